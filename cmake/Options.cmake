@@ -1,0 +1,32 @@
+# qztessel_options carries what every target of ours is compiled with and no
+# consumer should inherit: warnings and sanitizers. Link it PRIVATE.
+add_library(qztessel_options INTERFACE)
+
+target_compile_options(
+  qztessel_options
+  INTERFACE -Wall
+            -Wextra
+            -Wpedantic
+            -Wconversion
+            -Wsign-conversion
+            -Wshadow
+            -Wnon-virtual-dtor
+            -Wold-style-cast
+            $<$<BOOL:${QZTESSEL_WERROR}>:-Werror>)
+
+# Release keeps the containers unchecked. Elsewhere an index outside a vector
+# ends the program, also where no sanitizer would see it.
+target_compile_definitions(
+  qztessel_options
+  INTERFACE $<$<NOT:$<CONFIG:Release,MinSizeRel>>:_GLIBCXX_ASSERTIONS>)
+
+if(QZTESSEL_SANITIZE)
+  set(sanitizers -fsanitize=${QZTESSEL_SANITIZE} -fno-sanitize-recover=all)
+  if(QZTESSEL_SANITIZE MATCHES "undefined")
+    # Path numbers arrive as floating point; not every compiler's group has it.
+    list(APPEND sanitizers -fsanitize=float-cast-overflow)
+  endif()
+  target_compile_options(
+    qztessel_options INTERFACE -O1 -fno-omit-frame-pointer ${sanitizers})
+  target_link_options(qztessel_options INTERFACE ${sanitizers})
+endif()

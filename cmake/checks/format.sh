@@ -1,0 +1,7 @@
+#!/bin/bash
+# Usage: format.sh CLANG_FORMAT
+# Fails with the places where a source of ours is not formatted.
+set -euo pipefail
+find packing pathtree coder binding hosts tests bench fuzz \
+    \( -name '*.cpp' -o -name '*.hpp' \) -print0 2>/dev/null |
+    xargs -0 -r -n 16 -P 2 "$1" --dry-run --Werror

@@ -1,0 +1,53 @@
+#!/bin/bash
+# Breaks each rule of includes.sh once, in a small tree of its own, and
+# expects each breach, and nothing else, to be reported.
+set -euo pipefail
+checker=$PWD/cmake/checks/includes.sh
+tree=$(mktemp -d)
+trap 'rm -rf "$tree"' EXIT
+cd "$tree"
+mkdir -p packing pathtree coder binding hosts/small
+
+# Writes a file that includes each of the given headers.
+including() {
+    local file=$1
+    shift
+    printf '#include "%s"\n' "$@" >"$file"
+}
+for header in packing/sixpacks pathtree/BPathTree coder/HuffmanPathTree \
+    binding/HostInterface binding/Methods hosts/small/Host; do
+    echo '#include <vector>' >"$header.hpp"
+done
+
+including packing/BPathTreeForm.cpp packing/sixpacks.hpp pathtree/BPathTree.hpp
+including coder/good.cpp packing/sixpacks.hpp pathtree/BPathTree.hpp
+including binding/good.cpp binding/HostInterface.hpp coder/HuffmanPathTree.hpp
+including hosts/small/good.cpp binding/HostInterface.hpp hosts/small/Host.hpp
+"$checker" . || {
+    echo "a tree without a breach is refused"
+    exit 1
+}
+
+including packing/bad1.cpp pathtree/BPathTree.hpp
+including pathtree/bad2.cpp packing/sixpacks.hpp
+including coder/bad3.cpp binding/HostInterface.hpp
+including binding/bad4.cpp hosts/small/Host.hpp
+including hosts/small/bad5.cpp binding/Methods.hpp
+including hosts/small/bad6.cpp coder/HuffmanPathTree.hpp
+including pathtree/bad7.cpp BPathTree.hpp
+echo '#  include <coder/HuffmanPathTree.hpp>' >pathtree/bad8.cpp
+if found=$("$checker" .); then
+    echo "breaches are not refused"
+    exit 1
+fi
+for number in 1 2 3 4 5 6 7 8; do
+    grep -q "bad$number.cpp:1: " <<<"$found" || {
+        echo "bad$number.cpp is not reported"
+        exit 1
+    }
+done
+(($(wc -l <<<"$found") == 8)) || {
+    echo "more than the eight breaches is reported:"
+    echo "$found"
+    exit 1
+}
