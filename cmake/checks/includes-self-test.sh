@@ -28,7 +28,7 @@ including hosts/small/good.cpp binding/HostInterface.hpp hosts/small/Host.hpp
     exit 1
 }
 
-including packing/bad1.cpp pathtree/BPathTree.hpp
+including packing/sixpacks-bad1.cpp pathtree/BPathTree.hpp
 including pathtree/bad2.cpp packing/sixpacks.hpp
 including coder/bad3.cpp binding/HostInterface.hpp
 including binding/bad4.cpp hosts/small/Host.hpp
