@@ -5,19 +5,21 @@
 # through pkg-config.
 set -euo pipefail
 cmake=$1 cxx=$2 projectBuild=$3 work=$4
-source=$PWD/tests/consumer
 rm -rf "$work"
 "$cmake" --install "$projectBuild" --prefix "$work/first" >/dev/null
 mv "$work/first" "$work/prefix"
 
-"$cmake" -G Ninja -S "$source" -B "$work/build" \
+"$cmake" -G Ninja -S tests/consumer -B "$work/build" \
     -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_PREFIX_PATH="$work/prefix" >/dev/null
 "$cmake" --build "$work/build"
 "$work/build/consumer"
+if [[ -x $work/build/load-plugin ]]; then
+    "$work/build/load-plugin"
+fi
 
 pcFile=$(find "$work/prefix" -name qztessel.pc)
 export PKG_CONFIG_PATH=${pcFile%/*}
 # shellcheck disable=SC2046  # the flags are words
-"$cxx" -std=c++20 "$source/main.cpp" -o "$work/consumer" \
+"$cxx" -std=c++20 tests/outside/main.cpp -o "$work/consumer" \
     $(pkg-config --cflags --libs qztessel)
 "$work/consumer"

@@ -1,0 +1,18 @@
+// Loads the installed plug-in into a process that is no host: the loader must
+// name the symbol that is missing, and nothing else may be wrong.
+#include <dlfcn.h>
+
+#include <iostream>
+#include <string>
+
+int main() {
+    if (dlopen(PLUGIN_FILE, RTLD_NOW) != nullptr) {
+        std::cerr << "a process without a host could load the plug-in\n";
+        return 1;
+    }
+    const std::string reason = dlerror();
+    std::cout << reason << '\n';
+    const bool isExpected =
+        reason.find("undefined symbol: VXHostInterface") != std::string::npos;
+    return isExpected ? 0 : 1;
+}
