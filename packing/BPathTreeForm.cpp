@@ -1,0 +1,48 @@
+// The stored form of the path tree: two lists with one entry for each node
+// but the root, in pre-order (a node before its children, children in the
+// order of insertion).
+//
+//   structure   one code a node:
+//                 code | has children | its parent's last child
+//                 -----+--------------+------------------------
+//                   0  |      no      |          yes
+//                   1  |      yes     |          yes
+//                   2  |      no      |          no
+//                   3  |      yes     |          no
+//   values      the node's encoded component
+
+#include <algorithm>
+
+#include "packing/TreeBuilder.hpp"
+#include "packing/sixpacks.hpp"
+#include "pathtree/BPathTree.hpp"
+#include "pathtree/NodeWalk.hpp"
+#include "pathtree/containers.hpp"
+
+namespace tessel {
+
+std::size_t BPathTree::serialize(std::vector<std::uint8_t>& structure,
+                                 Components& values) const {
+    std::size_t mostChildren = root->children().size();
+    for (NodeWalk walk(*root); walk.next();) {
+        const ComponentView value = walk.node().value();
+        values.emplace_back(value.begin(), value.end());
+        structure.push_back(nodecode::of(walk));
+        mostChildren = std::max(mostChildren, walk.node().children().size());
+    }
+    return mostChildren;
+}
+
+std::size_t BPathTree::deserialize(std::vector<std::uint8_t>& structure,
+                                   Components& values) {
+    TreeBuilder builder(*this, structure);
+    if (structure.empty() && values.empty()) return 0;
+    for (std::size_t i = 0; !builder.complete(); ++i) {
+        if (i == values.size()) throw DamagedFormException();
+        builder.add(values[i]);
+        releaseContents(values[i]);
+    }
+    return builder.leaves();
+}
+
+}  // namespace tessel

@@ -1,0 +1,241 @@
+#include "packing/sixpacks.hpp"
+
+#include <zlib.h>
+
+#include <utility>
+
+namespace tessel {
+
+const char* DamagedFormException::what() const noexcept {
+    return "The stored form is truncated or damaged.";
+}
+
+namespace sixpacks {
+
+namespace {
+
+// Deflate's best case is a 258-byte match in two bits, so no stream grows by
+// more than this factor.
+constexpr std::uint64_t maxInflationFactor = 1032;
+
+constexpr int compressionLevel = 9;
+
+// Sum of byte j shifted left by 8 j over the given bytes.
+std::uint64_t fromLittleEndian(std::span<const std::uint8_t> bytes) {
+    std::uint64_t value = 0;
+    for (std::size_t j = bytes.size(); j-- > 0;)
+        value = (value << 8) | bytes[j];
+    return value;
+}
+
+}  // namespace
+
+const char* InvalidUintConversionException::what() const noexcept {
+    return "Invalid uint type conversion.";
+}
+
+// The only place where an outside length meets the end of the data.
+std::span<const std::uint8_t> ByteCursor::take(std::uint64_t n) {
+    if (n > rest.size()) throw DamagedFormException();
+    const auto head = rest.first(static_cast<std::size_t>(n));
+    rest = rest.subspan(static_cast<std::size_t>(n));
+    return head;
+}
+
+std::uint64_t ByteCursor::takeUint(PackedSizeT width) {
+    return fromLittleEndian(take(widthBytes(width)));
+}
+
+void ByteCursor::requireItems(std::uint64_t count,
+                              std::size_t bytesEach) const {
+    if (count > rest.size() / bytesEach) throw DamagedFormException();
+}
+
+std::size_t widthBytes(PackedSizeT width) {
+    switch (width) {
+        case PackedSizeT::Uint8:
+            return sizeof(std::uint8_t);
+        case PackedSizeT::Uint16:
+            return sizeof(std::uint16_t);
+        case PackedSizeT::Uint32:
+            return sizeof(std::uint32_t);
+        case PackedSizeT::Uint64:
+            return sizeof(std::uint64_t);
+    }
+    throw InvalidUintConversionException();
+}
+
+template <class UintT, class ValueT>
+void PackerUnpackerUint<UintT, ValueT>::packValues(
+    std::vector<ValueT> values, std::vector<std::uint8_t>& out) {
+    for (const ValueT value : values) this->packValue(value, out);
+}
+
+template <class UintT, class ValueT>
+void PackerUnpackerUint<UintT, ValueT>::packValue(
+    ValueT value, std::vector<std::uint8_t>& out) {
+    for (std::size_t j = 0; j < sizeof(UintT); ++j)
+        out.push_back(static_cast<std::uint8_t>(value >> (8 * j)));
+}
+
+template <class UintT, class ValueT>
+void PackerUnpackerUint<UintT, ValueT>::unpackValues(std::vector<ValueT>& out,
+                                                     ByteIterator& it,
+                                                     const std::size_t& count) {
+    for (std::size_t i = 0; i < count; ++i) {
+        ValueT value = 0;
+        this->unpackValue(value, it);
+        out.push_back(value);
+    }
+}
+
+template <class UintT, class ValueT>
+void PackerUnpackerUint<UintT, ValueT>::unpackValue(ValueT& value,
+                                                    ByteIterator& it) {
+    value = fromLittleEndian({&*it, sizeof(UintT)});
+    it += sizeof(UintT);
+}
+
+template class PackerUnpackerUint<std::uint8_t>;
+template class PackerUnpackerUint<std::uint16_t>;
+template class PackerUnpackerUint<std::uint32_t>;
+template class PackerUnpackerUint<std::uint64_t>;
+
+std::unique_ptr<PackerUnpackerBase<std::size_t>> makePackerUnpacker(
+    PackedSizeT width) {
+    switch (width) {
+        case PackedSizeT::Uint8:
+            return std::make_unique<PackerUnpackerUint<std::uint8_t>>();
+        case PackedSizeT::Uint16:
+            return std::make_unique<PackerUnpackerUint<std::uint16_t>>();
+        case PackedSizeT::Uint32:
+            return std::make_unique<PackerUnpackerUint<std::uint32_t>>();
+        case PackedSizeT::Uint64:
+            return std::make_unique<PackerUnpackerUint<std::uint64_t>>();
+    }
+    throw InvalidUintConversionException();
+}
+
+PackedSizeT narrowestWidth(std::size_t n) noexcept {
+    if (n <= 0xFF) return PackedSizeT::Uint8;
+    if (n <= 0xFFFF) return PackedSizeT::Uint16;
+    if (n <= 0xFFFFFFFF) return PackedSizeT::Uint32;
+    return PackedSizeT::Uint64;
+}
+
+PackedSizeT packPackedSizeT(std::size_t n, std::vector<std::uint8_t>& out) {
+    const PackedSizeT width = narrowestWidth(n);
+    out.push_back(static_cast<std::uint8_t>(width));
+    return width;
+}
+
+void packSizeTVector(const std::vector<std::size_t>& values,
+                     std::vector<std::uint8_t>& out, PackedSizeT valueSize,
+                     PackedSizeT countSize) {
+    makePackerUnpacker(countSize)->packValue(values.size(), out);
+    makePackerUnpacker(valueSize)->packValues(values, out);
+}
+
+void unpackSizeTVector(std::vector<std::size_t>& out, ByteIterator& it,
+                       PackedSizeT valueSize, PackedSizeT countSize) {
+    std::size_t count = 0;
+    makePackerUnpacker(countSize)->unpackValue(count, it);
+    makePackerUnpacker(valueSize)->unpackValues(out, it, count);
+}
+
+void unpackSizeTVector(std::vector<std::size_t>& out, ByteCursor& cursor,
+                       PackedSizeT valueSize, PackedSizeT countSize) {
+    const std::uint64_t count = cursor.takeUint(countSize);
+    cursor.requireItems(count, widthBytes(valueSize));
+    out.reserve(out.size() + static_cast<std::size_t>(count));
+    for (std::uint64_t i = 0; i < count; ++i)
+        out.push_back(cursor.takeUint(valueSize));
+}
+
+void boolVecToBytes(std::vector<std::uint8_t>& out,
+                    const std::vector<bool>& bits) {
+    if (bits.empty()) return;
+    std::uint8_t count = 0;
+    unsigned acc = 0;
+    for (const bool bit : bits) {
+        if (bit) acc |= 1U << count;
+        if (++count == 8) {
+            out.push_back(static_cast<std::uint8_t>(acc));
+            acc = 0;
+            count = 0;
+        }
+    }
+    out.push_back(static_cast<std::uint8_t>(acc));
+    out.push_back(count);
+}
+
+void bytesToBoolVec(const std::vector<std::uint8_t>& bytes,
+                    std::vector<bool>& out) {
+    if (bytes.empty() || bytes.back() > 8) throw DamagedFormException();
+    if (bytes.size() == 1) return;
+    const std::size_t last = bytes.size() - 2;
+    for (std::size_t i = 0; i <= last; ++i) {
+        const unsigned count = i == last ? bytes.back() : 8;
+        for (unsigned k = 0; k < count; ++k)
+            out.push_back(((bytes[i] >> k) & 1U) != 0);
+    }
+}
+
+void packVector(std::vector<std::uint8_t>& data, std::vector<std::uint8_t>& out,
+                PackedSizeT lengthSize) {
+    makePackerUnpacker(lengthSize)->packValue(data.size(), out);
+    out.insert(out.end(), data.begin(), data.end());
+}
+
+void unpackVector(std::vector<std::uint8_t>& out, ByteIterator& it,
+                  PackedSizeT lengthSize) {
+    std::size_t length = 0;
+    makePackerUnpacker(lengthSize)->unpackValue(length, it);
+    const auto end = it + static_cast<std::ptrdiff_t>(length);
+    out.insert(out.end(), it, end);
+    it = end;
+}
+
+std::span<const std::uint8_t> unpackVector(ByteCursor& cursor,
+                                           PackedSizeT lengthSize) {
+    return cursor.take(cursor.takeUint(lengthSize));
+}
+
+std::vector<std::uint8_t> compressUint8(std::vector<std::uint8_t>& data) {
+    uLongf length = compressBound(data.size());
+    std::vector<std::uint8_t> result(length);
+    if (compress2(result.data(), &length, data.data(), data.size(),
+                  compressionLevel) != Z_OK)
+        throw std::bad_alloc();  // the buffer is large enough by construction
+    result.resize(length);
+    return result;
+}
+
+std::vector<std::uint8_t> decompressUint8(ByteIterator begin,
+                                          std::size_t compressedSize,
+                                          std::size_t uncompressedSize) {
+    std::vector<std::uint8_t> result(uncompressedSize);
+    uLongf length = uncompressedSize;
+    const std::uint8_t* stream = compressedSize == 0 ? nullptr : &*begin;
+    uncompress(result.data(), &length, stream, compressedSize);
+    result.resize(length);
+    return result;
+}
+
+std::vector<std::uint8_t> decompressChecked(
+    std::span<const std::uint8_t> stream, std::uint64_t uncompressedSize) {
+    if (uncompressedSize / maxInflationFactor > stream.size())
+        throw DamagedFormException();
+    std::vector<std::uint8_t> result(
+        static_cast<std::size_t>(uncompressedSize));
+    uLongf length = result.size();
+    const int status =
+        uncompress(result.data(), &length, stream.data(), stream.size());
+    if (status == Z_MEM_ERROR) throw std::bad_alloc();
+    if (status != Z_OK || length != uncompressedSize)
+        throw DamagedFormException();
+    return result;
+}
+
+}  // namespace sixpacks
+}  // namespace tessel

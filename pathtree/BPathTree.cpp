@@ -1,0 +1,339 @@
+#include "pathtree/BPathTree.hpp"
+
+#include <iterator>
+#include <stdexcept>
+#include <unordered_set>
+#include <utility>
+
+#include "pathtree/NodeWalk.hpp"
+#include "pathtree/containers.hpp"
+
+namespace tessel {
+
+namespace {
+
+Component copyOf(ComponentView value) { return {value.begin(), value.end()}; }
+
+// A component that became a node has been moved from: it is left empty. One
+// in a packed list is only read.
+void takeOver(Component& component) { releaseContents(component); }
+void takeOver(const ComponentView&) {}
+
+const BNode& childAt(const BNode& node, std::uint64_t position) {
+    const ChildList children = node.children();
+    if (position >= children.size())
+        throw std::out_of_range("A position leads outside the path tree.");
+    return children[static_cast<std::size_t>(position)];
+}
+
+template <class T>
+void appendAll(std::vector<T>& out, std::vector<T>& more) {
+    out.reserve(out.size() + more.size());
+    std::move(more.begin(), more.end(), std::back_inserter(out));
+}
+
+std::size_t componentBytes(const Components& components) {
+    std::size_t bytes = components.capacity() * sizeof(Component);
+    for (const Component& component : components) bytes += component.capacity();
+    return bytes;
+}
+
+}  // namespace
+
+const char* NoMorePathException::what() const noexcept {
+    return "No more paths to provide.";
+}
+
+const char* NoTreeToTraverseException::what() const noexcept {
+    return "Cannot traverse an empty tree for a path.";
+}
+
+const char* EmptyPathForTraverseException::what() const noexcept {
+    return "Cannot traverse an tree for an empty path track.";
+}
+
+const char* UnknownNodeTypeException::what() const noexcept {
+    return "Cannot determine the node type for the given value.";
+}
+
+BPathTree::BPathTree() {
+    root = BNodePtr::adopt(pool.make({}, NodePool::Kind::folder));
+}
+
+BPathTree::BPathTree(const BPathTree& other)
+    : root(other.root),
+      pendingNodes(other.pendingNodes),
+      parentNodes(other.parentNodes),
+      currentPrefix(other.currentPrefix),
+      spareFlag(other.spareFlag) {}
+
+BPathTree::~BPathTree() = default;
+
+// ---- Insertion ----
+
+std::uint64_t BPathTree::findNode(const Component& value,
+                                  const ChildList& nodes) const {
+    const std::size_t count = nodes.size();
+    for (std::size_t i = 0; i < count; ++i)
+        if (sameComponent(nodes[i].value(), value)) return i;
+    return allOnes;
+}
+
+std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
+                                            Component& value,
+                                            bool& existed) const {
+    const std::size_t position =
+        findOrAppend(nodes.node(), value, NodePool::Kind::leaf, existed);
+    if (!existed) takeOver(value);
+    return position;
+}
+
+std::size_t BPathTree::findOrAppend(BNode& parent, ComponentView value,
+                                    NodePool::Kind kind, bool& existed) const {
+    const std::size_t found = finder.find(parent, value);
+    existed = found != ChildFinder::notFound;
+    if (existed) return found;
+    BNodePtr made = BNodePtr::adopt(pool.make(value, kind));
+    NodePool::append(parent, made);
+    const std::size_t position = parent.children().size() - 1;
+    finder.remember(parent, position);
+    return position;
+}
+
+bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
+    bool existed = false;
+    BNode* node = root.get();
+    for (std::size_t i = 0; i < components.size(); ++i) {
+        const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
+                                                    : NodePool::Kind::leaf;
+        const std::size_t position =
+            findOrAppend(*node, components[i], kind, existed);
+        if (existed)
+            pathTrack.push_back(position);
+        else
+            takeOver(components[i]);
+        node = &node->children()[position];
+    }
+    return existed;
+}
+
+template <class Folder, class Files>
+bool BPathTree::insertBatch(Folder& folderComponents, Files& fileNames,
+                            PathTrack& pathTrack,
+                            std::uint64_t& firstFileIndex) {
+    bool existed = false;
+    BNode* folder = root.get();
+    for (auto&& component : folderComponents) {
+        const std::size_t position =
+            findOrAppend(*folder, component, NodePool::Kind::folder, existed);
+        if (!existed) takeOver(component);
+        pathTrack.push_back(position);
+        folder = &folder->children()[position];
+    }
+    const std::size_t before = folder->children().size();
+    firstFileIndex = existed ? before : allOnes;
+    if (fileNames.empty()) return existed;
+    NodePool::reserve(*folder, fileNames.size());
+    try {
+        for (auto&& name : fileNames) {
+            BNodePtr file =
+                BNodePtr::adopt(pool.make(name, NodePool::Kind::leaf));
+            NodePool::append(*folder, file);
+        }
+    } catch (...) {
+        NodePool::truncate(*folder, before);
+        throw;
+    }
+    for (auto&& name : fileNames) takeOver(name);
+    return existed;
+}
+
+bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
+                        PathTrack& pathTrack, std::uint64_t& firstFileIndex) {
+    return insertBatch(folderComponents, fileNames, pathTrack, firstFileIndex);
+}
+
+bool BPathTree::addPath(const PackedComponents& folderComponents,
+                        const PackedComponents& fileNames, PathTrack& pathTrack,
+                        std::uint64_t& firstFileIndex) {
+    return insertBatch(folderComponents, fileNames, pathTrack, firstFileIndex);
+}
+
+bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
+    return node->isLeaf();
+}
+
+void BPathTree::releaseFinder(std::size_t most) noexcept {
+    if (finder.indexedChildren() <= most) finder.clear();
+}
+
+// ---- Iteration ----
+
+void BPathTree::pushAllChildren(const BNodePtr& node, NodeStack& stack) const {
+    stack.pushChildren(node);
+}
+
+void BPathTree::pushAllChildren(const BNodePtr& node) {
+    pushAllChildren(node, pendingNodes);
+}
+
+bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node,
+                                    const NodeStack& parents) const noexcept {
+    if (parents.empty()) return false;
+    const ChildList siblings = parents.top().children();
+    return !siblings.empty() && &siblings.back() == node.get();
+}
+
+bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
+    return isNodeAtEndOfParent(node, parentNodes);
+}
+
+void BPathTree::reset() {
+    finder.clear();
+    if (root->isLeaf()) return;
+    pendingNodes.clear();
+    pushAllChildren(root);
+    parentNodes.clear();
+    parentNodes.push(root);
+    currentPrefix.clear();
+}
+
+bool BPathTree::hasNextPath() const noexcept {
+    return !root->isLeaf() && !pendingNodes.empty();
+}
+
+void BPathTree::getNextPath(Components& out) {
+    if (!hasNextPath()) throw NoMorePathException();
+    BNodePtr node(&pendingNodes.top());
+    while (!node->isLeaf()) {
+        pendingNodes.pop();
+        currentPrefix.push_back(copyOf(node->value()));
+        pushAllChildren(node);
+        parentNodes.push(node);
+        node = BNodePtr(&pendingNodes.top());
+    }
+    const bool folderEnds = isNodeAtEndOfParent(node);
+    pendingNodes.pop();
+    // Assigning in place keeps the memory that out already has.
+    out.resize(currentPrefix.size() + 1);
+    for (std::size_t i = 0; i < currentPrefix.size(); ++i)
+        out[i] = currentPrefix[i];
+    const ComponentView name = node->value();
+    out.back().assign(name.begin(), name.end());
+    if (folderEnds) closeFinishedFolders();
+}
+
+void BPathTree::closeFinishedFolders() {
+    while (!parentNodes.empty()) {
+        const BNodePtr folder(&parentNodes.top());
+        parentNodes.pop();
+        if (!currentPrefix.empty()) currentPrefix.pop_back();
+        if (!isNodeAtEndOfParent(folder)) return;
+    }
+}
+
+// ---- Lookup ----
+
+void BPathTree::traversePath(const PathTrack& pathTrack,
+                             Components& out) const {
+    if (root->isLeaf()) throw NoTreeToTraverseException();
+    if (pathTrack.empty()) throw EmptyPathForTraverseException();
+    Components found;
+    found.reserve(pathTrack.size());
+    const BNode* node = root.get();
+    for (const std::uint64_t position : pathTrack) {
+        node = &childAt(*node, position);
+        found.push_back(copyOf(node->value()));
+    }
+    appendAll(out, found);
+}
+
+template <class Tracks>
+void BPathTree::lookUp(
+    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
+    const std::vector<std::uint64_t>& selectedPartitions,
+    const Tracks& partitionTracks,
+    const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
+    if (selectedPartitions.empty()) return;
+    if (fileOffsets.size() < selectedPartitions.size())
+        throw std::out_of_range("A selected partition has no file offsets.");
+    std::vector<Components> folders;
+    std::vector<Components> files;
+    folders.reserve(selectedPartitions.size());
+    files.reserve(selectedPartitions.size());
+    for (std::size_t i = 0; i < selectedPartitions.size(); ++i) {
+        const std::uint64_t partition = selectedPartitions[i];
+        if (partition >= partitionTracks.size())
+            throw std::out_of_range("A partition does not exist.");
+        const PathTrack& track =
+            partitionTracks[static_cast<std::size_t>(partition)];
+        const BNode* folder = root.get();
+        const BNode* end = folder;
+        Components& components = folders.emplace_back();
+        components.reserve(track.size());
+        for (const std::uint64_t position : track) {
+            folder = end;
+            end = &childAt(*folder, position);
+            components.push_back(copyOf(end->value()));
+        }
+        std::uint64_t base = 0;
+        if (end->isLeaf()) {
+            if (track.empty())
+                throw std::out_of_range("A track leads nowhere.");
+            components.pop_back();
+            base = track.back();
+        } else {
+            folder = end;
+        }
+        Components& names = files.emplace_back();
+        names.reserve(fileOffsets[i].size());
+        for (const std::uint64_t offset : fileOffsets[i])
+            names.push_back(
+                copyOf(childAt(*folder, base - 1 + offset).value()));
+    }
+    appendAll(folderPaths, folders);
+    appendAll(filePaths, files);
+}
+
+void BPathTree::getPath(
+    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
+    const std::vector<std::uint64_t>& selectedPartitions,
+    const std::vector<PathTrack>& partitionTracks,
+    const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
+    lookUp(folderPaths, filePaths, selectedPartitions, partitionTracks,
+           fileOffsets);
+}
+
+void BPathTree::getPath(
+    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
+    const std::vector<std::uint64_t>& selectedPartitions,
+    const PathTracks& partitionTracks,
+    const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
+    lookUp(folderPaths, filePaths, selectedPartitions, partitionTracks,
+           fileOffsets);
+}
+
+// ---- Memory ----
+
+BPathTree::MemoryUsage BPathTree::memoryUsage() const {
+    MemoryUsage usage;
+    std::unordered_set<const void*> slabs;
+    const void* latest = nullptr;
+    const auto account = [&](const BNode& node) {
+        usage.names += node.value().size();
+        usage.childLists += NodeMemory::childListBytes(node);
+        const auto [slab, bytes] = NodeMemory::slab(node);
+        if (slab == latest) return;
+        latest = slab;
+        if (slabs.insert(slab).second) usage.nodes += bytes;
+    };
+    account(*root);
+    for (NodeWalk walk(*root); walk.next();) account(walk.node());
+    usage.nodes -= usage.names;
+    usage.finder = finder.memoryBytes();
+    usage.iteration = pendingNodes.memoryBytes() + parentNodes.memoryBytes() +
+                      componentBytes(currentPrefix);
+    return usage;
+}
+
+}  // namespace tessel

@@ -1,0 +1,246 @@
+#include "pathtree/NodePool.hpp"
+
+#include <malloc.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <limits>
+#include <memory>
+#include <mutex>
+#include <new>
+#include <stdexcept>
+#include <unordered_map>
+
+namespace tessel {
+
+namespace {
+
+// A node finds its slab by clearing the low bits of its address, so every
+// node starts within the first slabAlignment bytes of its slab.
+constexpr std::size_t slabAlignment = std::size_t{16} << 10;
+
+// Leaves room for the allocator's own header, so that slabs which follow
+// each other in memory waste no space between them.
+constexpr std::size_t largestSlab = slabAlignment - 64;
+constexpr std::size_t smallestSlab = 1024 - 64;
+
+constexpr std::size_t nodeAlignment = 4;
+
+constexpr std::size_t roundUp(std::size_t n, std::size_t unit) {
+    return (n + unit - 1) / unit * unit;
+}
+
+// Child lists of nodes that were made as leaves, by the node's address.
+struct LateChildren {
+    std::mutex access;  // nodes may be released on several threads
+    std::unordered_map<const BNode*, ChildBlock*> lists;
+};
+
+std::size_t allocatedBytes(void* memory) noexcept {
+    return memory == nullptr ? 0
+                             : malloc_usable_size(memory) + sizeof(std::size_t);
+}
+
+}  // namespace
+
+// One aligned piece of memory that nodes are cut from, front to back.
+class NodeSlab {
+public:
+    static NodeSlab* create(std::size_t bytes) {
+        void* memory = nullptr;
+        if (posix_memalign(&memory, slabAlignment, bytes) != 0)
+            throw std::bad_alloc();
+        return new (memory) NodeSlab(bytes);
+    }
+
+    static NodeSlab* of(const BNode* node) noexcept {
+        const auto address = reinterpret_cast<std::uintptr_t>(node);
+        return reinterpret_cast<NodeSlab*>(address & ~(slabAlignment - 1));
+    }
+
+    // A place for `before` + `bytes` bytes, or nullptr if none is left. The
+    // place counts as a node until release().
+    char* cut(std::size_t before, std::size_t bytes) noexcept {
+        const std::size_t total = roundUp(before + bytes, nodeAlignment);
+        if (total > size - used) return nullptr;
+        char* at = reinterpret_cast<char*>(this) + used + before;
+        used += total;
+        live.fetch_add(1, std::memory_order_relaxed);
+        return at;
+    }
+
+    // Gives back one node, or the pool's own hold.
+    void release() noexcept {
+        if (live.fetch_sub(1, std::memory_order_acq_rel) != 1) return;
+        this->~NodeSlab();
+        std::free(this);
+    }
+
+    ChildBlock* lateList(const BNode* node) noexcept {
+        const std::lock_guard lock(late->access);
+        return late->lists.find(node)->second;
+    }
+    void setLateList(const BNode* node, ChildBlock* list) {
+        if (late == nullptr) late = std::make_unique<LateChildren>();
+        const std::lock_guard lock(late->access);
+        late->lists[node] = list;
+    }
+    void forgetLateList(const BNode* node) noexcept {
+        const std::lock_guard lock(late->access);
+        late->lists.erase(node);
+    }
+
+    std::size_t bytes() noexcept { return allocatedBytes(this); }
+
+private:
+    explicit NodeSlab(std::size_t bytes) noexcept : size(bytes) {}
+
+    std::atomic<std::size_t> live{1};  // nodes, and 1 while a pool fills it
+    std::size_t size;
+    std::size_t used = sizeof(NodeSlab);
+    std::unique_ptr<LateChildren> late;
+};
+
+ChildBlock* BNode::lateBlock() const noexcept {
+    return NodeSlab::of(this)->lateList(this);
+}
+
+void BNode::setBlock(ChildBlock* list) {
+    if ((head & ownsListFlag) != 0) {
+        std::memcpy(listSlot(), &list, sizeof list);
+    } else {
+        NodeSlab::of(this)->setLateList(this, list);
+        head = static_cast<std::uint8_t>(head | lateListFlag);
+    }
+}
+
+// Walks down and up through the dead nodes. On the way down the slot that a
+// child stood in, which is free once the child is taken from its list,
+// remembers the way up: the nodes themselves are the stack.
+void BNode::destroy(BNode* dead) noexcept {
+    BNode* above = nullptr;
+    for (;;) {
+        ChildBlock* list = dead->block();
+        if (list != nullptr && list->size > 0) {
+            BNode** slot = &list->slots()[--list->size];
+            BNode* child = *slot;
+            if (!child->unshare()) continue;
+            *slot = above;
+            above = dead;
+            dead = child;
+            continue;
+        }
+        if ((dead->head & lateListFlag) != 0)
+            NodeSlab::of(dead)->forgetLateList(dead);
+        std::free(list);
+        NodeSlab::of(dead)->release();
+        if (above == nullptr) return;
+        dead = above;
+        ChildBlock* open = dead->block();
+        above = open->slots()[open->size];
+    }
+}
+
+NodePool::~NodePool() {
+    if (current != nullptr) current->release();
+}
+
+void* NodePool::allocate(std::size_t before, std::size_t bytes) {
+    if (current != nullptr)
+        if (char* at = current->cut(before, bytes)) return at;
+    const std::size_t needed =
+        roundUp(before + bytes, nodeAlignment) + sizeof(NodeSlab);
+    if (needed > largestSlab / 4) {  // a slab of its own
+        NodeSlab* own = NodeSlab::create(needed);
+        char* at = own->cut(before, bytes);
+        own->release();
+        return at;
+    }
+    NodeSlab* next = NodeSlab::create(
+        std::clamp(made / 8, std::max(smallestSlab, needed), largestSlab));
+    if (current != nullptr) current->release();
+    current = next;
+    return current->cut(before, bytes);
+}
+
+BNode* NodePool::make(ComponentView value, Kind kind) {
+    const bool isLong = value.size() >= BNode::longLength;
+    const std::size_t before = kind == Kind::folder ? sizeof(ChildBlock*) : 0;
+    const std::size_t bytes = offsetof(BNode, head) + 1 +
+                              (isLong ? sizeof(std::uint64_t) : 0) +
+                              value.size();
+    BNode* node = new (allocate(before, bytes)) BNode;
+    made += before + bytes;
+    unsigned head =
+        (isLong ? BNode::longLength : static_cast<unsigned>(value.size()))
+        << BNode::lengthShift;
+    if (kind == Kind::folder) {
+        head |= BNode::ownsListFlag;
+        std::memset(node->listSlot(), 0, sizeof(ChildBlock*));
+    }
+    node->head = static_cast<std::uint8_t>(head);
+    std::uint8_t* at = node->afterHead();
+    if (isLong) {
+        const std::uint64_t length = value.size();
+        std::memcpy(at, &length, sizeof length);
+        at += sizeof length;
+    }
+    if (!value.empty()) std::memcpy(at, value.data(), value.size());
+    return node;
+}
+
+void NodePool::reserve(BNode& parent, std::size_t count) {
+    constexpr std::size_t most = std::numeric_limits<std::uint32_t>::max();
+    if (count == 0) return;
+    ChildBlock* list = parent.block();
+    const std::size_t size = list == nullptr ? 0 : list->size;
+    if (count > most - size)
+        throw std::length_error("A folder has too many children.");
+    if (list != nullptr && size + count <= list->capacity) return;
+    // A quarter more than needed keeps single appends linear; a first list
+    // is exact.
+    const std::size_t capacity =
+        size == 0 ? count
+                  : std::min(most, std::max(size + count, size + size / 4 + 1));
+    if (list == nullptr) parent.setBlock(nullptr);  // may throw, so first
+    void* memory =
+        std::realloc(list, sizeof(ChildBlock) + capacity * sizeof(BNode*));
+    if (memory == nullptr) throw std::bad_alloc();
+    auto* grown = static_cast<ChildBlock*>(memory);
+    grown->size = static_cast<std::uint32_t>(size);
+    grown->capacity = static_cast<std::uint32_t>(capacity);
+    parent.setBlock(grown);
+}
+
+void NodePool::append(BNode& parent, BNodePtr& child) {
+    reserve(parent, 1);
+    ChildBlock* list = parent.block();
+    list->slots()[list->size++] = child.release();
+}
+
+void NodePool::truncate(BNode& parent, std::size_t size) noexcept {
+    ChildBlock* list = parent.block();
+    while (list != nullptr && list->size > size)
+        BNodePtr::adopt(list->slots()[--list->size]);
+}
+
+std::size_t NodeMemory::nodeBytes(const BNode& node) noexcept {
+    const bool isLong = node.head >> BNode::lengthShift == BNode::longLength;
+    const bool ownsList = (node.head & BNode::ownsListFlag) != 0;
+    return roundUp(
+        (ownsList ? sizeof(ChildBlock*) : 0) + offsetof(BNode, head) + 1 +
+            (isLong ? sizeof(std::uint64_t) : 0) + node.value().size(),
+        nodeAlignment);
+}
+
+std::size_t NodeMemory::childListBytes(const BNode& node) noexcept {
+    return allocatedBytes(node.block());
+}
+
+std::pair<const void*, std::size_t> NodeMemory::slab(
+    const BNode& node) noexcept {
+    NodeSlab* slab = NodeSlab::of(&node);
+    return {slab, slab->bytes()};
+}
+
+}  // namespace tessel

@@ -1,0 +1,67 @@
+#pragma once
+
+#include <cstddef>
+#include <vector>
+
+#include "pathtree/BNode.hpp"
+
+namespace tessel {
+
+// A stack of nodes. All children of a node, pushed together, are kept as one
+// range of positions, so that pushing a folder of a million files is one
+// step and takes no memory for the files.
+//
+// Ownership: the stack keeps its nodes alive, children through their parent.
+//   A copy shares them.
+// Cost: every operation is O(1).
+class NodeStack {
+public:
+    bool empty() const noexcept { return ranges.empty(); }
+
+    // The number of nodes on the stack. Cost: linear in the ranges.
+    std::size_t size() const noexcept {
+        std::size_t count = 0;
+        for (const Range& range : ranges) count += range.end - range.next;
+        return count;
+    }
+
+    // The node on top; the stack must not be empty.
+    BNode& top() const noexcept {
+        const Range& range = ranges.back();
+        return range.isNode ? *range.node : range.node->children()[range.next];
+    }
+
+    void push(const BNodePtr& node) { ranges.push_back({node, 0, 1, true}); }
+
+    // Pushes the node's present children from the last to the first, so that
+    // the first is on top. Children appended later are not on the stack.
+    void pushChildren(const BNodePtr& node) {
+        const std::size_t count = node->children().size();
+        if (count > 0) ranges.push_back({node, 0, count, false});
+    }
+
+    // Takes the top off; the stack must not be empty.
+    void pop() noexcept {
+        if (++ranges.back().next == ranges.back().end) ranges.pop_back();
+    }
+
+    void clear() noexcept { ranges.clear(); }
+
+    // Bytes on the heap.
+    std::size_t memoryBytes() const noexcept {
+        return ranges.capacity() * sizeof(Range);
+    }
+
+private:
+    // A node itself, or its children at the positions next to end - 1.
+    struct Range {
+        BNodePtr node;
+        std::size_t next;
+        std::size_t end;
+        bool isNode;
+    };
+
+    std::vector<Range> ranges;
+};
+
+}  // namespace tessel
