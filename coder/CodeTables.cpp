@@ -34,8 +34,13 @@ void DecodeTable::build(const std::vector<HNode>& nodes,
             if (next < 0) break;
             node = &nodes[static_cast<std::size_t>(next)];
             if (!node->isLeaf()) continue;
-            step.characters[step.count++] = node->character;
-            step.bits = static_cast<std::uint8_t>(bit + 1);
+            step.characters[step.count] = node->character;
+            // Later ends stay at the last one's.
+            const auto taken = static_cast<std::uint16_t>(bit + 1);
+            if (step.count == 0) step.bits1 = taken & 15U;
+            if (step.count <= 1) step.bits2 = taken & 15U;
+            step.bits3 = taken & 15U;
+            ++step.count;
             if (step.count == mostCharacters) break;
             node = &root;
         }

@@ -23,8 +23,17 @@ public:
 
     struct Step {
         std::array<char16_t, mostCharacters> characters{};
-        std::uint8_t count = 0;  // of characters; 0: ask the tree
-        std::uint8_t bits = 0;   // that these characters take
+        std::uint16_t count : 4 = 0;  // of characters; 0: ask the tree
+        // Bits that the first one, two and three characters take.
+        std::uint16_t bits1 : 4 = 0;
+        std::uint16_t bits2 : 4 = 0;
+        std::uint16_t bits3 : 4 = 0;
+
+        unsigned bits(unsigned characterCount) const noexcept {
+            return characterCount == 3   ? bits3
+                   : characterCount == 2 ? bits2
+                                         : bits1;
+        }
     };
 
     // Derives the table; an empty tree or one whose root is a leaf gives an

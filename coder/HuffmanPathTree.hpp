@@ -346,6 +346,8 @@ private:
     template <class List>
     void insertPartition(List& folderComponents, List& fileNames);
 
+    std::size_t stepThrough(ComponentView bytes, std::size_t bit,
+                            std::size_t end, std::u16string& text) const;
     std::size_t walkToLeaf(ComponentView bytes, std::size_t bit,
                            std::size_t end, std::u16string& text) const;
     std::size_t partitionAtOrAfter(std::size_t k, std::uint64_t number) const;
@@ -353,6 +355,9 @@ private:
                         std::vector<std::uint8_t>& out) const;
     void packDuplicates(std::size_t mostChildren,
                         std::vector<std::uint8_t>& out) const;
+    void getPathByNumber(std::vector<Components>& folderPaths,
+                         std::vector<Components>& filePaths,
+                         const std::vector<double>& partitions) const;
     void getPathByTrack(std::vector<Components>& folderPaths,
                         const std::vector<double>& partitions) const;
 

@@ -1,6 +1,7 @@
 // Paths out of the coder: texts of components, iteration, lookup by number.
 
 #include <algorithm>
+#include <array>
 #include <bit>
 #include <cmath>
 #include <cstring>
@@ -31,19 +32,32 @@ bool bitAt(ComponentView bytes, std::size_t bit) {
     return ((bytes[bit / bitsPerByte] >> (bit % bitsPerByte)) & 1U) != 0;
 }
 
-// At least 25 bits from position `bit` on, least significant first; what
-// lies behind the end reads as 0.
-std::uint64_t windowAt(ComponentView bytes, std::size_t bit) {
-    static_assert(std::endian::native == std::endian::little);
-    std::uint32_t window = 0;
-    const std::size_t first = bit / bitsPerByte;
-    const std::size_t left = bytes.size() - first;
-    if (left >= sizeof window)
-        std::memcpy(&window, bytes.data() + first, sizeof window);
-    else
-        std::memcpy(&window, bytes.data() + first, left);
-    return window >> (bit % bitsPerByte);
-}
+// Reads the bits of a component up to 64 at a time.
+class BitReader {
+public:
+    explicit BitReader(ComponentView component) noexcept : bytes(component) {
+        static_assert(std::endian::native == std::endian::little);
+        std::memcpy(&head, bytes.data(), std::min(bytes.size(), sizeof head));
+    }
+
+    // The bits from position `bit` on, least significant first, of which at
+    // least sureBits are given as far as the component has them; what lies
+    // behind its end reads as 0.
+    static constexpr unsigned sureBits = 57;
+    std::uint64_t from(std::size_t bit) const noexcept {
+        const std::size_t first = bit / bitsPerByte;
+        if (first == 0 || bytes.size() <= sizeof head) return head >> bit;
+        const std::size_t base =
+            std::min(first, bytes.size() - sizeof(std::uint64_t));
+        std::uint64_t window = 0;
+        std::memcpy(&window, bytes.data() + base, sizeof window);
+        return window >> (bit - base * bitsPerByte);
+    }
+
+private:
+    ComponentView bytes;
+    std::uint64_t head = 0;
+};
 
 // A path number as it stands among the numbers of a request. Infinity and
 // whatever 64 bits cannot hold is above every number in use.
@@ -93,21 +107,50 @@ void HuffmanPathTree::appendPathFrom(ComponentView bytes,
     const std::size_t before = text.size();
     try {
         for (std::size_t bit = 0; bit < end;) {
-            if (!decodeTable.empty()) {
-                const DecodeTable::Step& step =
-                    decodeTable[windowAt(bytes, bit)];
-                if (step.count > 0 && step.bits <= end - bit) {
-                    text.append(step.characters.data(), step.count);
-                    bit += step.bits;
-                    continue;
-                }
-            }
-            bit = walkToLeaf(bytes, bit, end, text);
+            bit = stepThrough(bytes, bit, end, text);
+            if (bit < end) bit = walkToLeaf(bytes, bit, end, text);
         }
     } catch (...) {
         text.resize(before);
         throw;
     }
+}
+
+// Decodes as far as the table leads, several characters a step. Returns
+// where the table knows no further, or `end`.
+std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
+                                         std::size_t end,
+                                         std::u16string& text) const {
+    if (decodeTable.empty()) return bit;
+    constexpr unsigned stepsAWindow =
+        BitReader::sureBits / DecodeTable::windowBits;
+    constexpr std::size_t mostAWindow =
+        std::size_t{stepsAWindow} * DecodeTable::mostCharacters;
+    std::array<char16_t, 16 * mostAWindow> decoded;
+    std::size_t filled = 0;
+    const BitReader reader(bytes);
+    bool known = true;
+    while (known && bit < end) {
+        if (filled > decoded.size() - mostAWindow) {
+            text.append(decoded.data(), filled);
+            filled = 0;
+        }
+        std::uint64_t window = reader.from(bit);
+        for (unsigned k = 0; k < stepsAWindow && bit < end; ++k) {
+            const DecodeTable::Step& step = decodeTable[window];
+            unsigned count = step.count;
+            while (count > 0 && step.bits(count) > end - bit) --count;
+            known = count > 0;
+            if (!known) break;
+            std::copy(step.characters.begin(), step.characters.end(),
+                      decoded.begin() + static_cast<std::ptrdiff_t>(filled));
+            filled += count;
+            bit += step.bits(count);
+            window >>= step.bits(count);
+        }
+    }
+    text.append(decoded.data(), filled);
+    return bit;
 }
 
 std::u16string HuffmanPathTree::generatePathFrom(const Component& bytes) const {
@@ -147,16 +190,30 @@ void HuffmanPathTree::getPath(std::vector<Components>& folderPaths,
         getPathByTrack(folderPaths, partitions);
         return;
     }
-    std::vector<std::uint64_t> selectedPartitions;
-    std::vector<std::vector<std::uint64_t>> fileOffsets;
+    const std::size_t foldersBefore = folderPaths.size();
+    const std::size_t filesBefore = filePaths.size();
+    try {
+        getPathByNumber(folderPaths, filePaths, partitions);
+    } catch (...) {
+        folderPaths.resize(foldersBefore);
+        filePaths.resize(filesBefore);
+        throw;
+    }
+}
+
+// Merges the numbers with the ends of the partitions, both ascending.
+void HuffmanPathTree::getPathByNumber(
+    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
+    const std::vector<double>& partitions) const {
+    std::vector<std::uint64_t> offsets;
+    PathTrack track;
     std::size_t k = 0;
     for (std::size_t i = 0; i < partitions.size();) {
         std::uint64_t number = pathNumberOf(partitions[i]);
         k = partitionAtOrAfter(k, number);
-        if (k == partitionEnds.size()) break;
+        if (k == partitionEnds.size()) return;
         const std::uint64_t base = k > 0 ? partitionEnds[k - 1] : 0;
-        std::vector<std::uint64_t>& offsets = fileOffsets.emplace_back();
-        selectedPartitions.push_back(k);
+        offsets.clear();
         while (number <= partitionEnds[k]) {
             if (number <= base)
                 throw std::out_of_range("A path number is out of order.");
@@ -164,21 +221,36 @@ void HuffmanPathTree::getPath(std::vector<Components>& folderPaths,
             if (++i == partitions.size()) break;
             number = pathNumberOf(partitions[i]);
         }
+        if (k >= partitionTracks.size())
+            throw std::out_of_range("A partition has no track.");
+        partitionTracks.get(k, track);
+        pathTree->getBatch(folderPaths.emplace_back(), filePaths.emplace_back(),
+                           track, offsets);
     }
-    pathTree->getPath(folderPaths, filePaths, selectedPartitions,
-                      partitionTracks, fileOffsets);
 }
 
 // The first partition from k on whose end is not below the number; the
 // number of partitions if there is none.
 std::size_t HuffmanPathTree::partitionAtOrAfter(std::size_t k,
                                                 std::uint64_t number) const {
-    const auto from = partitionEnds.begin() + static_cast<std::ptrdiff_t>(k);
-    const auto found =
-        endsAscend ? std::lower_bound(from, partitionEnds.end(), number)
-                   : std::find_if(from, partitionEnds.end(),
-                                  [number](auto end) { return end >= number; });
-    return static_cast<std::size_t>(found - partitionEnds.begin());
+    const auto begin = partitionEnds.begin();
+    const auto at = [begin](std::size_t i) {
+        return begin + static_cast<std::ptrdiff_t>(i);
+    };
+    const auto holds = [number](std::uint64_t end) { return end >= number; };
+    if (!endsAscend)
+        return static_cast<std::size_t>(
+            std::find_if(at(k), partitionEnds.end(), holds) - begin);
+    // Strides that double, then a search within the last: a request for
+    // neighbours stays near, one for a far number takes few steps.
+    std::size_t stride = 1;
+    while (stride < partitionEnds.size() - k && !holds(*at(k + stride - 1))) {
+        k += stride;
+        stride *= 2;
+    }
+    const std::size_t last = std::min(k + stride, partitionEnds.size());
+    return static_cast<std::size_t>(std::lower_bound(at(k), at(last), number) -
+                                    begin);
 }
 
 void HuffmanPathTree::getPathByTrack(

@@ -248,51 +248,28 @@ void BPathTree::traversePath(const PathTrack& pathTrack,
     appendAll(out, found);
 }
 
-template <class Tracks>
-void BPathTree::lookUp(
-    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
-    const std::vector<std::uint64_t>& selectedPartitions,
-    const Tracks& partitionTracks,
-    const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
-    if (selectedPartitions.empty()) return;
-    if (fileOffsets.size() < selectedPartitions.size())
-        throw std::out_of_range("A selected partition has no file offsets.");
-    std::vector<Components> folders;
-    std::vector<Components> files;
-    folders.reserve(selectedPartitions.size());
-    files.reserve(selectedPartitions.size());
-    for (std::size_t i = 0; i < selectedPartitions.size(); ++i) {
-        const std::uint64_t partition = selectedPartitions[i];
-        if (partition >= partitionTracks.size())
-            throw std::out_of_range("A partition does not exist.");
-        const PathTrack& track =
-            partitionTracks[static_cast<std::size_t>(partition)];
-        const BNode* folder = root.get();
-        const BNode* end = folder;
-        Components& components = folders.emplace_back();
-        components.reserve(track.size());
-        for (const std::uint64_t position : track) {
-            folder = end;
-            end = &childAt(*folder, position);
-            components.push_back(copyOf(end->value()));
-        }
-        std::uint64_t base = 0;
-        if (end->isLeaf()) {
-            if (track.empty())
-                throw std::out_of_range("A track leads nowhere.");
-            components.pop_back();
-            base = track.back();
-        } else {
-            folder = end;
-        }
-        Components& names = files.emplace_back();
-        names.reserve(fileOffsets[i].size());
-        for (const std::uint64_t offset : fileOffsets[i])
-            names.push_back(
-                copyOf(childAt(*folder, base - 1 + offset).value()));
+void BPathTree::getBatch(Components& folder, Components& files,
+                         const PathTrack& track,
+                         const std::vector<std::uint64_t>& offsets) const {
+    const BNode* parent = root.get();
+    const BNode* end = parent;
+    folder.reserve(folder.size() + track.size());
+    for (const std::uint64_t position : track) {
+        parent = end;
+        end = &childAt(*parent, position);
+        folder.push_back(copyOf(end->value()));
     }
-    appendAll(folderPaths, folders);
-    appendAll(filePaths, files);
+    std::uint64_t base = 0;
+    if (end->isLeaf()) {
+        if (track.empty()) throw std::out_of_range("A track leads nowhere.");
+        folder.pop_back();
+        base = track.back();
+    } else {
+        parent = end;
+    }
+    files.reserve(files.size() + offsets.size());
+    for (const std::uint64_t offset : offsets)
+        files.push_back(copyOf(childAt(*parent, base - 1 + offset).value()));
 }
 
 void BPathTree::getPath(
@@ -300,17 +277,20 @@ void BPathTree::getPath(
     const std::vector<std::uint64_t>& selectedPartitions,
     const std::vector<PathTrack>& partitionTracks,
     const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
-    lookUp(folderPaths, filePaths, selectedPartitions, partitionTracks,
-           fileOffsets);
-}
-
-void BPathTree::getPath(
-    std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
-    const std::vector<std::uint64_t>& selectedPartitions,
-    const PathTracks& partitionTracks,
-    const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
-    lookUp(folderPaths, filePaths, selectedPartitions, partitionTracks,
-           fileOffsets);
+    if (fileOffsets.size() < selectedPartitions.size())
+        throw std::out_of_range("A selected partition has no file offsets.");
+    std::vector<Components> folders(selectedPartitions.size());
+    std::vector<Components> files(selectedPartitions.size());
+    for (std::size_t i = 0; i < selectedPartitions.size(); ++i) {
+        const std::uint64_t partition = selectedPartitions[i];
+        if (partition >= partitionTracks.size())
+            throw std::out_of_range("A partition does not exist.");
+        getBatch(folders[i], files[i],
+                 partitionTracks[static_cast<std::size_t>(partition)],
+                 fileOffsets[i]);
+    }
+    appendAll(folderPaths, folders);
+    appendAll(filePaths, files);
 }
 
 // ---- Memory ----

@@ -163,12 +163,11 @@ public:
         const std::vector<std::uint64_t>& selectedPartitions,
         const std::vector<PathTrack>& partitionTracks,
         const std::vector<std::vector<std::uint64_t>>& fileOffsets) const;
-    void getPath(
-        std::vector<Components>& folderPaths,
-        std::vector<Components>& filePaths,
-        const std::vector<std::uint64_t>& selectedPartitions,
-        const PathTracks& partitionTracks,
-        const std::vector<std::vector<std::uint64_t>>& fileOffsets) const;
+
+    // The same for one batch: appends to folder and files. If it throws, part
+    // of them may be appended.
+    void getBatch(Components& folder, Components& files, const PathTrack& track,
+                  const std::vector<std::uint64_t>& offsets) const;
 
     // ---- Stored form (defined beside its layout, in packing/) ----
 
@@ -222,13 +221,6 @@ private:
     template <class Folder, class Files>
     bool insertBatch(Folder& folderComponents, Files& fileNames,
                      PathTrack& pathTrack, std::uint64_t& firstFileIndex);
-    template <class Tracks>
-    void lookUp(
-        std::vector<Components>& folderPaths,
-        std::vector<Components>& filePaths,
-        const std::vector<std::uint64_t>& selectedPartitions,
-        const Tracks& partitionTracks,
-        const std::vector<std::vector<std::uint64_t>>& fileOffsets) const;
     void closeFinishedFolders();
 
     // Helpers of insertion, which is const for addIfExistsAndFind: the tree

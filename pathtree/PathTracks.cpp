@@ -34,16 +34,14 @@ std::size_t PathTracks::read(std::size_t at, PathTrack& track) const {
     return at;
 }
 
-PathTrack PathTracks::operator[](std::size_t i) const {
+void PathTracks::get(std::size_t i, PathTrack& track) const {
     std::size_t at = static_cast<std::size_t>(starts[i / tracksPerStart]);
-    PathTrack track;
     for (std::size_t skipped = i % tracksPerStart; skipped > 0; --skipped) {
         std::uint64_t left = readInteger(at);
         while (left > 0)
             if ((bytes[at++] & moreFollows) == 0) --left;
     }
     read(at, track);
-    return track;
 }
 
 void PathTracks::reserveFor(std::size_t length) {

@@ -24,7 +24,13 @@ public:
     bool empty() const noexcept { return count == 0; }
 
     // A copy of track i, which must be below size().
-    PathTrack operator[](std::size_t i) const;
+    PathTrack operator[](std::size_t i) const {
+        PathTrack track;
+        get(i, track);
+        return track;
+    }
+    // The same into a track whose memory is used again.
+    void get(std::size_t i, PathTrack& track) const;
     PathTrack front() const { return (*this)[0]; }
     PathTrack back() const { return (*this)[count - 1]; }
 
@@ -56,7 +62,7 @@ public:
     friend bool operator==(const PathTracks& a, const PathTracks& b) = default;
 
 private:
-    static constexpr std::size_t tracksPerStart = 16;
+    static constexpr std::size_t tracksPerStart = 8;
 
     // Replaces track by the one that begins at `at`; returns where the next
     // one begins.
