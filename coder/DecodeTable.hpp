@@ -24,15 +24,16 @@ public:
     struct Step {
         std::array<char16_t, mostCharacters> characters{};
         std::uint16_t count : 4 = 0;  // of characters; 0: ask the tree
-        // Bits that the first one, two and three characters take.
+        // Bits that the first one, two and three characters take. What
+        // fewer than three characters leave free repeats the last.
         std::uint16_t bits1 : 4 = 0;
         std::uint16_t bits2 : 4 = 0;
         std::uint16_t bits3 : 4 = 0;
 
         unsigned bits(unsigned characterCount) const noexcept {
-            return characterCount == 3   ? bits3
-                   : characterCount == 2 ? bits2
-                                         : bits1;
+            return characterCount == count ? bits3
+                   : characterCount == 2   ? bits2
+                                           : bits1;
         }
     };
 

@@ -139,11 +139,13 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
         for (unsigned k = 0; k < stepsAWindow && bit < end; ++k) {
             const DecodeTable::Step& step = decodeTable[window];
             unsigned count = step.count;
-            while (count > 0 && step.bits(count) > end - bit) --count;
+            // Near the end a step may hold more than is there.
+            if (end - bit < DecodeTable::windowBits)
+                while (count > 0 && step.bits(count) > end - bit) --count;
             known = count > 0;
             if (!known) break;
-            std::copy(step.characters.begin(), step.characters.end(),
-                      decoded.begin() + static_cast<std::ptrdiff_t>(filled));
+            std::memcpy(&decoded[filled], step.characters.data(),
+                        sizeof step.characters);
             filled += count;
             bit += step.bits(count);
             window >>= step.bits(count);
