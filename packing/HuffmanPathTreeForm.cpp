@@ -44,8 +44,6 @@ using Bytes = std::vector<std::uint8_t>;
 constexpr std::uint8_t partitionMarker = 0x01;
 constexpr std::uint8_t duplicatesMarker = 0x00;
 
-constexpr std::size_t lengthFieldBytes = 8;
-
 void packUint(std::uint64_t value, PackedSizeT width, Bytes& out) {
     const std::size_t bytes = sixpacks::widthBytes(width);
     for (std::size_t j = 0; j < bytes; ++j)
@@ -234,7 +232,7 @@ void HuffmanPathTree::LoadedForm::readShape(ByteCursor& cursor) {
 }
 
 void HuffmanPathTree::LoadedForm::readTree(ByteCursor& cursor) {
-    const auto codes = sixpacks::unpackVector(cursor, PackedSizeT::Uint64);
+    const auto nodeCodes = sixpacks::unpackVector(cursor, PackedSizeT::Uint64);
     const std::uint64_t count = cursor.takeUint(PackedSizeT::Uint64);
     const PackedSizeT width = takeWidth(cursor);
     if (count > 0) cursor.requireItems(count, sixpacks::widthBytes(width));
@@ -243,8 +241,8 @@ void HuffmanPathTree::LoadedForm::readTree(ByteCursor& cursor) {
     for (std::uint64_t i = 0; i < count; ++i)
         maxCodeBytes = std::max<std::uint64_t>(
             maxCodeBytes, sixpacks::unpackVector(cursor, width).size());
-    if (codes.empty() && count == 0) return;
-    TreeBuilder builder(*pathTree, codes);
+    if (nodeCodes.empty() && count == 0) return;
+    TreeBuilder builder(*pathTree, nodeCodes);
     for (std::uint64_t i = 0; !builder.complete(); ++i) {
         if (i == count) throw DamagedFormException();
         builder.add(sixpacks::unpackVector(values, width));
