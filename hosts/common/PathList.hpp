@@ -1,0 +1,80 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace tessel::paths {
+
+// A list of paths could not be read. what() says which and why, in a sentence
+// for the user.
+class PathListError : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+// PathList keeps the bytes of paths, in order, for any number of them.
+//
+// Invariants: no path is empty; the views it hands out are valid until the
+//   next append.
+// Threads: any number of readers.
+// Cost: the text, one byte and eight more a path.
+class PathList {
+public:
+    std::size_t size() const noexcept { return ends.size(); }
+    bool empty() const noexcept { return ends.empty(); }
+
+    // Path i, counted from 0; i must be below size().
+    std::string_view operator[](std::size_t i) const noexcept {
+        const std::size_t start = i == 0 ? 0 : ends[i - 1] + 1;
+        return {text.data() + start, ends[i] - start};
+    }
+
+    // Bytes of all paths, nothing between them counted.
+    std::size_t textBytes() const noexcept { return text.size() - size(); }
+
+    // Throws std::invalid_argument if the path is empty.
+    void append(std::string_view path);
+
+    // Takes over a text that holds one path after the other. They are
+    // separated by NUL if the text has a NUL, otherwise by newline; a
+    // separator at the end is no beginning of another path. Throws
+    // PathListError if a path is empty: the message begins with `name`, the
+    // text's origin, and tells the line.
+    static PathList fromText(std::string text, const std::string& name);
+
+private:
+    std::string text;                 // each path with one byte behind it
+    std::vector<std::uint64_t> ends;  // where that byte is
+};
+
+// What a walk left out.
+struct WalkReport {
+    std::size_t foldersRead = 0;
+    std::size_t foldersSkipped = 0;  // could not be opened or read
+    std::string firstSkipped;
+    std::string firstReason;
+};
+
+// Reads a list from a file, as PathList::fromText takes it. Also reads from a
+// pipe. Throws PathListError.
+PathList readListFile(const std::string& file);
+
+// Lists everything below a folder that is not a folder, as the given name,
+// one '/' and the way down. Symbolic links are listed and not followed, save
+// the given name itself. A folder's own files come first, in the order of
+// their bytes, then each folder in it, in the same order. Folders that cannot
+// be read are left out and counted. Throws PathListError if the given one
+// cannot be read.
+//
+// Cost: open files and stack do not grow with the depth.
+PathList listFolder(const std::string& folder, WalkReport& report);
+
+// Whichever of the two the name calls for. Throws PathListError, also if
+// there is no such file and if the list is empty.
+PathList readPaths(const std::string& fileOrFolder, WalkReport& report);
+
+}  // namespace tessel::paths

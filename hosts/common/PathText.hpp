@@ -1,0 +1,59 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+// A path is bytes to the operating system and UTF-16 to the coder. This is
+// the way between the two, and it loses nothing:
+//
+//   bytes that are UTF-8        the characters that they stand for
+//   any other byte, 0x80..0xFF  one lone low surrogate, U+DC80..U+DCFF
+//
+// UTF-8 is read strictly: overlong forms, encoded surrogates and values above
+// U+10FFFF are other bytes, each for itself. So every byte string has one
+// UTF-16 text, but not every text comes from a byte string.
+namespace tessel::paths {
+
+// One step of decoding: how many bytes were read, and the one or two code
+// units that they give.
+struct DecodedCharacter {
+    std::size_t byteCount = 1;
+    std::size_t unitCount = 1;
+    std::array<char16_t, 2> units{};
+};
+
+// Decodes the first character of bytes, which must not be empty.
+DecodedCharacter decodeCharacter(std::string_view bytes) noexcept;
+
+// Calls visit(char16_t) for every code unit of the bytes' text.
+template <class Visit>
+void forEachUnit(std::string_view bytes, Visit visit) {
+    while (!bytes.empty()) {
+        const auto first = static_cast<unsigned char>(bytes.front());
+        if (first < 0x80) {
+            visit(static_cast<char16_t>(first));
+            bytes.remove_prefix(1);
+            continue;
+        }
+        const DecodedCharacter character = decodeCharacter(bytes);
+        for (std::size_t i = 0; i < character.unitCount; ++i) {
+            visit(character.units[i]);
+        }
+        bytes.remove_prefix(character.byteCount);
+    }
+}
+
+// Appends the bytes' text.
+void appendText(std::string_view bytes, std::u16string& text);
+std::u16string toText(std::string_view bytes);
+
+// Appends the bytes whose text this is and returns true. Returns false, with
+// `bytes` unchanged, if no byte string has this text: it holds a surrogate
+// that is neither half of a pair nor a byte's, or it spells with bytes'
+// surrogates what is UTF-8 after all.
+bool appendBytes(std::u16string_view text, std::string& bytes);
+
+}  // namespace tessel::paths
