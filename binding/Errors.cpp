@@ -1,0 +1,54 @@
+#include "binding/Errors.hpp"
+
+#include <utility>
+
+#include "binding/HostAccess.hpp"
+
+namespace tessel {
+
+namespace {
+
+// MessageIdException is what travels to the host: a copy of the error, which
+// outlives whatever the raising frame held.
+class MessageIdException {
+public:
+    explicit MessageIdException(const MessageIdError& source)
+        : error(source.clone()) {}
+
+    void report() const {
+        host().HostError(error->identifier(), error->argumentList());
+    }
+    void rethrow() const { error->rethrow(); }
+
+private:
+    std::unique_ptr<MessageIdError> error;
+};
+
+}  // namespace
+
+MessageIdError::MessageIdError(
+    std::vector<HostMessageArgument> messageArguments,
+    std::string messageComponent, std::string messageKey)
+    : arguments(std::move(messageArguments)),
+      component(std::move(messageComponent)),
+      key(std::move(messageKey)),
+      fullIdentifier(component + ":" + key) {}
+
+void raiseHostError(const MessageIdError& error) {
+    const MessageIdException wrapped(error);
+    wrapped.report();
+    wrapped.rethrow();
+    throw HostReturnedException();  // for the compiler: rethrow has thrown
+}
+
+void checkElement(std::size_t count, bool inFolders, std::size_t outer,
+                  std::size_t inner) {
+    namespace errors = VELOX::datastoreio::huffmanpaths;
+    if (count != 0) return;
+    std::string position = std::to_string(outer);
+    if (inner != 0) position += ", " + std::to_string(inner);
+    if (inFolders) raiseHostError(errors::folderElementEmpty(position));
+    raiseHostError(errors::fileElementEmpty(position));
+}
+
+}  // namespace tessel

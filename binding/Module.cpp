@@ -1,0 +1,25 @@
+#include "binding/ClassInfo.hpp"
+#include "binding/HostAccess.hpp"
+
+// The two functions that the module exports. A module loaded again after it
+// was unloaded starts afresh.
+
+// Registers the class: on every call in the host's alternative mode, otherwise
+// once, by whichever call comes first and does not throw.
+//
+// Throws HostRefusedException when the process offers no host of the right
+// version, and whatever the host raises.
+extern "C" __attribute__((visibility("default"))) void
+VXInitialize_libqztessel() {
+    if (tessel::host().hostAlternativeMode()) {
+        tessel::registerHuffmanPaths();
+        return;
+    }
+    static const tessel::HostClass* const registered =
+        tessel::registerHuffmanPaths();
+    static_cast<void>(registered);
+}
+
+// Nothing to do: what was registered is the host's.
+extern "C" __attribute__((visibility("default"))) void
+VXTerminate_libqztessel() {}

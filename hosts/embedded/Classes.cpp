@@ -1,0 +1,75 @@
+#include "hosts/embedded/Classes.hpp"
+
+#include <algorithm>
+#include <utility>
+
+namespace tessel::embedded {
+
+bool PropertyRecord::isSaved() const noexcept {
+    constexpr std::uint32_t unsaved =
+        attributes::isAbstract | attributes::isTransient |
+        attributes::isStatic | attributes::isDependent;
+    return (attributeBits & unsaved) == 0;
+}
+
+bool PropertyRecord::isCopied() const noexcept {
+    constexpr std::uint32_t uncopied =
+        attributes::isAbstract | attributes::isStatic;
+    return has(attributes::copiedWithInstance) &&
+           (attributeBits & uncopied) == 0;
+}
+
+ClassRecord::ClassRecord(const Name* classFullName,
+                         const Module* definingModule,
+                         std::unique_ptr<HostClassInfo> classInfo)
+    : ownName(classFullName),
+      ownModule(definingModule),
+      descriptor(std::move(classInfo)) {}
+
+ClassRecord::~ClassRecord() {
+    while (!methods.empty()) methods.pop_back();
+}
+
+HostMethodInfo* ClassRecord::findMethod(std::string_view method) const {
+    for (const auto& candidate : methods) {
+        if (candidate->name() == method) return candidate.get();
+    }
+    return nullptr;
+}
+
+HostMethodInfo* ClassRecord::constructor() const {
+    return findMethod(descriptor->className());
+}
+
+const PropertyRecord* ClassRecord::findProperty(
+    std::string_view property) const {
+    const auto found = std::find_if(
+        properties.begin(), properties.end(),
+        [&](const PropertyRecord& p) { return p.name->str() == property; });
+    return found == properties.end() ? nullptr : &*found;
+}
+
+std::shared_ptr<Instance> ClassRecord::makeInstance() {
+    std::unique_ptr<void, std::function<void(void*)>> native(
+        descriptor->createNativeObject(),
+        [this](void* made) { descriptor->destroyNativeObject(made); });
+    auto instance = std::make_shared<Instance>(*this, native.get());
+    static_cast<void>(native.release());
+    return instance;
+}
+
+Instance::Instance(ClassRecord& instanceClass, void* nativeObject)
+    : owner(&instanceClass), ownNative(nativeObject) {
+    owner->living.insert(this);
+}
+
+void Instance::destroy() noexcept {
+    if (owner == nullptr) return;
+    ClassRecord* const formerOwner = std::exchange(owner, nullptr);
+    formerOwner->living.erase(this);
+    listeners.clear();
+    formerOwner->descriptor->destroyNativeObject(
+        std::exchange(ownNative, nullptr));
+}
+
+}  // namespace tessel::embedded

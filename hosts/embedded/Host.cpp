@@ -1,0 +1,347 @@
+#include "hosts/embedded/Host.hpp"
+
+#include <map>
+#include <stdexcept>
+#include <utility>
+
+#include "hosts/embedded/Dispatch.hpp"
+#include "hosts/embedded/Errors.hpp"
+#include "hosts/embedded/FilesetClass.hpp"
+#include "hosts/embedded/MessageCatalogue.hpp"
+#include "hosts/embedded/Modules.hpp"
+#include "hosts/embedded/Operations.hpp"
+#include "hosts/embedded/Registry.hpp"
+
+namespace {
+
+// The host of this process, for VXHostInterface. A process has one host, so
+// this is the one thing that is global.
+// NOLINTNEXTLINE(cppcoreguidelines-avoid-non-const-global-variables)
+tessel::HostGate gate{tessel::hostInterfaceVersion, nullptr};
+
+}  // namespace
+
+const tessel::HostGate* VXHostInterface(std::uint32_t /*wantedVersion*/) {
+    return &gate;
+}
+
+namespace tessel::embedded {
+
+class Host::State {
+public:
+    explicit State(const HostOptions& options)
+        : catalogue(options.messages),
+          errors(catalogue),
+          registry(errors),
+          operations(registry, errors, options.alternativeMode),
+          dispatch(errors),
+          modules(registry, errors) {
+        for (const std::string& package : options.packages) {
+            registry.packages.add(package);
+        }
+    }
+
+    // The instance that a value refers to. Raises an error if it is none.
+    Instance& instanceOf(const Value& value) const {
+        if (value.valueClass() != ValueClass::Object || value.numel() == 0) {
+            errors.own("notAnInstance", {"object"});
+        }
+        Instance& instance = *value.instance(0);
+        if (!instance.isLiving()) errors.own("invalidInstance");
+        return instance;
+    }
+
+    const PropertyRecord& propertyOf(const Instance& instance,
+                                     std::string_view name) const {
+        const ClassRecord& record = *instance.instanceClass();
+        const PropertyRecord* const property = record.findProperty(name);
+        if (property == nullptr) {
+            errors.own("propertyMissing",
+                       {record.fullName(), std::string(name)});
+        }
+        return *property;
+    }
+
+    // A method that users may call, static or not.
+    HostMethodInfo& methodOf(const ClassRecord& record, std::string_view name,
+                             bool isStatic) const {
+        HostMethodInfo* const method = record.findMethod(name);
+        if (method == nullptr || method == record.constructor() ||
+            method->isAbstract() || method->isStatic() != isStatic) {
+            errors.own("methodMissing", {record.fullName(), std::string(name)});
+        }
+        if (method->access() != HostAccess::Public) {
+            errors.own("methodRestricted", {std::string(name)});
+        }
+        return *method;
+    }
+
+    Value newInstance(ClassRecord& record) const {
+        return errors.guarded(record.fullName(), [&] {
+            return Value::objects({1, 1}, {record.makeInstance()});
+        });
+    }
+
+    const ClassExtension& extensionOf(const ClassRecord& record) const {
+        static const ClassExtension none;
+        const auto found = extensions.find(record.fullName());
+        return found == extensions.end() ? none : found->second;
+    }
+
+    void copyProperty(const Instance& from, const Instance& to,
+                      const PropertyRecord& property) {
+        try {
+            dispatch.set(to, property,
+                         dispatch.get(from, property, Caller::Host),
+                         Caller::Host);
+        } catch (const HostException& failure) {
+            if (!property.has(attributes::warnOnCopyError)) throw;
+            copyWarnings.push_back(property.name->str() + ": " +
+                                   failure.what());
+        }
+    }
+
+    void update(const Instance& instance) const {
+        HostClassInfo& info = instance.instanceClass()->info();
+        errors.guarded(info.className(),
+                       [&] { info.updateInstance(instance.native()); });
+    }
+
+    MessageCatalogue catalogue;
+    Errors errors;
+    Registry registry;
+    Operations operations;
+    Dispatch dispatch;
+    Modules modules;
+    std::map<std::string, ClassExtension, std::less<>> extensions;
+    std::vector<std::string> copyWarnings;
+};
+
+Host::Host(const HostOptions& options) {
+    if (gate.host != nullptr) {
+        throw std::logic_error("This process has a host already.");
+    }
+    state = std::make_unique<State>(options);
+    extendClass(filesetClassName, filesetExtension());
+    gate.host = &state->operations;
+}
+
+Host::~Host() {
+    state->registry.removeAllClasses();
+    state->modules.unloadAll();
+    gate.host = nullptr;
+}
+
+// --- Modules -----------------------------------------------------------------
+
+void Host::loadModule(const std::filesystem::path& file) {
+    state->modules.load(file);
+}
+
+void Host::removeClasses(const std::filesystem::path& file) {
+    state->modules.removeClasses(file);
+}
+
+void Host::unloadModule(const std::filesystem::path& file) {
+    state->modules.unload(file);
+}
+
+// --- Classes -----------------------------------------------------------------
+
+void Host::defineClass(std::string_view package,
+                       std::unique_ptr<HostClassInfo> info) {
+    state->registry.define(state->registry.packages.add(package),
+                           std::move(info));
+}
+
+void Host::extendClass(std::string fullName, ClassExtension extension) {
+    state->extensions.insert_or_assign(std::move(fullName),
+                                       std::move(extension));
+}
+
+bool Host::hasClass(std::string_view fullName) const {
+    return state->registry.find(state->registry.names.intern(fullName)) !=
+           nullptr;
+}
+
+std::vector<std::string> Host::classNames() const {
+    std::vector<std::string> names;
+    for (const ClassRecord* const record : state->registry.all()) {
+        if (!record->info().isHidden()) names.push_back(record->fullName());
+    }
+    return names;
+}
+
+std::vector<std::string> Host::methodNames(std::string_view className) const {
+    std::vector<std::string> names;
+    for (const auto& method : state->registry.get(className).methods) {
+        if (method->isVisible()) names.emplace_back(method->name());
+    }
+    return names;
+}
+
+std::vector<std::string> Host::propertyNames(std::string_view className) const {
+    std::vector<std::string> names;
+    for (const auto& property : state->registry.get(className).properties) {
+        if (property.has(attributes::isVisible)) {
+            names.push_back(property.name->str());
+        }
+    }
+    return names;
+}
+
+// --- Instances ---------------------------------------------------------------
+
+Value Host::constructWith(std::string_view className,
+                          std::span<const Value* const> inputs,
+                          std::int32_t requested) {
+    ClassRecord& record = state->registry.get(className);
+    Value instance = state->newInstance(record);
+    if (HostMethodInfo* const constructor = record.constructor()) {
+        const std::vector<const HostArray*> arrays(inputs.begin(),
+                                                   inputs.end());
+        state->dispatch.construct(*constructor, instance, arrays, requested);
+    } else if (!inputs.empty()) {
+        state->errors.own("tooManyInputs");
+    }
+    return instance;
+}
+
+std::vector<Value> Host::callWith(std::int32_t requested, const Value& instance,
+                                  std::string_view method,
+                                  std::span<const Value* const> inputs) {
+    const ClassRecord& record = *state->instanceOf(instance).instanceClass();
+    std::vector<const HostArray*> arrays{&instance};
+    arrays.insert(arrays.end(), inputs.begin(), inputs.end());
+    return state->dispatch.call(state->methodOf(record, method, false), arrays,
+                                requested);
+}
+
+std::vector<Value> Host::callStatic(std::int32_t requested,
+                                    std::string_view className,
+                                    std::string_view method,
+                                    std::span<const Value* const> inputs) {
+    const ClassRecord& record = state->registry.get(className);
+    const std::vector<const HostArray*> arrays(inputs.begin(), inputs.end());
+    return state->dispatch.call(state->methodOf(record, method, true), arrays,
+                                requested);
+}
+
+Value Host::get(const Value& instance, std::string_view property) {
+    const Instance& object = state->instanceOf(instance);
+    return state->dispatch.get(object, state->propertyOf(object, property),
+                               Caller::User);
+}
+
+void Host::set(const Value& instance, std::string_view property,
+               const Value& value) {
+    const Instance& object = state->instanceOf(instance);
+    state->dispatch.set(object, state->propertyOf(object, property), value,
+                        Caller::User);
+}
+
+void Host::listen(const Value& instance, std::string_view property,
+                  ListenerKind kind, std::function<void()> notify) {
+    Instance& object = state->instanceOf(instance);
+    const PropertyRecord& record = state->propertyOf(object, property);
+    const std::uint32_t allowed = kind == ListenerKind::Get
+                                      ? attributes::getListenersAllowed
+                                      : attributes::setListenersAllowed;
+    if (!record.has(allowed)) {
+        state->errors.own("listenerRefused", {std::string(property)});
+    }
+    object.listeners.push_back({&record, kind, std::move(notify)});
+}
+
+Value Host::inspect(const Value& instance) {
+    const Instance& object = state->instanceOf(instance);
+    Value shown = Value::structure();
+    for (const PropertyRecord& property : object.instanceClass()->properties) {
+        if (property.has(attributes::inspectionAllowed)) {
+            shown.setField(property.name->str(),
+                           state->dispatch.get(object, property, Caller::User));
+        }
+    }
+    return shown;
+}
+
+Value Host::copy(const Value& instance) {
+    const Instance& source = state->instanceOf(instance);
+    ClassRecord& record = *source.instanceClass();
+    if (!record.info().copiesInstances()) {
+        state->errors.own("notCopyable", {record.fullName()});
+    }
+    const ClassExtension& extension = state->extensionOf(record);
+    Value copied = extension.copy ? extension.copy(*this, instance)
+                                  : state->newInstance(record);
+    const Instance& target = state->instanceOf(copied);
+    for (const PropertyRecord& property : record.properties) {
+        if (property.isCopied()) state->copyProperty(source, target, property);
+    }
+    state->update(target);
+    return copied;
+}
+
+const std::vector<std::string>& Host::copyWarnings() const noexcept {
+    return state->copyWarnings;
+}
+
+Value Host::save(const Value& instance) {
+    const Instance& object = state->instanceOf(instance);
+    const ClassRecord& record = *object.instanceClass();
+    if (!record.info().savesInstances()) {
+        state->errors.own("notSavable", {record.fullName()});
+    }
+    const std::unique_ptr<Value> custom(
+        static_cast<Value*>(state->errors.guarded(record.fullName(), [&] {
+            return record.info().customSave(&instance);
+        })));
+    if (custom) return std::move(*custom);
+    Value saved = Value::structure();
+    for (const PropertyRecord& property : record.properties) {
+        if (property.isSaved()) {
+            saved.setField(property.name->str(),
+                           state->dispatch.get(object, property, Caller::Host));
+        }
+    }
+    const ClassExtension& extension = state->extensionOf(record);
+    if (extension.save) extension.save(*this, instance, saved);
+    return saved;
+}
+
+Value Host::load(std::string_view className, const Value& saved) {
+    ClassRecord& record = state->registry.get(className);
+    if (!record.info().savesInstances()) {
+        state->errors.own("notSavable", {record.fullName()});
+    }
+    Value loaded = state->newInstance(record);
+    const SavedValue savedForm(saved);
+    state->errors.guarded(record.fullName(), [&] {
+        record.info().customLoad(&loaded, &savedForm);
+    });
+    const Instance& object = state->instanceOf(loaded);
+    const bool hasFields =
+        saved.valueClass() == ValueClass::Struct && saved.numel() != 0;
+    for (const PropertyRecord& property : record.properties) {
+        const std::string& name = property.name->str();
+        if (hasFields && property.isSaved() && saved.hasField(name)) {
+            state->dispatch.set(object, property, saved.field(name),
+                                Caller::Host);
+        }
+    }
+    state->update(object);
+    return loaded;
+}
+
+void Host::destroy(const Value& instance) {
+    state->instanceOf(instance).destroy();
+}
+
+bool Host::isValid(const Value& instance) const {
+    return instance.valueClass() == ValueClass::Object &&
+           instance.numel() != 0 && instance.instance(0)->isLiving();
+}
+
+HostInterface& Host::operations() noexcept { return state->operations; }
+
+}  // namespace tessel::embedded

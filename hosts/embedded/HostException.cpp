@@ -1,0 +1,21 @@
+#include "hosts/embedded/HostException.hpp"
+
+#include <utility>
+
+namespace tessel::embedded {
+
+HostException::HostException(std::string messageIdentifier,
+                             std::vector<HostMessageArgument> messageArguments,
+                             std::string messageText)
+    : name(std::move(messageIdentifier)),
+      values(std::move(messageArguments)),
+      text(std::move(messageText)) {}
+
+std::string toText(const HostMessageArgument& argument) {
+    if (const auto* number = std::get_if<std::int64_t>(&argument)) {
+        return std::to_string(*number);
+    }
+    return std::get<std::string>(argument);
+}
+
+}  // namespace tessel::embedded

@@ -1,0 +1,132 @@
+#include "hosts/embedded/Modules.hpp"
+
+#include <dlfcn.h>
+
+#include <algorithm>
+#include <optional>
+#include <utility>
+
+namespace tessel::embedded {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+// One spelling for a file, however it was named.
+fs::path resolved(const fs::path& file) {
+    std::error_code ignored;
+    fs::path path = fs::weakly_canonical(file, ignored);
+    return path.empty() ? file : path;
+}
+
+void terminate(const Module& module) noexcept {
+    if (const HostModuleEntry end =
+            module.find("VXTerminate_" + module.name())) {
+        end();
+    }
+}
+
+}  // namespace
+
+Module::~Module() { dlclose(handle); }
+
+std::string Module::name() const {
+    const std::string fileName = file.filename().string();
+    return fileName.substr(0, fileName.find(".so"));
+}
+
+HostModuleEntry Module::find(const std::string& function) const {
+    return reinterpret_cast<HostModuleEntry>(dlsym(handle, function.c_str()));
+}
+
+Modules::Loaded::iterator Modules::find(const fs::path& file) {
+    return std::find_if(modules.begin(), modules.end(),
+                        [&](const auto& m) { return m->path() == file; });
+}
+
+std::unique_ptr<Module> Modules::open(const fs::path& file) const {
+    if (!fs::is_regular_file(file)) {
+        errors.own("moduleMissing", {file.string()});
+    }
+    void* const handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (handle == nullptr) {
+        const std::string reason = dlerror();
+        const bool lacksSymbol =
+            reason.find("undefined symbol") != std::string::npos;
+        errors.own(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
+                   {file.string(), reason});
+    }
+    return std::make_unique<Module>(file, handle);
+}
+
+// Calls the entry; what it registers belongs to the module. When it fails, the
+// text of the failure is copied while the module's code is still there.
+void Modules::enter(const Module& module) {
+    const std::string name = "VXInitialize_" + module.name();
+    const HostModuleEntry entry = module.find(name);
+    if (entry == nullptr) {
+        errors.own("entryMissing", {module.path().string(), name});
+    }
+    std::optional<std::string> failure;
+    const Module* const outer = std::exchange(registry.enteringModule, &module);
+    try {
+        entry();
+    } catch (const std::exception& exception) {
+        failure = exception.what();
+    } catch (...) {
+        failure = "an unknown exception";
+    }
+    registry.enteringModule = outer;
+    if (failure) {
+        errors.own("entryFailed", {module.path().string(), *failure});
+    }
+}
+
+void Modules::load(const fs::path& file) {
+    const fs::path path = resolved(file);
+    const auto present = find(path);
+    if (present != modules.end()) {
+        enter(**present);
+        return;
+    }
+    std::unique_ptr<Module> module = open(path);
+    modules.reserve(modules.size() + 1);
+    try {
+        enter(*module);
+    } catch (...) {
+        registry.removeClasses(*module);
+        throw;
+    }
+    modules.push_back(std::move(module));
+}
+
+Modules::Loaded::iterator Modules::withoutClasses(const fs::path& file) {
+    const auto present = find(resolved(file));
+    if (present == modules.end()) {
+        errors.own("moduleNotLoaded", {file.string()});
+    }
+    const std::size_t instances = registry.instanceCount(**present);
+    if (instances != 0) {
+        errors.own("moduleInUse",
+                   {file.string(), static_cast<std::int64_t>(instances)});
+    }
+    registry.removeClasses(**present);
+    return present;
+}
+
+void Modules::removeClasses(const fs::path& file) { withoutClasses(file); }
+
+void Modules::unload(const fs::path& file) {
+    const auto present = withoutClasses(file);
+    terminate(**present);
+    modules.erase(present);
+}
+
+void Modules::unloadAll() noexcept {
+    while (!modules.empty()) {
+        terminate(*modules.back());
+        modules.pop_back();
+    }
+}
+
+}  // namespace tessel::embedded

@@ -1,0 +1,75 @@
+#pragma once
+
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "hosts/embedded/Errors.hpp"
+#include "hosts/embedded/Registry.hpp"
+
+namespace tessel::embedded {
+
+// Module is one module file in memory.
+//
+// Ownership: owns the loader's handle, and gives it back with itself; whatever
+//   still has code in the module must be gone by then.
+class Module {
+public:
+    Module(std::filesystem::path modulePath, void* loaderHandle)
+        : file(std::move(modulePath)), handle(loaderHandle) {}
+    Module(const Module&) = delete;
+    Module& operator=(const Module&) = delete;
+    ~Module();
+
+    const std::filesystem::path& path() const noexcept { return file; }
+    // The file name up to ".so".
+    std::string name() const;
+
+    // A function that the module exports, or null.
+    HostModuleEntry find(const std::string& function) const;
+
+private:
+    std::filesystem::path file;
+    void* handle;
+};
+
+// Modules loads module files and lets them register their classes.
+//
+// Ownership: owns the modules; refers to the registry and the errors, which
+//   must outlive it.
+class Modules {
+public:
+    Modules(Registry& hostRegistry, const Errors& hostErrors)
+        : registry(hostRegistry), errors(hostErrors) {}
+
+    // Loads a module file and calls its entry. For a module that is loaded
+    // already it only calls the entry. Raises moduleMissing, moduleUnreadable,
+    // interfaceMissing, entryMissing or entryFailed; what is not loaded
+    // completely is gone, with all it registered.
+    void load(const std::filesystem::path& file);
+
+    // Removes the classes of a module, or removes them and unloads it. Raises
+    // moduleNotLoaded, or moduleInUse while instances of its classes live.
+    void removeClasses(const std::filesystem::path& file);
+    void unload(const std::filesystem::path& file);
+
+    // Unloads all modules. Their classes must be gone.
+    void unloadAll() noexcept;
+
+private:
+    using Loaded = std::vector<std::unique_ptr<Module>>;
+
+    // The loaded module of a canonical path, or the end.
+    Loaded::iterator find(const std::filesystem::path& file);
+    // The same for any path, with its classes removed.
+    Loaded::iterator withoutClasses(const std::filesystem::path& file);
+    std::unique_ptr<Module> open(const std::filesystem::path& file) const;
+    void enter(const Module& module);
+
+    Registry& registry;
+    const Errors& errors;
+    Loaded modules;
+};
+
+}  // namespace tessel::embedded

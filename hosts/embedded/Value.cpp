@@ -1,0 +1,238 @@
+#include "hosts/embedded/Value.hpp"
+
+#include <algorithm>
+#include <array>
+#include <limits>
+#include <stdexcept>
+
+namespace tessel::embedded {
+
+namespace {
+
+void requireCount(const Dimensions& dimensions, std::size_t held,
+                  std::size_t heldForEach = 1) {
+    if (held % heldForEach != 0 ||
+        elementCount(dimensions) != held / heldForEach) {
+        throw std::invalid_argument(
+            "The number of elements does not fit the dimensions.");
+    }
+}
+
+}  // namespace
+
+const char* className(ValueClass valueClass) noexcept {
+    static constexpr std::array names = {"double", "char",   "uint8", "logical",
+                                         "cell",   "struct", "object"};
+    return names[static_cast<std::size_t>(valueClass)];
+}
+
+std::size_t elementCount(const Dimensions& dimensions) {
+    std::size_t count = 1;
+    for (const std::size_t extent : dimensions) {
+        if (extent != 0 &&
+            count > std::numeric_limits<std::size_t>::max() / extent) {
+            throw std::length_error("The dimensions are too large.");
+        }
+        count *= extent;
+    }
+    return count;
+}
+
+Value::Value(const Dimensions& dimensions, Elements content, bool isComplex)
+    : elements(std::move(content)), complexParts(isComplex) {
+    if (dimensions.size() == 2) {
+        rows = dimensions[0];
+        columns = dimensions[1];
+    } else {
+        otherShape = std::make_shared<const Dimensions>(dimensions);
+    }
+}
+
+Value::Value(Value&& other) noexcept
+    : elements(std::move(other.elements)),
+      rows(std::exchange(other.rows, 0)),
+      columns(std::exchange(other.columns, 0)),
+      otherShape(std::move(other.otherShape)),
+      complexParts(other.complexParts) {}
+
+Value& Value::operator=(Value&& other) noexcept {
+    Value taken(std::move(other));
+    elements.swap(taken.elements);
+    std::swap(rows, taken.rows);
+    std::swap(columns, taken.columns);
+    otherShape.swap(taken.otherShape);
+    std::swap(complexParts, taken.complexParts);
+    return *this;
+}
+
+Dimensions Value::dimensions() const {
+    return otherShape ? *otherShape : Dimensions{rows, columns};
+}
+
+std::size_t Value::numel() const {
+    return otherShape ? elementCount(*otherShape) : rows * columns;
+}
+
+Value Value::chars(const Dimensions& dimensions, std::u16string text) {
+    requireCount(dimensions, text.size());
+    return {dimensions, std::move(text)};
+}
+
+Value Value::doubles(const Dimensions& dimensions, std::vector<double> values) {
+    requireCount(dimensions, values.size());
+    return {dimensions, std::move(values)};
+}
+
+Value Value::complexDoubles(const Dimensions& dimensions,
+                            std::vector<double> parts) {
+    requireCount(dimensions, parts.size(), 2);
+    return {dimensions, std::move(parts), true};
+}
+
+Value Value::bytes(const Dimensions& dimensions,
+                   std::vector<std::uint8_t> values) {
+    requireCount(dimensions, values.size());
+    return {dimensions, std::move(values)};
+}
+
+Value Value::logicals(const Dimensions& dimensions,
+                      std::vector<std::uint8_t> truths) {
+    requireCount(dimensions, truths.size());
+    return {dimensions, Logicals{std::move(truths)}};
+}
+
+Value Value::objects(const Dimensions& dimensions,
+                     std::vector<std::shared_ptr<Instance>> instances) {
+    requireCount(dimensions, instances.size());
+    if (std::find(instances.begin(), instances.end(), nullptr) !=
+        instances.end()) {
+        throw std::invalid_argument("An object needs its instance.");
+    }
+    return {dimensions, std::move(instances)};
+}
+
+Value Value::cell(const Dimensions& dimensions) {
+    std::vector<Value> unset(elementCount(dimensions));
+    return {dimensions, std::move(unset)};
+}
+
+Value Value::structure(const Dimensions& dimensions) {
+    elementCount(dimensions);  // refuses dimensions that are too large
+    return {dimensions, Fields{}};
+}
+
+Value Value::text(std::u16string_view text) {
+    return {{1, text.size()}, std::u16string(text)};
+}
+
+Value Value::scalar(double number) {
+    return {{1, 1}, std::vector<double>{number}};
+}
+
+Value Value::logical(bool truth) {
+    return logicals({1, 1}, {static_cast<std::uint8_t>(truth)});
+}
+
+Value Value::column(std::vector<double> values) {
+    return {{values.size(), 1}, std::move(values)};
+}
+
+Value Value::byteColumn(std::vector<std::uint8_t> values) {
+    return {{values.size(), 1}, std::move(values)};
+}
+
+Value Value::cellRow(std::vector<Value> elements) {
+    return {{1, elements.size()}, std::move(elements)};
+}
+
+Value Value::cellColumn(std::vector<Value> elements) {
+    return {{elements.size(), 1}, std::move(elements)};
+}
+
+ValueClass Value::valueClass() const noexcept {
+    return static_cast<ValueClass>(elements.index());
+}
+
+const std::u16string& Value::charData() const {
+    return std::get<std::u16string>(elements);
+}
+
+const std::vector<double>& Value::doubleData() const {
+    return std::get<std::vector<double>>(elements);
+}
+
+std::vector<double>& Value::doubleData() {
+    return std::get<std::vector<double>>(elements);
+}
+
+const std::vector<std::uint8_t>& Value::byteData() const {
+    return std::get<std::vector<std::uint8_t>>(elements);
+}
+
+std::vector<std::uint8_t>& Value::byteData() {
+    return std::get<std::vector<std::uint8_t>>(elements);
+}
+
+bool Value::truth(std::size_t index) const {
+    return std::get<Logicals>(elements).truths.at(index) != 0;
+}
+
+const std::shared_ptr<Instance>& Value::instance(std::size_t index) const {
+    return std::get<std::vector<std::shared_ptr<Instance>>>(elements).at(index);
+}
+
+const Value& Value::element(std::size_t index) const {
+    return std::get<std::vector<Value>>(elements).at(index);
+}
+
+void Value::setElement(std::size_t index, Value element) {
+    std::get<std::vector<Value>>(elements).at(index) = std::move(element);
+}
+
+const std::vector<Value>* Value::findField(std::string_view name) const {
+    for (const auto& [columnName, values] :
+         std::get<Fields>(elements).columns) {
+        if (columnName == name) return &values;
+    }
+    return nullptr;
+}
+
+std::vector<std::string> Value::fieldNames() const {
+    std::vector<std::string> names;
+    for (const auto& [name, values] : std::get<Fields>(elements).columns) {
+        names.push_back(name);
+    }
+    return names;
+}
+
+bool Value::hasField(std::string_view name) const {
+    return findField(name) != nullptr;
+}
+
+const Value& Value::field(std::string_view name, std::size_t index) const {
+    const std::vector<Value>* const values = findField(name);
+    if (values == nullptr) throw std::out_of_range("There is no such field.");
+    return values->at(index);
+}
+
+void Value::setField(std::string_view name, Value value, std::size_t index) {
+    auto& present = std::get<Fields>(elements).columns;
+    auto found = std::find_if(present.begin(), present.end(),
+                              [&](const auto& c) { return c.first == name; });
+    if (found == present.end()) {
+        present.emplace_back(name, std::vector<Value>(numel()));
+        found = std::prev(present.end());
+    }
+    found->second.at(index) = std::move(value);
+}
+
+bool Value::Fields::operator==(const Fields& other) const {
+    return columns == other.columns;
+}
+
+bool operator==(const Value& a, const Value& b) {
+    return a.dimensions() == b.dimensions() &&
+           a.complexParts == b.complexParts && a.elements == b.elements;
+}
+
+}  // namespace tessel::embedded
