@@ -126,6 +126,7 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
         BitReader::sureBits / DecodeTable::windowBits;
     constexpr std::size_t mostAWindow =
         std::size_t{stepsAWindow} * DecodeTable::mostCharacters;
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init): written first
     std::array<char16_t, 16 * mostAWindow> decoded;
     std::size_t filled = 0;
     const BitReader reader(bytes);

@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
 #include <cstdlib>
+#include <iostream>
 #include <span>
 #include <string>
 #include <vector>
@@ -63,7 +63,7 @@ private:
 // Ends the process, as a fuzzing engine expects of a finding.
 inline void require(bool holds, const char* what) {
     if (holds) return;
-    std::fprintf(stderr, "does not hold: %s\n", what);
+    std::cerr << "does not hold: " << what << std::endl;
     std::abort();
 }
 

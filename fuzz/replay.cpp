@@ -2,10 +2,10 @@
 // the folders named on the command line, in the order of their names.
 #include <algorithm>
 #include <cstdint>
-#include <cstdio>
 #include <exception>
 #include <filesystem>
 #include <fstream>
+#include <iostream>
 #include <iterator>
 #include <vector>
 
@@ -39,16 +39,15 @@ int main(int count, char** arguments) {
     try {
         for (int i = 1; i < count; ++i) {
             for (const auto& file : filesOf(arguments[i])) {
-                std::printf("%s\n", file.c_str());
-                std::fflush(stdout);
+                std::cout << file << std::endl;
                 replay(file);
                 ++replayed;
             }
         }
     } catch (const std::exception& failure) {
-        std::printf("failed: %s\n", failure.what());
+        std::cerr << "failed: " << failure.what() << '\n';
         return 1;
     }
-    std::printf("%zu inputs replayed\n", replayed);
+    std::cout << replayed << " inputs replayed\n";
     return replayed == 0 ? 1 : 0;
 }

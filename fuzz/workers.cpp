@@ -78,7 +78,7 @@ bool hasOnlyPathsAsLeaves(const Batch& batch) {
     }
     const Lists paths = pathsOf(batch);
     return std::none_of(paths.begin(), paths.end(), [&](const Texts& path) {
-        return folders.count(path) > 0;
+        return folders.contains(path);
     });
 }
 

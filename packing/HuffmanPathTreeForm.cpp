@@ -60,9 +60,9 @@ bool isShape(const std::vector<bool>& bits) {
     if (bits.empty()) return true;
     if (bits.size() > std::numeric_limits<std::int32_t>::max()) return false;
     std::size_t awaited = 1;
-    for (std::size_t k = 0; k < bits.size(); ++k) {
+    for (const bool isLeaf : bits) {
         if (awaited == 0) return false;
-        if (bits[k])
+        if (isLeaf)
             --awaited;
         else
             ++awaited;

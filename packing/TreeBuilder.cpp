@@ -25,8 +25,9 @@ std::vector<std::uint32_t> countChildren(std::span<const std::uint8_t> codes) {
 
 }  // namespace
 
-TreeBuilder::TreeBuilder(BPathTree& target, std::span<const std::uint8_t> bytes)
-    : tree(target), codes(bytes), childCounts(countChildren(bytes)) {
+TreeBuilder::TreeBuilder(BPathTree& target,
+                         std::span<const std::uint8_t> nodeCodes)
+    : tree(target), codes(nodeCodes), childCounts(countChildren(nodeCodes)) {
     tree.finder.clear();
     tree.root = BNodePtr::adopt(tree.pool.make({}, NodePool::Kind::folder));
     reserveChildren(*tree.root);

@@ -34,7 +34,7 @@ inline std::uint8_t of(const NodeWalk& walk) noexcept {
 class TreeBuilder {
 public:
     // Codes may be hostile; they are judged as add() comes to them.
-    TreeBuilder(BPathTree& tree, std::span<const std::uint8_t> codes);
+    TreeBuilder(BPathTree& target, std::span<const std::uint8_t> nodeCodes);
 
     bool complete() const noexcept { return open.empty(); }
 

@@ -130,7 +130,7 @@ private:
     static constexpr unsigned lengthShift = 2;
     static constexpr unsigned longLength = 63;
 
-    BNode() noexcept : references(1), head(0) {}
+    BNode() noexcept = default;
 
     const std::uint8_t* afterHead() const noexcept { return &head + 1; }
     std::uint8_t* afterHead() noexcept { return &head + 1; }
@@ -160,8 +160,8 @@ private:
     // Releases a node whose last share is gone, and all that it alone owns.
     static void destroy(BNode* dead) noexcept;
 
-    std::atomic<std::uint32_t> references;
-    std::uint8_t head;
+    std::atomic<std::uint32_t> references = 1;
+    std::uint8_t head = 0;
 };
 
 inline BNodePtr::BNodePtr(BNode* target) noexcept : node(target) {

@@ -154,6 +154,7 @@ void* NodePool::allocate(std::size_t before, std::size_t bytes) {
         NodeSlab* own = NodeSlab::create(needed);
         char* at = own->cut(before, bytes);
         own->release();
+        // NOLINTNEXTLINE(clang-analyzer-unix.Malloc): the cut holds a share
         return at;
     }
     NodeSlab* next = NodeSlab::create(
@@ -169,7 +170,7 @@ BNode* NodePool::make(ComponentView value, Kind kind) {
     const std::size_t bytes = offsetof(BNode, head) + 1 +
                               (isLong ? sizeof(std::uint64_t) : 0) +
                               value.size();
-    BNode* node = new (allocate(before, bytes)) BNode;
+    auto* node = new (allocate(before, bytes)) BNode;
     made += before + bytes;
     unsigned head =
         (isLong ? BNode::longLength : static_cast<unsigned>(value.size()))

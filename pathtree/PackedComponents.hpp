@@ -5,22 +5,24 @@
 #include <cstdint>
 #include <cstring>
 #include <iterator>
-#include <vector>
+#include <memory>
+#include <utility>
 
 #include "pathtree/BNode.hpp"
 
 namespace tessel {
 
-// A list of encoded components in one buffer, for handing a batch to the
-// path tree without an allocation for each component.
+// A list of encoded components, one behind the other in a shared buffer: a
+// batch is handed to the path tree without an allocation for each component,
+// nor for each folder.
 //
 //   | length, 1 byte, or 0xFF and 8 bytes | the component's bytes | ...
 //
-// Cost: one to nine bytes a component beside its own.
+// Ownership: shares the buffer with other lists; what it yields is valid as
+//   long as the list. Lists are made by ComponentPacker and never change.
+// Threads: may be handed from one thread to another.
 class PackedComponents {
 public:
-    // Walks the list front to back; what it yields is valid until the list
-    // changes.
     class Iterator {
     public:
         using iterator_category = std::input_iterator_tag;
@@ -33,7 +35,9 @@ public:
             : at(position) {}
         ComponentView operator*() const noexcept {
             if (*at != longMark) return {at + 1, *at};
-            return {at + 1 + sizeof(std::uint64_t), longLength()};
+            std::uint64_t length = 0;
+            std::memcpy(&length, at + 1, sizeof length);
+            return {at + 1 + sizeof length, static_cast<std::size_t>(length)};
         }
         Iterator& operator++() noexcept {
             const ComponentView here = **this;
@@ -45,67 +49,102 @@ public:
         }
 
     private:
-        std::size_t longLength() const noexcept {
-            std::uint64_t length = 0;
-            std::memcpy(&length, at + 1, sizeof length);
-            return static_cast<std::size_t>(length);
-        }
-
         const std::uint8_t* at;
     };
 
+    PackedComponents() noexcept = default;
+
     std::size_t size() const noexcept { return count; }
     bool empty() const noexcept { return count == 0; }
-    Iterator begin() const noexcept { return Iterator(bytes.data()); }
-    Iterator end() const noexcept {
-        return Iterator(bytes.data() + bytes.size());
-    }
+    Iterator begin() const noexcept { return Iterator(first); }
+    Iterator end() const noexcept { return Iterator(first + bytes); }
 
-    // Appends a component of `length` bytes, which the caller must write at
-    // the address returned before it touches the list again. It may write up
-    // to `slack` bytes more there, which do not become part of the list.
-    std::uint8_t* extend(std::size_t length) {
-        const bool isLong = length >= longMark;
-        const std::size_t start = bytes.size();
-        const std::size_t data =
-            start + 1 + (isLong ? sizeof(std::uint64_t) : 0);
-        bytes.reserve(grown(data + length + slack));
-        bytes.resize(data + length);
-        bytes[start] = isLong ? longMark : static_cast<std::uint8_t>(length);
-        if (isLong) {
-            const std::uint64_t stored = length;
-            std::memcpy(&bytes[start + 1], &stored, sizeof stored);
-        }
-        ++count;
-        return bytes.data() + data;
-    }
+private:
+    friend class ComponentPacker;
+
+    static constexpr std::uint8_t longMark = 0xFF;
+
+    std::shared_ptr<const std::uint8_t[]> buffer;
+    const std::uint8_t* first = nullptr;
+    std::size_t bytes = 0;
+    std::size_t count = 0;
+};
+
+// Writes lists of components one after the other into buffers that the lists
+// share.
+//
+// Threads: each thread has a packer of its own.
+// Cost: one to nine bytes a component beside its own; an allocation for each
+//   64 KiB, fewer bytes at first.
+class ComponentPacker {
+public:
+    // Bytes that a caller of extend may write behind the component.
     static constexpr std::size_t slack = 8;
 
-    // Appends a copy of the component.
+    // Appends a component of `length` bytes to the list at hand. The caller
+    // must write it at the address returned before it uses the packer again,
+    // and may write up to `slack` bytes more.
+    std::uint8_t* extend(std::size_t length) {
+        const bool isLong = length >= PackedComponents::longMark;
+        const std::size_t mark = 1 + (isLong ? sizeof(std::uint64_t) : 0);
+        if (mark + length + slack > capacity - used)
+            moveOn(mark + length + slack);
+        std::uint8_t* at = buffer.get() + used;
+        *at = isLong ? PackedComponents::longMark
+                     : static_cast<std::uint8_t>(length);
+        if (isLong) {
+            const std::uint64_t stored = length;
+            std::memcpy(at + 1, &stored, sizeof stored);
+        }
+        used += mark + length;
+        ++count;
+        return at + mark;
+    }
+
+    // Appends a copy of the component to the list at hand.
     void append(ComponentView component) {
         std::uint8_t* to = extend(component.size());
         if (!component.empty())
             std::memcpy(to, component.data(), component.size());
     }
 
-    // Empties the list and keeps its memory.
-    void clear() noexcept {
-        bytes.clear();
+    // Ends the list at hand, returns it and begins another one.
+    PackedComponents finish() noexcept {
+        PackedComponents list;
+        if (count > 0) {
+            list.buffer = buffer;
+            list.first = buffer.get() + start;
+            list.bytes = used - start;
+            list.count = count;
+        }
+        start = used;
         count = 0;
+        return list;
     }
 
 private:
-    static constexpr std::uint8_t longMark = 0xFF;
+    static constexpr std::size_t firstBuffer = std::size_t{1} << 10;
+    static constexpr std::size_t usualBuffer = std::size_t{64} << 10;
 
-    // The capacity to ask for: doubled when `needed` does not fit.
-    std::size_t grown(std::size_t needed) const noexcept {
-        return needed <= bytes.capacity()
-                   ? needed
-                   : std::max(needed, 2 * bytes.capacity());
+    // Takes a new buffer with room for the list at hand and `more` bytes.
+    void moveOn(std::size_t more) {
+        const std::size_t begun = used - start;
+        const std::size_t usual =
+            std::clamp(2 * capacity, firstBuffer, usualBuffer);
+        const std::size_t size = std::max(usual, begun + begun / 2 + more);
+        auto next = std::make_shared_for_overwrite<std::uint8_t[]>(size);
+        if (begun > 0) std::memcpy(next.get(), buffer.get() + start, begun);
+        buffer = std::move(next);
+        capacity = size;
+        start = 0;
+        used = begun;
     }
 
-    std::vector<std::uint8_t> bytes;
-    std::size_t count = 0;
+    std::shared_ptr<std::uint8_t[]> buffer;
+    std::size_t capacity = 0;
+    std::size_t start = 0;  // of the list at hand
+    std::size_t used = 0;
+    std::size_t count = 0;  // components of the list at hand
 };
 
 }  // namespace tessel

@@ -35,7 +35,7 @@ std::size_t PathTracks::read(std::size_t at, PathTrack& track) const {
 }
 
 void PathTracks::get(std::size_t i, PathTrack& track) const {
-    std::size_t at = static_cast<std::size_t>(starts[i / tracksPerStart]);
+    auto at = static_cast<std::size_t>(starts[i / tracksPerStart]);
     for (std::size_t skipped = i % tracksPerStart; skipped > 0; --skipped) {
         std::uint64_t left = readInteger(at);
         while (left > 0)
