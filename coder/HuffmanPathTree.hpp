@@ -185,7 +185,8 @@ public:
         std::uint64_t n, unsigned hardwareThreads);
 
     // A worker's job: encodes the folders first to last of asyncFolders and
-    // asyncFiles. Throws what generateCodeFor throws.
+    // asyncFiles and releases what it has encoded. Throws what
+    // generateCodeFor throws.
     void generateCodeForPath(std::uint64_t first, std::uint64_t last);
 
     // Waits for the workers and forgets them.
@@ -318,8 +319,8 @@ public:
     CodeTable codes;
     std::vector<std::int32_t> parentOf;  // by position in nodes; -1: none
 
-    // Workers. They read asyncFolders, asyncFiles and codes, which nobody
-    // changes meanwhile, and write their own entries of the encoded lists.
+    // Workers. Each has its own range of entries in asyncFolders, asyncFiles
+    // and the encoded lists; `codes`, which they share, nobody changes.
     std::vector<std::thread> genThreads;
     FolderTexts asyncFolders;
     FolderTexts asyncFiles;
@@ -337,14 +338,16 @@ private:
 
     std::size_t encodedBytes(const std::u16string& text) const;
     void encodeTo(const std::u16string& text, std::uint8_t* to) const;
-    void encodeAll(const std::vector<std::u16string>& texts,
-                   PackedComponents& out, std::uint64_t& longest) const;
+    PackedComponents encodeAll(std::vector<std::u16string>& texts,
+                               ComponentPacker& packer,
+                               std::uint64_t& longest) const;
     void encodeRange(std::uint64_t first, std::uint64_t last,
                      WorkerOutcome& outcome) noexcept;
     void raiseMaxCodeBytes(std::uint64_t length) noexcept;
     void encodeOnWorkers(unsigned hardwareThreads);
     template <class List>
-    void insertPartition(List& folderComponents, List& fileNames);
+    void insertPartition(List& folderComponents, List& fileNames,
+                         PathTrack& track);
 
     std::size_t stepThrough(ComponentView bytes, std::size_t bit,
                             std::size_t end, std::u16string& text) const;

@@ -96,7 +96,7 @@ void HuffmanPathTree::encodeTo(const std::u16string& text,
 
 Component HuffmanPathTree::generateCodeFor(const std::u16string& text) {
     const std::size_t length = encodedBytes(text);
-    Component bytes(length + PackedComponents::slack);
+    Component bytes(length + ComponentPacker::slack);
     if (length > 0) encodeTo(text, bytes.data());
     bytes.resize(length);
     raiseMaxCodeBytes(length);
@@ -186,32 +186,35 @@ void HuffmanPathTree::generateCodeForPath(std::uint64_t first,
     if (outcome.failure) std::rethrow_exception(outcome.failure);
 }
 
-void HuffmanPathTree::encodeAll(const std::vector<std::u16string>& texts,
-                                PackedComponents& out,
-                                std::uint64_t& longest) const {
-    out.clear();
+// Encodes the texts and releases them: what is still warm is freed fastest,
+// and the batch need not stand in memory twice.
+PackedComponents HuffmanPathTree::encodeAll(std::vector<std::u16string>& texts,
+                                            ComponentPacker& packer,
+                                            std::uint64_t& longest) const {
     for (const std::u16string& text : texts) {
         const std::size_t length = encodedBytes(text);
-        std::uint8_t* to = out.extend(length);
+        std::uint8_t* to = packer.extend(length);
         if (length > 0) encodeTo(text, to);
         longest = std::max<std::uint64_t>(longest, length);
     }
+    releaseContents(texts);
+    return packer.finish();
 }
 
 void HuffmanPathTree::encodeRange(std::uint64_t first, std::uint64_t last,
                                   WorkerOutcome& outcome) noexcept {
     try {
-        PackedComponents scratch;  // grows once for all folders of the range
+        ComponentPacker packer;
         for (std::uint64_t i = first; i <= last && i < asyncFolders.size();
              ++i) {
-            encodeAll(asyncFolders[i], scratch, outcome.longest);
-            PackedComponents folder = scratch;
+            PackedComponents folder =
+                encodeAll(asyncFolders[i], packer, outcome.longest);
             {
                 const std::lock_guard lock(folderResultMutex);
                 encodedFolders[i] = std::move(folder);
             }
-            encodeAll(asyncFiles[i], scratch, outcome.longest);
-            PackedComponents names = scratch;
+            PackedComponents names =
+                encodeAll(asyncFiles[i], packer, outcome.longest);
             const std::lock_guard lock(fileResultMutex);
             encodedFiles[i] = std::move(names);
         }
@@ -237,8 +240,9 @@ void HuffmanPathTree::clearThreadResources() {
 
 void HuffmanPathTree::addPathToBTreeFromAsyncData() {
     const std::size_t folders = encodedFolders.size();
+    PathTrack track;
     for (std::size_t i = 0; i < folders; ++i) {
-        insertPartition(encodedFolders[i], encodedFiles[i]);
+        insertPartition(encodedFolders[i], encodedFiles[i], track);
         encodedFolders[i] = {};
         encodedFiles[i] = {};
     }
@@ -250,11 +254,12 @@ void HuffmanPathTree::addPathToBTreeFromAsyncData() {
 }
 
 // What follows the insertion into the tree cannot throw, so that the tree
-// and the bookkeeping never disagree.
+// and the bookkeeping never disagree. `track` is memory to work in.
 template <class List>
-void HuffmanPathTree::insertPartition(List& folderComponents, List& fileNames) {
+void HuffmanPathTree::insertPartition(List& folderComponents, List& fileNames,
+                                      PathTrack& track) {
     const std::size_t fileCount = fileNames.size();
-    PathTrack track;
+    track.clear();
     track.reserve(folderComponents.size() + 1);
     reserveGently(partitionEnds, 1);
     partitionTracks.reserveFor(folderComponents.size() + 1);
@@ -273,7 +278,8 @@ void HuffmanPathTree::insertPartition(List& folderComponents, List& fileNames) {
 
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,
                                      Components& fileNames) {
-    insertPartition(folderComponents, fileNames);
+    PathTrack track;
+    insertPartition(folderComponents, fileNames, track);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& components) {

@@ -82,22 +82,23 @@ std::uint64_t BPathTree::findNode(const Component& value,
 std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
                                             Component& value,
                                             bool& existed) const {
-    const std::size_t position =
+    const ChildFinder::Found child =
         findOrAppend(nodes.node(), value, NodePool::Kind::leaf, existed);
     if (!existed) takeOver(value);
-    return position;
+    return child.position;
 }
 
-std::size_t BPathTree::findOrAppend(BNode& parent, ComponentView value,
-                                    NodePool::Kind kind, bool& existed) const {
-    const std::size_t found = finder.find(parent, value);
-    existed = found != ChildFinder::notFound;
+ChildFinder::Found BPathTree::findOrAppend(BNode& parent, ComponentView value,
+                                           NodePool::Kind kind,
+                                           bool& existed) const {
+    const ChildFinder::Found found = finder.find(parent, value);
+    existed = found.child != nullptr;
     if (existed) return found;
     BNodePtr made = BNodePtr::adopt(pool.make(value, kind));
     NodePool::append(parent, made);
-    const std::size_t position = parent.children().size() - 1;
-    finder.remember(parent, position);
-    return position;
+    finder.noteAppended(parent);
+    const ChildList children = parent.children();
+    return {&children.back(), children.size() - 1};
 }
 
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
@@ -106,13 +107,13 @@ bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
     for (std::size_t i = 0; i < components.size(); ++i) {
         const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
                                                     : NodePool::Kind::leaf;
-        const std::size_t position =
+        const auto [child, position] =
             findOrAppend(*node, components[i], kind, existed);
         if (existed)
             pathTrack.push_back(position);
         else
             takeOver(components[i]);
-        node = &node->children()[position];
+        node = child;
     }
     return existed;
 }
@@ -124,11 +125,11 @@ bool BPathTree::insertBatch(Folder& folderComponents, Files& fileNames,
     bool existed = false;
     BNode* folder = root.get();
     for (auto&& component : folderComponents) {
-        const std::size_t position =
+        const auto [child, position] =
             findOrAppend(*folder, component, NodePool::Kind::folder, existed);
         if (!existed) takeOver(component);
         pathTrack.push_back(position);
-        folder = &folder->children()[position];
+        folder = child;
     }
     const std::size_t before = folder->children().size();
     firstFileIndex = existed ? before : allOnes;
@@ -164,7 +165,7 @@ bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::releaseFinder(std::size_t most) noexcept {
-    if (finder.indexedChildren() <= most) finder.clear();
+    if (finder.heldChildren() <= most) finder.clear();
 }
 
 // ---- Iteration ----

@@ -216,8 +216,8 @@ public:
 private:
     friend class TreeBuilder;
 
-    std::size_t findOrAppend(BNode& parent, ComponentView value,
-                             NodePool::Kind kind, bool& existed) const;
+    ChildFinder::Found findOrAppend(BNode& parent, ComponentView value,
+                                    NodePool::Kind kind, bool& existed) const;
     template <class Folder, class Files>
     bool insertBatch(Folder& folderComponents, Files& fileNames,
                      PathTrack& pathTrack, std::uint64_t& firstFileIndex);

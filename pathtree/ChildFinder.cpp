@@ -1,8 +1,10 @@
 #include "pathtree/ChildFinder.hpp"
 
+#include <algorithm>
 #include <bit>
 #include <functional>
 #include <string_view>
+#include <utility>
 
 #include "pathtree/containers.hpp"
 
@@ -12,6 +14,10 @@ namespace {
 
 // Up to this many children a search from the front beats a table.
 constexpr std::size_t widestSearched = 8;
+
+// Entries of the cache, powers of two.
+constexpr std::size_t smallestCache = 64;
+constexpr std::size_t largestCache = std::size_t{1} << 18;
 
 std::uint64_t hashOf(ComponentView value) noexcept {
     return std::hash<std::string_view>{}(
@@ -68,8 +74,8 @@ std::size_t ChildFinder::Table::catchUp(const ChildList& children) {
 }
 
 std::size_t ChildFinder::Table::find(const ChildList& children,
-                                     ComponentView value) const {
-    const std::uint64_t hash = hashOf(value);
+                                     ComponentView value,
+                                     std::uint64_t hash) const {
     const std::size_t mask = entries.size() - 1;
     for (std::size_t at = hash & mask;; at = (at + 1) & mask) {
         const Entry& entry = entries[at];
@@ -81,47 +87,67 @@ std::size_t ChildFinder::Table::find(const ChildList& children,
     }
 }
 
-ChildFinder::LastFound& ChildFinder::lastFoundIn(const BNode& parent) noexcept {
+ChildFinder::Cached& ChildFinder::placeFor(const BNode& parent,
+                                           std::uint32_t tag) noexcept {
+    // Multiplicative hashing: the upper half of the product is well mixed.
     const auto address = reinterpret_cast<std::uintptr_t>(&parent);
-    return lastFound[(address ^ (address >> 9)) / 4 & (lastFoundSlots - 1)];
+    const std::uint64_t mixed = (address ^ tag) * 0x9E3779B97F4A7C15U;
+    return cache[(mixed >> 32) & (cache.size() - 1)];
 }
 
-std::size_t ChildFinder::find(BNode& parent, ComponentView value) {
+void ChildFinder::growCache() {
+    const std::vector<Cached> old = std::exchange(
+        cache, std::vector<Cached>(std::max(smallestCache, 2 * cache.size())));
+    for (const Cached& entry : old)
+        if (entry.parent != nullptr) placeFor(*entry.parent, entry.tag) = entry;
+}
+
+ChildFinder::Found ChildFinder::find(BNode& parent, ComponentView value) {
+    if (cache.empty()) growCache();
+    const std::uint64_t hash = hashOf(value);
+    Cached& place = placeFor(parent, tagOf(hash));
+    if (place.parent == &parent && place.tag == tagOf(hash) &&
+        sameComponent(place.child->value(), value))
+        return {place.child, place.position};
     const ChildList children = parent.children();
     const std::size_t count = children.size();
-    if (count == 0) return notFound;
-    if (lastFound.empty()) lastFound.resize(lastFoundSlots);
-    const LastFound& last = lastFoundIn(parent);
-    if (last.parent == &parent &&
-        sameComponent(children[last.position].value(), value))
-        return last.position;
+    if (count == 0) return {};
     std::size_t position = notFound;
     if (count <= widestSearched) {
         position = searchFromFront(children, value);
     } else {
         Table& table = tables[&parent];
         indexed += table.catchUp(children);
-        position = table.find(children, value);
+        position = table.find(children, value, hash);
     }
-    if (position != notFound) remember(parent, position);
-    return position;
+    if (position == notFound) return {};
+    BNode& child = children[position];
+    place = {&parent, &child, static_cast<std::uint32_t>(position),
+             tagOf(hash)};
+    return {&child, position};
 }
 
-void ChildFinder::remember(const BNode& parent, std::size_t position) noexcept {
-    if (!lastFound.empty()) lastFoundIn(parent) = {&parent, position};
+void ChildFinder::noteAppended(BNode& parent) {
+    if (++noted > cache.size() / 2 && cache.size() < largestCache) growCache();
+    const ChildList children = parent.children();
+    BNode& child = children.back();
+    const std::uint32_t tag = tagOf(hashOf(child.value()));
+    placeFor(parent, tag) = {
+        &parent, &child, static_cast<std::uint32_t>(children.size() - 1), tag};
 }
 
 void ChildFinder::clear() noexcept {
-    releaseContents(lastFound);
+    releaseContents(cache);
     releaseContents(tables);
     indexed = 0;
+    noted = 0;
 }
 
 std::size_t ChildFinder::memoryBytes() const noexcept {
     constexpr std::size_t mapNode =
         sizeof(std::pair<const BNode* const, Table>) + 2 * sizeof(void*);
     std::size_t bytes =
-        lastFound.capacity() * sizeof(LastFound) + tables.size() * mapNode;
+        cache.capacity() * sizeof(Cached) + tables.size() * mapNode;
     if (!tables.empty()) bytes += tables.bucket_count() * sizeof(void*);
     for (const auto& [parent, table] : tables) bytes += table.memoryBytes();
     return bytes;
