@@ -1,0 +1,125 @@
+#include "bench/CoderJob.hpp"
+
+#include <algorithm>
+#include <cstdint>
+#include <numeric>
+#include <random>
+#include <span>
+
+namespace bench {
+
+using tessel::Components;
+using tessel::HuffmanPathTree;
+using tessel::paths::forEachFolder;
+using tessel::paths::PathSplit;
+using tessel::paths::PathSplitter;
+
+namespace {
+
+std::size_t folderDepth(const PathSplitter& splitter, std::size_t path) {
+    std::size_t depth = 1;
+    forEachFolder(splitter.list()[path], splitter.split(path),
+                  [&](std::string_view) { ++depth; });
+    return depth;
+}
+
+// The way to the first file of every partition, in one buffer.
+class FileTracks {
+public:
+    FileTracks(const HuffmanPathTree& coder, const PathSplitter& splitter) {
+        std::size_t firstPath = 0;
+        coder.partitionTracks.forEach([&](const tessel::PathTrack& track) {
+            positions.insert(positions.end(), track.begin(), track.end());
+            // A folder that was new has no position of a file behind its own.
+            if (track.size() == folderDepth(splitter, firstPath)) {
+                positions.push_back(0);
+            }
+            firstPath = coder.partitionEnds[ends.size()];
+            ends.push_back(positions.size());
+        });
+    }
+
+    std::span<const std::uint64_t> operator[](std::size_t i) const {
+        const std::size_t start = i == 0 ? 0 : ends[i - 1];
+        return {positions.data() + start, ends[i] - start};
+    }
+
+    // The partitions in the order of their tracks.
+    std::vector<std::size_t> order() const {
+        std::vector<std::size_t> partitions(ends.size());
+        std::iota(partitions.begin(), partitions.end(), std::size_t{0});
+        std::sort(partitions.begin(), partitions.end(),
+                  [&](std::size_t a, std::size_t b) {
+                      return std::ranges::lexicographical_compare((*this)[a],
+                                                                  (*this)[b]);
+                  });
+        return partitions;
+    }
+
+private:
+    std::vector<std::uint64_t> positions;
+    std::vector<std::size_t> ends;
+};
+
+}  // namespace
+
+CoderPtr coderFor(tessel::paths::CharacterCounts counts) {
+    for (char16_t unit = 0; counts.characters.size() == 1; ++unit) {
+        if (counts.characters.front() == unit) continue;
+        counts.characters.push_back(unit);
+        counts.frequencies.push_back(0);
+    }
+    auto coder = std::make_unique<HuffmanPathTree>();
+    coder->deflateHuffman(counts.frequencies.data(), counts.characters);
+    return coder;
+}
+
+void joinFolder(const HuffmanPathTree& coder, const Components& components,
+                std::u16string& text) {
+    text.clear();
+    for (std::size_t i = 0; i < components.size(); ++i) {
+        coder.appendPathFrom(components[i], text);
+        if (i > 0) text += u'/';
+    }
+}
+
+void joinPath(const HuffmanPathTree& coder, const Components& components,
+              std::u16string& text) {
+    text.clear();
+    for (std::size_t i = 0; i < components.size(); ++i) {
+        coder.appendPathFrom(components[i], text);
+        if (i > 0 && i + 1 < components.size()) text += u'/';
+    }
+}
+
+std::vector<double> numbersFrom(std::size_t first, std::size_t last) {
+    std::vector<double> numbers(last - first + 1);
+    std::iota(numbers.begin(), numbers.end(), static_cast<double>(first));
+    return numbers;
+}
+
+std::vector<double> randomNumbers(std::size_t count, std::size_t last) {
+    std::mt19937_64 random(20230610);  // NOLINT(cert-msc*): on purpose
+    std::vector<double> numbers(count);
+    for (double& number : numbers) {
+        number = static_cast<double>(1 + random() % last);
+    }
+    return numbers;
+}
+
+std::vector<std::size_t> iterationOrder(const HuffmanPathTree& coder,
+                                        const PathSplitter& splitter) {
+    std::vector<std::size_t> paths;
+    paths.reserve(coder.pathCount);
+    const FileTracks tracks(coder, splitter);
+    for (const std::size_t partition : tracks.order()) {
+        const std::size_t first =
+            partition == 0 ? 0 : coder.partitionEnds[partition - 1];
+        for (std::size_t i = first; i < coder.partitionEnds[partition]; ++i) {
+            paths.push_back(i);
+        }
+    }
+    return paths;
+}
+
+}  // namespace bench

@@ -1,0 +1,379 @@
+#include "bench/Comparison.hpp"
+
+#include <algorithm>
+#include <fstream>
+#include <iostream>
+#include <stdexcept>
+
+#include "bench/Internals.hpp"
+#include "bench/Series.hpp"
+#include "bench/Timing.hpp"
+
+namespace bench {
+
+using tessel::paths::PathList;
+using tessel::paths::PathSplitter;
+
+namespace {
+
+constexpr std::array<Operation, operationCount> operations = {
+    Operation::Build,       Operation::Iterate, Operation::FetchAll,
+    Operation::FetchRandom, Operation::Store,   Operation::Restore,
+    Operation::Destroy};
+
+PathList readList(const std::string& name) {
+    tessel::paths::WalkReport report;
+    return tessel::paths::readPaths(name, report);
+}
+
+// Where the list comes from, if the file beside it says so.
+std::string originOf(const std::string& list) {
+    const std::size_t slash = list.rfind('/');
+    const std::string folder =
+        slash == std::string::npos ? "" : list.substr(0, slash + 1);
+    std::ifstream file(folder + "origin.txt");
+    std::string origin;
+    std::getline(file, origin);
+    return origin.empty() ? list : origin;
+}
+
+std::string shortName(const std::string& list) {
+    return list.substr(list.rfind('/') + 1);
+}
+
+// What every output says first.
+void describe(const PathList& list, const std::string& name) {
+    std::cout << shortName(name) << ": " << grouped(list.size()) << " paths, "
+              << fixed(static_cast<double>(list.textBytes()) /
+                           static_cast<double>(list.size()),
+                       2)
+              << " bytes a path, from " << originOf(name) << ".\n";
+    for (const auto& [fact, value] : machineFacts()) {
+        std::cout << fact << ": " << value << '\n';
+    }
+    std::cout << '\n';
+}
+
+Json describeJson(const PathList& list, const std::string& name) {
+    Json json;
+    json.text("list", shortName(name))
+        .text("origin", originOf(name))
+        .number("paths", static_cast<double>(list.size()))
+        .number("textBytes", static_cast<double>(list.textBytes()));
+    return json;
+}
+
+void finish(const Options& options, const Json& json) {
+    if (!options.jsonFile.empty()) writeJson(options.jsonFile, json);
+}
+
+// A row of one figure for every subject, and behind each but the first how
+// many times the first's it is.
+void ratioRow(Table& table, std::string what, const std::vector<double>& values,
+              const std::vector<double>& ratios) {
+    std::vector<std::string> cells = {std::move(what)};
+    for (std::size_t i = 0; i < values.size(); ++i) {
+        cells.push_back(threeDigits(values[i]));
+        if (i > 0) cells.push_back(threeDigits(ratios[i]));
+    }
+    table.row(std::move(cells));
+}
+
+template <class Value>
+void valueRow(Table& table, std::string what, const std::vector<Series>& all,
+              Value value) {
+    std::vector<double> values;
+    std::vector<double> ratios;
+    for (const Series& one : all) {
+        values.push_back(value(one));
+        ratios.push_back(values.back() / values.front());
+    }
+    ratioRow(table, std::move(what), values, ratios);
+}
+
+std::string rivalsTable(const std::vector<Series>& all) {
+    std::vector<std::string> heads = {"a path"};
+    for (const Series& one : all) {
+        heads.push_back(one.name);
+        if (&one != &all.front()) heads.emplace_back("ratio");
+    }
+    Table table(heads);
+    valueRow(table, "bytes in memory", all,
+             [](const Series& s) { return s.memoryPerPath(); });
+    valueRow(table, "bytes stored", all,
+             [](const Series& s) { return s.storedPerPath(); });
+    for (const Operation operation : operations) {
+        std::vector<double> values;
+        std::vector<double> ratios;
+        for (const Series& one : all) {
+            values.push_back(one.nanoseconds(operation));
+            ratios.push_back(
+                medianRatio(one.of(operation), all.front().of(operation)));
+        }
+        ratioRow(table, std::string("ns to ") + nameOf(operation), values,
+                 ratios);
+    }
+    return table.text();
+}
+
+std::string compressorsTable(const std::vector<Compressed>& all,
+                             const Series& library, std::size_t paths) {
+    const auto count = static_cast<double>(paths);
+    Table table({"the whole text", "bytes a path", "ratio", "ns to store",
+                 "ns to restore"});
+    table.row({library.name, threeDigits(library.storedPerPath()), "",
+               threeDigits(library.nanoseconds(Operation::Store)),
+               threeDigits(library.nanoseconds(Operation::Restore))});
+    for (const Compressed& one : all) {
+        const double bytes = static_cast<double>(one.bytes) / count;
+        table.row({one.name, threeDigits(bytes),
+                   threeDigits(bytes / library.storedPerPath()),
+                   threeDigits(one.storeSeconds * 1e9 / count),
+                   threeDigits(one.restoreSeconds * 1e9 / count)});
+    }
+    return table.text();
+}
+
+std::string internalsTable(const Internals& m) {
+    const auto instance = static_cast<double>(m.instanceBytes);
+    const auto times = [&](double value, double of) {
+        return threeDigits(value / of);
+    };
+    Table table({"the library beside its own bounds", "figure"});
+    table.row({"instance / UTF-8 text",
+               times(instance, static_cast<double>(m.textBytes))});
+    table.row({"memoryUsage / allocator's figure",
+               times(static_cast<double>(m.usageBytes), instance)});
+    table.row({"restored instance / instance",
+               times(static_cast<double>(m.restoredBytes), instance)});
+    table.row({"peak while adding, beyond the inputs / instance",
+               times(static_cast<double>(m.addingPeak), instance)});
+    table.row({"peak while restoring, beyond the form / instance",
+               times(static_cast<double>(m.restoringPeak), instance)});
+    table.row({"serialize / compress2", threeDigits(m.serializeToCompress)});
+    table.row({"restore / uncompress", threeDigits(m.restoreToUncompress)});
+    table.row({"destroy / build", threeDigits(m.destroyToBuild)});
+    table.row({"encoding with 1 worker / with 2", threeDigits(m.twoWorkers)});
+    return table.text();
+}
+
+Json seriesJson(const std::vector<Series>& all) {
+    Json json;
+    std::vector<Json> subjects;
+    for (const Series& one : all) {
+        Json subject = one.json();
+        Json ratios;
+        for (const Operation operation : operations) {
+            if (one.of(operation).empty()) continue;
+            ratios.number(
+                keyOf(operation),
+                medianRatio(one.of(operation), all.front().of(operation)));
+        }
+        subject.object("timesTheLibrarys", ratios);
+        subjects.push_back(subject);
+    }
+    json.list("subjects", subjects);
+    return json;
+}
+
+std::vector<SubjectPtr> allSubjects(const PathSplitter& splitter) {
+    const PathList& list = splitter.list();
+    std::vector<SubjectPtr> subjects;
+    subjects.push_back(makeLibrary(splitter));
+    subjects.push_back(makeTextVector(list));
+    subjects.push_back(makeStringVector(list));
+    subjects.push_back(makeTextBuffer(list));
+    if (auto marisa = makeMarisa(list)) subjects.push_back(std::move(marisa));
+    return subjects;
+}
+
+PathList headOf(const PathList& list, std::size_t count) {
+    PathList head;
+    for (std::size_t i = 0; i < count; ++i) head.append(list[i]);
+    return head;
+}
+
+// Short lists are measured more often, as their times vary more.
+Plan planFor(std::size_t paths, int runs) {
+    Plan plan;
+    const auto more = static_cast<int>(std::min<std::size_t>(
+        100, std::size_t{500'000} / std::max<std::size_t>(paths, 1)));
+    plan.runs = std::max(runs, more);
+    plan.storeRuns = paths > 1'000'000 ? 1 : plan.runs;
+    return plan;
+}
+
+std::vector<Series> measureLibrary(const PathList& list, const Plan& plan) {
+    const PathSplitter splitter(list);
+    std::vector<SubjectPtr> subjects;
+    subjects.push_back(makeLibrary(splitter));
+    return measure(subjects, list.size(), plan);
+}
+
+std::vector<std::string> figureHeads(std::string first) {
+    std::vector<std::string> heads = {std::move(first), "bytes in memory",
+                                      "bytes stored"};
+    for (const Operation operation : operations) {
+        heads.push_back(std::string("ns to ") + nameOf(operation));
+    }
+    return heads;
+}
+
+std::vector<std::string> figures(std::string first, const Series& one) {
+    std::vector<std::string> cells = {std::move(first),
+                                      threeDigits(one.memoryPerPath()),
+                                      threeDigits(one.storedPerPath())};
+    for (const Operation operation : operations) {
+        cells.push_back(threeDigits(one.nanoseconds(operation)));
+    }
+    return cells;
+}
+
+}  // namespace
+
+void compareRivals(const std::string& name, const Options& options) {
+    const PathList list = readList(name);
+    const PathSplitter splitter(list);
+    describe(list, name);
+
+    Plan plan;
+    plan.runs = plan.storeRuns = options.runs;
+    auto subjects = allSubjects(splitter);
+    const auto all = measure(subjects, list.size(), plan);
+    std::cout << rivalsTable(all) << '\n' << std::flush;
+    const Internals internals = measureInternals(splitter, options.runs);
+    std::cout << internalsTable(internals) << '\n' << std::flush;
+    const auto compressed = compressText(list);
+    std::cout << compressorsTable(compressed, all.front(), list.size());
+
+    Json json = describeJson(list, name);
+    json.object("rivals", seriesJson(all))
+        .object("internals", internals.json());
+    std::vector<Json> sizes;
+    for (const Compressed& one : compressed) {
+        sizes.push_back(
+            Json()
+                .text("name", one.name)
+                .number("storedBytes", static_cast<double>(one.bytes)));
+    }
+    json.list("compressors", sizes);
+    finish(options, json);
+}
+
+void measureGrowth(const std::string& name, const Options& options) {
+    const PathList whole = readList(name);
+    describe(whole, name);
+    Table table(figureHeads("paths, subject"));
+    std::vector<Json> points;
+    for (const std::size_t wanted :
+         {std::size_t{1'000}, std::size_t{7'000}, std::size_t{70'000},
+          std::size_t{300'000}, std::size_t{1'000'000}, std::size_t{3'000'000},
+          std::size_t{7'000'000}}) {
+        if (wanted > whole.size()) break;
+        const PathList list = headOf(whole, wanted);
+        const PathSplitter splitter(list);
+        std::vector<SubjectPtr> subjects;
+        subjects.push_back(makeLibrary(splitter));
+        subjects.push_back(makeStringVector(list));
+        if (auto marisa = makeMarisa(list)) {
+            subjects.push_back(std::move(marisa));
+        }
+        const auto all =
+            measure(subjects, list.size(), planFor(wanted, options.runs));
+        for (const Series& one : all) {
+            table.row(figures(grouped(wanted) + " " + one.name, one));
+        }
+        std::cerr << grouped(wanted) << " paths measured\n";
+        points.push_back(
+            seriesJson(all)
+                .number("paths", static_cast<double>(wanted))
+                .number("textBytes", static_cast<double>(list.textBytes())));
+    }
+    std::cout << table.text();
+    finish(options, describeJson(whole, name).list("growth", points));
+}
+
+void compareOrder(const std::string& sortedName,
+                  const std::string& shuffledName, const Options& options) {
+    const PathList sorted = readList(sortedName);
+    const PathList shuffled = readList(shuffledName);
+    if (sorted.size() != shuffled.size()) {
+        throw std::runtime_error(shuffledName + " is another list than " +
+                                 sortedName + ".");
+    }
+    describe(sorted, sortedName);
+    const PathSplitter sortedSplitter(sorted);
+    const PathSplitter shuffledSplitter(shuffled);
+    std::vector<SubjectPtr> subjects;
+    subjects.push_back(makeLibrary(sortedSplitter));
+    subjects.push_back(makeLibrary(shuffledSplitter));
+    Plan plan = planFor(sorted.size(), options.runs);
+    auto all = measure(subjects, sorted.size(), plan);
+    all[0].name = "sorted";
+    all[1].name = "shuffled";
+    std::cout << rivalsTable(all);
+    Json json = describeJson(sorted, sortedName);
+    finish(options, json.object("order", seriesJson(all)));
+}
+
+namespace {
+
+PathList siblings(std::size_t folders) {
+    PathList list;
+    for (std::size_t i = 0; i < folders; ++i) {
+        list.append("/data/folder" + std::to_string(i) + "/file");
+    }
+    return list;
+}
+
+PathList oneFolder(std::size_t files) {
+    PathList list;
+    for (std::size_t i = 0; i < files; ++i) {
+        list.append("/data/images/file" + std::to_string(i) + ".png");
+    }
+    return list;
+}
+
+// Chains of folders, each of them with a file in every folder.
+PathList chains(std::size_t count, std::size_t depth) {
+    PathList list;
+    for (std::size_t i = 0; i < count; ++i) {
+        std::string folder = "/deep" + std::to_string(i);
+        for (std::size_t level = 0; level < depth; ++level) {
+            folder += "/d" + std::to_string(level);
+            list.append(folder + "/file");
+        }
+    }
+    return list;
+}
+
+}  // namespace
+
+void measureShapes(const Options& options) {
+    struct Shape {
+        const char* key;
+        std::string name;
+        PathList list;
+    };
+    std::vector<Shape> shapes;
+    shapes.push_back({"fewSiblings", "2,000 sibling folders", siblings(2'000)});
+    shapes.push_back(
+        {"manySiblings", "200,000 sibling folders", siblings(200'000)});
+    shapes.push_back(
+        {"oneFolder", "5,000,000 files in a folder", oneFolder(5'000'000)});
+    shapes.push_back({"chains", "500 chains of 200 folders", chains(500, 200)});
+    Table table(figureHeads("a path of"));
+    Json all;
+    for (const Shape& shape : shapes) {
+        const auto series = measureLibrary(
+            shape.list, planFor(shape.list.size(), options.runs));
+        table.row(figures(shape.name, series.front()));
+        all.object(shape.key, series.front().json());
+        std::cerr << shape.name << " measured\n";
+    }
+    std::cout << table.text();
+    Json json;
+    finish(options, json.object("shapes", all));
+}
+
+}  // namespace bench

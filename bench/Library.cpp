@@ -1,0 +1,163 @@
+// The library itself as a subject.
+
+#include <map>
+#include <utility>
+
+#include "bench/CoderJob.hpp"
+#include "bench/Subject.hpp"
+#include "bench/Timing.hpp"
+
+namespace bench {
+
+using tessel::HuffmanPathTree;
+using tessel::paths::Batch;
+using tessel::paths::BatchReader;
+using tessel::paths::CharacterCounts;
+using tessel::paths::PathSplitter;
+
+namespace {
+
+// Long lists come in several batches, so that their texts need not all be in
+// memory.
+constexpr std::size_t pathsPerBatch = 1'000'000;
+
+CharacterCounts sumOf(const std::map<char16_t, double>& sums) {
+    CharacterCounts counts;
+    for (const auto& [unit, frequency] : sums) {
+        counts.characters.push_back(unit);
+        counts.frequencies.push_back(frequency);
+    }
+    return counts;
+}
+
+class Library : public Subject {
+public:
+    explicit Library(const PathSplitter& pathSplitter)
+        : splitter(&pathSplitter) {}
+
+    std::string name() const override { return "qztessel"; }
+
+    // Counts, makes the code, encodes and inserts; the lists of UTF-16
+    // strings are there before. They are released while they are added.
+    double build() override {
+        Batch batch;
+        CharacterCounts counts;
+        double seconds = countAll(batch, counts);
+        seconds += secondsOf([&] { coder = coderFor(std::move(counts)); });
+        if (!batch.folders.empty()) return seconds + add(batch);
+        BatchReader reader(*splitter, pathsPerBatch);
+        while (reader.next(batch)) seconds += add(batch);
+        return seconds;
+    }
+
+    double iterate() override {
+        return secondsOf([&] {
+            bench::iterate(*coder,
+                           [](const std::u16string& text) { keep(text); });
+        });
+    }
+
+    double fetchAll() override {
+        const auto numbers = numbersFrom(1, splitter->list().size());
+        return secondsOf([&] {
+            fetch(*coder, numbers,
+                  [](const std::u16string& text) { keep(text); });
+        });
+    }
+
+    double fetchRandom(const std::vector<double>& numbers) override {
+        std::vector<double> one(1);
+        return secondsOf([&] {
+            for (const double number : numbers) {
+                one[0] = number;
+                fetch(*coder, one,
+                      [](const std::u16string& text) { keep(text); });
+            }
+        });
+    }
+
+    double store() override {
+        form.clear();
+        form.shrink_to_fit();
+        return secondsOf([&] {
+            coder->serialize(form, true);
+            treeString = coder->getTreeString();
+        });
+    }
+
+    double restore() override {
+        return secondsOf([&] {
+            restored = std::make_unique<HuffmanPathTree>();
+            restored->deserialize(form, true);
+            restored->inflateHuffman(treeString);
+        });
+    }
+
+    double destroyRestored() override {
+        return secondsOf([&] { restored.reset(); });
+    }
+    double destroy() override {
+        return secondsOf([&] { coder.reset(); });
+    }
+
+    std::size_t storedBytes() const override {
+        return form.size() + treeString.size() * sizeof(char16_t);
+    }
+    bool verify() override { return isList(*coder); }
+    bool verifyRestored() override { return isList(*restored); }
+
+private:
+    // Leaves the batch in place if it is the only one.
+    double countAll(Batch& batch, CharacterCounts& counts) const {
+        BatchReader reader(*splitter, pathsPerBatch);
+        std::map<char16_t, double> sums;
+        double seconds = 0;
+        while (reader.next(batch)) {
+            seconds += secondsOf([&] {
+                counts =
+                    tessel::paths::countCharacters(batch.folders, batch.files);
+                for (std::size_t i = 0; i < counts.characters.size(); ++i) {
+                    sums[counts.characters[i]] += counts.frequencies[i];
+                }
+            });
+            if (batch.pathCount == splitter->list().size()) return seconds;
+        }
+        counts = sumOf(sums);
+        return seconds;
+    }
+
+    double add(Batch& batch) const {
+        return secondsOf([&] {
+            coder->generateCodeAsyncAndAddPaths(batch.folders, batch.files);
+        });
+    }
+
+    bool isList(const HuffmanPathTree& tested) const {
+        const auto& list = splitter->list();
+        std::size_t i = 0;
+        bool same = true;
+        std::string path;
+        fetch(tested, numbersFrom(1, list.size()),
+              [&](const std::u16string& text) {
+                  path.clear();
+                  same = same && tessel::paths::textToPath(text, path) &&
+                         path == list[i];
+                  ++i;
+              });
+        return same && i == list.size();
+    }
+
+    const PathSplitter* splitter;
+    CoderPtr coder;
+    CoderPtr restored;
+    std::vector<std::uint8_t> form;
+    std::u16string treeString;
+};
+
+}  // namespace
+
+SubjectPtr makeLibrary(const PathSplitter& splitter) {
+    return std::make_unique<Library>(splitter);
+}
+
+}  // namespace bench

@@ -1,0 +1,55 @@
+#pragma once
+
+#include <cstddef>
+#include <map>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+// Numbers as tables for people and as JSON for scripts.
+namespace bench {
+
+// "1,234,567"
+std::string grouped(std::size_t number);
+// With so many digits behind the point: "12.30"
+std::string fixed(double number, int digits);
+// With three digits that count, more if it is large: "0.0123", "1.23", "1234"
+std::string threeDigits(double number);
+
+// A table in markdown whose columns are also aligned as plain text, the first
+// one to the left.
+class Table {
+public:
+    explicit Table(std::vector<std::string> heads) { row(std::move(heads)); }
+    void row(std::vector<std::string> cells) {
+        rows.push_back(std::move(cells));
+    }
+    std::string text() const;
+
+private:
+    std::vector<std::vector<std::string>> rows;
+};
+
+// A JSON object, built in order.
+class Json {
+public:
+    Json& number(std::string_view key, double value);
+    Json& text(std::string_view key, std::string_view value);
+    Json& object(std::string_view key, const Json& value);
+    Json& list(std::string_view key, const std::vector<Json>& values);
+    std::string dump() const { return "{" + body + "}"; }
+
+private:
+    void key(std::string_view name);
+    std::string body;
+};
+
+// One line each: compiler, processor, cores, system.
+std::vector<std::pair<std::string, std::string>> machineFacts();
+
+// Writes `json` with the machine's facts to a file. Throws
+// std::runtime_error if that fails.
+void writeJson(const std::string& file, Json json);
+
+}  // namespace bench

@@ -1,0 +1,149 @@
+#include "bench/Series.hpp"
+
+#include <algorithm>
+#include <functional>
+#include <stdexcept>
+
+#include "bench/CoderJob.hpp"
+#include "bench/Heap.hpp"
+#include "bench/Timing.hpp"
+
+namespace bench {
+
+namespace {
+
+void require(bool verified, const Subject& subject) {
+    if (!verified) {
+        throw std::runtime_error(subject.name() +
+                                 " does not give its paths back.");
+    }
+}
+
+// One measurement of several subjects.
+class Measurement {
+public:
+    Measurement(std::vector<SubjectPtr>& measured, std::size_t pathCount,
+                const Plan& plannedRuns)
+        : subjects(&measured),
+          plan(plannedRuns),
+          numbers(randomNumbers(plannedRuns.fetches, pathCount)) {
+        for (const SubjectPtr& subject : measured) {
+            Series& one = series.emplace_back();
+            one.name = subject->name();
+            one.paths = pathCount;
+            one.fetches = plan.fetches;
+        }
+    }
+
+    std::vector<Series> result() {
+        for (int i = 0; i < plan.runs; ++i) run(i == 0, i < plan.storeRuns);
+        return std::move(series);
+    }
+
+private:
+    void each(Operation operation,
+              const std::function<double(Subject&)>& measured) {
+        for (std::size_t i = 0; i < subjects->size(); ++i) {
+            series[i].seconds[static_cast<std::size_t>(operation)].push_back(
+                measured(*(*subjects)[i]));
+        }
+    }
+
+    void run(bool isFirst, bool stores) {
+        buildAll(isFirst);
+        if (isFirst) {
+            for (const auto& subject : *subjects) {
+                require(subject->verify(), *subject);
+            }
+        }
+        each(Operation::Iterate, [](Subject& s) { return s.iterate(); });
+        each(Operation::FetchAll, [](Subject& s) { return s.fetchAll(); });
+        each(Operation::FetchRandom,
+             [&](Subject& s) { return s.fetchRandom(numbers); });
+        if (stores) storeAll(isFirst);
+        each(Operation::Destroy, [](Subject& s) { return s.destroy(); });
+    }
+
+    void buildAll(bool isFirst) {
+        std::size_t i = 0;
+        each(Operation::Build, [&](Subject& s) {
+            const std::size_t before = heapInUse() - s.sideBytes();
+            const double seconds = s.build();
+            if (isFirst) {
+                series[i].memoryBytes = heapInUse() - s.sideBytes() - before;
+            }
+            ++i;
+            return seconds;
+        });
+    }
+
+    void storeAll(bool isFirst) {
+        each(Operation::Store, [](Subject& s) { return s.store(); });
+        each(Operation::Restore, [&](Subject& s) {
+            const double seconds = s.restore();
+            if (isFirst) require(s.verifyRestored(), s);
+            s.destroyRestored();
+            return seconds;
+        });
+        for (std::size_t i = 0; i < subjects->size(); ++i) {
+            series[i].storedBytes = (*subjects)[i]->storedBytes();
+        }
+    }
+
+    std::vector<SubjectPtr>* subjects;
+    Plan plan;
+    std::vector<double> numbers;
+    std::vector<Series> series;
+};
+
+}  // namespace
+
+const char* nameOf(Operation operation) {
+    constexpr std::array<const char*, operationCount> names = {
+        "build", "iterate", "bulk fetch", "random fetch",
+        "store", "restore", "destroy"};
+    return names[static_cast<std::size_t>(operation)];
+}
+
+const char* keyOf(Operation operation) {
+    constexpr std::array<const char*, operationCount> keys = {
+        "build", "iterate", "bulkFetch", "randomFetch",
+        "store", "restore", "destroy"};
+    return keys[static_cast<std::size_t>(operation)];
+}
+
+double Series::nanoseconds(Operation operation) const {
+    const std::size_t count =
+        operation == Operation::FetchRandom ? fetches : paths;
+    return median(of(operation)) * 1e9 / static_cast<double>(count);
+}
+
+double Series::memoryPerPath() const {
+    return static_cast<double>(memoryBytes) / static_cast<double>(paths);
+}
+
+double Series::storedPerPath() const {
+    return static_cast<double>(storedBytes) / static_cast<double>(paths);
+}
+
+Json Series::json() const {
+    Json all;
+    all.text("name", name)
+        .number("paths", static_cast<double>(paths))
+        .number("memoryBytes", static_cast<double>(memoryBytes))
+        .number("storedBytes", static_cast<double>(storedBytes));
+    Json times;
+    for (std::size_t i = 0; i < operationCount; ++i) {
+        const auto operation = static_cast<Operation>(i);
+        times.number(keyOf(operation), nanoseconds(operation));
+    }
+    all.object("nanosecondsPerPath", times);
+    return all;
+}
+
+std::vector<Series> measure(std::vector<SubjectPtr>& subjects,
+                            std::size_t paths, const Plan& plan) {
+    return Measurement(subjects, paths, plan).result();
+}
+
+}  // namespace bench

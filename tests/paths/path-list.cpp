@@ -1,0 +1,202 @@
+// Lists of paths from files and folders.
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include "hosts/common/PathList.hpp"
+
+namespace {
+
+namespace fs = std::filesystem;
+using namespace std::string_literals;
+using tessel::paths::listFolder;
+using tessel::paths::PathList;
+using tessel::paths::PathListError;
+using tessel::paths::readListFile;
+using tessel::paths::readPaths;
+using tessel::paths::WalkReport;
+using Strings = std::vector<std::string>;
+
+Strings stringsOf(const PathList& list) {
+    Strings strings;
+    for (std::size_t i = 0; i < list.size(); ++i) strings.emplace_back(list[i]);
+    return strings;
+}
+
+Strings fromText(const std::string& text) {
+    return stringsOf(PathList::fromText(text, "list"));
+}
+
+// What reading throws, or "nothing".
+template <class Read>
+std::string messageOf(Read read) {
+    try {
+        read();
+    } catch (const PathListError& error) {
+        return error.what();
+    }
+    return "nothing";
+}
+
+// A folder of its own, removed at the end.
+class PathListFiles : public testing::Test {
+protected:
+    PathListFiles() {
+        std::string name = testing::TempDir() + "paths-XXXXXX";
+        EXPECT_NE(::mkdtemp(name.data()), nullptr);
+        top = name;
+    }
+    ~PathListFiles() override {
+        std::error_code ignored;
+        fs::remove_all(top, ignored);
+    }
+
+    std::string write(const std::string& name, const std::string& text) const {
+        const std::string file = top + "/" + name;
+        std::ofstream(file, std::ios::binary) << text;
+        return file;
+    }
+    void folder(const std::string& name) const {
+        fs::create_directories(top + "/" + name);
+    }
+
+    std::string top;
+    WalkReport report;
+};
+
+TEST(PathList, NewlinesSeparateAndTheLastMayBeLeftOut) {
+    EXPECT_EQ(fromText("a/b\nc d\n"), (Strings{"a/b", "c d"}));
+    EXPECT_EQ(fromText("a/b\nc d"), (Strings{"a/b", "c d"}));
+    EXPECT_EQ(fromText("\r\n"), Strings{"\r"});
+    EXPECT_EQ(fromText(""), Strings{});
+}
+
+TEST(PathList, WithANulOnlyNulsSeparate) {
+    EXPECT_EQ(fromText("a\nb\0c\0"s), (Strings{"a\nb", "c"}));
+    EXPECT_EQ(fromText("a\nb\0c\n"s), (Strings{"a\nb", "c\n"}));
+}
+
+TEST(PathList, AnEmptyPathIsRefusedWithItsLine) {
+    EXPECT_EQ(messageOf([] { fromText("a\nb\n\nc\n"); }),
+              "list, line 3: an empty path.");
+    EXPECT_EQ(messageOf([] { fromText("\n"); }),
+              "list, line 1: an empty path.");
+    EXPECT_EQ(messageOf([] { fromText("a\0\0"s); }),
+              "list, entry 2: an empty path.");
+    EXPECT_THROW(PathList().append(""), std::invalid_argument);
+}
+
+TEST(PathList, CountsItsText) {
+    PathList list = PathList::fromText("ab\nc", "list");
+    EXPECT_EQ(list.textBytes(), 3U);
+    list.append("/x\ny");
+    EXPECT_EQ(list.textBytes(), 7U);
+    EXPECT_EQ(stringsOf(list), (Strings{"ab", "c", "/x\ny"}));
+}
+
+TEST_F(PathListFiles, AFileIsReadWhole) {
+    std::string text;
+    Strings expected;
+    for (int i = 0; i < 40'000; ++i) {
+        expected.push_back("folder/" + std::to_string(i));
+        text += expected.back() + '\n';
+    }
+    EXPECT_EQ(stringsOf(readListFile(write("list", text))), expected);
+}
+
+TEST_F(PathListFiles, APipeIsReadToItsEnd) {
+    const std::string pipe = top + "/pipe";
+    ASSERT_EQ(::mkfifo(pipe.c_str(), 0600), 0);
+    const pid_t writer = ::fork();
+    if (writer == 0) {
+        std::ofstream(pipe) << "a\n" << std::string(200'000, 'b') << "\n";
+        ::_exit(0);
+    }
+    EXPECT_EQ(stringsOf(readPaths(pipe, report)),
+              (Strings{"a", std::string(200'000, 'b')}));
+}
+
+TEST_F(PathListFiles, WhatCannotBeReadIsNamed) {
+    EXPECT_EQ(messageOf([&] { readPaths(top + "/no", report); }),
+              "Cannot read " + top + "/no: No such file or directory.");
+    EXPECT_EQ(messageOf([&] { readListFile(top); }),
+              "Cannot read " + top + ": Is a directory.");
+    EXPECT_EQ(messageOf([&] { listFolder(top + "/no", report); }),
+              "Cannot read " + top + "/no: No such file or directory.");
+}
+
+TEST_F(PathListFiles, AListWithoutPathsIsRefused) {
+    const std::string file = write("list", "");
+    EXPECT_EQ(messageOf([&] { readPaths(file, report); }),
+              file + " holds no paths.");
+    folder("empty");
+    EXPECT_EQ(messageOf([&] { readPaths(top + "/empty", report); }),
+              top + "/empty holds no paths.");
+}
+
+TEST_F(PathListFiles, AWalkListsFilesFirstAndThenFoldersInOrder) {
+    folder("b/inner");
+    folder("a");
+    folder("empty");
+    write("z", "");
+    write("B", "");
+    write("b/y", "");
+    write("b/inner/x", "");
+    write("a/2", "");
+    write("a/10", "");
+    EXPECT_EQ(stringsOf(listFolder(top, report)),
+              (Strings{top + "/B", top + "/z", top + "/a/10", top + "/a/2",
+                       top + "/b/y", top + "/b/inner/x"}));
+    EXPECT_EQ(report.foldersRead, 5U);
+    EXPECT_EQ(report.foldersSkipped, 0U);
+    EXPECT_EQ(stringsOf(listFolder(top + "/a/", report)),
+              (Strings{top + "/a/10", top + "/a/2"}))
+        << "the name's own '/' is enough";
+}
+
+TEST_F(PathListFiles, AWalkListsLinksAndDoesNotFollowThem) {
+    folder("real");
+    write("real/file", "");
+    fs::create_directory_symlink("real", top + "/linked");
+    fs::create_symlink("nowhere", top + "/broken");
+    fs::create_directory_symlink("..", top + "/real/round");
+    EXPECT_EQ(stringsOf(listFolder(top, report)),
+              (Strings{top + "/broken", top + "/linked", top + "/real/file",
+                       top + "/real/round"}));
+    EXPECT_EQ(stringsOf(listFolder(top + "/linked", report)),
+              (Strings{top + "/linked/file", top + "/linked/round"}))
+        << "the given name itself may be a link";
+}
+
+TEST_F(PathListFiles, AFolderThatCannotBeReadIsCountedAndLeftOut) {
+    // A name too long for the system to open, whoever asks.
+    const std::string name(200, 'n');
+    const int start = ::open(".", O_RDONLY | O_DIRECTORY);
+    ASSERT_GE(start, 0);
+    ASSERT_EQ(::chdir(top.c_str()), 0);
+    constexpr int depth = 25;
+    for (int i = 0; i < depth; ++i) {
+        std::ofstream("file").put('x');
+        ASSERT_EQ(::mkdir(name.c_str(), 0700), 0);
+        ASSERT_EQ(::chdir(name.c_str()), 0);
+    }
+    ASSERT_EQ(::fchdir(start), 0);
+    ::close(start);
+
+    const PathList list = listFolder(top, report);
+    EXPECT_EQ(report.foldersSkipped, 1U);
+    EXPECT_EQ(report.firstReason, "File name too long");
+    EXPECT_GT(report.firstSkipped.size(), 4000U);
+    EXPECT_EQ(list.size(), report.foldersRead) << "one file a folder";
+    EXPECT_LT(list.size(), static_cast<std::size_t>(depth));
+}
+
+}  // namespace
