@@ -16,6 +16,7 @@
 
 #include "coder/CodeTable.hpp"
 #include "coder/DecodeTable.hpp"
+#include "coder/FolderMemo.hpp"
 #include "coder/HNode.hpp"
 #include "packing/sixpacks.hpp"
 #include "pathtree/BPathTree.hpp"
@@ -326,6 +327,7 @@ public:
     FolderTexts asyncFiles;
     std::vector<PackedComponents> encodedFolders;  // under folderResultMutex
     std::vector<PackedComponents> encodedFiles;    // under fileResultMutex
+    std::vector<ComponentBuffers> encodedBuffers;  // under folderResultMutex
     std::mutex folderResultMutex;
     std::mutex fileResultMutex;
 
@@ -345,9 +347,12 @@ private:
                      WorkerOutcome& outcome) noexcept;
     void raiseMaxCodeBytes(std::uint64_t length) noexcept;
     void encodeOnWorkers(unsigned hardwareThreads);
-    template <class List>
-    void insertPartition(List& folderComponents, List& fileNames,
-                         PathTrack& track);
+    void keepBuffers(ComponentPacker& packer, WorkerOutcome& outcome) noexcept;
+    void insertEncoded(std::size_t i, std::uint64_t hash, FolderMemo& memo,
+                       PathTrack& track);
+    void reserveForPartition(std::size_t trackLength);
+    void notePartition(PathTrack& track, bool existed,
+                       std::uint64_t firstFileIndex, std::size_t fileCount);
 
     std::size_t stepThrough(ComponentView bytes, std::size_t bit,
                             std::size_t end, std::u16string& text) const;

@@ -1,6 +1,7 @@
 // From texts to encoded components, on several threads, and into the tree.
 
 #include <algorithm>
+#include <array>
 #include <bit>
 #include <cstring>
 #include <stdexcept>
@@ -203,23 +204,36 @@ PackedComponents HuffmanPathTree::encodeAll(std::vector<std::u16string>& texts,
 
 void HuffmanPathTree::encodeRange(std::uint64_t first, std::uint64_t last,
                                   WorkerOutcome& outcome) noexcept {
+    ComponentPacker packer;
     try {
-        ComponentPacker packer;
         for (std::uint64_t i = first; i <= last && i < asyncFolders.size();
              ++i) {
-            PackedComponents folder =
+            const PackedComponents folder =
                 encodeAll(asyncFolders[i], packer, outcome.longest);
             {
                 const std::lock_guard lock(folderResultMutex);
-                encodedFolders[i] = std::move(folder);
+                encodedFolders[i] = folder;
             }
-            PackedComponents names =
+            const PackedComponents names =
                 encodeAll(asyncFiles[i], packer, outcome.longest);
             const std::lock_guard lock(fileResultMutex);
-            encodedFiles[i] = std::move(names);
+            encodedFiles[i] = names;
         }
     } catch (...) {
         outcome.failure = std::current_exception();
+    }
+    keepBuffers(packer, outcome);
+}
+
+// The encoded lists stand in the packer's buffers, which from now on live as
+// long as they do.
+void HuffmanPathTree::keepBuffers(ComponentPacker& packer,
+                                  WorkerOutcome& outcome) noexcept {
+    try {
+        const std::lock_guard lock(folderResultMutex);
+        encodedBuffers.push_back(packer.takeBuffers());
+    } catch (...) {
+        if (!outcome.failure) outcome.failure = std::current_exception();
     }
 }
 
@@ -234,18 +248,59 @@ void HuffmanPathTree::clearThreadResources() {
     releaseContents(asyncFiles);
     releaseContents(encodedFolders);
     releaseContents(encodedFiles);
+    releaseContents(encodedBuffers);
 }
 
 // ---- Insertion ----
 
+namespace {
+
+// The hashes of a batch's folders, computed some folders ahead so that what
+// the memo will touch is on its way when its turn comes.
+class FoldersAhead {
+public:
+    FoldersAhead(const std::vector<PackedComponents>& list,
+                 const FolderMemo& batchMemo)
+        : folders(list), memo(batchMemo) {
+        for (std::size_t i = 0; i < farthest; ++i) begin(i);
+    }
+
+    // The hash of folder i; folders are asked for one after the other.
+    std::uint64_t hashOf(std::size_t i) {
+        begin(i + farthest);
+        if (i + 2 * stride < folders.size())
+            memo.fetchFolder(hashes[(i + 2 * stride) % ring]);
+        if (i + stride < folders.size())
+            memo.fetchNode(hashes[(i + stride) % ring]);
+        return hashes[i % ring];
+    }
+
+private:
+    static constexpr std::size_t stride = 5;
+    static constexpr std::size_t farthest = 3 * stride;
+    static constexpr std::size_t ring = 16;  // more than farthest
+    static_assert(ring > farthest);
+
+    void begin(std::size_t i) {
+        if (i >= folders.size()) return;
+        hashes[i % ring] = FolderMemo::hashOf(folders[i]);
+        memo.fetchEntry(hashes[i % ring]);
+    }
+
+    const std::vector<PackedComponents>& folders;
+    const FolderMemo& memo;
+    std::array<std::uint64_t, ring> hashes{};
+};
+
+}  // namespace
+
 void HuffmanPathTree::addPathToBTreeFromAsyncData() {
     const std::size_t folders = encodedFolders.size();
+    FolderMemo memo;
+    FoldersAhead ahead(encodedFolders, memo);
     PathTrack track;
-    for (std::size_t i = 0; i < folders; ++i) {
-        insertPartition(encodedFolders[i], encodedFiles[i], track);
-        encodedFolders[i] = {};
-        encodedFiles[i] = {};
-    }
+    for (std::size_t i = 0; i < folders; ++i)
+        insertEncoded(i, ahead.hashOf(i), memo, track);
     clearThreadResources();
     // Search memory is worth keeping only while it serves many more folders
     // than this batch had.
@@ -253,18 +308,56 @@ void HuffmanPathTree::addPathToBTreeFromAsyncData() {
     pathTree->releaseFinder(folders * childrenWorthAFolder);
 }
 
-// What follows the insertion into the tree cannot throw, so that the tree
-// and the bookkeeping never disagree. `track` is memory to work in.
-template <class List>
-void HuffmanPathTree::insertPartition(List& folderComponents, List& fileNames,
-                                      PathTrack& track) {
-    const std::size_t fileCount = fileNames.size();
+// Inserts partition i of the batch; `track` is memory to work in.
+void HuffmanPathTree::insertEncoded(std::size_t i, std::uint64_t hash,
+                                    FolderMemo& memo, PathTrack& track) {
+    const PackedComponents& folderComponents = encodedFolders[i];
+    const PackedComponents& fileNames = encodedFiles[i];
+    reserveForPartition(folderComponents.size());
     track.clear();
     track.reserve(folderComponents.size() + 1);
+    const FolderMemo::Folder* known = memo.find(folderComponents, hash);
+    BNode* folder = nullptr;
+    bool existed = known != nullptr;
+    if (existed) {
+        folder = known->node;
+        const auto positions = memo.trackOf(*known);
+        track.assign(positions.begin(), positions.end());
+    } else {
+        folder = &pathTree->addFolder(folderComponents, track, existed);
+        // Without components the root takes the files and never counts as
+        // found.
+        if (!folderComponents.empty())
+            memo.add(folderComponents, hash, *folder, track);
+    }
+    const std::uint64_t first = pathTree->addFiles(*folder, fileNames);
+    notePartition(track, existed, first, fileNames.size());
+}
+
+void HuffmanPathTree::addPathToBTree(Components& folderComponents,
+                                     Components& fileNames) {
+    const std::size_t fileCount = fileNames.size();
+    reserveForPartition(folderComponents.size());
+    PathTrack track;
+    track.reserve(folderComponents.size() + 1);
+    std::uint64_t first = 0;
+    const bool existed =
+        pathTree->addPath(folderComponents, fileNames, track, first);
+    notePartition(track, existed, first, fileCount);
+}
+
+// After this, notePartition cannot throw, so that the tree and the
+// bookkeeping never disagree.
+void HuffmanPathTree::reserveForPartition(std::size_t trackLength) {
     reserveGently(partitionEnds, 1);
-    partitionTracks.reserveFor(folderComponents.size() + 1);
-    std::uint64_t firstFileIndex = 0;
-    if (pathTree->addPath(folderComponents, fileNames, track, firstFileIndex)) {
+    partitionTracks.reserveFor(trackLength + 1);
+}
+
+// The track has room for one more position.
+void HuffmanPathTree::notePartition(PathTrack& track, bool existed,
+                                    std::uint64_t firstFileIndex,
+                                    std::size_t fileCount) {
+    if (existed) {
         track.push_back(firstFileIndex);
         maxPartitionTrackLength =
             std::max<std::uint64_t>(maxPartitionTrackLength, track.size());
@@ -274,12 +367,6 @@ void HuffmanPathTree::insertPartition(List& folderComponents, List& fileNames,
                  (partitionEnds.empty() || partitionEnds.back() <= pathCount);
     partitionEnds.push_back(pathCount);
     partitionTracks.push_back(track);
-}
-
-void HuffmanPathTree::addPathToBTree(Components& folderComponents,
-                                     Components& fileNames) {
-    PathTrack track;
-    insertPartition(folderComponents, fileNames, track);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& components) {

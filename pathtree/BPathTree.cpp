@@ -118,46 +118,57 @@ bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
     return existed;
 }
 
-template <class Folder, class Files>
-bool BPathTree::insertBatch(Folder& folderComponents, Files& fileNames,
-                            PathTrack& pathTrack,
-                            std::uint64_t& firstFileIndex) {
-    bool existed = false;
+template <class Folder>
+BNode& BPathTree::findOrAddFolder(Folder& components, PathTrack& pathTrack,
+                                  bool& existed) {
+    existed = false;
     BNode* folder = root.get();
-    for (auto&& component : folderComponents) {
+    for (auto&& component : components) {
         const auto [child, position] =
             findOrAppend(*folder, component, NodePool::Kind::folder, existed);
         if (!existed) takeOver(component);
         pathTrack.push_back(position);
         folder = child;
     }
-    const std::size_t before = folder->children().size();
-    firstFileIndex = existed ? before : allOnes;
-    if (fileNames.empty()) return existed;
-    NodePool::reserve(*folder, fileNames.size());
+    return *folder;
+}
+
+template <class Files>
+std::uint64_t BPathTree::appendFiles(BNode& folder, Files& fileNames) {
+    const std::size_t before = folder.children().size();
+    if (fileNames.empty()) return before;
+    NodePool::reserve(folder, fileNames.size());
     try {
         for (auto&& name : fileNames) {
             BNodePtr file =
                 BNodePtr::adopt(pool.make(name, NodePool::Kind::leaf));
-            NodePool::append(*folder, file);
+            NodePool::append(folder, file);
         }
     } catch (...) {
-        NodePool::truncate(*folder, before);
+        NodePool::truncate(folder, before);
         throw;
     }
     for (auto&& name : fileNames) takeOver(name);
-    return existed;
+    return before;
 }
 
 bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
                         PathTrack& pathTrack, std::uint64_t& firstFileIndex) {
-    return insertBatch(folderComponents, fileNames, pathTrack, firstFileIndex);
+    bool existed = false;
+    BNode& folder = findOrAddFolder(folderComponents, pathTrack, existed);
+    const std::uint64_t first = appendFiles(folder, fileNames);
+    firstFileIndex = existed ? first : allOnes;
+    return existed;
 }
 
-bool BPathTree::addPath(const PackedComponents& folderComponents,
-                        const PackedComponents& fileNames, PathTrack& pathTrack,
-                        std::uint64_t& firstFileIndex) {
-    return insertBatch(folderComponents, fileNames, pathTrack, firstFileIndex);
+BNode& BPathTree::addFolder(const PackedComponents& folderComponents,
+                            PathTrack& pathTrack, bool& existed) {
+    return findOrAddFolder(folderComponents, pathTrack, existed);
+}
+
+std::uint64_t BPathTree::addFiles(BNode& folder,
+                                  const PackedComponents& fileNames) {
+    return appendFiles(folder, fileNames);
 }
 
 bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
@@ -165,7 +176,7 @@ bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::releaseFinder(std::size_t most) noexcept {
-    if (finder.heldChildren() <= most) finder.clear();
+    if (finder.indexedChildren() <= most) finder.clear();
 }
 
 // ---- Iteration ----

@@ -105,10 +105,12 @@ public:
     bool addPath(Components& folderComponents, Components& fileNames,
                  PathTrack& pathTrack, std::uint64_t& firstFileIndex);
 
-    // The same from packed lists, which are only read.
-    bool addPath(const PackedComponents& folderComponents,
-                 const PackedComponents& fileNames, PathTrack& pathTrack,
-                 std::uint64_t& firstFileIndex);
+    // The two halves of it, from packed lists, which are only read. The
+    // first finds or makes the folder; the second, to be called with a
+    // folder of this tree, returns the position that the first file takes.
+    BNode& addFolder(const PackedComponents& folderComponents,
+                     PathTrack& pathTrack, bool& existed);
+    std::uint64_t addFiles(BNode& folder, const PackedComponents& fileNames);
 
     // True when the node has no children.
     bool isLeaf(const BNodePtr& node) const noexcept;
@@ -218,9 +220,11 @@ private:
 
     ChildFinder::Found findOrAppend(BNode& parent, ComponentView value,
                                     NodePool::Kind kind, bool& existed) const;
-    template <class Folder, class Files>
-    bool insertBatch(Folder& folderComponents, Files& fileNames,
-                     PathTrack& pathTrack, std::uint64_t& firstFileIndex);
+    template <class Folder>
+    BNode& findOrAddFolder(Folder& components, PathTrack& pathTrack,
+                           bool& existed);
+    template <class Files>
+    std::uint64_t appendFiles(BNode& folder, Files& fileNames);
     void closeFinishedFolders();
 
     // Helpers of insertion, which is const for addIfExistsAndFind: the tree

@@ -1,10 +1,8 @@
 #include "pathtree/ChildFinder.hpp"
 
-#include <algorithm>
 #include <bit>
 #include <functional>
 #include <string_view>
-#include <utility>
 
 #include "pathtree/containers.hpp"
 
@@ -14,10 +12,6 @@ namespace {
 
 // Up to this many children a search from the front beats a table.
 constexpr std::size_t widestSearched = 8;
-
-// Entries of the cache, powers of two.
-constexpr std::size_t smallestCache = 64;
-constexpr std::size_t largestCache = std::size_t{1} << 18;
 
 std::uint64_t hashOf(ComponentView value) noexcept {
     return std::hash<std::string_view>{}(
@@ -74,8 +68,8 @@ std::size_t ChildFinder::Table::catchUp(const ChildList& children) {
 }
 
 std::size_t ChildFinder::Table::find(const ChildList& children,
-                                     ComponentView value,
-                                     std::uint64_t hash) const {
+                                     ComponentView value) const {
+    const std::uint64_t hash = hashOf(value);
     const std::size_t mask = entries.size() - 1;
     for (std::size_t at = hash & mask;; at = (at + 1) & mask) {
         const Entry& entry = entries[at];
@@ -87,28 +81,17 @@ std::size_t ChildFinder::Table::find(const ChildList& children,
     }
 }
 
-ChildFinder::Cached& ChildFinder::placeFor(const BNode& parent,
-                                           std::uint32_t tag) noexcept {
-    // Multiplicative hashing: the upper half of the product is well mixed.
+ChildFinder::LastFound& ChildFinder::lastFoundIn(const BNode& parent) noexcept {
     const auto address = reinterpret_cast<std::uintptr_t>(&parent);
-    const std::uint64_t mixed = (address ^ tag) * 0x9E3779B97F4A7C15U;
-    return cache[(mixed >> 32) & (cache.size() - 1)];
-}
-
-void ChildFinder::growCache() {
-    const std::vector<Cached> old = std::exchange(
-        cache, std::vector<Cached>(std::max(smallestCache, 2 * cache.size())));
-    for (const Cached& entry : old)
-        if (entry.parent != nullptr) placeFor(*entry.parent, entry.tag) = entry;
+    return lastFound[(address ^ (address >> 9)) / 4 & (lastFoundPlaces - 1)];
 }
 
 ChildFinder::Found ChildFinder::find(BNode& parent, ComponentView value) {
-    if (cache.empty()) growCache();
-    const std::uint64_t hash = hashOf(value);
-    Cached& place = placeFor(parent, tagOf(hash));
-    if (place.parent == &parent && place.tag == tagOf(hash) &&
-        sameComponent(place.child->value(), value))
-        return {place.child, place.position};
+    if (lastFound.empty()) lastFound.resize(lastFoundPlaces);
+    LastFound& last = lastFoundIn(parent);
+    if (last.parent == &parent &&
+        sameComponent(last.found.child->value(), value))
+        return last.found;
     const ChildList children = parent.children();
     const std::size_t count = children.size();
     if (count == 0) return {};
@@ -118,36 +101,31 @@ ChildFinder::Found ChildFinder::find(BNode& parent, ComponentView value) {
     } else {
         Table& table = tables[&parent];
         indexed += table.catchUp(children);
-        position = table.find(children, value, hash);
+        position = table.find(children, value);
     }
     if (position == notFound) return {};
-    BNode& child = children[position];
-    place = {&parent, &child, static_cast<std::uint32_t>(position),
-             tagOf(hash)};
-    return {&child, position};
+    last = {&parent, {&children[position], position}};
+    return last.found;
 }
 
-void ChildFinder::noteAppended(BNode& parent) {
-    if (++noted > cache.size() / 2 && cache.size() < largestCache) growCache();
+void ChildFinder::noteAppended(BNode& parent) noexcept {
     const ChildList children = parent.children();
-    BNode& child = children.back();
-    const std::uint32_t tag = tagOf(hashOf(child.value()));
-    placeFor(parent, tag) = {
-        &parent, &child, static_cast<std::uint32_t>(children.size() - 1), tag};
+    if (!lastFound.empty())
+        lastFoundIn(parent) = {&parent,
+                               {&children.back(), children.size() - 1}};
 }
 
 void ChildFinder::clear() noexcept {
-    releaseContents(cache);
+    releaseContents(lastFound);
     releaseContents(tables);
     indexed = 0;
-    noted = 0;
 }
 
 std::size_t ChildFinder::memoryBytes() const noexcept {
     constexpr std::size_t mapNode =
         sizeof(std::pair<const BNode* const, Table>) + 2 * sizeof(void*);
     std::size_t bytes =
-        cache.capacity() * sizeof(Cached) + tables.size() * mapNode;
+        lastFound.capacity() * sizeof(LastFound) + tables.size() * mapNode;
     if (!tables.empty()) bytes += tables.bucket_count() * sizeof(void*);
     for (const auto& [parent, table] : tables) bytes += table.memoryBytes();
     return bytes;

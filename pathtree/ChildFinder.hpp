@@ -12,18 +12,16 @@ namespace tessel {
 // Finds the first child with a given value, as a search from the front
 // would, without looking at every child of a wide folder.
 //
-// Two memories serve it: a cache of children found or appended before, which
-// lists of paths ask for again and again, and for each wide folder a hash
-// table from value to first position, which also knows what is not there.
-// Children are only appended and never change, so neither can become wrong;
-// a table takes in the children that came since its last use, whoever
-// appended them. The finder must be cleared before nodes that it has seen
-// are released.
+// Two memories serve it: the children found last, which a sorted list of
+// paths asks for again and again, and for each wide folder a hash table from
+// value to first position. Children are only appended and never change, so
+// neither can become wrong; a table takes in the children that came since
+// its last use, whoever appended them. The finder must be cleared before
+// nodes that it has seen are released.
 //
 // Threads: none; one thread at a time.
-// Cost: a search takes constant time on average. The cache takes about 50
-//   bytes a folder, 6 MiB at most; the tables take 11 to 22 bytes a child of
-//   the wide folders that were searched.
+// Cost: a search takes constant time on average; the tables take 11 to 22
+//   bytes a child of the wide folders that were searched.
 class ChildFinder {
 public:
     static constexpr std::size_t notFound = ~std::size_t{0};
@@ -38,10 +36,10 @@ public:
 
     // Notes the last child of parent, which was appended because find did
     // not find its value.
-    void noteAppended(BNode& parent);
+    void noteAppended(BNode& parent) noexcept;
 
-    // Children that the memories hold.
-    std::size_t heldChildren() const noexcept { return indexed + noted; }
+    // Children in all tables.
+    std::size_t indexedChildren() const noexcept { return indexed; }
 
     // Forgets everything and releases the memory.
     void clear() noexcept;
@@ -56,8 +54,7 @@ private:
     public:
         // Takes in the children that it does not hold yet; returns how many.
         std::size_t catchUp(const ChildList& children);
-        std::size_t find(const ChildList& children, ComponentView value,
-                         std::uint64_t hash) const;
+        std::size_t find(const ChildList& children, ComponentView value) const;
         std::size_t memoryBytes() const noexcept {
             return entries.capacity() * sizeof(Entry);
         }
@@ -74,22 +71,17 @@ private:
         std::size_t held = 0;        // children 0 to held - 1 are in
     };
 
-    // A child that find once answered. An entry gives way to another one
-    // that wants its place.
-    struct Cached {
+    struct LastFound {
         const BNode* parent = nullptr;
-        BNode* child = nullptr;
-        std::uint32_t position = 0;
-        std::uint32_t tag = 0;  // half of the hash of the child's value
+        Found found;
     };
+    static constexpr std::size_t lastFoundPlaces = 64;  // a power of two
 
-    Cached& placeFor(const BNode& parent, std::uint32_t tag) noexcept;
-    void growCache();
+    LastFound& lastFoundIn(const BNode& parent) noexcept;
 
-    std::vector<Cached> cache;  // a power of two, or nothing yet
+    std::vector<LastFound> lastFound;
     std::unordered_map<const BNode*, Table> tables;
-    std::size_t indexed = 0;  // children in the tables
-    std::size_t noted = 0;    // children appended since the cache was empty
+    std::size_t indexed = 0;
 };
 
 }  // namespace tessel

@@ -7,20 +7,20 @@
 #include <iterator>
 #include <memory>
 #include <utility>
+#include <vector>
 
 #include "pathtree/BNode.hpp"
 
 namespace tessel {
 
-// A list of encoded components, one behind the other in a shared buffer: a
-// batch is handed to the path tree without an allocation for each component,
-// nor for each folder.
+// A list of encoded components, one behind the other in a buffer: a batch is
+// handed to the path tree without an allocation for each component, nor for
+// each folder.
 //
 //   | length, 1 byte, or 0xFF and 8 bytes | the component's bytes | ...
 //
-// Ownership: shares the buffer with other lists; what it yields is valid as
-//   long as the list. Lists are made by ComponentPacker and never change.
-// Threads: may be handed from one thread to another.
+// Ownership: a view. The ComponentBuffers that its ComponentPacker filled
+//   must outlive it.
 class PackedComponents {
 public:
     class Iterator {
@@ -57,22 +57,32 @@ public:
     std::size_t size() const noexcept { return count; }
     bool empty() const noexcept { return count == 0; }
     Iterator begin() const noexcept { return Iterator(first); }
-    Iterator end() const noexcept { return Iterator(first + bytes); }
+    Iterator end() const noexcept { return Iterator(first + byteCount); }
+
+    // The whole list as it stands in the buffer. Lists of equal components
+    // have equal bytes, and no others have.
+    ComponentView bytes() const noexcept { return {first, byteCount}; }
 
 private:
     friend class ComponentPacker;
 
     static constexpr std::uint8_t longMark = 0xFF;
 
-    std::shared_ptr<const std::uint8_t[]> buffer;
+    PackedComponents(const std::uint8_t* start, std::size_t length,
+                     std::size_t components) noexcept
+        : first(start), byteCount(length), count(components) {}
+
     const std::uint8_t* first = nullptr;
-    std::size_t bytes = 0;
+    std::size_t byteCount = 0;
     std::size_t count = 0;
 };
 
-// Writes lists of components one after the other into buffers that the lists
-// share.
+// The memory that lists of components stand in.
+using ComponentBuffers = std::vector<std::unique_ptr<std::uint8_t[]>>;
+
+// Writes lists of components one after the other.
 //
+// Ownership: owns the buffers until takeBuffers hands them over.
 // Threads: each thread has a packer of its own.
 // Cost: one to nine bytes a component beside its own; an allocation for each
 //   64 KiB, fewer bytes at first.
@@ -89,7 +99,7 @@ public:
         const std::size_t mark = 1 + (isLong ? sizeof(std::uint64_t) : 0);
         if (mark + length + slack > capacity - used)
             moveOn(mark + length + slack);
-        std::uint8_t* at = buffer.get() + used;
+        std::uint8_t* at = buffers.back().get() + used;
         *at = isLong ? PackedComponents::longMark
                      : static_cast<std::uint8_t>(length);
         if (isLong) {
@@ -111,15 +121,18 @@ public:
     // Ends the list at hand, returns it and begins another one.
     PackedComponents finish() noexcept {
         PackedComponents list;
-        if (count > 0) {
-            list.buffer = buffer;
-            list.first = buffer.get() + start;
-            list.bytes = used - start;
-            list.count = count;
-        }
+        if (count > 0)
+            list = {buffers.back().get() + start, used - start, count};
         start = used;
         count = 0;
         return list;
+    }
+
+    // Hands over all buffers; the lists stay valid. The packer is then as
+    // new.
+    ComponentBuffers takeBuffers() noexcept {
+        capacity = start = used = count = 0;
+        return std::exchange(buffers, {});
     }
 
 private:
@@ -132,17 +145,21 @@ private:
         const std::size_t usual =
             std::clamp(2 * capacity, firstBuffer, usualBuffer);
         const std::size_t size = std::max(usual, begun + begun / 2 + more);
-        auto next = std::make_shared_for_overwrite<std::uint8_t[]>(size);
-        if (begun > 0) std::memcpy(next.get(), buffer.get() + start, begun);
-        buffer = std::move(next);
+        auto next = std::make_unique_for_overwrite<std::uint8_t[]>(size);
+        if (begun > 0)
+            std::memcpy(next.get(), buffers.back().get() + start, begun);
+        if (begun > 0 && start == 0)  // nothing else stands in the old one
+            buffers.back() = std::move(next);
+        else
+            buffers.push_back(std::move(next));
         capacity = size;
         start = 0;
         used = begun;
     }
 
-    std::shared_ptr<std::uint8_t[]> buffer;
-    std::size_t capacity = 0;
-    std::size_t start = 0;  // of the list at hand
+    ComponentBuffers buffers;
+    std::size_t capacity = 0;  // of the last buffer
+    std::size_t start = 0;     // of the list at hand
     std::size_t used = 0;
     std::size_t count = 0;  // components of the list at hand
 };
