@@ -10,9 +10,6 @@ namespace bench {
 
 namespace {
 
-// The allocator's own word in front of every allocation.
-constexpr std::int64_t wordBytes = sizeof(std::size_t);
-
 std::atomic<bool>& counting() noexcept {
     static std::atomic<bool> flag{false};
     return flag;
@@ -51,6 +48,9 @@ std::size_t HeapPeak::bytes() const noexcept {
 #ifdef QZTESSEL_COUNT_HEAP
 
 namespace {
+
+// The allocator's own word in front of every allocation.
+constexpr std::int64_t wordBytes = sizeof(std::size_t);
 
 void* taken(void* memory) noexcept {
     if (memory == nullptr || !counting().load(std::memory_order_relaxed)) {

@@ -223,9 +223,9 @@ TEST(Batches, JoinedTextsGiveThePathBack) {
     EXPECT_EQ(text, u"/");
 
     std::string path;
-    EXPECT_TRUE(textToPath(std::u16string(1, noRoot) + u"a", path));
+    EXPECT_TRUE(textToPath(std::u16string(1, noRoot) + u'a', path));
     EXPECT_EQ(path, "a");
-    EXPECT_FALSE(textToPath(u"a" + std::u16string(1, noRoot), path));
+    EXPECT_FALSE(textToPath(std::u16string(u"a") + noRoot, path));
     EXPECT_EQ(path, "a");
 }
 
@@ -414,7 +414,7 @@ TEST(PathSplitter, EveryPairOfShortPathsComesBack) {
     }
     for (const std::string& a : all) {
         for (const std::string& b : all) {
-            const PathList list = listOf({a, b, a + "/" + b});
+            const PathList list = listOf({a, b, a + '/' + b});
             const PathSplitter splitter(list);
             ASSERT_FALSE(sharesNodes(splitter)) << a << " " << b;
         }
@@ -427,15 +427,14 @@ TEST(PathSplitter, EveryPairOfShortPathsComesBack) {
 // A tree of folders as `find` lists it: every folder is a path, too.
 Strings foldersAndFiles(const std::string& top) {
     Strings paths = {top};
-    const std::string prefix = top == "/" ? top : top + "/";
-    for (const char* a : {"a", "b", "usr", "var"}) {
+    const std::string prefix = top == "/" ? top : top + '/';
+    for (const std::string a : {"a", "b", "usr", "var"}) {
         paths.push_back(prefix + a);
         for (int b = 0; b < 40; ++b) {
-            paths.push_back(prefix + a + "/" + std::to_string(b));
+            const std::string folder = prefix + a + '/' + std::to_string(b);
+            paths.push_back(folder);
             for (int c = 0; c < 15; ++c) {
-                paths.push_back(paths.back().substr(0, prefix.size()) + a +
-                                "/" + std::to_string(b) + "/f" +
-                                std::to_string(c));
+                paths.push_back(folder + "/f" + std::to_string(c));
             }
         }
     }
@@ -453,9 +452,12 @@ TEST(PathSplitter, ListsWithThousandsOfFoldersAsPathsComeBack) {
     }
     // Chains, in which every path but the last is a folder.
     for (int i = 0; i < 300; ++i) {
-        std::string path = "/chain" + std::to_string(i);
+        std::string path = "/chain";
+        path += std::to_string(i);
         for (int depth = 0; depth < 10; ++depth) {
-            everything.push_back(path += "/" + std::to_string(depth));
+            path += '/';
+            path += std::to_string(depth);
+            everything.push_back(path);
         }
     }
     EXPECT_GT(PathSplitter(listOf(everything)).keptApartCount(), 3000U);
