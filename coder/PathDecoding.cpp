@@ -37,7 +37,10 @@ class BitReader {
 public:
     explicit BitReader(ComponentView component) noexcept : bytes(component) {
         static_assert(std::endian::native == std::endian::little);
-        std::memcpy(&head, bytes.data(), std::min(bytes.size(), sizeof head));
+        if (bytes.size() >= sizeof head)
+            std::memcpy(&head, bytes.data(), sizeof head);
+        else
+            std::memcpy(&head, bytes.data(), bytes.size());
     }
 
     // The bits from position `bit` on, least significant first, of which at
@@ -124,35 +127,50 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
     if (decodeTable.empty()) return bit;
     constexpr unsigned stepsAWindow =
         BitReader::sureBits / DecodeTable::windowBits;
+    constexpr std::size_t bitsAWindow =
+        std::size_t{stepsAWindow} * DecodeTable::windowBits;
+    // A character takes at least a bit, and a step is written whole.
     constexpr std::size_t mostAWindow =
-        std::size_t{stepsAWindow} * DecodeTable::mostCharacters;
-    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init): written first
-    std::array<char16_t, 16 * mostAWindow> decoded;
-    std::size_t filled = 0;
+        bitsAWindow + DecodeTable::mostCharacters;
+    std::array<char16_t, 4 * mostAWindow> decoded;
+    char16_t* const flushAt = decoded.data() + decoded.size() - mostAWindow;
+    char16_t* out = decoded.data();
+    const auto put = [&out](const DecodeTable::Step& step) {
+        std::memcpy(out, step.characters.data(), sizeof step.characters);
+    };
     const BitReader reader(bytes);
-    bool known = true;
-    while (known && bit < end) {
-        if (filled > decoded.size() - mostAWindow) {
-            text.append(decoded.data(), filled);
-            filled = 0;
-        }
+    // As long as all steps of a window lie before the end.
+    while (end - bit >= bitsAWindow) {
         std::uint64_t window = reader.from(bit);
-        for (unsigned k = 0; k < stepsAWindow && bit < end; ++k) {
+        for (unsigned k = 0; k < stepsAWindow; ++k) {
             const DecodeTable::Step& step = decodeTable[window];
-            unsigned count = step.count;
-            // Near the end a step may hold more than is there.
-            if (end - bit < DecodeTable::windowBits)
-                while (count > 0 && step.bits(count) > end - bit) --count;
-            known = count > 0;
-            if (!known) break;
-            std::memcpy(&decoded[filled], step.characters.data(),
-                        sizeof step.characters);
-            filled += count;
-            bit += step.bits(count);
-            window >>= step.bits(count);
+            if (step.count == 0) {
+                text.append(decoded.data(), out);
+                return bit;
+            }
+            put(step);
+            out += step.count;
+            bit += step.bits3;
+            window >>= step.bits3;
+        }
+        if (out >= flushAt) {
+            text.append(decoded.data(), out);
+            out = decoded.data();
         }
     }
-    text.append(decoded.data(), filled);
+    // Near the end a step may hold more characters than are there.
+    std::uint64_t window = bit < end ? reader.from(bit) : 0;
+    while (bit < end) {
+        const DecodeTable::Step& step = decodeTable[window];
+        unsigned count = step.count;
+        while (count > 0 && step.bits(count) > end - bit) --count;
+        if (count == 0) break;
+        put(step);
+        out += count;
+        bit += step.bits(count);
+        window >>= step.bits(count);
+    }
+    text.append(decoded.data(), out);
     return bit;
 }
 
