@@ -304,7 +304,7 @@ void HuffmanPathTree::addPathToBTreeFromAsyncData() {
     clearThreadResources();
     // Search memory is worth keeping only while it serves many more folders
     // than this batch had.
-    constexpr std::size_t childrenWorthAFolder = 4;
+    constexpr std::size_t childrenWorthAFolder = 16;
     pathTree->releaseFinder(folders * childrenWorthAFolder);
 }
 
