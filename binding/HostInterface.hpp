@@ -60,9 +60,9 @@ class HostOpaque {
 protected:
     HostOpaque() = default;
     HostOpaque(const HostOpaque&) = default;
-    HostOpaque(HostOpaque&&) = default;
+    HostOpaque(HostOpaque&&) noexcept = default;
     HostOpaque& operator=(const HostOpaque&) = default;
-    HostOpaque& operator=(HostOpaque&&) = default;
+    HostOpaque& operator=(HostOpaque&&) noexcept = default;
     ~HostOpaque() = default;
 };
 

@@ -134,19 +134,23 @@ Value Value::logical(bool truth) {
 }
 
 Value Value::column(std::vector<double> values) {
-    return {{values.size(), 1}, std::move(values)};
+    const std::size_t count = values.size();
+    return {{count, 1}, std::move(values)};
 }
 
 Value Value::byteColumn(std::vector<std::uint8_t> values) {
-    return {{values.size(), 1}, std::move(values)};
+    const std::size_t count = values.size();
+    return {{count, 1}, std::move(values)};
 }
 
 Value Value::cellRow(std::vector<Value> elements) {
-    return {{1, elements.size()}, std::move(elements)};
+    const std::size_t count = elements.size();
+    return {{1, count}, std::move(elements)};
 }
 
 Value Value::cellColumn(std::vector<Value> elements) {
-    return {{elements.size(), 1}, std::move(elements)};
+    const std::size_t count = elements.size();
+    return {{count, 1}, std::move(elements)};
 }
 
 ValueClass Value::valueClass() const noexcept {
