@@ -34,10 +34,3 @@ foreach(source IN LISTS coreSources tidySources)
     WORKING_DIRECTORY ${PROJECT_SOURCE_DIR})
   set_tests_properties(tidy.${source} PROPERTIES LABELS check COST 50)
 endforeach()
-
-if(TARGET listing)
-  add_test(NAME check.listing COMMAND listing /usr/include)
-  set_tests_properties(
-    check.listing PROPERTIES LABELS check PASS_REGULAR_EXPRESSION
-                             "all [0-9]+ paths identical")
-endif()
