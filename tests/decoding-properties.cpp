@@ -56,7 +56,7 @@ RC_GTEST_PROP(Decoding, GivesBackWhatWasEncoded, ()) {
     const auto frequencies = *rc::gen::container<Frequencies>(
         characters.size(), support::anyFrequency());
     const CoderPtr coder = support::coderWith(characters, frequencies);
-    const auto text = *support::textOf(rc::gen::elementOf(characters));
+    const auto text = *support::anyTextOf(rc::gen::elementOf(characters));
     const Bytes bytes = coder->generateCodeFor(text);
     RC_ASSERT(
         bytes ==
@@ -156,7 +156,7 @@ TEST(Decoding, CodesAroundTheLongestThatTheTableHolds) {
 
 RC_GTEST_PROP(Decoding, GivesBackTextsInLongCodes, ()) {
     static const LongCodes codes = longCodes(120, 2);
-    const auto text = *support::textOf(rc::gen::weightedOneOf<char16_t>(
+    const auto text = *support::anyTextOf(rc::gen::weightedOneOf<char16_t>(
         {{1, rc::gen::elementOf(codes.characters)},
          {3, rc::gen::elementOf(codes.characters.substr(108))}}));
     const Bytes bytes = codes.coder->generateCodeFor(text);

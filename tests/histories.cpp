@@ -66,7 +66,7 @@ rc::Gen<std::u16string> anyName() {
     return rc::gen::weightedOneOf<std::u16string>(
         {{20, rc::gen::container<std::u16string>(1, unit)},
          {8, rc::gen::container<std::u16string>(2, unit)},
-         {2, support::textOf(unit)},
+         {2, support::anyTextOf(unit)},
          {1, rc::gen::map(unit, [](char16_t character) {
               return std::u16string(2500, character);
           })}});

@@ -325,9 +325,9 @@ TEST(PathTreeInsertion, ACopyTakesOverTheSpareFlag) {
 
 TEST(PathTreeInsertion, ACopyOutlivesItsSource) {
     auto source = std::make_unique<BPathTree>();
-    for (int i = 0; i < 2000; ++i)
-        addBatch(*source, {"folder" + std::to_string(i % 50)},
-                 {"file" + std::to_string(i)});
+    for (std::size_t i = 0; i < 2000; ++i)
+        addBatch(*source, {support::numbered("folder", i % 50)},
+                 {support::numbered("file", i)});
     const Paths before = allPaths(*source);
     BPathTree copy(*source);
     source.reset();

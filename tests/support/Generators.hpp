@@ -24,7 +24,7 @@ inline rc::Gen<char16_t> anyCodeUnit() {
                           })}});
 }
 
-inline rc::Gen<std::u16string> textOf(rc::Gen<char16_t> units) {
+inline rc::Gen<std::u16string> anyTextOf(rc::Gen<char16_t> units) {
     return rc::gen::nonEmpty(
         rc::gen::container<std::u16string>(std::move(units)));
 }

@@ -14,6 +14,13 @@ inline tessel::Component component(const std::string& text) {
     return {text.begin(), text.end()};
 }
 
+// "name7": distinct names.
+inline std::string numbered(const char* prefix, std::size_t number) {
+    std::string name = prefix;
+    name += std::to_string(number);
+    return name;
+}
+
 inline tessel::Components components(const std::vector<std::string>& texts) {
     tessel::Components list;
     for (const std::string& text : texts) list.push_back(component(text));

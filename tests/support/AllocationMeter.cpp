@@ -1,0 +1,75 @@
+#include "tests/support/AllocationMeter.hpp"
+
+#include <algorithm>
+#include <cstdlib>
+#include <new>
+
+namespace {
+
+thread_local bool watching = false;
+thread_local std::size_t largestBytes = 0;
+thread_local std::size_t totalBytes = 0;
+
+void note(std::size_t bytes) {
+    if (!watching) return;
+    largestBytes = std::max(largestBytes, bytes);
+    totalBytes += bytes;
+}
+
+}  // namespace
+
+// The linker sends every call of these four in the program to the wrappers.
+extern "C" {
+void* __real_malloc(std::size_t bytes);
+void* __real_calloc(std::size_t count, std::size_t bytes);
+void* __real_realloc(void* memory, std::size_t bytes);
+int __real_posix_memalign(void** memory, std::size_t alignment,
+                          std::size_t bytes);
+
+void* __wrap_malloc(std::size_t bytes) {
+    note(bytes);
+    return __real_malloc(bytes);
+}
+
+void* __wrap_calloc(std::size_t count, std::size_t bytes) {
+    note(count * bytes);
+    return __real_calloc(count, bytes);
+}
+
+void* __wrap_realloc(void* memory, std::size_t bytes) {
+    note(bytes);
+    return __real_realloc(memory, bytes);
+}
+
+int __wrap_posix_memalign(void** memory, std::size_t alignment,
+                          std::size_t bytes) {
+    note(bytes);
+    return __real_posix_memalign(memory, alignment, bytes);
+}
+}
+
+void* operator new(std::size_t bytes) {
+    if (void* memory = std::malloc(bytes)) return memory;
+    throw std::bad_alloc();
+}
+
+void operator delete(void* memory) noexcept { std::free(memory); }
+void operator delete(void* memory, std::size_t /*bytes*/) noexcept {
+    std::free(memory);
+}
+
+namespace support {
+
+AllocationMeter::AllocationMeter() {
+    largestBytes = 0;
+    totalBytes = 0;
+    watching = true;
+}
+
+AllocationMeter::~AllocationMeter() { watching = false; }
+
+std::size_t AllocationMeter::largest() const { return largestBytes; }
+
+std::size_t AllocationMeter::total() const { return totalBytes; }
+
+}  // namespace support

@@ -1,0 +1,137 @@
+// What happens when the platform gives no more threads. This program answers
+// for it: pthread_create fails from the n-th call on.
+
+#include <dlfcn.h>
+#include <gtest/gtest.h>
+#include <pthread.h>
+
+#include <atomic>
+#include <cerrno>
+#include <system_error>
+
+#include "tests/support/Coders.hpp"
+
+namespace {
+
+// Threads that may still be started.
+std::atomic<int> threadsLeft{1 << 30};
+
+using CreateThread = int (*)(pthread_t*, const pthread_attr_t*,
+                             void* (*)(void*), void*);
+
+}  // namespace
+
+// Sanitizers bring their own, under this name.
+extern "C" __attribute__((weak)) int __interceptor_pthread_create(
+    pthread_t* thread, const pthread_attr_t* attributes, void* (*start)(void*),
+    void* argument);
+
+extern "C" int pthread_create(pthread_t* thread,
+                              const pthread_attr_t* attributes,
+                              void* (*start)(void*), void* argument) {
+    if (threadsLeft.fetch_sub(1) <= 0) return EAGAIN;
+    static const CreateThread real = __interceptor_pthread_create != nullptr
+                                         ? &__interceptor_pthread_create
+                                         : reinterpret_cast<CreateThread>(dlsym(
+                                               RTLD_NEXT, "pthread_create"));
+    return real(thread, attributes, start, argument);
+}
+
+namespace {
+
+using support::Bytes;
+using support::CoderPtr;
+using support::Texts;
+using tessel::HuffmanPathTree;
+
+// For the lifetime of the object only `count` threads can be started.
+class FewThreads {
+public:
+    explicit FewThreads(int count) { threadsLeft = count; }
+    ~FewThreads() { threadsLeft = 1 << 30; }
+};
+
+std::vector<Texts> folders() { return std::vector<Texts>(8, Texts{u"a"}); }
+std::vector<Texts> files() { return std::vector<Texts>(8, Texts{u"b", u"c"}); }
+
+TEST(ThreadCreation, ABatchWithoutThreadsIsRefusedAndTheCoderCanBeUsedOn) {
+    for (int possible = 0; possible < 4; ++possible) {
+        const CoderPtr coder = support::fourLetterCoder();
+        support::addBatch(*coder, {u"d"}, {u"d"});
+        const Bytes before = support::formOf(*coder, false);
+        {
+            const FewThreads few(possible);
+            EXPECT_THROW(support::addBatches(*coder, folders(), files(), 4),
+                         std::system_error);
+        }
+        EXPECT_EQ(support::formOf(*coder, false), before);
+        EXPECT_EQ(coder->pathCount, 1U);
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        support::addBatches(*coder, folders(), files(), 4);
+        EXPECT_EQ(coder->pathCount, 17U);
+        EXPECT_EQ(support::iterated(*coder).size(), 17U);
+    }
+}
+
+TEST(ThreadCreation, TheErrorIsThePlatforms) {
+    const CoderPtr coder = support::fourLetterCoder();
+    const FewThreads few(1);
+    try {
+        support::addBatches(*coder, folders(), files(), 4);
+        FAIL() << "a thread was started";
+    } catch (const std::system_error& failure) {
+        EXPECT_EQ(failure.code().value(), EAGAIN);
+    }
+}
+
+TEST(ThreadCreation, OneFolderNeedsNoThread) {
+    const CoderPtr coder = support::fourLetterCoder();
+    const FewThreads none(0);
+    support::addBatch(*coder, {u"a"}, {u"b"});
+    EXPECT_EQ(coder->pathCount, 1U);
+}
+
+TEST(ThreadCreation, AFailureBeforeTheMissingThreadsFoldersComesFirst) {
+    const CoderPtr coder = support::fourLetterCoder();
+    auto bad = files();
+    bad[1] = {u"x"};  // of the first worker's folders
+    const FewThreads few(2);
+    EXPECT_THROW(support::addBatches(*coder, folders(), bad, 4),
+                 tessel::CodeNotFoundException);
+    EXPECT_EQ(coder->pathCount, 0U);
+}
+
+TEST(ThreadCreation, AFailureBehindTheMissingThreadsFoldersComesSecond) {
+    const CoderPtr coder = support::fourLetterCoder();
+    auto bad = files();
+    bad[7] = {u"x"};  // of the last worker's folders
+    const FewThreads few(2);
+    EXPECT_THROW(support::addBatches(*coder, folders(), bad, 4),
+                 std::system_error);
+    EXPECT_EQ(coder->pathCount, 0U);
+}
+
+TEST(ThreadCreation, AsManyThreadsAsWorkersAreStarted) {
+    struct Case {
+        std::size_t folders;
+        unsigned hardware;
+        int threads;
+    };
+    for (const Case& sample : {Case{8, 3, 3}, Case{8, 64, 8}, Case{2, 7, 2},
+                               Case{8, 0, 2}, Case{8, 1, 1}}) {
+        const CoderPtr coder = support::fourLetterCoder();
+        std::vector<Texts> some(sample.folders, Texts{u"a"});
+        std::vector<Texts> names(sample.folders, Texts{u"b"});
+        {
+            const FewThreads exact(sample.threads);
+            EXPECT_NO_THROW(
+                support::addBatches(*coder, some, names, sample.hardware));
+        }
+        if (sample.threads == 1) continue;  // could be the calling one
+        const FewThreads tooFew(sample.threads - 1);
+        EXPECT_THROW(support::addBatches(*coder, some, names, sample.hardware),
+                     std::system_error);
+    }
+}
+
+}  // namespace
