@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/HashIndex.hpp"
 
 namespace tessel {
 
@@ -23,45 +24,36 @@ public:
         BNode* node = nullptr;
         std::size_t trackStart = 0;
         std::size_t trackLength = 0;
-        std::uint64_t hash = 0;
     };
 
     // A hash of the folder's components, to be handed to find and add.
-    static std::uint64_t hashOf(const PackedComponents& components) noexcept;
+    static std::uint32_t hashOf(const PackedComponents& components) noexcept;
 
     // The folder of these components, or nullptr if it was not added. Valid
     // until the next add.
     const Folder* find(const PackedComponents& components,
-                       std::uint64_t hash) const noexcept;
+                       std::uint32_t hash) const noexcept;
 
     // Adds a folder that find did not find. If it throws, nothing changes.
-    void add(const PackedComponents& components, std::uint64_t hash,
+    void add(const PackedComponents& components, std::uint32_t hash,
              BNode& node, const PathTrack& track);
 
     // Ask the processor for what a later find will touch, one dependent step
     // each: call them in this order, some folders apart. They change nothing
     // and may be left out.
-    void fetchEntry(std::uint64_t hash) const noexcept;
-    void fetchFolder(std::uint64_t hash) const noexcept;
-    void fetchNode(std::uint64_t hash) const noexcept;
+    void fetchEntry(std::uint32_t hash) const noexcept;
+    void fetchFolder(std::uint32_t hash) const noexcept;
+    void fetchNode(std::uint32_t hash) const noexcept;
 
     std::span<const std::uint64_t> trackOf(const Folder& folder) const {
         return {positions.data() + folder.trackStart, folder.trackLength};
     }
 
 private:
-    // Open addressing; an entry keeps half of the hash.
-    struct Entry {
-        std::uint32_t tag = 0;
-        std::uint32_t folderPlusOne = 0;  // 0: free
-    };
+    // The folder that find would look at first, if it may be the one.
+    const Folder* likely(std::uint32_t hash) const noexcept;
 
-    // The folder in the first entry for the hash, if it may be the one.
-    const Folder* likely(std::uint64_t hash) const noexcept;
-    void grow();
-    void place(Entry entry, std::uint64_t hash) noexcept;
-
-    std::vector<Entry> entries;  // a power of two, or nothing yet
+    HashIndex index;  // positions in `folders`
     std::vector<Folder> folders;
     std::vector<std::uint64_t> positions;  // tracks, one behind the other
 };

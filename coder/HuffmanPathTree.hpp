@@ -348,7 +348,7 @@ private:
     void raiseMaxCodeBytes(std::uint64_t length) noexcept;
     void encodeOnWorkers(unsigned hardwareThreads);
     void keepBuffers(ComponentPacker& packer, WorkerOutcome& outcome) noexcept;
-    void insertEncoded(std::size_t i, std::uint64_t hash, FolderMemo& memo,
+    void insertEncoded(std::size_t i, std::uint32_t hash, FolderMemo& memo,
                        PathTrack& track);
     void reserveForPartition(std::size_t trackLength);
     void notePartition(PathTrack& track, bool existed,

@@ -266,7 +266,7 @@ public:
     }
 
     // The hash of folder i; folders are asked for one after the other.
-    std::uint64_t hashOf(std::size_t i) {
+    std::uint32_t hashOf(std::size_t i) {
         begin(i + farthest);
         if (i + 2 * stride < folders.size())
             memo.fetchFolder(hashes[(i + 2 * stride) % ring]);
@@ -289,7 +289,7 @@ private:
 
     const std::vector<PackedComponents>& folders;
     const FolderMemo& memo;
-    std::array<std::uint64_t, ring> hashes{};
+    std::array<std::uint32_t, ring> hashes{};
 };
 
 }  // namespace
@@ -309,7 +309,7 @@ void HuffmanPathTree::addPathToBTreeFromAsyncData() {
 }
 
 // Inserts partition i of the batch; `track` is memory to work in.
-void HuffmanPathTree::insertEncoded(std::size_t i, std::uint64_t hash,
+void HuffmanPathTree::insertEncoded(std::size_t i, std::uint32_t hash,
                                     FolderMemo& memo, PathTrack& track) {
     const PackedComponents& folderComponents = encodedFolders[i];
     const PackedComponents& fileNames = encodedFiles[i];

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "pathtree/BNode.hpp"
+#include "pathtree/HashIndex.hpp"
 
 namespace tessel {
 
@@ -24,7 +25,7 @@ namespace tessel {
 //   bytes a child of the wide folders that were searched.
 class ChildFinder {
 public:
-    static constexpr std::size_t notFound = ~std::size_t{0};
+    static constexpr std::size_t notFound = HashIndex::notFound;
 
     struct Found {
         BNode* child = nullptr;
@@ -48,27 +49,20 @@ public:
     std::size_t memoryBytes() const noexcept;
 
 private:
-    // Open addressing over positions. An entry keeps half of the hash, so
-    // that most misses never touch a node.
+    // The first positions of the values among the children of one folder.
     class Table {
     public:
         // Takes in the children that it does not hold yet; returns how many.
         std::size_t catchUp(const ChildList& children);
-        std::size_t find(const ChildList& children, ComponentView value) const;
+        std::size_t find(const ChildList& children, ComponentView value,
+                         std::uint32_t hash) const;
         std::size_t memoryBytes() const noexcept {
-            return entries.capacity() * sizeof(Entry);
+            return positions.memoryBytes();
         }
 
     private:
-        struct Entry {
-            std::uint32_t tag = 0;
-            std::uint32_t positionPlusOne = 0;  // 0: free
-        };
-        void rebuild(const ChildList& children);
-        void insert(const ChildList& children, std::size_t position);
-
-        std::vector<Entry> entries;  // a power of two
-        std::size_t held = 0;        // children 0 to held - 1 are in
+        HashIndex positions;
+        std::size_t held = 0;  // children 0 to held - 1 are in
     };
 
     struct LastFound {
