@@ -11,7 +11,6 @@ namespace bench {
 using tessel::Components;
 using tessel::HuffmanPathTree;
 using tessel::paths::forEachFolder;
-using tessel::paths::PathSplit;
 using tessel::paths::PathSplitter;
 
 namespace {

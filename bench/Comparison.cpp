@@ -231,10 +231,10 @@ std::vector<std::string> figures(std::string first, const Series& one) {
 
 }  // namespace
 
-void compareRivals(const std::string& name, const Options& options) {
-    const PathList list = readList(name);
+void compareRivals(const std::string& listName, const Options& options) {
+    const PathList list = readList(listName);
     const PathSplitter splitter(list);
-    describe(list, name);
+    describe(list, listName);
 
     Plan plan;
     plan.runs = plan.storeRuns = options.runs;
@@ -246,10 +246,11 @@ void compareRivals(const std::string& name, const Options& options) {
     const auto compressed = compressText(list);
     std::cout << compressorsTable(compressed, all.front(), list.size());
 
-    Json json = describeJson(list, name);
+    Json json = describeJson(list, listName);
     json.object("rivals", seriesJson(all))
         .object("internals", internals.json());
     std::vector<Json> sizes;
+    sizes.reserve(compressed.size());
     for (const Compressed& one : compressed) {
         sizes.push_back(
             Json()
@@ -260,9 +261,9 @@ void compareRivals(const std::string& name, const Options& options) {
     finish(options, json);
 }
 
-void measureGrowth(const std::string& name, const Options& options) {
-    const PathList whole = readList(name);
-    describe(whole, name);
+void measureGrowth(const std::string& listName, const Options& options) {
+    const PathList whole = readList(listName);
+    describe(whole, listName);
     Table table(figureHeads("paths, subject"));
     std::vector<Json> points;
     for (const std::size_t wanted :
@@ -290,7 +291,7 @@ void measureGrowth(const std::string& name, const Options& options) {
                 .number("textBytes", static_cast<double>(list.textBytes())));
     }
     std::cout << table.text();
-    finish(options, describeJson(whole, name).list("growth", points));
+    finish(options, describeJson(whole, listName).list("growth", points));
 }
 
 void compareOrder(const std::string& sortedName,

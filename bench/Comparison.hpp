@@ -13,10 +13,10 @@ struct Options {
     std::string jsonFile;  // none if empty
 };
 
-void compareRivals(const std::string& list, const Options& options);
-void measureGrowth(const std::string& list, const Options& options);
-void compareOrder(const std::string& sorted, const std::string& shuffled,
-                  const Options& options);
+void compareRivals(const std::string& listName, const Options& options);
+void measureGrowth(const std::string& listName, const Options& options);
+void compareOrder(const std::string& sortedName,
+                  const std::string& shuffledName, const Options& options);
 void measureShapes(const Options& options);
 
 }  // namespace bench

@@ -91,6 +91,8 @@ bool HeapPeak::works() noexcept { return false; }
 #ifdef QZTESSEL_COUNT_HEAP
 
 // The C library's allocator under the names that it exports for this purpose.
+// NOLINTBEGIN(readability-identifier-naming)
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name)
 extern "C" {
 void* __libc_malloc(std::size_t);
 void __libc_free(void*);
@@ -128,5 +130,7 @@ int posix_memalign(void** memory, std::size_t alignment, std::size_t bytes) {
     return *memory == nullptr ? ENOMEM : 0;
 }
 }
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
+// NOLINTEND(readability-identifier-naming)
 
 #endif

@@ -144,6 +144,7 @@ double encode(HuffmanPathTree& coder, unsigned workers) {
     const auto ranges = HuffmanPathTree::splitFolders(folders, workers);
     return secondsOf([&] {
         std::vector<std::thread> threads;
+        threads.reserve(ranges.size());
         for (const auto& [first, last] : ranges) {
             threads.emplace_back([&coder, from = first, to = last]() noexcept {
                 coder.generateCodeForPath(from, to);

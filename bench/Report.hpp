@@ -34,10 +34,10 @@ private:
 // A JSON object, built in order.
 class Json {
 public:
-    Json& number(std::string_view key, double value);
-    Json& text(std::string_view key, std::string_view value);
-    Json& object(std::string_view key, const Json& value);
-    Json& list(std::string_view key, const std::vector<Json>& values);
+    Json& number(std::string_view name, double value);
+    Json& text(std::string_view name, std::string_view value);
+    Json& object(std::string_view name, const Json& value);
+    Json& list(std::string_view name, const std::vector<Json>& values);
     std::string dump() const { return "{" + body + "}"; }
 
 private:
