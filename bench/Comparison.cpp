@@ -47,9 +47,9 @@ void describe(const PathList& list, const std::string& name) {
               << fixed(static_cast<double>(list.textBytes()) /
                            static_cast<double>(list.size()),
                        2)
-              << " bytes a path, from " << originOf(name) << ".\n";
+              << " bytes a path, from " << originOf(name) << ".\n\n";
     for (const auto& [fact, value] : machineFacts()) {
-        std::cout << fact << ": " << value << '\n';
+        std::cout << "- " << fact << ": " << value << '\n';
     }
     std::cout << '\n';
 }
