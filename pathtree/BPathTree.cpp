@@ -79,13 +79,18 @@ std::uint64_t BPathTree::findNode(const Component& value,
     return allOnes;
 }
 
+// Not through the finder: `nodes` may be those of any tree, and the finder
+// must not know nodes that this one does not keep alive.
 std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
                                             Component& value,
                                             bool& existed) const {
-    const ChildFinder::Found child =
-        findOrAppend(nodes.node(), value, NodePool::Kind::leaf, existed);
-    if (!existed) takeOver(value);
-    return child.position;
+    const std::uint64_t found = findNode(value, nodes);
+    existed = found != allOnes;
+    if (existed) return found;
+    BNodePtr made = BNodePtr::adopt(pool.make(value, NodePool::Kind::leaf));
+    NodePool::append(nodes.node(), made);
+    takeOver(value);
+    return nodes.size() - 1;
 }
 
 ChildFinder::Found BPathTree::findOrAppend(BNode& parent, ComponentView value,

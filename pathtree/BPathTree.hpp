@@ -80,7 +80,7 @@ public:
     // Position of the first of `nodes` that equals value. If there is none,
     // `existed` becomes false and a new last child takes over the bytes,
     // leaving value empty; otherwise `existed` becomes true and value is
-    // untouched.
+    // untouched. Cost: linear.
     std::uint64_t addIfExistsAndFind(const ChildList& nodes, Component& value,
                                      bool& existed) const;
 
