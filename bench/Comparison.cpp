@@ -193,12 +193,13 @@ PathList headOf(const PathList& list, std::size_t count) {
     return head;
 }
 
-// Short lists are measured more often, as their times vary more.
+// Short lists are measured more often, as their times vary more, unless one
+// run is all that is wanted.
 Plan planFor(std::size_t paths, int runs) {
     Plan plan;
     const auto more = static_cast<int>(std::min<std::size_t>(
         100, std::size_t{500'000} / std::max<std::size_t>(paths, 1)));
-    plan.runs = std::max(runs, more);
+    plan.runs = runs == 1 ? 1 : std::max(runs, more);
     plan.storeRuns = paths > 1'000'000 ? 1 : plan.runs;
     return plan;
 }
