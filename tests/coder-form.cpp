@@ -689,6 +689,16 @@ TEST(CoderForm, AnUnknownWidthIsRefusedWhenItIsUsed) {
         expectRefused<InvalidUintConversionException>(form);
 }
 
+TEST(CoderForm, AWidthOfAnEmptyListIsUsed) {
+    // Ends, then a track's positions.
+    expectRefused<InvalidUintConversionException>(
+        plainForm({shapeOfTwo, onePath, {1, 4, 0, 0}, u64(0), {0, 0}}));
+    expectRefused<InvalidUintConversionException>(
+        plainForm({shapeOfTwo, onePath, {1, 0, 0, 1, 1}, u64(1), {4, 0}, {0}}));
+    expectRefused<InvalidUintConversionException>(
+        plainForm({shapeOfTwo, onePath, {0, 4, 0, 0, 2, 0}}));
+}
+
 TEST(CoderForm, AClaimThatGoesBeyondTheEndIsDamage) {
     const Bytes huge = u64(~std::uint64_t{0});
     const Bytes large = u64(std::uint64_t{1} << 40);

@@ -100,6 +100,20 @@ TEST(PathEncoding, ABatchOfACodeThatIsOneLeafIsStoredAndReadBack) {
     EXPECT_EQ(path, (Components{{}, {}, {}}));
 }
 
+TEST(PathEncoding, TheExceptionsDeriveFromTheStandardBaseAlone) {
+    const auto onlyStandard = [](const auto& failure) {
+        using Failure = std::decay_t<decltype(failure)>;
+        return std::is_convertible_v<Failure*, std::exception*> &&
+               !std::is_convertible_v<Failure*, std::runtime_error*> &&
+               !std::is_convertible_v<Failure*, std::logic_error*> &&
+               sizeof(Failure) == sizeof(std::exception);
+    };
+    EXPECT_TRUE(onlyStandard(tessel::NoCodeForEmptyString()));
+    EXPECT_TRUE(onlyStandard(tessel::CodeNotFoundException()));
+    EXPECT_TRUE(onlyStandard(tessel::DamagedFormException()));
+    EXPECT_TRUE(onlyStandard(tessel::InvalidUintConversionException()));
+}
+
 // ---- How a batch is split ----
 
 TEST(PathEncoding, TenFoldersOnFourThreadsLeaveTheRemainderToTheLast) {

@@ -201,6 +201,21 @@ TEST(PathTreeForm, EntriesAfterACompleteTreeAreIgnored) {
     EXPECT_EQ(allPaths(tree), Paths{"1/2"});
 }
 
+TEST(PathTreeForm, ReadingForgetsWhatInsertionRemembered) {
+    BPathTree tree;
+    for (int round = 0; round < 4; ++round) {
+        for (std::size_t i = 0; i < 50; ++i)
+            addWhole(tree, {"A", support::numbered("n", i * 3)});
+        EXPECT_EQ(addWhole(tree, {"A", "n147"}).track.size(), 2U);
+        read(tree, {0x03, 0x02, 0x00, 0x00},
+             components({"A", "n3", "n0", "B"}));
+        EXPECT_EQ(addWhole(tree, {"A", "n0"}),
+                  (support::WholeAdded{true, {0, 1}}));
+        EXPECT_EQ(addWhole(tree, {"A", "n147"}),
+                  (support::WholeAdded{false, {0}}));
+    }
+}
+
 // ---- Hostile pairs ----
 
 TEST(PathTreeForm, ACodeOfFourIsUnknown) {

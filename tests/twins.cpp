@@ -147,6 +147,19 @@ TEST(ChildFinder, AFolderOfManyThousandsWithEqualNamesBetween) {
     EXPECT_EQ(finder.indexedChildren(), 0U);
 }
 
+// So many names that some share all the bits of a hash that are kept.
+TEST(ChildFinder, NamesOfEqualHashAreToldApart) {
+    BPathTree tree;
+    constexpr std::size_t count = 400000;
+    for (std::size_t i = 0; i < count; ++i) {
+        Component value = support::littleEndian(i, 4);
+        bool existed = true;
+        tree.addIfExistsAndFind(tree.root->children(), value, existed);
+        ASSERT_FALSE(existed) << i;
+    }
+    EXPECT_EQ(tree.root->children().size(), count);
+}
+
 TEST(ChildFinder, AWideFolderOfFoldersIsBuiltWithoutADuplicate) {
     BPathTree tree;
     for (int round = 0; round < 3; ++round) {
@@ -420,6 +433,20 @@ RC_GTEST_PROP(FolderMemo, EqualsAMap, ()) {
     }
 }
 
+TEST(FolderMemo, FoldersOfEqualHashAreToldApart) {
+    constexpr std::size_t count = 400000;
+    tessel::FolderMemo memo;
+    ComponentPacker packer;
+    BPathTree tree;
+    for (std::size_t i = 0; i < count; ++i) {
+        const auto list =
+            support::packedBy(packer, {support::littleEndian(i, 4)});
+        const auto hash = tessel::FolderMemo::hashOf(list);
+        ASSERT_EQ(memo.find(list, hash), nullptr) << i;
+        memo.add(list, hash, *tree.root, {i});
+    }
+}
+
 // ---- Lookup by number: a merge, step by step ----
 
 // A coder with one folder of many files, and partitions that end anywhere.
@@ -447,6 +474,7 @@ Crafted crafted(const std::vector<std::uint64_t>& ends) {
     }
     Bytes form = both.expected.form().bytes();
     both.coder->deserialize(form, false);
+    both.expected = both.expected.restored();
     return both;
 }
 
@@ -474,6 +502,43 @@ RC_GTEST_PROP(PathLookupTwin, EqualsTheMergeWhereverPartitionsEnd, ()) {
     compareLookup(both, sorted);
     sorted.erase(std::remove(sorted.begin(), sorted.end(), 0), sorted.end());
     compareLookup(both, sorted);
+
+    // A copy, and the coder after one more batch, keep the ends' order.
+    Crafted copied;
+    copied.expected = both.expected;
+    copied.coder->copyTree(*both.coder);
+    compareLookup(copied, sorted);
+    Components folder = {{1, 1}};
+    Components files = {{5, 5}};
+    copied.expected.addPartition(folder, files);
+    copied.coder->addPathToBTree(folder, files);
+    compareLookup(copied, sorted);
+    compareLookup(copied, numbers);
+}
+
+// Two forms read one after the other: the ends begin again.
+RC_GTEST_PROP(PathLookupTwin, EqualsTheMergeAfterASecondForm, ()) {
+    const auto ends = rc::gen::map(
+        rc::gen::nonEmpty(rc::gen::container<std::vector<std::uint64_t>>(
+            rc::gen::inRange<std::uint64_t>(0, 100))),
+        [](std::vector<std::uint64_t> list) {
+            std::sort(list.begin(), list.end());
+            return list;
+        });
+    Crafted both = crafted(*ends);
+    const Crafted second = crafted(*ends);
+    Bytes form = second.expected.form().bytes();
+    both.coder->deserialize(form, false);
+    for (const std::uint64_t end : second.expected.partitionEnds)
+        both.expected.partitionEnds.push_back(end);
+    for (const model::Track& track : second.expected.partitionTracks)
+        both.expected.partitionTracks.push_back(track);
+    auto numbers = *rc::gen::container<std::vector<double>>(
+        rc::gen::map(rc::gen::inRange(1, 110),
+                     [](int n) { return static_cast<double>(n); }));
+    compareLookup(both, numbers);
+    std::sort(numbers.begin(), numbers.end());
+    compareLookup(both, numbers);
 }
 
 RC_GTEST_PROP(PathLookupTwin, EqualsTheMergeInManyPartitions, ()) {

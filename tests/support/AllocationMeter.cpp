@@ -1,6 +1,7 @@
 #include "tests/support/AllocationMeter.hpp"
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <new>
 
@@ -10,10 +11,23 @@ thread_local bool watching = false;
 thread_local std::size_t largestBytes = 0;
 thread_local std::size_t totalBytes = 0;
 
-void note(std::size_t bytes) {
-    if (!watching) return;
-    largestBytes = std::max(largestBytes, bytes);
-    totalBytes += bytes;
+thread_local bool failing = false;
+thread_local std::size_t allocationsLeft = 0;
+thread_local bool failed = false;
+
+// Counts an allocation; false if it is to fail.
+bool allow(std::size_t bytes) {
+    if (watching) {
+        largestBytes = std::max(largestBytes, bytes);
+        totalBytes += bytes;
+    }
+    if (!failing) return true;
+    if (allocationsLeft > 0) {
+        --allocationsLeft;
+        return true;
+    }
+    failed = true;
+    return false;
 }
 
 }  // namespace
@@ -27,24 +41,21 @@ int __real_posix_memalign(void** memory, std::size_t alignment,
                           std::size_t bytes);
 
 void* __wrap_malloc(std::size_t bytes) {
-    note(bytes);
-    return __real_malloc(bytes);
+    return allow(bytes) ? __real_malloc(bytes) : nullptr;
 }
 
 void* __wrap_calloc(std::size_t count, std::size_t bytes) {
-    note(count * bytes);
-    return __real_calloc(count, bytes);
+    return allow(count * bytes) ? __real_calloc(count, bytes) : nullptr;
 }
 
 void* __wrap_realloc(void* memory, std::size_t bytes) {
-    note(bytes);
-    return __real_realloc(memory, bytes);
+    return allow(bytes) ? __real_realloc(memory, bytes) : nullptr;
 }
 
 int __wrap_posix_memalign(void** memory, std::size_t alignment,
                           std::size_t bytes) {
-    note(bytes);
-    return __real_posix_memalign(memory, alignment, bytes);
+    return allow(bytes) ? __real_posix_memalign(memory, alignment, bytes)
+                        : ENOMEM;
 }
 }
 
@@ -71,5 +82,15 @@ AllocationMeter::~AllocationMeter() { watching = false; }
 std::size_t AllocationMeter::largest() const { return largestBytes; }
 
 std::size_t AllocationMeter::total() const { return totalBytes; }
+
+AllocationFailure::AllocationFailure(std::size_t count) {
+    allocationsLeft = count;
+    failed = false;
+    failing = true;
+}
+
+AllocationFailure::~AllocationFailure() { failing = false; }
+
+bool AllocationFailure::happened() const { return failed; }
 
 }  // namespace support

@@ -4,9 +4,11 @@
 
 namespace support {
 
-// Watches what this thread allocates while it exists. Only in programs that
-// are linked with support/AllocationMeter.cpp and wrap malloc, calloc,
-// realloc and posix_memalign.
+// Both classes work only in programs that are linked with
+// support/AllocationMeter.cpp and wrap malloc, calloc, realloc and
+// posix_memalign.
+
+// Watches what this thread allocates while it exists.
 class AllocationMeter {
 public:
     AllocationMeter();
@@ -16,6 +18,18 @@ public:
 
     std::size_t largest() const;  // single allocation, in bytes
     std::size_t total() const;    // of all allocations, in bytes
+};
+
+// While it exists, this thread's allocations fail after the first `count`.
+class AllocationFailure {
+public:
+    explicit AllocationFailure(std::size_t count);
+    ~AllocationFailure();
+    AllocationFailure(const AllocationFailure&) = delete;
+    AllocationFailure& operator=(const AllocationFailure&) = delete;
+
+    // Whether one failed.
+    bool happened() const;
 };
 
 }  // namespace support

@@ -1,0 +1,224 @@
+// What is left behind when memory runs out, at every allocation in turn.
+
+#include <gtest/gtest.h>
+
+#include <new>
+
+#include "tests/support/AllocationMeter.hpp"
+#include "tests/support/Coders.hpp"
+#include "tests/support/Trees.hpp"
+
+namespace {
+
+using support::AllocationFailure;
+using support::Bytes;
+using support::CoderPtr;
+using support::Texts;
+using tessel::Components;
+using tessel::HuffmanPathTree;
+
+// More than any of these operations makes.
+constexpr std::size_t mostAllocations = 5000;
+
+// Calls test(n) with n = 0, 1, 2 and so on: the operation in it has n
+// allocations to spend. Ends when test says that they were enough.
+template <class Test>
+void forEachAllocation(Test test) {
+    std::size_t n = 0;
+    while (n < mostAllocations && !test(n)) ++n;
+    EXPECT_GT(n, 0U) << "nothing was allocated";
+    EXPECT_LT(n, mostAllocations);
+}
+
+// Runs the operation with n allocations to spend. Returns false if it threw
+// std::bad_alloc, which it must only do when one failed.
+template <class Operation>
+bool succeedsWith(std::size_t n, Operation operation) {
+    bool threw = false;
+    bool happened = false;
+    {
+        const AllocationFailure failure(n);
+        try {
+            operation();
+        } catch (const std::bad_alloc&) {
+            threw = true;
+        }
+        happened = failure.happened();
+    }
+    EXPECT_EQ(threw, happened);
+    return !threw;
+}
+
+CoderPtr filledCoder() {
+    CoderPtr coder = support::fourLetterCoder();
+    support::addBatches(*coder, {{u"a", u"b"}, {u"c"}, {u"a", u"b"}},
+                        {{u"a", u"d"}, {u"b"}, {u"c", u"cc"}});
+    support::addWhole(*coder, {u"d", u"a"});
+    support::addWhole(*coder, {u"d", u"a"});
+    return coder;
+}
+
+TEST(MemoryFailures, ABatchLeavesTheFoldersBeforeTheFailureAdded) {
+    const std::vector<Texts> folders = {{u"b", std::u16string(300, u'a')}};
+    forEachAllocation([&](std::size_t n) {
+        const CoderPtr coder = filledCoder();
+        const std::uint64_t before = coder->pathCount;
+        std::vector<Texts> batch = folders;
+        std::vector<Texts> files = {Texts(40, std::u16string(90, u'c'))};
+        const bool added = succeedsWith(
+            n, [&] { coder->generateCodeAsyncAndAddPaths(batch, files, 1); });
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        EXPECT_EQ(coder->pathCount, added ? before + 40 : before);
+        EXPECT_EQ(coder->partitionEnds.size(), added ? 4U : 3U);
+        // No file of the batch is there unless all are.
+        const std::size_t paths = support::iterated(*coder).size();
+        EXPECT_TRUE(paths == before + (added ? 40 : 0) ||
+                    (!added && paths == before + 1))
+            << paths;
+        support::addBatch(*coder, {u"a", u"b"}, {u"dd"});
+        const CoderPtr back = support::restoredFrom(
+            support::formOf(*coder, false), false, *coder);
+        EXPECT_EQ(support::tracksOf(*back), support::tracksOf(*coder));
+        return added;
+    });
+}
+
+TEST(MemoryFailures, ABatchOnWorkersIsRefusedOrAddedInPart) {
+    forEachAllocation([&](std::size_t n) {
+        const CoderPtr coder = filledCoder();
+        std::vector<Texts> folders = {{u"b"}, {u"a"}, {u"b", u"c"}};
+        std::vector<Texts> files(3, Texts{u"a", u"b", u"c", u"d"});
+        const bool added = succeedsWith(
+            n, [&] { coder->generateCodeAsyncAndAddPaths(folders, files, 2); });
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        EXPECT_EQ((coder->pathCount - 7) % 4, 0U);
+        if (added) {
+            EXPECT_EQ(coder->pathCount, 19U);
+        }
+        EXPECT_EQ(coder->partitionEnds.size(), 3 + (coder->pathCount - 7) / 4);
+        support::addBatch(*coder, {u"a", u"b"}, {u"dd"});
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        return added;
+    });
+}
+
+TEST(MemoryFailures, APartitionIsAddedOrNot) {
+    forEachAllocation([](std::size_t n) {
+        const CoderPtr coder = filledCoder();
+        Components folder = {{1}, Bytes(300, 2)};
+        Components files(30, Bytes(100, 3));
+        const bool added =
+            succeedsWith(n, [&] { coder->addPathToBTree(folder, files); });
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        EXPECT_EQ(coder->pathCount, added ? 37U : 7U);
+        EXPECT_EQ(coder->partitionTracks.size(), added ? 4U : 3U);
+        return added;
+    });
+}
+
+TEST(MemoryFailures, AWholePathIsCountedOnlyIfItIsAdded) {
+    for (const Texts& path : {Texts{u"d", u"a"}, Texts{u"d", u"b", u"c"}}) {
+        forEachAllocation([&path](std::size_t n) {
+            const CoderPtr coder = filledCoder();
+            Components components = support::encodedBy(*coder, path);
+            const bool added =
+                succeedsWith(n, [&] { coder->addPathToBTree(components); });
+            EXPECT_EQ(support::brokenInvariant(*coder), "");
+            EXPECT_EQ(coder->pathCount, added ? 8U : 7U);
+            if (!added) {
+                EXPECT_EQ(coder->duplicates.size(), 1U);
+            }
+            support::addWhole(*coder, {u"a"});
+            return added;
+        });
+    }
+}
+
+TEST(MemoryFailures, AFormIsReadOrTheCoderIsAsItWas) {
+    for (const bool compress : {false, true}) {
+        const CoderPtr source = filledCoder();
+        const Bytes form = support::formOf(*source, compress);
+        forEachAllocation([&](std::size_t n) {
+            const CoderPtr coder = support::fourLetterCoder();
+            support::addBatch(*coder, {u"d"}, {u"a", u"b"});
+            const Bytes before = support::formOf(*coder, false);
+            Bytes in = form;
+            const bool read =
+                succeedsWith(n, [&] { coder->deserialize(in, compress); });
+            if (!read) {
+                EXPECT_EQ(support::formOf(*coder, false), before);
+                EXPECT_EQ(coder->pathCount, 2U);
+                EXPECT_EQ(support::iterated(*coder).size(), 2U);
+            } else {
+                EXPECT_EQ(coder->partitionEnds.size(), 4U);
+            }
+            return read;
+        });
+    }
+}
+
+TEST(MemoryFailures, LookupsLeaveTheirOutputsAsTheyWere) {
+    const CoderPtr coder = filledCoder();
+    forEachAllocation([&coder](std::size_t n) {
+        std::vector<Components> folders = {{{1}}};
+        std::vector<Components> files = {{{2}}};
+        const bool found = succeedsWith(n, [&] {
+            coder->getPath(folders, files, {1, 2, 3, 4, 5});
+        });
+        EXPECT_EQ(folders.size(), found ? 4U : 1U);
+        EXPECT_EQ(files.size(), found ? 4U : 1U);
+        return found;
+    });
+}
+
+TEST(MemoryFailures, TraversingLeavesItsOutputAsItWas) {
+    tessel::BPathTree tree;
+    support::addWhole(tree, {"a", "b", "c"});
+    forEachAllocation([&tree](std::size_t n) {
+        Components out = support::components({"before"});
+        const bool found = succeedsWith(n, [&] {
+            tree.traversePath({0, 0, 0}, out);
+        });
+        EXPECT_EQ(out.size(), found ? 4U : 1U);
+        return found;
+    });
+}
+
+TEST(MemoryFailures, DecodingLeavesTheTextAsItWas) {
+    const CoderPtr coder = support::fourLetterCoder();
+    const Bytes bytes = coder->generateCodeFor(std::u16string(500, u'b'));
+    forEachAllocation([&](std::size_t n) {
+        std::u16string text = u"before";
+        const bool decoded =
+            succeedsWith(n, [&] { coder->appendPathFrom(bytes, text); });
+        EXPECT_EQ(text.size(), decoded ? 506U : 6U);
+        return decoded;
+    });
+}
+
+TEST(MemoryFailures, WritingLeavesTheCoderAsItWas) {
+    const CoderPtr coder = filledCoder();
+    const Bytes form = support::formOf(*coder, false);
+    forEachAllocation([&](std::size_t n) {
+        Bytes out;
+        const bool written =
+            succeedsWith(n, [&] { coder->serialize(out, false); });
+        if (written) {
+            EXPECT_EQ(out, form);
+        }
+        return written;
+    });
+    EXPECT_EQ(support::formOf(*coder, false), form);
+}
+
+TEST(MemoryFailures, ReleasingTakesNoMemory) {
+    CoderPtr coder = filledCoder();
+    auto copy = std::make_unique<HuffmanPathTree>();
+    copy->copyTree(*coder);
+    const AllocationFailure none(0);
+    coder.reset();
+    copy.reset();
+    EXPECT_FALSE(none.happened());
+}
+
+}  // namespace
