@@ -132,19 +132,27 @@ private:
         });
     }
 
-    bool isList(const HuffmanPathTree& tested) const {
-        const auto& list = splitter->list();
-        std::size_t i = 0;
+    bool isList(HuffmanPathTree& tested) const {
+        std::size_t fetched = 0;
         bool same = true;
-        std::string path;
-        fetch(tested, numbersFrom(1, list.size()),
+        fetch(tested, numbersFrom(1, splitter->list().size()),
               [&](const std::u16string& text) {
-                  path.clear();
-                  same = same && tessel::paths::textToPath(text, path) &&
-                         path == list[i];
-                  ++i;
+                  same = same && isPath(text, fetched++);
               });
-        return same && i == list.size();
+        const auto order = iterationOrder(tested, *splitter);
+        std::size_t met = 0;
+        bench::iterate(tested, [&](const std::u16string& text) {
+            same = same && met < order.size() && isPath(text, order[met]);
+            ++met;
+        });
+        return same && fetched == order.size() && met == order.size();
+    }
+
+    bool isPath(const std::u16string& text, std::size_t position) const {
+        std::string path;
+        return position < splitter->list().size() &&
+               tessel::paths::textToPath(text, path) &&
+               path == splitter->list()[position];
     }
 
     const PathSplitter* splitter;
