@@ -27,6 +27,6 @@ if(QZTESSEL_SANITIZE)
     list(APPEND sanitizers -fsanitize=float-cast-overflow)
   endif()
   target_compile_options(
-    qztessel_options INTERFACE -O1 -fno-omit-frame-pointer ${sanitizers})
+    qztessel_options INTERFACE -fno-omit-frame-pointer ${sanitizers})
   target_link_options(qztessel_options INTERFACE ${sanitizers})
 endif()
