@@ -65,9 +65,7 @@ public:
     std::unique_ptr<tessel::MessageIdError> clone() const override {
         return std::make_unique<Self>(static_cast<const Self&>(*this));
     }
-    void rethrow() const override {
-        throw static_cast<const Self&>(*this);
-    }
+    void rethrow() const override { throw static_cast<const Self&>(*this); }
 
 protected:
     ErrorOf(std::vector<tessel::HostMessageArgument> messageArguments,

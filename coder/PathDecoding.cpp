@@ -132,6 +132,7 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
     // A character takes at least a bit, and a step is written whole.
     constexpr std::size_t mostAWindow =
         bitsAWindow + DecodeTable::mostCharacters;
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init): written first
     std::array<char16_t, 4 * mostAWindow> decoded;
     char16_t* const flushAt = decoded.data() + decoded.size() - mostAWindow;
     char16_t* out = decoded.data();
