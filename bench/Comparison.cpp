@@ -154,6 +154,7 @@ std::string internalsTable(const Internals& m) {
     table.row({"restore / uncompress", threeDigits(m.restoreToUncompress)});
     table.row({"destroy / build", threeDigits(m.destroyToBuild)});
     table.row({"encoding with 1 worker / with 2", threeDigits(m.twoWorkers)});
+    table.row({"the same in processor time", threeDigits(m.twoWorkersAlone)});
     return table.text();
 }
 

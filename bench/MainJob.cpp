@@ -1,5 +1,7 @@
 #include "bench/MainJob.hpp"
 
+#include <sys/resource.h>
+
 #include <algorithm>
 #include <iostream>
 #include <optional>
@@ -237,6 +239,13 @@ void sizeRow(Table& table, const char* name, std::size_t bytes,
              " B"});
 }
 
+// The most that this process had in memory, the list's text included.
+std::size_t peakResidentBytes() {
+    rusage usage{};
+    ::getrusage(RUSAGE_SELF, &usage);
+    return static_cast<std::size_t>(usage.ru_maxrss) * 1024;
+}
+
 std::string asTable(const Measurements& m) {
     Table table({"", "total", "a path", "paths/s"});
     table.row({"paths", grouped(m.paths)});
@@ -251,6 +260,7 @@ std::string asTable(const Measurements& m) {
     sizeRow(table, "- code", m.memory.code, m.paths);
     sizeRow(table, "- other", m.memory.other, m.paths);
     sizeRow(table, "stored", m.storedBytes, m.paths);
+    sizeRow(table, "peak of the process", peakResidentBytes(), m.paths);
     for (const Step& step : m.steps) {
         const auto paths = static_cast<double>(step.paths);
         table.row({step.name, fixed(step.seconds, 3) + " s",
