@@ -1,0 +1,615 @@
+#include <new>
+#include <optional>
+#include <stdexcept>
+
+#include "tests/host/HostFixture.hpp"
+
+// The embedded host's class system, with a class that the test defines itself.
+namespace tessel::embedded {
+
+namespace {
+
+namespace attr = attributes;
+
+// The native object of the test's class.
+struct Counter {
+    double number = 0;
+    int updates = 0;
+};
+
+// What the class does, chosen by each test.
+struct Behaviour {
+    bool copies = true;
+    bool saves = true;
+    bool hidden = false;
+    bool custom = false;
+    bool failsToDefine = false;
+    std::uint32_t bits = attr::copiedWithInstance | attr::isVisible;
+    HostAccess setAccess = HostAccess::Public;
+    std::string typeName = "double";
+    int made = 0;
+    int destroyed = 0;
+    int released = 0;
+};
+
+class TestMethod : public HostMethodInfo {
+public:
+    using Body = std::function<void(HostFrame&)>;
+    TestMethod(Behaviour& classBehaviour, HostInterface& hostInterface,
+               std::string methodName, HostSignature* heldSignature,
+               Body methodBody)
+        : behaviour(classBehaviour),
+          host(hostInterface),
+          ownName(std::move(methodName)),
+          held(heldSignature),
+          body(std::move(methodBody)) {}
+    ~TestMethod() override {
+        host.hostReleaseSignature(held);
+        ++behaviour.released;
+    }
+
+    const char* name() const noexcept override { return ownName.c_str(); }
+    const HostSignature* signature() const noexcept override { return held; }
+    void execute(HostFrame& frame) override { body(frame); }
+    HostAccess access() const noexcept override { return ownAccess; }
+    bool isStatic() const noexcept override { return callsStatically; }
+    bool isAbstract() const noexcept override { return hasNoBody; }
+    bool isVisible() const noexcept override { return shown; }
+
+    HostAccess ownAccess = HostAccess::Public;
+    bool callsStatically = false;
+    bool hasNoBody = false;
+    bool shown = true;
+
+private:
+    Behaviour& behaviour;
+    HostInterface& host;
+    std::string ownName;
+    HostSignature* held;
+    Body body;
+};
+
+HostArray* getNumber(void* native) {
+    const double number =
+        native == nullptr ? -1 : static_cast<Counter*>(native)->number;
+    return new Value(Value::scalar(number));
+}
+
+void setNumber(void* native, const HostArray* value) {
+    const double number = static_cast<const Value*>(value)->doubleData().at(0);
+    if (number < 0) throw std::range_error("Too small.");
+    static_cast<Counter*>(native)->number = number;
+}
+
+void dispose(HostArray* value) { delete static_cast<Value*>(value); }
+
+class TestClass : public HostClassInfo {
+public:
+    using Define = std::function<void(TestClass&, HostClass*)>;
+    TestClass(Behaviour& classBehaviour, HostInterface& hostInterface,
+              Define defineMethods)
+        : behaviour(classBehaviour),
+          host(hostInterface),
+          define(std::move(defineMethods)) {}
+    ~TestClass() override { ++behaviour.released; }
+
+    const char* className() const noexcept override { return "Counter"; }
+    void defineMembers(HostClass* definedClass) override {
+        define(*this, definedClass);
+        host.hostAddProperty(
+            definedClass, {"Number", "A number", behaviour.typeName.c_str(),
+                           behaviour.bits, HostAccess::Public,
+                           behaviour.setAccess, getNumber, setNumber, dispose});
+        if (behaviour.failsToDefine) throw std::runtime_error("No members.");
+    }
+    void* createNativeObject() override {
+        ++behaviour.made;
+        return new Counter();
+    }
+    void destroyNativeObject(void* native) noexcept override {
+        ++behaviour.destroyed;
+        delete static_cast<Counter*>(native);
+    }
+    void updateInstance(void* native) override {
+        ++static_cast<Counter*>(native)->updates;
+    }
+    bool copiesInstances() const noexcept override { return behaviour.copies; }
+    bool savesInstances() const noexcept override { return behaviour.saves; }
+    bool isHidden() const noexcept override { return behaviour.hidden; }
+    HostArray* customSave(const HostArray* /*instance*/) override {
+        return behaviour.custom ? new Value(Value::text(u"custom")) : nullptr;
+    }
+
+    struct Types {
+        std::vector<const char*> inputs = {};
+        std::vector<const char*> outputs = {};
+        bool optionalTail = false;
+        bool fewerOutputs = false;
+    };
+    TestMethod& addMethod(HostClass* definedClass, const char* name,
+                          const Types& types, TestMethod::Body body) {
+        HostSignature* const signature = host.hostCreateSignature();
+        for (const char* type : types.inputs) {
+            host.hostSignatureAddInput(signature, type, "input");
+        }
+        for (const char* type : types.outputs) {
+            host.hostSignatureAddOutput(signature, type, "output");
+        }
+        if (types.optionalTail) host.hostSignatureMarkOptionalTail(signature);
+        if (types.fewerOutputs) host.hostSignatureMarkOutputs(signature);
+        auto method = std::make_unique<TestMethod>(behaviour, host, name,
+                                                   signature, std::move(body));
+        TestMethod& added = *method;
+        host.hostAddMethod(definedClass, std::move(method));
+        return added;
+    }
+
+private:
+    Behaviour& behaviour;
+    HostInterface& host;
+    Define define;
+};
+
+constexpr const char* counterName = "velox.test.Counter";
+
+class OwnClassTest : public testing::Test {
+protected:
+    void define(const TestClass::Define& methods = [](TestClass&, HostClass*) {
+    }) {
+        host.defineClass(
+            "velox.test",
+            std::make_unique<TestClass>(behaviour, host.operations(), methods));
+    }
+    // A class with one method that only notes that it ran.
+    void defineWithMethod(const TestClass::Types& types) {
+        define([&](TestClass& own, HostClass* definedClass) {
+            own.addMethod(definedClass, "run", types, [&](HostFrame& frame) {
+                ++runs;
+                for (std::int32_t i = 0; i < frame.outputCount; ++i) {
+                    frame.outputs[i] = new Value(Value::scalar(i));
+                }
+            });
+        });
+    }
+    // The same, with this body and no declared inputs.
+    void defineWithBody(const std::vector<const char*>& outputs,
+                        const TestMethod::Body& body) {
+        define([&](TestClass& own, HostClass* definedClass) {
+            own.addMethod(definedClass, "run", {{counterName}, outputs}, body);
+        });
+    }
+    std::string key(const std::function<void()>& action) {
+        const std::string identifier = errorOf(action).identifier();
+        return identifier.substr(identifier.rfind(':') + 1);
+    }
+    std::string keyOfCall(std::int32_t requested, std::size_t inputs,
+                          const Value& input = Value::scalar(1)) {
+        const Value instance = host.construct(counterName);
+        const std::vector<const Value*> list(inputs, &input);
+        return key([&] { host.callWith(requested, instance, "run", list); });
+    }
+    static double number(const Value& value) {
+        return value.doubleData().at(0);
+    }
+
+    Behaviour behaviour;
+    int runs = 0;
+    Host host{testOptions()};
+};
+
+}  // namespace
+
+// --- Registration ------------------------------------------------------------
+
+TEST_F(OwnClassTest, ClassIsRegisteredOnce) {
+    define();
+    EXPECT_EQ(key([&] { define(); }), "classExists");
+    EXPECT_EQ(host.classNames(), (std::vector<std::string>{counterName}));
+}
+
+TEST_F(OwnClassTest, ClassThatFailsToDefineIsForgottenAndReleased) {
+    behaviour.failsToDefine = true;
+    const auto methods = [](TestClass& own, HostClass* definedClass) {
+        own.addMethod(definedClass, "run", {}, [](HostFrame&) {});
+    };
+    EXPECT_THROW(define(methods), std::runtime_error);
+    EXPECT_FALSE(host.hasClass(counterName));
+    EXPECT_EQ(behaviour.released, 2);  // the class and its method
+    behaviour.failsToDefine = false;
+    define(methods);
+    EXPECT_TRUE(host.hasClass(counterName));
+}
+
+TEST_F(OwnClassTest, MembersCanOnlyBeAddedDuringDefinition) {
+    HostClass* kept = nullptr;
+    define([&](TestClass&, HostClass* definedClass) { kept = definedClass; });
+    EXPECT_EQ(key([&] {
+                  host.operations().hostAddProperty(
+                      kept,
+                      {"Late", nullptr, "any", 0, HostAccess::Public,
+                       HostAccess::Public, getNumber, setNumber, dispose});
+              }),
+              "notDefining");
+}
+
+TEST_F(OwnClassTest, HiddenClassIsNotListed) {
+    behaviour.hidden = true;
+    define();
+    EXPECT_TRUE(host.classNames().empty());
+    EXPECT_TRUE(host.isValid(host.construct(counterName)));
+}
+
+TEST_F(OwnClassTest, UnknownNamesAreReported) {
+    define();
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(key([&] { host.construct("velox.test.Nothing"); }),
+              "classMissing");
+    EXPECT_EQ(key([&] { host.call(0, instance, "nothing"); }), "methodMissing");
+    EXPECT_EQ(key([&] { host.get(instance, "Nothing"); }), "propertyMissing");
+    EXPECT_EQ(key([&] { host.call(0, Value::scalar(1), "run"); }),
+              "notAnInstance");
+}
+
+// --- Dispatch ----------------------------------------------------------------
+
+TEST_F(OwnClassTest, CountsMustBeTheDeclaredOnes) {
+    defineWithMethod({{counterName, "any"}, {"any", "any"}});
+    EXPECT_EQ(keyOfCall(3, 2), "tooManyOutputs");
+    EXPECT_EQ(keyOfCall(1, 2), "tooFewOutputs");
+    EXPECT_EQ(keyOfCall(2, 2), "tooManyInputs");
+    EXPECT_EQ(keyOfCall(2, 0), "tooFewInputs");
+    EXPECT_EQ(runs, 0);
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(host.call(2, instance, "run", Value()).size(), 2U);
+    EXPECT_EQ(host.call(0, instance, "run", Value()).size(), 0U);
+    EXPECT_EQ(runs, 2);
+}
+
+TEST_F(OwnClassTest, OptionalTailLeavesCountsToTheMethod) {
+    defineWithMethod({{counterName, "any", "any"}, {"any", "any"}, true});
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(host.call(1, instance, "run").size(), 1U);
+    EXPECT_EQ(host.call(2, instance, "run", Value()).size(), 2U);
+    EXPECT_EQ(keyOfCall(3, 0), "tooManyOutputs");
+    EXPECT_EQ(keyOfCall(1, 3), "tooManyInputs");
+}
+
+TEST_F(OwnClassTest, OutputsMarkAllowsFewerOutputs) {
+    defineWithMethod({{counterName}, {"any", "any"}, false, true});
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(host.call(1, instance, "run").size(), 1U);
+    EXPECT_EQ(keyOfCall(1, 1), "tooManyInputs");
+}
+
+TEST_F(OwnClassTest, DeclaredTypesAreCheckedBeforeTheMethodRuns) {
+    const Value instance = [&] {
+        define([&](TestClass& own, HostClass* definedClass) {
+            for (const char* type : {"char", "cell", "double", "uint8",
+                                     "logical", "struct", counterName, "any"}) {
+                own.addMethod(definedClass, type, {{counterName, type}},
+                              [&](HostFrame&) { ++runs; });
+            }
+        });
+        return host.construct(counterName);
+    }();
+    const std::vector<std::pair<std::string, Value>> values = {
+        {"char", Value::text(u"x")},
+        {"cell", Value::cell({1, 1})},
+        {"double", Value::scalar(1)},
+        {"uint8", Value::byteColumn({1})},
+        {"logical", Value::logical(true)},
+        {"struct", Value::structure()},
+        {counterName, instance}};
+    for (const auto& [type, ignored] : values) {
+        for (const auto& [given, value] : values) {
+            if (type == given) {
+                host.call(0, instance, type, value);
+                continue;
+            }
+            const HostException error = errorOf(
+                [&, &t = type, &v = value] { host.call(0, instance, t, v); });
+            EXPECT_EQ(error.identifier(), "VELOX:embedded:wrongType");
+            EXPECT_EQ(argumentsOf(error),
+                      (std::vector<std::string>{"input", type, given}));
+        }
+        host.call(0, instance, "any", instance);
+    }
+    EXPECT_EQ(runs, 14);
+}
+
+TEST_F(OwnClassTest, ComplexDoubleIsDouble) {
+    defineWithMethod({{counterName, "double"}, {}});
+    const Value instance = host.construct(counterName);
+    host.call(0, instance, "run", Value::complexDoubles({1, 1}, {1, 2}));
+    EXPECT_EQ(runs, 1);
+}
+
+TEST_F(OwnClassTest, UnassignedRequestedOutputIsReportedAndTheRestReleased) {
+    defineWithBody({"any", "any"}, [](HostFrame& frame) {
+        frame.outputs[0] = new Value(Value::scalar(1));
+    });
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(key([&] { host.call(2, instance, "run"); }), "outputNotAssigned");
+}
+
+TEST_F(OwnClassTest, OutputsOfMethodThatThrowsAreReleased) {
+    defineWithBody({"any"}, [](HostFrame& frame) {
+        frame.outputs[0] = new Value(Value::scalar(1));
+        throw std::runtime_error("After all.");
+    });
+    const Value instance = host.construct(counterName);
+    const HostException error = errorOf([&] { host.call(1, instance, "run"); });
+    EXPECT_EQ(argumentsOf(error),
+              (std::vector<std::string>{"run", "After all."}));
+}
+
+TEST_F(OwnClassTest, WhatMethodsThrowBecomesHostErrors) {
+    std::function<void()> action;
+    defineWithBody({}, [&](HostFrame&) { action(); });
+    const Value instance = host.construct(counterName);
+    const auto call = [&] { host.call(0, instance, "run"); };
+    action = [] { throw std::bad_alloc(); };
+    EXPECT_EQ(key(call), "outOfMemory");
+    action = [] { throw 42; };
+    EXPECT_EQ(key(call), "nativeError");
+    action = [&] { host.operations().hostErrorTooFewInputs(); };
+    EXPECT_EQ(key(call), "tooFewInputs");
+}
+
+TEST_F(OwnClassTest, ConstructorThatThrowsLeavesNoInstance) {
+    define([](TestClass& own, HostClass* definedClass) {
+        own.addMethod(definedClass, "Counter", {{}, {counterName}},
+                      [](HostFrame&) { throw std::runtime_error("No."); });
+    });
+    EXPECT_EQ(key([&] { host.construct(counterName); }), "nativeError");
+    EXPECT_EQ(behaviour.made, 1);
+    EXPECT_EQ(behaviour.destroyed, 1);
+}
+
+TEST_F(OwnClassTest, ConstructorFindsItsInstanceInTheFirstOutput) {
+    define([](TestClass& own, HostClass* definedClass) {
+        own.addMethod(
+            definedClass, "Counter", {{"double"}, {counterName}},
+            [](HostFrame& frame) {
+                const auto& made = *static_cast<const Value*>(frame.outputs[0]);
+                setNumber(made.instance(0)->native(), frame.inputs[0]);
+            });
+    });
+    EXPECT_EQ(number(host.get(host.construct(counterName, Value::scalar(7)),
+                              "Number")),
+              7);
+    const Value instance = host.construct(counterName, Value::scalar(7));
+    EXPECT_EQ(key([&] { host.call(1, instance, "Counter", Value::scalar(1)); }),
+              "methodMissing");
+}
+
+TEST_F(OwnClassTest, ClassWithoutConstructorTakesNoInputs) {
+    define();
+    EXPECT_EQ(key([&] { host.construct(counterName, Value()); }),
+              "tooManyInputs");
+}
+
+TEST_F(OwnClassTest, MethodAttributesAreHonoured) {
+    define([&](TestClass& own, HostClass* definedClass) {
+        const auto add = [&](const char* name) -> TestMethod& {
+            return own.addMethod(definedClass, name, {{}, {}, true},
+                                 [&](HostFrame&) { ++runs; });
+        };
+        add("restricted").ownAccess = HostAccess::Restricted;
+        add("static").callsStatically = true;
+        add("abstract").hasNoBody = true;
+        add("invisible").shown = false;
+    });
+    EXPECT_EQ(host.methodNames(counterName),
+              (std::vector<std::string>{"restricted", "static", "abstract"}));
+    const Value instance = host.construct(counterName);
+    const auto called = [&](const char* name) {
+        return key([&] { host.call(0, instance, name); });
+    };
+    EXPECT_EQ(called("restricted"), "methodRestricted");
+    EXPECT_EQ(called("static"), "methodMissing");
+    EXPECT_EQ(called("abstract"), "methodMissing");
+    EXPECT_EQ(runs, 0);
+    host.callStatic(0, counterName, "static", {});
+    EXPECT_EQ(runs, 1);
+}
+
+// --- Instances ---------------------------------------------------------------
+
+TEST_F(OwnClassTest, NativeObjectGoesWithTheLastValue) {
+    define();
+    std::optional<Value> first = host.construct(counterName);
+    std::optional<Value> second = *first;
+    Value cell = Value::cell({1, 1});
+    cell.setElement(0, *second);
+    first.reset();
+    second.reset();
+    EXPECT_EQ(behaviour.destroyed, 0);
+    cell = Value();
+    EXPECT_EQ(behaviour.destroyed, 1);
+    EXPECT_EQ(behaviour.made, 1);
+}
+
+TEST_F(OwnClassTest, DestroyedInstanceIsDestroyedOnce) {
+    define();
+    {
+        const Value instance = host.construct(counterName);
+        host.destroy(instance);
+        EXPECT_EQ(behaviour.destroyed, 1);
+    }
+    EXPECT_EQ(behaviour.destroyed, 1);
+}
+
+// --- Properties --------------------------------------------------------------
+
+TEST_F(OwnClassTest, PublicPropertyIsReadAndWritten) {
+    define();
+    const Value instance = host.construct(counterName);
+    host.set(instance, "Number", Value::scalar(5));
+    EXPECT_EQ(number(host.get(instance, "Number")), 5);
+    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::text(u"5")); }),
+              "wrongType");
+    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::scalar(-1)); }),
+              "nativeError");
+    EXPECT_EQ(number(host.get(instance, "Number")), 5);
+}
+
+TEST_F(OwnClassTest, RestrictedSetterIsRefusedToUsersAllowedToLoadAndCopy) {
+    behaviour.setAccess = HostAccess::Restricted;
+    define();
+    Value saved = Value::structure();
+    saved.setField("Number", Value::scalar(8));
+    const Value loaded = host.load(counterName, saved);
+    EXPECT_EQ(key([&] { host.set(loaded, "Number", Value::scalar(1)); }),
+              "propertyRestricted");
+    EXPECT_EQ(number(host.get(host.copy(loaded), "Number")), 8);
+}
+
+TEST_F(OwnClassTest, OnlyPropertiesCopiedWithTheInstanceAreCopied) {
+    behaviour.bits = attr::isVisible;
+    define();
+    const Value instance = host.construct(counterName);
+    host.set(instance, "Number", Value::scalar(5));
+    EXPECT_EQ(number(host.get(host.copy(instance), "Number")), 0);
+}
+
+class UnsavedProperty : public OwnClassTest,
+                        public testing::WithParamInterface<std::uint32_t> {};
+
+TEST_P(UnsavedProperty, IsNeitherSavedNorLoaded) {
+    behaviour.bits = GetParam();
+    define();
+    EXPECT_TRUE(host.save(host.construct(counterName)).fieldNames().empty());
+    Value saved = Value::structure();
+    saved.setField("Number", Value::scalar(8));
+    const Value loaded = host.load(counterName, saved);
+    EXPECT_EQ(static_cast<Counter*>(loaded.instance(0)->native())->number, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(Bits, UnsavedProperty,
+                         testing::Values(attr::isTransient, attr::isDependent,
+                                         attr::isStatic, attr::isAbstract));
+
+TEST_F(OwnClassTest, AbstractPropertyHasNoValue) {
+    behaviour.bits = attr::isAbstract;
+    define();
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(key([&] { host.get(instance, "Number"); }), "propertyHasNoValue");
+    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::scalar(1)); }),
+              "propertyHasNoValue");
+}
+
+TEST_F(OwnClassTest, StaticPropertyHasNoNativeObject) {
+    behaviour.bits = attr::isStatic;
+    define();
+    EXPECT_EQ(number(host.get(host.construct(counterName), "Number")), -1);
+}
+
+TEST_F(OwnClassTest, InvisiblePropertyIsNotListed) {
+    behaviour.bits = attr::copiedWithInstance;
+    define();
+    EXPECT_TRUE(host.propertyNames(counterName).empty());
+}
+
+TEST_F(OwnClassTest, InspectionShowsPropertiesThatAllowIt) {
+    behaviour.bits = attr::inspectionAllowed;
+    define();
+    const Value shown = host.inspect(host.construct(counterName));
+    EXPECT_EQ(shown.field("Number"), Value::scalar(0));
+}
+
+TEST_F(OwnClassTest, ListenersAreNotifiedWhereAllowed) {
+    behaviour.bits = attr::getListenersAllowed | attr::setListenersAllowed;
+    define();
+    const Value instance = host.construct(counterName);
+    int gets = 0;
+    int sets = 0;
+    host.listen(instance, "Number", ListenerKind::Get, [&] { ++gets; });
+    host.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
+    host.set(instance, "Number", Value::scalar(1));
+    host.get(instance, "Number");
+    host.get(instance, "Number");
+    EXPECT_EQ(gets, 2);
+    EXPECT_EQ(sets, 1);
+}
+
+TEST_F(OwnClassTest, UnchangedValueAbortsTheSetWhereSoMarked) {
+    behaviour.bits = attr::abortSetWhenUnchanged | attr::setListenersAllowed;
+    define();
+    const Value instance = host.construct(counterName);
+    int sets = 0;
+    host.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
+    host.set(instance, "Number", Value::scalar(0));
+    EXPECT_EQ(sets, 0);
+    host.set(instance, "Number", Value::scalar(1));
+    EXPECT_EQ(sets, 1);
+}
+
+TEST_F(OwnClassTest, CopyErrorOnlyWarnsWhereSoMarked) {
+    behaviour.bits = attr::copiedWithInstance | attr::warnOnCopyError;
+    define();
+    const Value instance = host.construct(counterName);
+    static_cast<Counter*>(instance.instance(0)->native())->number = -3;
+    EXPECT_TRUE(host.isValid(host.copy(instance)));
+    EXPECT_EQ(
+        host.copyWarnings(),
+        (std::vector<std::string>{"Number: 'Number' failed: Too small."}));
+}
+
+TEST_F(OwnClassTest, CopyErrorIsRaisedOtherwiseAndLeavesNoInstance) {
+    define();
+    const Value instance = host.construct(counterName);
+    static_cast<Counter*>(instance.instance(0)->native())->number = -3;
+    EXPECT_EQ(key([&] { host.copy(instance); }), "nativeError");
+    EXPECT_EQ(behaviour.made, 2);
+    EXPECT_EQ(behaviour.destroyed, 1);
+}
+
+// --- Class attributes --------------------------------------------------------
+
+TEST_F(OwnClassTest, ClassThatDoesNotCopyOrSaveIsNotCopiedOrSaved) {
+    behaviour.copies = false;
+    behaviour.saves = false;
+    define();
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(key([&] { host.copy(instance); }), "notCopyable");
+    EXPECT_EQ(key([&] { host.save(instance); }), "notSavable");
+    EXPECT_EQ(key([&] { host.load(counterName, Value::structure()); }),
+              "notSavable");
+}
+
+TEST_F(OwnClassTest, CustomSaveReplacesTheHostsOwn) {
+    behaviour.custom = true;
+    define();
+    EXPECT_EQ(host.save(host.construct(counterName)), Value::text(u"custom"));
+}
+
+TEST_F(OwnClassTest, InstanceIsUpdatedAfterLoadAndCopy) {
+    define();
+    const auto updates = [](const Value& instance) {
+        return static_cast<Counter*>(instance.instance(0)->native())->updates;
+    };
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(updates(instance), 0);
+    EXPECT_EQ(updates(host.copy(instance)), 1);
+    EXPECT_EQ(updates(host.load(counterName, host.save(instance))), 1);
+}
+
+TEST_F(OwnClassTest, ExtensionFillsCopiesAndSavedForms) {
+    define();
+    host.extendClass(counterName, {[](Host& own, const Value&) {
+                                       Value made = own.construct(counterName);
+                                       own.set(made, "Number",
+                                               Value::scalar(9));
+                                       return made;
+                                   },
+                                   [](Host&, const Value&, Value& saved) {
+                                       saved.setField("More", Value());
+                                   }});
+    const Value instance = host.construct(counterName);
+    EXPECT_EQ(number(host.get(host.copy(instance), "Number")), 0);
+    EXPECT_EQ(host.save(instance).fieldNames(),
+              (std::vector<std::string>{"Number", "More"}));
+}
+
+}  // namespace tessel::embedded
