@@ -95,6 +95,18 @@ TEST_P(MemoryUsage, OfACoderWithDuplicatesIsTheAllocators) {
     EXPECT_GT(coder->memoryUsage().duplicates, 18000U * 8);
 }
 
+// Paths that were stored and then extended: files became folders.
+TEST_P(MemoryUsage, OfACoderWithLateFoldersIsTheAllocators) {
+    const std::size_t before = allocatedBytes();
+    const CoderPtr coder = filledCoder(GetParam());
+    for (std::size_t i = 0; i < 20000; ++i) {
+        const Texts path = {u"/", u"late", nameOf(i, 7)};
+        support::addWhole(*coder, path);
+        support::addWhole(*coder, {path[0], path[1], path[2], u"file"});
+    }
+    compareAccount(*coder, before);
+}
+
 TEST_P(MemoryUsage, NamesAreTheBytesOfTheComponents) {
     const CoderPtr coder = filledCoder(GetParam());
     std::size_t bytes = 0;

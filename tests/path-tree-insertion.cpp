@@ -302,6 +302,24 @@ TEST(PathTreeInsertion, AddIfExistsAndFindTellsWhatItDid) {
     EXPECT_EQ(childTexts(*tree.root), (Paths{"a", "b"}));
 }
 
+TEST(PathTreeInsertion, AddIfExistsAndFindWorksOnAnyTreesNodes) {
+    const BPathTree tree;
+    for (int round = 0; round < 50; ++round) {
+        BPathTree other;
+        const tessel::ChildList children = other.root->children();
+        for (std::uint64_t i = 0; i < 20; ++i) {
+            bool existed = true;
+            Component value = component(support::numbered("n", i));
+            EXPECT_EQ(tree.addIfExistsAndFind(children, value, existed), i);
+            EXPECT_FALSE(existed);
+            value = component("n0");
+            EXPECT_EQ(tree.addIfExistsAndFind(children, value, existed), 0U);
+            EXPECT_TRUE(existed);
+        }
+    }
+    EXPECT_TRUE(tree.root->isLeaf());
+}
+
 // ---- Copies ----
 
 TEST(PathTreeInsertion, APathAddedThroughACopyIsSeenByTheSource) {

@@ -89,7 +89,7 @@ RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
         BPathTree& used = step % 3 == 0 ? copy : tree;
         if (step % 11 == 0) used.releaseFinder();
         if (step % 13 == 0) used.reset();
-        Component value = nameOf(step / 16, kinds);
+        const Component value = nameOf(step / 16, kinds);
         if (step % 5 == 0) {  // appended unseen, equal ones too
             Components files = {value, {}, value};
             Components none;
@@ -101,11 +101,12 @@ RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
         const std::size_t before = tree.root->children().size();
         const std::uint64_t expected =
             tree.findNode(value, tree.root->children());
-        bool existed = false;
-        const std::uint64_t position =
-            used.addIfExistsAndFind(tree.root->children(), value, existed);
+        Components path = {value};
+        PathTrack track;
+        const bool existed = used.addPath(path, track);
         RC_ASSERT(existed == (expected != BPathTree::allOnes));
-        RC_ASSERT(position == (existed ? expected : before));
+        RC_ASSERT(track == (existed ? PathTrack{expected} : PathTrack{}));
+        RC_ASSERT(tree.root->children().size() == before + (existed ? 0 : 1));
     }
 }
 
@@ -152,10 +153,9 @@ TEST(ChildFinder, NamesOfEqualHashAreToldApart) {
     BPathTree tree;
     constexpr std::size_t count = 400000;
     for (std::size_t i = 0; i < count; ++i) {
-        Component value = support::littleEndian(i, 4);
-        bool existed = true;
-        tree.addIfExistsAndFind(tree.root->children(), value, existed);
-        ASSERT_FALSE(existed) << i;
+        Components path = {support::littleEndian(i, 4)};
+        PathTrack track;
+        ASSERT_FALSE(tree.addPath(path, track)) << i;
     }
     EXPECT_EQ(tree.root->children().size(), count);
 }

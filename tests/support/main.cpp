@@ -5,10 +5,13 @@
 
 #include <cstdlib>
 #include <iostream>
+#include <string>
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
-    setenv("RC_PARAMS", "seed=20230610 max_success=100", 0);
+    const std::string usual =
+        "seed=20230610 max_success=" + std::to_string(QZTESSEL_PROPERTY_RUNS);
+    setenv("RC_PARAMS", usual.c_str(), 0);
     std::cerr << "RC_PARAMS=\"" << std::getenv("RC_PARAMS") << "\"\n";
     return RUN_ALL_TESTS();
 }
