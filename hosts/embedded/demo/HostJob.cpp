@@ -1,0 +1,241 @@
+#include "hosts/embedded/demo/HostJob.hpp"
+
+#include <malloc.h>
+
+#include <algorithm>
+#include <chrono>
+#include <limits>
+#include <numeric>
+#include <utility>
+
+#include "hosts/embedded/FilesetClass.hpp"
+
+namespace tessel::embedded {
+
+namespace {
+
+constexpr std::size_t pathsPerBatch = 20'000;
+constexpr std::size_t numbersAtOnce = 50'000;
+
+Value cellOf(const std::vector<std::u16string>& texts) {
+    std::vector<Value> elements;
+    elements.reserve(texts.size());
+    for (const std::u16string& text : texts) {
+        elements.push_back(Value::text(text));
+    }
+    return Value::cellColumn(std::move(elements));
+}
+
+Value cellOfCells(const paths::FolderTexts& lists) {
+    std::vector<Value> elements;
+    elements.reserve(lists.size());
+    for (const auto& texts : lists) elements.push_back(cellOf(texts));
+    return Value::cellColumn(std::move(elements));
+}
+
+std::vector<std::u16string> textsOf(const Value& cell) {
+    std::vector<std::u16string> texts;
+    for (std::size_t i = 0; i < cell.numel(); ++i) {
+        texts.push_back(cell.element(i).charData());
+    }
+    return texts;
+}
+
+// Components with the file's name last, joined.
+std::u16string joinedText(std::vector<std::u16string> components) {
+    const std::u16string file = std::move(components.back());
+    components.pop_back();
+    std::u16string text;
+    paths::appendFolder(components, text);
+    return text + file;
+}
+
+std::string toPath(std::u16string_view joined) {
+    std::string path;
+    if (!paths::textToPath(joined, path)) path = "(the text of no path)";
+    return path;
+}
+
+std::size_t heapBytes() {
+    const struct mallinfo2 info = mallinfo2();
+    return info.uordblks + info.hblkhd;
+}
+
+}  // namespace
+
+HostJob::HostJob(Host& jobHost, const paths::PathList& pathList)
+    : host(jobHost), list(pathList), splitter(pathList) {}
+
+JobResults HostJob::run() {
+    results = {};
+    results.paths = list.size();
+    results.keptApart = splitter.keptApartCount();
+    results.textBytes = list.textBytes();
+
+    const std::size_t heapBefore = heapBytes();
+    const Value instance = makeInstance();
+    addPaths(instance);
+    results.instanceBytes = heapBytes() - heapBefore;
+    readInEveryWay(instance);
+
+    const Value rebuilt = rebuild(instance);
+    iterate(rebuilt, "iterate the rebuilt one");
+    Value copied;
+    step("copy", [&] { copied = host.copy(rebuilt); });
+    host.destroy(rebuilt);
+    fetchJoined(copied, "fetch from the copy");
+    Value saved;
+    step("save", [&] { saved = host.save(copied); });
+    Value loaded;
+    step("load", [&] { loaded = host.load(filesetClassName, saved); });
+    fetchParts(loaded, "fetch from the loaded one");
+    return results;
+}
+
+void HostJob::step(const std::string& name,
+                   const std::function<void()>& action) {
+    using Clock = std::chrono::steady_clock;
+    const Clock::time_point begin = Clock::now();
+    action();
+    const std::chrono::duration<double> taken = Clock::now() - begin;
+    results.steps.push_back({name, taken.count(), list.size()});
+}
+
+// In mode "files": folders first, then as many cells of file names. A list of
+// one character alone gets a second one to count, so that there is a code.
+Value HostJob::makeInstance() {
+    paths::BatchReader reader(splitter,
+                              std::numeric_limits<std::size_t>::max());
+    paths::Batch all;
+    reader.next(all);
+    if (paths::countCharacters(all.folders, all.files).characters.size() == 1) {
+        all.files.back().push_back({paths::noRoot});
+    }
+    std::vector<Value> elements;
+    elements.reserve(2 * all.folders.size());
+    for (const auto& folder : all.folders) elements.push_back(cellOf(folder));
+    for (const auto& files : all.files) elements.push_back(cellOf(files));
+    all = {};
+    const Value foldersAndFiles = Value::cellColumn(std::move(elements));
+    Value instance;
+    step("make, mode files", [&] {
+        instance = host.construct(filesetClassName, Value::text(u"files"),
+                                  foldersAndFiles);
+    });
+    return instance;
+}
+
+void HostJob::addPaths(const Value& instance) {
+    step("add, in batches", [&] {
+        paths::BatchReader reader(splitter, pathsPerBatch);
+        paths::Batch batch;
+        while (reader.next(batch)) {
+            host.call(0, instance, "addPaths", cellOfCells(batch.folders),
+                      cellOfCells(batch.files));
+        }
+    });
+}
+
+void HostJob::readInEveryWay(const Value& instance) {
+    iterate(instance, "iterate");
+    fetchJoined(instance, "fetch, with separator");
+    fetchParts(instance, "fetch, in parts");
+}
+
+// Through the outputs of serialize and the property Frequencies.
+Value HostJob::rebuild(const Value& instance) {
+    std::vector<Value> outputs;
+    step("serialize", [&] { outputs = host.call(2, instance, "serialize"); });
+    const Value frequencies = host.get(instance, "Frequencies");
+    results.storedBytes = outputs[1].numel() +
+                          outputs[0].numel() * sizeof(char16_t) +
+                          frequencies.numel() * sizeof(double);
+    Value rebuilt;
+    step("rebuild, mode tree", [&] {
+        rebuilt = host.construct(filesetClassName, Value::text(u"tree"),
+                                 outputs[0], outputs[1], frequencies);
+    });
+    return rebuilt;
+}
+
+// The order of iteration is the tree's own, so both sides are sorted.
+void HostJob::iterate(const Value& instance, const std::string& name) {
+    std::vector<std::string> iterated;
+    step(name, [&] {
+        iterated.clear();
+        iterated.reserve(list.size());
+        host.call(0, instance, "reset");
+        while (host.call(1, instance, "hasNextPath")[0].truth(0)) {
+            const Value path = host.call(1, instance, "getNextPath")[0];
+            iterated.push_back(toPath(joinedText(textsOf(path))));
+        }
+    });
+    std::sort(iterated.begin(), iterated.end());
+    std::vector<std::size_t> order(list.size());
+    std::iota(order.begin(), order.end(), std::size_t{0});
+    std::sort(order.begin(), order.end(),
+              [&](std::size_t a, std::size_t b) { return list[a] < list[b]; });
+    if (iterated.size() != order.size()) {
+        throw DifferenceException(
+            name + ": " + std::to_string(iterated.size()) +
+            " paths instead of " + std::to_string(order.size()));
+    }
+    for (std::size_t i = 0; i < order.size(); ++i) {
+        if (iterated[i] == list[order[i]]) continue;
+        throw DifferenceException(name + ": " + std::string(list[order[i]]) +
+                                  "\nis missing before\n" + iterated[i]);
+    }
+}
+
+void HostJob::fetchJoined(const Value& instance, const std::string& name) {
+    const Value separator = Value::text(u"/");
+    step(name, [&] {
+        forNumbers([&](const Value& numbers, std::size_t first) {
+            const Value fetched =
+                host.call(1, instance, "getPaths", numbers, separator)[0];
+            for (std::size_t i = 0; i < fetched.numel(); ++i) {
+                compareInOrder(first + i, fetched.element(i).charData(), name);
+            }
+        });
+    });
+}
+
+void HostJob::fetchParts(const Value& instance, const std::string& name) {
+    step(name, [&] {
+        forNumbers([&](const Value& numbers, std::size_t first) {
+            const std::vector<Value> parts =
+                host.call(2, instance, "getPaths", numbers);
+            for (std::size_t i = 0; i < parts[0].numel(); ++i) {
+                std::u16string folder;
+                paths::appendFolder(textsOf(parts[0].element(i)), folder);
+                for (const auto& file : textsOf(parts[1].element(i))) {
+                    compareInOrder(first++, folder + file, name);
+                }
+            }
+        });
+    });
+}
+
+void HostJob::forNumbers(
+    const std::function<void(const Value&, std::size_t)>& visit) const {
+    for (std::size_t first = 1; first <= list.size(); first += numbersAtOnce) {
+        std::vector<double> numbers(
+            std::min(numbersAtOnce, list.size() - first + 1));
+        std::iota(numbers.begin(), numbers.end(), static_cast<double>(first));
+        visit(Value::column(std::move(numbers)), first);
+    }
+}
+
+// The path of a number, counted from 1.
+void HostJob::compareInOrder(std::size_t number, std::u16string_view joined,
+                             const std::string& route) const {
+    const std::string path = toPath(joined);
+    if (number <= list.size() && path == list[number - 1]) return;
+    throw DifferenceException(
+        route + ": path " + std::to_string(number) + " should be\n" +
+        std::string(number <= list.size() ? list[number - 1]
+                                          : "(behind the last)") +
+        "\nand is\n" + path);
+}
+
+}  // namespace tessel::embedded
