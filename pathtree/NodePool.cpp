@@ -30,16 +30,25 @@ constexpr std::size_t roundUp(std::size_t n, std::size_t unit) {
     return (n + unit - 1) / unit * unit;
 }
 
-// Child lists of nodes that were made as leaves, by the node's address.
-struct LateChildren {
-    std::mutex access;  // nodes may be released on several threads
-    std::unordered_map<const BNode*, ChildBlock*> lists;
-};
-
 std::size_t allocatedBytes(void* memory) noexcept {
     return memory == nullptr ? 0
                              : malloc_usable_size(memory) + sizeof(std::size_t);
 }
+
+// Child lists of nodes that were made as leaves, by the node's address.
+struct LateChildren {
+    std::mutex access;  // nodes may be released on several threads
+    std::unordered_map<const BNode*, ChildBlock*> lists;
+
+    // What the allocator gave out for this, but not for the lists.
+    std::size_t bytes() noexcept {
+        // The map chains nodes of a link and its value, of 24 bytes, for
+        // which the allocator takes 32.
+        constexpr std::size_t mapNode = 32;
+        return allocatedBytes(this) + lists.size() * mapNode +
+               lists.bucket_count() * sizeof(void*) + sizeof(std::size_t);
+    }
+};
 
 }  // namespace
 
@@ -90,7 +99,10 @@ public:
         late->lists.erase(node);
     }
 
-    std::size_t bytes() noexcept { return allocatedBytes(this); }
+    // What the allocator gave out for the slab and the lists that it keeps.
+    std::size_t bytes() noexcept {
+        return allocatedBytes(this) + (late == nullptr ? 0 : late->bytes());
+    }
 
 private:
     explicit NodeSlab(std::size_t bytes) noexcept : size(bytes) {}
