@@ -4,10 +4,12 @@
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 #include <memory>
 #include <ostream>
+#include <random>
 
 #include "tests/support/Coders.hpp"
 #include "tests/support/Generators.hpp"
@@ -394,6 +396,57 @@ RC_GTEST_PROP(Histories, TheFormDoesNotDependOnTheNumberOfThreads, ()) {
         const Bytes form = support::formOf(*coder, false);
         if (first.empty()) first = form;
         RC_ASSERT(form == first);
+    }
+}
+
+// One long history: wide folders, many partitions, every width of a field
+// that fits in memory.
+void playLongHistory() {
+    std::mt19937_64 random(20230610);
+    const auto below = [&random](std::uint64_t n) { return random() % n; };
+    const auto name = [&](std::uint64_t kinds) {
+        std::u16string text;
+        for (std::uint64_t n = below(kinds) + 1; n > 0; n /= alphabet.size())
+            text.push_back(alphabet[n % alphabet.size()]);
+        return text;
+    };
+    const auto names = [&](std::uint64_t count, std::uint64_t kinds) {
+        Texts texts;
+        while (texts.size() < count) texts.push_back(name(kinds));
+        return texts;
+    };
+    Play play(alphabet, {40, 30, 9, 5, 3, 1, 1});
+    for (int round = 0; round < 60; ++round) {
+        Step batch;
+        for (int i = 0; i < 40; ++i) {
+            batch.folders.push_back(names(1 + below(3), 700));
+            batch.files.push_back(names(below(12), 100000));
+        }
+        batch.number = static_cast<unsigned>(below(1000));
+        play.step(batch);
+        Step fetch;
+        fetch.kind = Kind::fetch;
+        fetch.number = 1;
+        for (int i = 0; i < 200; ++i)
+            fetch.numbers.emplace_back(9, below(1000000));
+        play.step(fetch);
+        Step whole;
+        whole.kind = Kind::whole;
+        whole.folders.push_back(names(2, 20));
+        play.step(whole);
+        Step restore;
+        restore.kind = Kind::restore;
+        restore.number = 1;
+        if (round % 20 == 19) play.step(restore);
+    }
+    play.compareAll();
+}
+
+TEST(Histories, OfManyThousandPathsGiveTheModelsAnswers) {
+    try {
+        playLongHistory();
+    } catch (const rc::detail::CaseResult& failure) {
+        FAIL() << failure.description;
     }
 }
 

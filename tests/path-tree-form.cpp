@@ -201,18 +201,30 @@ TEST(PathTreeForm, EntriesAfterACompleteTreeAreIgnored) {
     EXPECT_EQ(allPaths(tree), Paths{"1/2"});
 }
 
+// Nodes of the tree that was read can stand where nodes of the old tree
+// stood, which the insertions of old have searched.
 TEST(PathTreeForm, ReadingForgetsWhatInsertionRemembered) {
+    constexpr std::size_t folders = 2000;
+    constexpr std::size_t filesEach = 12;
+    const auto fill = [](BPathTree& tree, const char* name) {
+        for (std::size_t i = 0; i < folders * filesEach; ++i)
+            addWhole(tree, {support::numbered("d", i % folders),
+                            support::numbered(name, i / folders)});
+    };
+    BPathTree source;
+    fill(source, "new");
+    const Stored form = stored(source);
     BPathTree tree;
-    for (int round = 0; round < 4; ++round) {
-        for (std::size_t i = 0; i < 50; ++i)
-            addWhole(tree, {"A", support::numbered("n", i * 3)});
-        EXPECT_EQ(addWhole(tree, {"A", "n147"}).track.size(), 2U);
-        read(tree, {0x03, 0x02, 0x00, 0x00},
-             components({"A", "n3", "n0", "B"}));
-        EXPECT_EQ(addWhole(tree, {"A", "n0"}),
-                  (support::WholeAdded{true, {0, 1}}));
-        EXPECT_EQ(addWhole(tree, {"A", "n147"}),
-                  (support::WholeAdded{false, {0}}));
+    for (int round = 0; round < 3; ++round) {
+        fill(tree, "old");
+        read(tree, form.structure, form.values);
+        for (std::size_t i = 0; i < folders; ++i) {
+            const std::string folder = support::numbered("d", i);
+            ASSERT_EQ(addWhole(tree, {folder, "new11"}),
+                      (support::WholeAdded{true, {i, 11}}));
+            ASSERT_EQ(addWhole(tree, {folder, "old3"}),
+                      (support::WholeAdded{false, {i}}));
+        }
     }
 }
 
