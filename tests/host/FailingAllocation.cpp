@@ -10,12 +10,17 @@ namespace {
 std::atomic<long> countdown{0};  // to the failure; 0 or less: none to come
 std::atomic<unsigned long> asked{0};
 
-void* allocate(std::size_t size) {
+void* allocate(std::size_t size, std::size_t alignment) {
     asked += size;
     if (countdown > 0 && --countdown == 0) throw std::bad_alloc();
-    void* const memory = std::malloc(size == 0 ? 1 : size);
+    const std::size_t rounded = (size / alignment + 1) * alignment;
+    void* const memory = std::aligned_alloc(alignment, rounded);
     if (memory == nullptr) throw std::bad_alloc();
     return memory;
+}
+
+void* allocate(std::size_t size) {
+    return allocate(size, alignof(std::max_align_t));
 }
 
 }  // namespace
@@ -29,13 +34,34 @@ unsigned long bytesAsked() { return asked; }
 
 }  // namespace failing
 
+// All forms that this program, its modules and their libraries use.
 void* operator new(std::size_t size) { return allocate(size); }
+void* operator new(std::size_t size, std::align_val_t alignment) {
+    return allocate(size, static_cast<std::size_t>(alignment));
+}
+void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+    try {
+        return allocate(size);
+    } catch (const std::bad_alloc&) {
+        return nullptr;
+    }
+}
 void* operator new[](std::size_t size) { return allocate(size); }
 void operator delete(void* memory) noexcept { std::free(memory); }
-void operator delete[](void* memory) noexcept { std::free(memory); }
+void operator delete(void* memory, const std::nothrow_t& /*tag*/) noexcept {
+    std::free(memory);
+}
 void operator delete(void* memory, std::size_t /*size*/) noexcept {
     std::free(memory);
 }
+void operator delete(void* memory, std::align_val_t /*alignment*/) noexcept {
+    std::free(memory);
+}
+void operator delete(void* memory, std::size_t /*size*/,
+                     std::align_val_t /*alignment*/) noexcept {
+    std::free(memory);
+}
+void operator delete[](void* memory) noexcept { std::free(memory); }
 void operator delete[](void* memory, std::size_t /*size*/) noexcept {
     std::free(memory);
 }
