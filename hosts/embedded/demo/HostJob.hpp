@@ -56,7 +56,7 @@ private:
     void fetchJoined(const Value& instance, const std::string& name);
     void fetchParts(const Value& instance, const std::string& name);
 
-    void compareInOrder(std::size_t position, std::u16string_view joined,
+    void compareInOrder(std::size_t number, std::u16string_view joined,
                         const std::string& route) const;
     // Calls visit(numbers, first number) for all path numbers, some at a time.
     void forNumbers(
