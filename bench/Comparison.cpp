@@ -166,9 +166,7 @@ Json seriesJson(const std::vector<Series>& all) {
         Json ratios;
         for (const Operation operation : operations) {
             if (one.of(operation).empty()) continue;
-            ratios.number(
-                keyOf(operation),
-                medianRatio(one.of(operation), all.front().of(operation)));
+            ratios.number(keyOf(operation), one.times(all.front(), operation));
         }
         subject.object("timesTheLibrarys", ratios);
         subjects.push_back(subject);
@@ -188,6 +186,8 @@ std::vector<SubjectPtr> allSubjects(const PathSplitter& splitter) {
     return subjects;
 }
 
+constexpr std::size_t yardstickPaths = 70'000;
+
 PathList headOf(const PathList& list, std::size_t count) {
     PathList head;
     for (std::size_t i = 0; i < count; ++i) head.append(list[i]);
@@ -203,13 +203,6 @@ Plan planFor(std::size_t paths, int runs) {
     plan.runs = runs == 1 ? 1 : std::max(runs, more);
     plan.storeRuns = paths > 1'000'000 ? 1 : plan.runs;
     return plan;
-}
-
-std::vector<Series> measureLibrary(const PathList& list, const Plan& plan) {
-    const PathSplitter splitter(list);
-    std::vector<SubjectPtr> subjects;
-    subjects.push_back(makeLibrary(splitter));
-    return measure(subjects, list.size(), plan);
 }
 
 std::vector<std::string> figureHeads(std::string first) {
@@ -241,7 +234,7 @@ void compareRivals(const std::string& listName, const Options& options) {
     Plan plan;
     plan.runs = plan.storeRuns = options.runs;
     auto subjects = allSubjects(splitter);
-    const auto all = measure(subjects, list.size(), plan);
+    const auto all = measure(subjects, plan);
     std::cout << rivalsTable(all) << '\n' << std::flush;
     const Internals internals = measureInternals(splitter, options.runs);
     std::cout << internalsTable(internals) << '\n' << std::flush;
@@ -266,10 +259,14 @@ void compareRivals(const std::string& listName, const Options& options) {
 void measureGrowth(const std::string& listName, const Options& options) {
     const PathList whole = readList(listName);
     describe(whole, listName);
+    // Measured beside every longer list, for ratios within a run.
+    const PathList yardstick =
+        headOf(whole, std::min(whole.size(), yardstickPaths));
+    const PathSplitter yardstickSplitter(yardstick);
     Table table(figureHeads("paths, subject"));
     std::vector<Json> points;
     for (const std::size_t wanted :
-         {std::size_t{1'000}, std::size_t{7'000}, std::size_t{70'000},
+         {std::size_t{1'000}, std::size_t{7'000}, yardstickPaths,
           std::size_t{300'000}, std::size_t{1'000'000}, std::size_t{3'000'000},
           std::size_t{7'000'000}}) {
         if (wanted > whole.size()) break;
@@ -278,12 +275,15 @@ void measureGrowth(const std::string& listName, const Options& options) {
         std::vector<SubjectPtr> subjects;
         subjects.push_back(makeLibrary(splitter));
         subjects.push_back(makeStringVector(list));
+        if (wanted > yardstick.size()) {
+            subjects.push_back(makeLibrary(yardstickSplitter));
+        }
         if (auto marisa = makeMarisa(list)) {
             subjects.push_back(std::move(marisa));
         }
-        const auto all =
-            measure(subjects, list.size(), planFor(wanted, options.runs));
-        for (const Series& one : all) {
+        auto all = measure(subjects, planFor(wanted, options.runs));
+        for (Series& one : all) {
+            if (one.paths != wanted) one.name = "(70,000 " + one.name + ")";
             table.row(figures(grouped(wanted) + " " + one.name, one));
         }
         std::cerr << grouped(wanted) << " paths measured\n";
@@ -311,7 +311,7 @@ void compareOrder(const std::string& sortedName,
     subjects.push_back(makeLibrary(sortedSplitter));
     subjects.push_back(makeLibrary(shuffledSplitter));
     Plan plan = planFor(sorted.size(), options.runs);
-    auto all = measure(subjects, sorted.size(), plan);
+    auto all = measure(subjects, plan);
     all[0].name = "sorted";
     all[1].name = "shuffled";
     std::cout << rivalsTable(all);
@@ -358,25 +358,36 @@ void measureShapes(const Options& options) {
         std::string name;
         PathList list;
     };
-    std::vector<Shape> shapes;
-    shapes.push_back({"fewSiblings", "2,000 sibling folders", siblings(2'000)});
-    shapes.push_back(
+    // Shapes of one group are compared, so they are measured together.
+    std::vector<std::vector<Shape>> groups(3);
+    groups[0].push_back(
+        {"fewSiblings", "2,000 sibling folders", siblings(2'000)});
+    groups[0].push_back(
         {"manySiblings", "200,000 sibling folders", siblings(200'000)});
-    shapes.push_back(
+    groups[1].push_back(
         {"oneFolder", "5,000,000 files in a folder", oneFolder(5'000'000)});
-    shapes.push_back({"chains", "500 chains of 200 folders", chains(500, 200)});
+    groups[2].push_back(
+        {"chains", "500 chains of 200 folders", chains(500, 200)});
     Table table(figureHeads("a path of"));
     Json all;
-    for (const Shape& shape : shapes) {
-        const auto series = measureLibrary(
-            shape.list, planFor(shape.list.size(), options.runs));
-        table.row(figures(shape.name, series.front()));
-        all.object(shape.key, series.front().json());
-        std::cerr << shape.name << " measured\n";
+    for (const auto& group : groups) {
+        std::vector<PathSplitter> splitters;
+        std::vector<SubjectPtr> subjects;
+        splitters.reserve(group.size());
+        subjects.reserve(group.size());
+        for (const Shape& shape : group) {
+            subjects.push_back(makeLibrary(splitters.emplace_back(shape.list)));
+        }
+        const auto series =
+            measure(subjects, planFor(group.back().list.size(), options.runs));
+        for (std::size_t i = 0; i < group.size(); ++i) {
+            table.row(figures(group[i].name, series[i]));
+            all.object(group[i].key, series[i].json());
+            std::cerr << group[i].name << " measured\n";
+        }
     }
     std::cout << table.text();
-    Json json;
-    finish(options, json.object("shapes", all));
+    finish(options, Json().object("shapes", all));
 }
 
 }  // namespace bench

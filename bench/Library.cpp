@@ -36,6 +36,7 @@ public:
         : splitter(&pathSplitter) {}
 
     std::string name() const override { return "qztessel"; }
+    std::size_t paths() const override { return splitter->list().size(); }
 
     // Counts, makes the code, encodes and inserts; the lists of UTF-16
     // strings are there before. They are released while they are added.

@@ -20,6 +20,7 @@ public:
     explicit Marisa(const PathList& paths) : list(&paths) {}
 
     std::string name() const override { return "marisa-trie"; }
+    std::size_t paths() const override { return list->size(); }
 
     // From a keyset, which is there before.
     double build() override {

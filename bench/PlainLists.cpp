@@ -39,6 +39,7 @@ public:
     explicit Plain(const PathList& paths) : list(&paths) {}
 
     std::string name() const override { return Container::name(); }
+    std::size_t paths() const override { return list->size(); }
 
     double build() override {
         return secondsOf([&] {

@@ -127,8 +127,13 @@ Json& Json::list(std::string_view name, const std::vector<Json>& values) {
 std::vector<std::pair<std::string, std::string>> machineFacts() {
     utsname system{};
     ::uname(&system);
+#ifdef __clang__
+    const std::string compiler = __VERSION__;
+#else
+    const std::string compiler = "g++ " __VERSION__;
+#endif
     return {
-        {"compiler", __VERSION__},
+        {"compiler", compiler},
         {"processor", processorName()},
         {"cores", std::to_string(std::thread::hardware_concurrency())},
         {"system", std::string(&system.sysname[0]) + " " + &system.machine[0]}};

@@ -22,15 +22,12 @@ void require(bool verified, const Subject& subject) {
 // One measurement of several subjects.
 class Measurement {
 public:
-    Measurement(std::vector<SubjectPtr>& measured, std::size_t pathCount,
-                const Plan& plannedRuns)
-        : subjects(&measured),
-          plan(plannedRuns),
-          numbers(randomNumbers(plannedRuns.fetches, pathCount)) {
+    Measurement(std::vector<SubjectPtr>& measured, const Plan& plannedRuns)
+        : subjects(&measured), plan(plannedRuns) {
         for (const SubjectPtr& subject : measured) {
             Series& one = series.emplace_back();
             one.name = subject->name();
-            one.paths = pathCount;
+            one.paths = subject->paths();
             one.fetches = plan.fetches;
         }
     }
@@ -58,8 +55,9 @@ private:
         }
         each(Operation::Iterate, [](Subject& s) { return s.iterate(); });
         each(Operation::FetchAll, [](Subject& s) { return s.fetchAll(); });
-        each(Operation::FetchRandom,
-             [&](Subject& s) { return s.fetchRandom(numbers); });
+        each(Operation::FetchRandom, [&](Subject& s) {
+            return s.fetchRandom(randomNumbers(plan.fetches, s.paths()));
+        });
         if (stores) storeAll(isFirst);
         each(Operation::Destroy, [](Subject& s) { return s.destroy(); });
     }
@@ -92,7 +90,6 @@ private:
 
     std::vector<SubjectPtr>* subjects;
     Plan plan;
-    std::vector<double> numbers;
     std::vector<Series> series;
 };
 
@@ -112,10 +109,22 @@ const char* keyOf(Operation operation) {
     return keys[static_cast<std::size_t>(operation)];
 }
 
-double Series::nanoseconds(Operation operation) const {
+std::vector<double> Series::runs(Operation operation) const {
     const std::size_t count =
         operation == Operation::FetchRandom ? fetches : paths;
-    return median(of(operation)) * 1e9 / static_cast<double>(count);
+    std::vector<double> nanoseconds = of(operation);
+    for (double& value : nanoseconds) {
+        value *= 1e9 / static_cast<double>(count);
+    }
+    return nanoseconds;
+}
+
+double Series::nanoseconds(Operation operation) const {
+    return median(runs(operation));
+}
+
+double Series::times(const Series& other, Operation operation) const {
+    return medianRatio(runs(operation), other.runs(operation));
 }
 
 double Series::memoryPerPath() const {
@@ -142,8 +151,8 @@ Json Series::json() const {
 }
 
 std::vector<Series> measure(std::vector<SubjectPtr>& subjects,
-                            std::size_t paths, const Plan& plan) {
-    return Measurement(subjects, paths, plan).result();
+                            const Plan& plan) {
+    return Measurement(subjects, plan).result();
 }
 
 }  // namespace bench

@@ -36,8 +36,12 @@ struct Series {
     const std::vector<double>& of(Operation operation) const {
         return seconds[static_cast<std::size_t>(operation)];
     }
-    // The median, in nanoseconds a path.
+    // Of one operation in every run, in nanoseconds a path.
+    std::vector<double> runs(Operation operation) const;
+    // Their median.
     double nanoseconds(Operation operation) const;
+    // The median of how many times another series' it is in the same run.
+    double times(const Series& other, Operation operation) const;
     double memoryPerPath() const;
     double storedPerPath() const;
     Json json() const;
@@ -55,6 +59,6 @@ struct Plan {
 // each answer is verified before anything is timed. Throws
 // std::runtime_error if a subject does not give its list back.
 std::vector<Series> measure(std::vector<SubjectPtr>& subjects,
-                            std::size_t paths, const Plan& plan);
+                            const Plan& plan);
 
 }  // namespace bench

@@ -24,6 +24,8 @@ public:
     virtual ~Subject() = default;
 
     virtual std::string name() const = 0;
+    // How many paths its list has.
+    virtual std::size_t paths() const = 0;
 
     virtual double build() = 0;
     // The full text of every path, in the instance's own order.
