@@ -191,7 +191,10 @@ HostArray* Host::hostCreateLogicalScalar(bool value) {
     return made.release();
 }
 
-void Host::hostReleaseArray(HostArray* array) noexcept { delete &boxOf(array); }
+void Host::hostReleaseArray(HostArray* array) noexcept {
+    if (array == nullptr) errors.emplace_back("null released");
+    delete static_cast<Box*>(array);
+}
 
 // --- Instances ---------------------------------------------------------------
 

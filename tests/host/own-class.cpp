@@ -29,7 +29,7 @@ struct Behaviour {
     std::string typeName = "double";
     int made = 0;
     int destroyed = 0;
-    int released = 0;
+    std::vector<std::string> released;  // descriptors
 };
 
 class TestMethod : public HostMethodInfo {
@@ -45,7 +45,7 @@ public:
           body(std::move(methodBody)) {}
     ~TestMethod() override {
         host.hostReleaseSignature(held);
-        ++behaviour.released;
+        behaviour.released.push_back(ownName);
     }
 
     const char* name() const noexcept override { return ownName.c_str(); }
@@ -91,7 +91,7 @@ public:
         : behaviour(classBehaviour),
           host(hostInterface),
           define(std::move(defineMethods)) {}
-    ~TestClass() override { ++behaviour.released; }
+    ~TestClass() override { behaviour.released.emplace_back("the class"); }
 
     const char* className() const noexcept override { return "Counter"; }
     void defineMembers(HostClass* definedClass) override {
@@ -210,11 +210,15 @@ TEST_F(OwnClassTest, ClassIsRegisteredOnce) {
 TEST_F(OwnClassTest, ClassThatFailsToDefineIsForgottenAndReleased) {
     behaviour.failsToDefine = true;
     const auto methods = [](TestClass& own, HostClass* definedClass) {
-        own.addMethod(definedClass, "run", {}, [](HostFrame&) {});
+        for (const char* name : {"first", "second", "third"}) {
+            own.addMethod(definedClass, name, {}, [](HostFrame&) {});
+        }
     };
     EXPECT_THROW(define(methods), std::runtime_error);
     EXPECT_FALSE(host.hasClass(counterName));
-    EXPECT_EQ(behaviour.released, 2);  // the class and its method
+    EXPECT_EQ(
+        behaviour.released,
+        (std::vector<std::string>{"third", "second", "first", "the class"}));
     behaviour.failsToDefine = false;
     define(methods);
     EXPECT_TRUE(host.hasClass(counterName));

@@ -653,6 +653,7 @@ TEST_F(InstanceTest, SettersAndGettersWorkOnTheNativeObject) {
     EXPECT_EQ(gotNumbers->numbers, (std::vector<double>{3, 1, 2}));
     EXPECT_EQ(gotNumbers->dimensions, (std::vector<std::size_t>{3, 1}));
     properties[0].info.disposer(nullptr);
+    EXPECT_TRUE(host.errors.empty());
 }
 
 // --- Custom load -------------------------------------------------------------
