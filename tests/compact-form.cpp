@@ -181,6 +181,15 @@ TEST(CompactForm, ALongTreeStringIsRefusedAndChangesNothing) {
     EXPECT_EQ(codeText(coder, u'c'), "11");
 }
 
+TEST(CompactForm, NodesAreNotMadeFromAShortString) {
+    HuffmanPathTree coder;
+    coder.boolTree = bitsOf("01011");
+    coder.setTreeString(u"a");
+    EXPECT_THROW(coder.inflateFromBoolTree(), tessel::DamagedFormException);
+    EXPECT_THROW(coder.inflate(), tessel::DamagedFormException);
+    EXPECT_TRUE(coder.nodes.empty());
+}
+
 TEST(CompactForm, AStringWithoutAShapeIsRefused) {
     HuffmanPathTree coder;
     EXPECT_THROW(coder.inflateHuffman(u"a"), tessel::DamagedFormException);

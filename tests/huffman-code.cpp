@@ -332,6 +332,19 @@ TEST(HuffmanCode, DeflateIsRefusedAfterInflate) {
     EXPECT_EQ(codeText(*coder, u'c'), "01");
 }
 
+TEST(HuffmanCode, DeflateIsRefusedOnAShapeThatWasRead) {
+    const CoderPtr source = coderWith(u"abcd", {1, 1, 1, 1});
+    support::Bytes form = support::formOf(*source, false);
+    HuffmanPathTree coder;
+    coder.deserialize(form, false);
+    const Frequencies other = {9, 5, 1};
+    EXPECT_THROW(coder.deflateHuffman(other.data(), u"xyz"), std::logic_error);
+    EXPECT_TRUE(coder.nodes.empty());
+    EXPECT_EQ(bitText(coder.getBoolTree()), "0011011");
+    coder.inflateHuffman(u"acbd");
+    EXPECT_EQ(codeText(coder, u'c'), "01");
+}
+
 // ---- Frequencies ----
 
 TEST(HuffmanCode, SetFrequenciesTakesTheListOver) {

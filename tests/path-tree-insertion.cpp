@@ -368,6 +368,30 @@ TEST(PathTreeInsertion, ASourceOutlivesItsCopiesAndTheirInsertions) {
     EXPECT_EQ(allPaths(source), (Paths{"a/b/d", "a/b/e", "a/c"}));
 }
 
+// ---- Memory ----
+
+TEST(PathTreeInsertion, ResetReleasesWhatInsertionRemembered) {
+    BPathTree tree;
+    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    for (std::size_t i = 0; i < 100; ++i)
+        addWhole(tree, {support::numbered("d", i), "f"});
+    EXPECT_GT(tree.memoryUsage().finder, 100U);
+    tree.reset();
+    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
+}
+
+TEST(PathTreeInsertion, ReleaseFinderSparesAMemoryThatIsLarge) {
+    BPathTree tree;
+    for (std::size_t i = 0; i < 100; ++i)
+        addWhole(tree, {support::numbered("d", i), "f"});
+    tree.releaseFinder(50);
+    EXPECT_GT(tree.memoryUsage().finder, 100U);
+    tree.releaseFinder(100);
+    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
+}
+
 // ---- Handles ----
 
 TEST(PathTreeInsertion, AHeldNodeKeepsWhatIsBelowItAlive) {
