@@ -41,7 +41,7 @@ void iterate(tessel::HuffmanPathTree& coder, Visit visit) {
 
 // Fetches the paths of these ascending numbers at once and calls
 // visit(const std::u16string&) with their texts. Each folder met is decoded
-// once.
+// once, and released with its names while they are still warm.
 template <class Visit>
 void fetch(const tessel::HuffmanPathTree& coder,
            const std::vector<double>& numbers, Visit visit) {
@@ -57,6 +57,8 @@ void fetch(const tessel::HuffmanPathTree& coder,
             coder.appendPathFrom(file, text);
             visit(static_cast<const std::u16string&>(text));
         }
+        tessel::Components().swap(folders[i]);
+        tessel::Components().swap(files[i]);
     }
 }
 

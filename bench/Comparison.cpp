@@ -154,7 +154,6 @@ std::string internalsTable(const Internals& m) {
     table.row({"restore / uncompress", threeDigits(m.restoreToUncompress)});
     table.row({"destroy / build", threeDigits(m.destroyToBuild)});
     table.row({"encoding with 1 worker / with 2", threeDigits(m.twoWorkers)});
-    table.row({"the same in processor time", threeDigits(m.twoWorkersAlone)});
     return table.text();
 }
 

@@ -2,10 +2,7 @@
 
 #include <zlib.h>
 
-#include <algorithm>
-#include <ctime>
 #include <stdexcept>
-#include <thread>
 #include <utility>
 
 #include "bench/CoderJob.hpp"
@@ -134,60 +131,25 @@ void measureDestroy(const PathSplitter& splitter, int runs, Internals& result) {
     result.destroyToBuild = medianRatio(destroys, builds);
 }
 
-double processorSeconds() {
-    timespec used{};
-    ::clock_gettime(CLOCK_THREAD_CPUTIME_ID, &used);
-    return static_cast<double>(used.tv_sec) +
-           static_cast<double>(used.tv_nsec) * 1e-9;
-}
-
-struct WorkerTimes {
-    std::vector<double> seconds;
-    std::vector<double> processor;  // of the worker that used most
-};
-
-// Encodes the batch that waits in the coder, nothing more, on so many
-// workers.
-void encode(HuffmanPathTree& coder, unsigned workers, WorkerTimes& times) {
-    const std::size_t folders = coder.asyncFolders.size();
-    coder.encodedFolders.clear();
-    coder.encodedFolders.resize(folders);
-    coder.encodedFiles.clear();
-    coder.encodedFiles.resize(folders);
-    const auto ranges = HuffmanPathTree::splitFolders(folders, workers);
-    std::vector<double> processor(ranges.size());
-    times.seconds.push_back(secondsOf([&] {
-        std::vector<std::thread> threads;
-        threads.reserve(ranges.size());
-        for (std::size_t i = 0; i < ranges.size(); ++i) {
-            threads.emplace_back([&, i]() noexcept {
-                coder.generateCodeForPath(ranges[i].first, ranges[i].second);
-                processor[i] = processorSeconds();
-            });
-        }
-        for (std::thread& thread : threads) thread.join();
-    }));
-    times.processor.push_back(
-        *std::max_element(processor.begin(), processor.end()));
-}
-
+// Encoding alone, on one worker and on two.
 void measureWorkers(const PathSplitter& splitter, int runs, Internals& result) {
     Batch batch = wholeBatch(splitter);
     const CoderPtr coder =
         coderFor(tessel::paths::countCharacters(batch.folders, batch.files));
-    WorkerTimes one;
-    WorkerTimes two;
+    std::vector<double> one;
+    std::vector<double> two;
     for (int i = 0; i < runs; ++i) {
-        // Encoding may use up the texts, so every run has its own.
+        // Encoding uses up the texts, so every run has its own.
         for (const unsigned workers : {1U, 2U}) {
             coder->asyncFolders = batch.folders;
             coder->asyncFiles = batch.files;
-            encode(*coder, workers, workers == 1 ? one : two);
+            (workers == 1 ? one : two)
+                .push_back(
+                    secondsOf([&] { coder->encodeOnWorkers(workers); }));
+            coder->clearThreadResources();
         }
     }
-    coder->clearThreadResources();
-    result.twoWorkers = medianRatio(one.seconds, two.seconds);
-    result.twoWorkersAlone = medianRatio(one.processor, two.processor);
+    result.twoWorkers = medianRatio(one, two);
 }
 
 }  // namespace
@@ -210,8 +172,7 @@ Json Internals::json() const {
     return all.number("serializeToCompress", serializeToCompress)
         .number("restoreToUncompress", restoreToUncompress)
         .number("destroyToBuild", destroyToBuild)
-        .number("twoWorkers", twoWorkers)
-        .number("twoWorkersAlone", twoWorkersAlone);
+        .number("twoWorkers", twoWorkers);
 }
 
 Internals measureInternals(const PathSplitter& splitter, int runs) {

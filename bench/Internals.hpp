@@ -19,10 +19,7 @@ struct Internals {
     double serializeToCompress = 0;
     double restoreToUncompress = 0;
     double destroyToBuild = 0;
-    double twoWorkers = 0;  // one worker's time to that of two
-    // The same of processor time, of the longer of the two: what the time
-    // would be if nobody else wanted the cores.
-    double twoWorkersAlone = 0;
+    double twoWorkers = 0;  // encoding: one worker's time to that of two
 
     Json json() const;
 };

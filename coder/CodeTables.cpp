@@ -17,6 +17,18 @@ void CodeTable::insert(char16_t character, const Entry& entry) {
     ++count;
 }
 
+void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
+    const unsigned position = count();
+    word |= std::uint64_t{character} << (position * characterBits);
+    word += std::uint64_t{1} << fieldsAt;
+    // From its own place on to that of all characters.
+    for (unsigned i = position + 1; i <= mostCharacters; ++i) {
+        const unsigned at = fieldsAt + i * fieldBits;
+        word &= ~(((std::uint64_t{1} << fieldBits) - 1) << at);
+        word |= std::uint64_t{bitCount} << at;
+    }
+}
+
 void DecodeTable::build(const std::vector<HNode>& nodes,
                         std::int32_t rootIndex) {
     clear();
@@ -34,14 +46,8 @@ void DecodeTable::build(const std::vector<HNode>& nodes,
             if (next < 0) break;
             node = &nodes[static_cast<std::size_t>(next)];
             if (!node->isLeaf()) continue;
-            step.characters[step.count] = node->character;
-            // Later ends stay at the last one's.
-            const auto taken = static_cast<std::uint16_t>(bit + 1);
-            if (step.count == 0) step.bits1 = taken & 15U;
-            if (step.count <= 1) step.bits2 = taken & 15U;
-            step.bits3 = taken & 15U;
-            ++step.count;
-            if (step.count == mostCharacters) break;
+            step.append(node->character, bit + 1);
+            if (step.count() == mostCharacters) break;
             node = &root;
         }
     }

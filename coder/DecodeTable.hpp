@@ -1,8 +1,9 @@
 #pragma once
 
-#include <array>
+#include <bit>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <vector>
 
 #include "coder/HNode.hpp"
@@ -15,26 +16,58 @@ namespace tessel {
 // leaves to that walk whatever it does not hold: codes longer than
 // `windowBits` and bits that lead off the tree.
 //
-// Cost: 8 KiB.
+// Cost: 16 KiB.
 class DecodeTable {
 public:
-    static constexpr unsigned windowBits = 10;
+    static constexpr unsigned windowBits = 11;
     static constexpr unsigned mostCharacters = 3;
 
-    struct Step {
-        std::array<char16_t, mostCharacters> characters{};
-        std::uint16_t count : 4 = 0;  // of characters; 0: ask the tree
-        // Bits that the first one, two and three characters take. What
-        // fewer than three characters leave free repeats the last.
-        std::uint16_t bits1 : 4 = 0;
-        std::uint16_t bits2 : 4 = 0;
-        std::uint16_t bits3 : 4 = 0;
+    // Up to three characters and the bits that they take, in one word: the
+    // characters from the lowest bits up, their count, and the bits that the
+    // first one, two and three take. What fewer characters leave free repeats
+    // the last, so the bits of three are those of all.
+    class Step {
+    public:
+        // Characters that a step is written as, with or without a meaning.
+        static constexpr unsigned writtenCharacters = 4;
 
-        unsigned bits(unsigned characterCount) const noexcept {
-            return characterCount == count ? bits3
-                   : characterCount == 2   ? bits2
-                                           : bits1;
+        // 0: nothing is known, ask the tree.
+        unsigned count() const noexcept { return field(0); }
+        // Bits that all of its characters take.
+        unsigned bits() const noexcept { return field(mostCharacters); }
+        // Bits that the first n take, n from 1 to count().
+        unsigned bitsOf(unsigned n) const noexcept { return field(n); }
+
+        // How many of its characters end within so many bits.
+        unsigned countWithin(std::uint64_t bitCount) const noexcept {
+            unsigned n = count();
+            while (n > 0 && bitsOf(n) > bitCount) --n;
+            return n;
         }
+
+        // Writes its characters and, behind them, what is to be overwritten.
+        void writeTo(char16_t* out) const noexcept {
+            static_assert(std::endian::native == std::endian::little);
+            static_assert(sizeof word == writtenCharacters * sizeof *out);
+            std::memcpy(out, &word, sizeof word);
+        }
+
+        // Appends a character that ends after so many bits of the window;
+        // there must be fewer than mostCharacters.
+        void append(char16_t character, unsigned bitCount) noexcept;
+
+    private:
+        static constexpr unsigned characterBits = 16;
+        static constexpr unsigned fieldBits = 4;
+        static constexpr unsigned fieldsAt = mostCharacters * characterBits;
+        static_assert(windowBits < 1U << fieldBits);
+
+        unsigned field(unsigned i) const noexcept {
+            return static_cast<unsigned>(word >> (fieldsAt + i * fieldBits)) &
+                   ((1U << fieldBits) - 1);
+        }
+
+        std::uint64_t word = 0;
     };
 
     // Derives the table; an empty tree or one whose root is a leaf gives an
@@ -45,7 +78,7 @@ public:
     bool empty() const noexcept { return steps.empty(); }
 
     // The step for the next windowBits bits, the first one least significant.
-    const Step& operator[](std::uint64_t window) const noexcept {
+    Step operator[](std::uint64_t window) const noexcept {
         return steps[window & ((1U << windowBits) - 1)];
     }
 

@@ -185,10 +185,16 @@ public:
     static std::vector<std::pair<std::uint64_t, std::uint64_t>> splitFolders(
         std::uint64_t n, unsigned hardwareThreads);
 
-    // A worker's job: encodes the folders first to last of asyncFolders and
-    // asyncFiles and releases what it has encoded. Throws what
-    // generateCodeFor throws.
+    // Encodes the folders first to last of asyncFolders and asyncFiles into
+    // encodedFolders and encodedFiles, which must be as long. Throws what
+    // generateCodeFor throws. Safe on several threads whose folders differ.
     void generateCodeForPath(std::uint64_t first, std::uint64_t last);
+
+    // Encodes all of asyncFolders and asyncFiles, which must be equally long,
+    // on as many workers as splitFolders gives ranges, and releases the texts
+    // on the way. A worker whose range is done helps with the others'. Throws
+    // what generateCodeAsyncAndAddPaths throws; what was encoded stays.
+    void encodeOnWorkers(unsigned hardwareThreads);
 
     // Waits for the workers and forgets them.
     void joinAllGenThreads();
@@ -332,7 +338,8 @@ public:
     std::mutex fileResultMutex;
 
 private:
-    struct WorkerOutcome;
+    class WorkerRange;
+    struct Worker;
     struct LoadedForm;
 
     void requireNoCode() const;
@@ -340,14 +347,16 @@ private:
 
     std::size_t encodedBytes(const std::u16string& text) const;
     void encodeTo(const std::u16string& text, std::uint8_t* to) const;
-    PackedComponents encodeAll(std::vector<std::u16string>& texts,
-                               ComponentPacker& packer,
-                               std::uint64_t& longest) const;
-    void encodeRange(std::uint64_t first, std::uint64_t last,
-                     WorkerOutcome& outcome) noexcept;
+    PackedComponents encodeAll(const std::vector<std::u16string>& texts,
+                               Worker& worker) const;
+    void encodeFolders(std::uint64_t first, std::uint64_t last, Worker& worker);
+    void work(std::vector<WorkerRange>& ranges, std::size_t own,
+              Worker& worker) noexcept;
+    void releaseEncoded(Worker& worker) noexcept;
+    void collect(const std::vector<Worker>& workers);
     void raiseMaxCodeBytes(std::uint64_t length) noexcept;
-    void encodeOnWorkers(unsigned hardwareThreads);
-    void keepBuffers(ComponentPacker& packer, WorkerOutcome& outcome) noexcept;
+    void reserveBuffers(Worker& worker);
+    void keepBuffers(Worker& worker) noexcept;
     void insertEncoded(std::size_t i, std::uint32_t hash, FolderMemo& memo,
                        PathTrack& track);
     void reserveForPartition(std::size_t trackLength);
@@ -369,6 +378,7 @@ private:
     void getPathByTrack(std::vector<Components>& folderPaths,
                         const std::vector<double>& partitions) const;
 
+    std::mutex releaseMutex;  // held by the worker that releases texts
     DecodeTable decodeTable;  // derived from nodes; empty: walk the tree
     bool codeBuilt = false;
     bool endsAscend = true;  // partitionEnds can be searched

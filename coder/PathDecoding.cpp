@@ -36,30 +36,45 @@ bool bitAt(ComponentView bytes, std::size_t bit) {
 class BitReader {
 public:
     explicit BitReader(ComponentView component) noexcept : bytes(component) {
-        static_assert(std::endian::native == std::endian::little);
-        if (bytes.size() >= sizeof head)
-            std::memcpy(&head, bytes.data(), sizeof head);
-        else
-            std::memcpy(&head, bytes.data(), bytes.size());
+        if (bytes.size() < sizeof whole) whole = shortComponent();
     }
 
     // The bits from position `bit` on, least significant first, of which at
-    // least sureBits are given as far as the component has them; what lies
-    // behind its end reads as 0.
+    // least sureBits are given as far as the component has them.
     static constexpr unsigned sureBits = 57;
     std::uint64_t from(std::size_t bit) const noexcept {
-        const std::size_t first = bit / bitsPerByte;
-        if (first == 0 || bytes.size() <= sizeof head) return head >> bit;
+        if (bytes.size() < sizeof whole) return whole >> bit;
         const std::size_t base =
-            std::min(first, bytes.size() - sizeof(std::uint64_t));
-        std::uint64_t window = 0;
-        std::memcpy(&window, bytes.data() + base, sizeof window);
-        return window >> (bit - base * bitsPerByte);
+            std::min(bit / bitsPerByte, bytes.size() - sizeof whole);
+        return load<std::uint64_t>(base) >> (bit - base * bitsPerByte);
     }
 
 private:
+    template <class Integer>
+    Integer load(std::size_t at) const noexcept {
+        static_assert(std::endian::native == std::endian::little);
+        Integer value = 0;
+        std::memcpy(&value, bytes.data() + at, sizeof value);
+        return value;
+    }
+
+    // All bytes of a component of one to seven, from reads that overlap.
+    std::uint64_t shortComponent() const noexcept {
+        const std::size_t size = bytes.size();
+        const auto placed = [](std::uint64_t value, std::size_t at) {
+            return value << (at * bitsPerByte);
+        };
+        if (size >= sizeof(std::uint32_t)) {
+            const std::size_t rest = size - sizeof(std::uint32_t);
+            return load<std::uint32_t>(0) |
+                   placed(load<std::uint32_t>(rest), rest);
+        }
+        return bytes[0] | placed(bytes[size / 2], size / 2) |
+               placed(bytes[size - 1], size - 1);
+    }
+
     ComponentView bytes;
-    std::uint64_t head = 0;
+    std::uint64_t whole = 0;  // of a component shorter than this
 };
 
 // A path number as it stands among the numbers of a request. Infinity and
@@ -131,49 +146,55 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
         std::size_t{stepsAWindow} * DecodeTable::windowBits;
     // A character takes at least a bit, and a step is written whole.
     constexpr std::size_t mostAWindow =
-        bitsAWindow + DecodeTable::mostCharacters;
-    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init): written first
+        bitsAWindow + DecodeTable::Step::writtenCharacters;
     // Not cleared: it is written before it is read, and this is the hot path.
     // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
     std::array<char16_t, 4 * mostAWindow> decoded;
     char16_t* const flushAt = decoded.data() + decoded.size() - mostAWindow;
     char16_t* out = decoded.data();
-    const auto put = [&out](const DecodeTable::Step& step) {
-        std::memcpy(out, step.characters.data(), sizeof step.characters);
+    const auto flush = [&] {
+        text.append(decoded.data(),
+                    static_cast<std::size_t>(out - decoded.data()));
+        out = decoded.data();
     };
     const BitReader reader(bytes);
-    // As long as all steps of a window lie before the end.
+    DecodeTable::Step step;
+    // As long as all steps of a window lie before the end. A step that knows
+    // nothing takes no bits, so all that follow it know nothing either.
     while (end - bit >= bitsAWindow) {
         std::uint64_t window = reader.from(bit);
         for (unsigned k = 0; k < stepsAWindow; ++k) {
-            const DecodeTable::Step& step = decodeTable[window];
-            if (step.count == 0) {
-                text.append(decoded.data(), out);
-                return bit;
-            }
-            put(step);
-            out += step.count;
-            bit += step.bits3;
-            window >>= step.bits3;
+            step = decodeTable[window];
+            step.writeTo(out);
+            out += step.count();
+            bit += step.bits();
+            window >>= step.bits();
         }
-        if (out >= flushAt) {
-            text.append(decoded.data(), out);
-            out = decoded.data();
+        if (step.count() == 0) {
+            flush();
+            return bit;
+        }
+        if (out >= flushAt) flush();
+    }
+    if (bit < end) {
+        std::uint64_t window = reader.from(bit);
+        do {
+            step = decodeTable[window];
+            step.writeTo(out);
+            out += step.count();
+            bit += step.bits();
+            window >>= step.bits();
+        } while (bit < end && step.count() > 0);
+        // The last step may hold more characters than are there.
+        if (bit > end) {
+            bit -= step.bits();
+            out -= step.count();
+            const unsigned fitting = step.countWithin(end - bit);
+            if (fitting > 0) bit += step.bitsOf(fitting);
+            out += fitting;
         }
     }
-    // Near the end a step may hold more characters than are there.
-    std::uint64_t window = bit < end ? reader.from(bit) : 0;
-    while (bit < end) {
-        const DecodeTable::Step& step = decodeTable[window];
-        unsigned count = step.count;
-        while (count > 0 && step.bits(count) > end - bit) --count;
-        if (count == 0) break;
-        put(step);
-        out += count;
-        bit += step.bits(count);
-        window >>= step.bits(count);
-    }
-    text.append(decoded.data(), out);
+    flush();
     return bit;
 }
 

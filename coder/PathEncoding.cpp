@@ -113,11 +113,47 @@ void HuffmanPathTree::raiseMaxCodeBytes(std::uint64_t length) noexcept {
 
 // ---- A batch ----
 
-// What a worker leaves behind; on a cache line of its own, because workers
-// write theirs all the time.
-struct alignas(64) HuffmanPathTree::WorkerOutcome {
-    std::uint64_t longest = 0;  // component up to the failure
-    std::exception_ptr failure;
+// The folders that one worker begins with. It takes a few at a time from the
+// front, and workers that have finished their own then help with the rest, so
+// that a range of long folders does not keep all others waiting. On a cache
+// line of its own: usually only its own worker touches it.
+class alignas(64) HuffmanPathTree::WorkerRange {
+public:
+    using FirstAndLast = std::pair<std::uint64_t, std::uint64_t>;
+
+    void set(const FirstAndLast& folders) noexcept {
+        next.store(folders.first, std::memory_order_relaxed);
+        last = folders.second;
+        step = std::clamp((last - folders.first + 1) / leastSteps,
+                          std::uint64_t{1}, mostFoldersAStep);
+    }
+
+    // The next few folders; none if the first lies behind the last.
+    FirstAndLast take() noexcept {
+        const std::uint64_t first =
+            next.fetch_add(step, std::memory_order_relaxed);
+        return {first, std::min(first + step - 1, last)};
+    }
+
+private:
+    static constexpr std::uint64_t leastSteps = 64;
+    static constexpr std::uint64_t mostFoldersAStep = 64;
+
+    std::atomic<std::uint64_t> next = 0;
+    std::uint64_t last = 0;
+    std::uint64_t step = 1;
+};
+
+// What one worker has at hand and leaves behind; on cache lines of its own,
+// because it is written all the time.
+struct alignas(64) HuffmanPathTree::Worker {
+    ComponentPacker packer;
+    std::size_t buffersAt = 0;  // place of its buffers in encodedBuffers
+    std::vector<WorkerRange::FirstAndLast> unreleased;  // encoded texts
+    std::uint64_t folder = 0;                           // at hand
+    std::uint64_t longestInFolder = 0;  // component of the one at hand
+    std::uint64_t longest = 0;          // component of those before it
+    std::exception_ptr failure;         // in the folder at hand
 };
 
 std::vector<std::pair<std::uint64_t, std::uint64_t>>
@@ -156,85 +192,149 @@ void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
         generateCodeForPath(0, 0);
     else
         encodeOnWorkers(hardwareThreads);
+    releaseContents(asyncFolders);
+    releaseContents(asyncFiles);
     addPathToBTreeFromAsyncData();
 }
 
 void HuffmanPathTree::encodeOnWorkers(unsigned hardwareThreads) {
-    const auto ranges = splitFolders(asyncFolders.size(), hardwareThreads);
-    std::vector<WorkerOutcome> outcomes(ranges.size());
+    encodedFolders.resize(asyncFolders.size());
+    encodedFiles.resize(asyncFolders.size());
+    if (asyncFolders.empty()) return;
+    const auto split = splitFolders(asyncFolders.size(), hardwareThreads);
+    std::vector<WorkerRange> ranges(split.size());
+    for (std::size_t w = 0; w < split.size(); ++w) ranges[w].set(split[w]);
+    std::vector<Worker> workers(split.size());
+    for (Worker& worker : workers) reserveBuffers(worker);
     try {
-        genThreads.reserve(ranges.size());
-        for (std::size_t w = 0; w < ranges.size(); ++w)
+        genThreads.reserve(split.size());
+        for (std::size_t w = 0; w < split.size(); ++w)
             genThreads.emplace_back(
-                [this, range = ranges[w], &outcome = outcomes[w]] {
-                    encodeRange(range.first, range.second, outcome);
-                });
+                [this, &ranges, w, &workers] { work(ranges, w, workers[w]); });
     } catch (...) {
-        outcomes[genThreads.size()].failure = std::current_exception();
+        const std::size_t notStarted = genThreads.size();
+        workers[notStarted].folder = split[notStarted].first;
+        workers[notStarted].failure = std::current_exception();
     }
     joinAllGenThreads();
-    for (const WorkerOutcome& outcome : outcomes) {
-        raiseMaxCodeBytes(outcome.longest);
-        if (outcome.failure) std::rethrow_exception(outcome.failure);
+    collect(workers);
+}
+
+// The body of the worker that begins with range `own`.
+void HuffmanPathTree::work(std::vector<WorkerRange>& ranges, std::size_t own,
+                           Worker& worker) noexcept {
+    try {
+        for (std::size_t k = 0; k < ranges.size(); ++k) {
+            WorkerRange& range = ranges[(own + k) % ranges.size()];
+            for (auto folders = range.take(); folders.first <= folders.second;
+                 folders = range.take()) {
+                encodeFolders(folders.first, folders.second, worker);
+                worker.unreleased.push_back(folders);
+                const std::unique_lock turn(releaseMutex, std::try_to_lock);
+                if (turn) releaseEncoded(worker);
+            }
+        }
+    } catch (...) {
+        worker.failure = std::current_exception();
     }
+    keepBuffers(worker);
+    const std::lock_guard turn(releaseMutex);
+    releaseEncoded(worker);
+}
+
+// Releases the texts that the worker has encoded: what is still warm is freed
+// fastest, and the batch need not stand in memory twice. One worker at a time
+// does it and the others go on encoding, because all texts come from the
+// caller's thread and the allocator would let threads that free them wait
+// for each other.
+void HuffmanPathTree::releaseEncoded(Worker& worker) noexcept {
+    for (const auto& [first, last] : worker.unreleased) {
+        for (std::uint64_t i = first; i <= last; ++i) {
+            releaseContents(asyncFolders[i]);
+            releaseContents(asyncFiles[i]);
+        }
+    }
+    worker.unreleased.clear();
+}
+
+// Notes the longest component and throws the failure of the lowest folder.
+// A worker leaves its own range only when all of it is taken, and the folders
+// of a range are taken in order: so every folder below the lowest that failed
+// has been encoded.
+void HuffmanPathTree::collect(const std::vector<Worker>& workers) {
+    const Worker* failed = nullptr;
+    for (const Worker& worker : workers)
+        if (worker.failure &&
+            (failed == nullptr || worker.folder < failed->folder))
+            failed = &worker;
+    if (failed == nullptr) {
+        for (const Worker& worker : workers) raiseMaxCodeBytes(worker.longest);
+        return;
+    }
+    // What encoding in order would have met.
+    raiseMaxCodeBytes(failed->longestInFolder);
+    for (std::uint64_t i = 0; i < failed->folder; ++i)
+        for (const PackedComponents& list :
+             {encodedFolders[i], encodedFiles[i]})
+            for (const ComponentView component : list)
+                raiseMaxCodeBytes(component.size());
+    std::rethrow_exception(failed->failure);
 }
 
 void HuffmanPathTree::generateCodeForPath(std::uint64_t first,
                                           std::uint64_t last) {
-    WorkerOutcome outcome;
-    encodeRange(first, last, outcome);
-    raiseMaxCodeBytes(outcome.longest);
-    if (outcome.failure) std::rethrow_exception(outcome.failure);
+    Worker worker;
+    reserveBuffers(worker);
+    try {
+        encodeFolders(first, last, worker);
+    } catch (...) {
+        worker.failure = std::current_exception();
+    }
+    keepBuffers(worker);
+    raiseMaxCodeBytes(std::max(worker.longest, worker.longestInFolder));
+    if (worker.failure) std::rethrow_exception(worker.failure);
 }
 
-// Encodes the texts and releases them: what is still warm is freed fastest,
-// and the batch need not stand in memory twice.
-PackedComponents HuffmanPathTree::encodeAll(std::vector<std::u16string>& texts,
-                                            ComponentPacker& packer,
-                                            std::uint64_t& longest) const {
+PackedComponents HuffmanPathTree::encodeAll(
+    const std::vector<std::u16string>& texts, Worker& worker) const {
     for (const std::u16string& text : texts) {
         const std::size_t length = encodedBytes(text);
-        std::uint8_t* to = packer.extend(length);
+        std::uint8_t* to = worker.packer.extend(length);
         if (length > 0) encodeTo(text, to);
-        longest = std::max<std::uint64_t>(longest, length);
+        worker.longestInFolder =
+            std::max<std::uint64_t>(worker.longestInFolder, length);
     }
-    releaseContents(texts);
-    return packer.finish();
+    return worker.packer.finish();
 }
 
-void HuffmanPathTree::encodeRange(std::uint64_t first, std::uint64_t last,
-                                  WorkerOutcome& outcome) noexcept {
-    ComponentPacker packer;
-    try {
-        for (std::uint64_t i = first; i <= last && i < asyncFolders.size();
-             ++i) {
-            const PackedComponents folder =
-                encodeAll(asyncFolders[i], packer, outcome.longest);
-            {
-                const std::lock_guard lock(folderResultMutex);
-                encodedFolders[i] = folder;
-            }
-            const PackedComponents names =
-                encodeAll(asyncFiles[i], packer, outcome.longest);
-            const std::lock_guard lock(fileResultMutex);
-            encodedFiles[i] = names;
+void HuffmanPathTree::encodeFolders(std::uint64_t first, std::uint64_t last,
+                                    Worker& worker) {
+    for (std::uint64_t i = first; i <= last && i < asyncFolders.size(); ++i) {
+        worker.folder = i;
+        worker.longestInFolder = 0;
+        const PackedComponents folder = encodeAll(asyncFolders[i], worker);
+        {
+            const std::lock_guard lock(folderResultMutex);
+            encodedFolders[i] = folder;
         }
-    } catch (...) {
-        outcome.failure = std::current_exception();
+        const PackedComponents names = encodeAll(asyncFiles[i], worker);
+        const std::lock_guard lock(fileResultMutex);
+        encodedFiles[i] = names;
+        worker.longest = std::max(worker.longest, worker.longestInFolder);
     }
-    keepBuffers(packer, outcome);
 }
 
-// The encoded lists stand in the packer's buffers, which from now on live as
-// long as they do.
-void HuffmanPathTree::keepBuffers(ComponentPacker& packer,
-                                  WorkerOutcome& outcome) noexcept {
-    try {
-        const std::lock_guard lock(folderResultMutex);
-        encodedBuffers.push_back(packer.takeBuffers());
-    } catch (...) {
-        if (!outcome.failure) outcome.failure = std::current_exception();
-    }
+// The encoded lists stand in the packer's buffers, which from the worker's end
+// on live as long as they do. Their place is made before, when that may fail.
+void HuffmanPathTree::reserveBuffers(Worker& worker) {
+    const std::lock_guard lock(folderResultMutex);
+    worker.buffersAt = encodedBuffers.size();
+    encodedBuffers.emplace_back();
+}
+
+void HuffmanPathTree::keepBuffers(Worker& worker) noexcept {
+    const std::lock_guard lock(folderResultMutex);
+    encodedBuffers[worker.buffersAt] = worker.packer.takeBuffers();
 }
 
 void HuffmanPathTree::joinAllGenThreads() {

@@ -12,7 +12,9 @@ namespace tessel {
 
 namespace {
 
-Component copyOf(ComponentView value) { return {value.begin(), value.end()}; }
+void appendCopy(ComponentView value, Components& out) {
+    out.emplace_back(value.begin(), value.end());
+}
 
 // A component that became a node has been moved from: it is left empty. One
 // in a packed list is only read.
@@ -224,7 +226,7 @@ void BPathTree::getNextPath(Components& out) {
     BNodePtr node(&pendingNodes.top());
     while (!node->isLeaf()) {
         pendingNodes.pop();
-        currentPrefix.push_back(copyOf(node->value()));
+        appendCopy(node->value(), currentPrefix);
         pushAllChildren(node);
         parentNodes.push(node);
         node = BNodePtr(&pendingNodes.top());
@@ -260,7 +262,7 @@ void BPathTree::traversePath(const PathTrack& pathTrack,
     const BNode* node = root.get();
     for (const std::uint64_t position : pathTrack) {
         node = &childAt(*node, position);
-        found.push_back(copyOf(node->value()));
+        appendCopy(node->value(), found);
     }
     appendAll(out, found);
 }
@@ -274,7 +276,7 @@ void BPathTree::getBatch(Components& folder, Components& files,
     for (const std::uint64_t position : track) {
         parent = end;
         end = &childAt(*parent, position);
-        folder.push_back(copyOf(end->value()));
+        appendCopy(end->value(), folder);
     }
     std::uint64_t base = 0;
     if (end->isLeaf()) {
@@ -286,7 +288,7 @@ void BPathTree::getBatch(Components& folder, Components& files,
     }
     files.reserve(files.size() + offsets.size());
     for (const std::uint64_t offset : offsets)
-        files.push_back(copyOf(childAt(*parent, base - 1 + offset).value()));
+        appendCopy(childAt(*parent, base - 1 + offset).value(), files);
 }
 
 void BPathTree::getPath(
