@@ -73,13 +73,48 @@ private:
     BNode* owner;
 };
 
-// The array that a node's children stand in: one allocation, owned by the
-// node, of which each used slot owns a share of a child.
+// The array that a node's children stand in if there are several: one
+// allocation, owned by the node, of which each used slot owns a share of a
+// child.
 struct ChildBlock {
     std::uint32_t size;
     std::uint32_t capacity;
 
     BNode** slots() noexcept { return reinterpret_cast<BNode**>(this + 1); }
+};
+
+// What a node keeps its children by, in one word: nothing, the share of an
+// only child, which many folders have, or an array. Both are aligned to four
+// bytes, so the lowest bit can tell them apart.
+class ChildStore {
+public:
+    ChildStore() noexcept = default;
+    static ChildStore only(BNode* child) noexcept {
+        return ChildStore(reinterpret_cast<std::uintptr_t>(child) | onlyFlag);
+    }
+    static ChildStore array(ChildBlock* block) noexcept {
+        return ChildStore(reinterpret_cast<std::uintptr_t>(block));
+    }
+
+    bool isOnly() const noexcept { return (word & onlyFlag) != 0; }
+    BNode* child() const noexcept {
+        return reinterpret_cast<BNode*>(word & ~onlyFlag);
+    }
+    // Null if there is none.
+    ChildBlock* block() const noexcept {
+        return isOnly() ? nullptr : reinterpret_cast<ChildBlock*>(word);
+    }
+    std::size_t size() const noexcept {
+        if (isOnly()) return 1;
+        return word == 0 ? 0 : block()->size;
+    }
+
+private:
+    static constexpr std::uintptr_t onlyFlag = 1;
+
+    explicit ChildStore(std::uintptr_t value) noexcept : word(value) {}
+
+    std::uintptr_t word = 0;
 };
 
 // One component of the trie: its value, its children and its share count,
@@ -91,8 +126,8 @@ struct ChildBlock {
 //                            ^ the node's address, a multiple of 4
 //
 // Most nodes are files and never have children, so a node made as a leaf has
-// no room for a child list. If it gets children after all, its slab keeps
-// the list for it (NodeSlab::lateChildren); the node stays where it is.
+// no room for a child store. If it gets children after all, its slab keeps
+// the store for it; the node stays where it is.
 //
 // Invariants: the value never changes; children are only appended; every
 //   child in the list is kept alive by it.
@@ -125,8 +160,8 @@ private:
     friend class NodeSlab;
     friend struct NodeMemory;
 
-    static constexpr std::uint8_t ownsListFlag = 1;  // list before the node
-    static constexpr std::uint8_t lateListFlag = 2;  // list in the slab
+    static constexpr std::uint8_t ownsStoreFlag = 1;  // before the node
+    static constexpr std::uint8_t lateStoreFlag = 2;  // in the slab
     static constexpr unsigned lengthShift = 2;
     static constexpr unsigned longLength = 63;
 
@@ -135,20 +170,22 @@ private:
     const std::uint8_t* afterHead() const noexcept { return &head + 1; }
     std::uint8_t* afterHead() noexcept { return &head + 1; }
 
-    void* listSlot() const noexcept {
+    void* storeSlot() const noexcept {
         return const_cast<char*>(reinterpret_cast<const char*>(this)) -
-               sizeof(ChildBlock*);
+               sizeof(ChildStore);
     }
-    ChildBlock* block() const noexcept {
-        if ((head & ownsListFlag) != 0) {
-            ChildBlock* list = nullptr;
-            std::memcpy(&list, listSlot(), sizeof list);
-            return list;
-        }
-        return (head & lateListFlag) != 0 ? lateBlock() : nullptr;
+    ChildStore store() const noexcept {
+        ChildStore kept;
+        if ((head & ownsStoreFlag) != 0)
+            std::memcpy(&kept, storeSlot(), sizeof kept);
+        else if ((head & lateStoreFlag) != 0)
+            kept = lateStore();
+        return kept;
     }
-    ChildBlock* lateBlock() const noexcept;
-    void setBlock(ChildBlock* list);
+    ChildStore lateStore() const noexcept;
+    // Throws std::bad_alloc, with nothing changed, when a node that was made
+    // as a leaf gets its first store.
+    void setStore(ChildStore kept);
 
     void share() noexcept {
         references.fetch_add(1, std::memory_order_relaxed);
@@ -179,18 +216,18 @@ inline BNodePtr BNodePtr::adopt(BNode* owned) noexcept {
 }
 
 inline std::size_t ChildList::size() const noexcept {
-    const ChildBlock* list = owner->block();
-    return list == nullptr ? 0 : list->size;
+    return owner->store().size();
 }
 inline BNode& ChildList::operator[](std::size_t i) const noexcept {
-    return *owner->block()->slots()[i];
+    const ChildStore kept = owner->store();
+    return kept.isOnly() ? *kept.child() : *kept.block()->slots()[i];
 }
 
 // Bytes that nodes take, as the allocator counts them.
 struct NodeMemory {
     // The node's piece of its slab, its children's array not included.
     static std::size_t nodeBytes(const BNode& node) noexcept;
-    // The array of the node's children; 0 if it has none.
+    // The array of the node's children; 0 if it has none or one.
     static std::size_t childListBytes(const BNode& node) noexcept;
     // Identity and size of the slab that the node lives in.
     static std::pair<const void*, std::size_t> slab(const BNode& node) noexcept;

@@ -35,18 +35,18 @@ std::size_t allocatedBytes(void* memory) noexcept {
                              : malloc_usable_size(memory) + sizeof(std::size_t);
 }
 
-// Child lists of nodes that were made as leaves, by the node's address.
-struct LateChildren {
+// Child stores of nodes that were made as leaves, by the node's address.
+struct LateStores {
     std::mutex access;  // nodes may be released on several threads
-    std::unordered_map<const BNode*, ChildBlock*> lists;
+    std::unordered_map<const BNode*, ChildStore> stores;
 
-    // What the allocator gave out for this, but not for the lists.
+    // What the allocator gave out for this, but not for the arrays.
     std::size_t bytes() noexcept {
         // The map chains nodes of a link and its value, of 24 bytes, for
         // which the allocator takes 32.
         constexpr std::size_t mapNode = 32;
-        return allocatedBytes(this) + lists.size() * mapNode +
-               lists.bucket_count() * sizeof(void*) + sizeof(std::size_t);
+        return allocatedBytes(this) + stores.size() * mapNode +
+               stores.bucket_count() * sizeof(void*) + sizeof(std::size_t);
     }
 };
 
@@ -85,21 +85,21 @@ public:
         std::free(this);
     }
 
-    ChildBlock* lateList(const BNode* node) noexcept {
+    ChildStore lateStore(const BNode* node) noexcept {
         const std::lock_guard lock(late->access);
-        return late->lists.find(node)->second;
+        return late->stores.find(node)->second;
     }
-    void setLateList(const BNode* node, ChildBlock* list) {
-        if (late == nullptr) late = std::make_unique<LateChildren>();
+    void setLateStore(const BNode* node, ChildStore kept) {
+        if (late == nullptr) late = std::make_unique<LateStores>();
         const std::lock_guard lock(late->access);
-        late->lists[node] = list;
+        late->stores[node] = kept;
     }
-    void forgetLateList(const BNode* node) noexcept {
+    void forgetLateStore(const BNode* node) noexcept {
         const std::lock_guard lock(late->access);
-        late->lists.erase(node);
+        late->stores.erase(node);
     }
 
-    // What the allocator gave out for the slab and the lists that it keeps.
+    // What the allocator gave out for the slab and the stores that it keeps.
     std::size_t bytes() noexcept {
         return allocatedBytes(this) + (late == nullptr ? 0 : late->bytes());
     }
@@ -110,46 +110,59 @@ private:
     std::atomic<std::size_t> live{1};  // nodes, and 1 while a pool fills it
     std::size_t size;
     std::size_t used = sizeof(NodeSlab);
-    std::unique_ptr<LateChildren> late;
+    std::unique_ptr<LateStores> late;
 };
 
-ChildBlock* BNode::lateBlock() const noexcept {
-    return NodeSlab::of(this)->lateList(this);
+ChildStore BNode::lateStore() const noexcept {
+    return NodeSlab::of(this)->lateStore(this);
 }
 
-void BNode::setBlock(ChildBlock* list) {
-    if ((head & ownsListFlag) != 0) {
-        std::memcpy(listSlot(), &list, sizeof list);
+void BNode::setStore(ChildStore kept) {
+    if ((head & ownsStoreFlag) != 0) {
+        std::memcpy(storeSlot(), &kept, sizeof kept);
     } else {
-        NodeSlab::of(this)->setLateList(this, list);
-        head = static_cast<std::uint8_t>(head | lateListFlag);
+        NodeSlab::of(this)->setLateStore(this, kept);
+        head = static_cast<std::uint8_t>(head | lateStoreFlag);
     }
 }
 
-// Walks down and up through the dead nodes. On the way down the slot that a
-// child stood in, which is free once the child is taken from its list,
-// remembers the way up: the nodes themselves are the stack.
+// Walks down and up through the dead nodes. On the way down the place that a
+// child stood in, which is free once the child is taken from it, remembers
+// the way up: the nodes themselves are the stack.
 void BNode::destroy(BNode* dead) noexcept {
     BNode* above = nullptr;
     for (;;) {
-        ChildBlock* list = dead->block();
-        if (list != nullptr && list->size > 0) {
-            BNode** slot = &list->slots()[--list->size];
-            BNode* child = *slot;
-            if (!child->unshare()) continue;
-            *slot = above;
+        const ChildStore kept = dead->store();
+        if (kept.size() > 0) {
+            BNode* child = nullptr;
+            if (kept.isOnly()) {
+                child = kept.child();
+                const bool last = child->unshare();
+                dead->setStore(last ? ChildStore::only(above) : ChildStore());
+                if (!last) continue;
+            } else {
+                BNode** slot = &kept.block()->slots()[--kept.block()->size];
+                child = *slot;
+                if (!child->unshare()) continue;
+                *slot = above;
+            }
             above = dead;
             dead = child;
             continue;
         }
-        if ((dead->head & lateListFlag) != 0)
-            NodeSlab::of(dead)->forgetLateList(dead);
-        std::free(list);
+        if ((dead->head & lateStoreFlag) != 0)
+            NodeSlab::of(dead)->forgetLateStore(dead);
+        std::free(kept.block());
         NodeSlab::of(dead)->release();
         if (above == nullptr) return;
         dead = above;
-        ChildBlock* open = dead->block();
-        above = open->slots()[open->size];
+        const ChildStore open = dead->store();
+        if (open.isOnly()) {
+            above = open.child();
+            dead->setStore(ChildStore());
+        } else {
+            above = open.block()->slots()[open.block()->size];
+        }
     }
 }
 
@@ -178,7 +191,7 @@ void* NodePool::allocate(std::size_t before, std::size_t bytes) {
 
 BNode* NodePool::make(ComponentView value, Kind kind) {
     const bool isLong = value.size() >= BNode::longLength;
-    const std::size_t before = kind == Kind::folder ? sizeof(ChildBlock*) : 0;
+    const std::size_t before = kind == Kind::folder ? sizeof(ChildStore) : 0;
     const std::size_t bytes = offsetof(BNode, head) + 1 +
                               (isLong ? sizeof(std::uint64_t) : 0) +
                               value.size();
@@ -188,8 +201,9 @@ BNode* NodePool::make(ComponentView value, Kind kind) {
         (isLong ? BNode::longLength : static_cast<unsigned>(value.size()))
         << BNode::lengthShift;
     if (kind == Kind::folder) {
-        head |= BNode::ownsListFlag;
-        std::memset(node->listSlot(), 0, sizeof(ChildBlock*));
+        head |= BNode::ownsStoreFlag;
+        const ChildStore none;
+        std::memcpy(node->storeSlot(), &none, sizeof none);
     }
     node->head = static_cast<std::uint8_t>(head);
     std::uint8_t* at = node->afterHead();
@@ -204,50 +218,67 @@ BNode* NodePool::make(ComponentView value, Kind kind) {
 
 void NodePool::reserve(BNode& parent, std::size_t count) {
     constexpr std::size_t most = std::numeric_limits<std::uint32_t>::max();
-    if (count == 0) return;
-    ChildBlock* list = parent.block();
-    const std::size_t size = list == nullptr ? 0 : list->size;
+    const ChildStore kept = parent.store();
+    const std::size_t size = kept.size();
     if (count > most - size)
         throw std::length_error("A folder has too many children.");
-    if (list != nullptr && size + count <= list->capacity) return;
+    // An only child needs no array.
+    const std::size_t room =
+        kept.block() == nullptr ? 1 : kept.block()->capacity;
+    if (size + count <= room) return;
     // A quarter more than needed keeps single appends linear; a first list
     // is exact.
     const std::size_t capacity =
         size == 0 ? count
                   : std::min(most, std::max(size + count, size + size / 4 + 1));
-    if (list == nullptr) parent.setBlock(nullptr);  // may throw, so first
-    void* memory =
-        std::realloc(list, sizeof(ChildBlock) + capacity * sizeof(BNode*));
+    if (kept.block() == nullptr) parent.setStore(kept);  // may throw, so first
+    void* memory = std::realloc(kept.block(),
+                                sizeof(ChildBlock) + capacity * sizeof(BNode*));
     if (memory == nullptr) throw std::bad_alloc();
     auto* grown = static_cast<ChildBlock*>(memory);
+    if (kept.isOnly()) grown->slots()[0] = kept.child();
     grown->size = static_cast<std::uint32_t>(size);
     grown->capacity = static_cast<std::uint32_t>(capacity);
-    parent.setBlock(grown);
+    parent.setStore(ChildStore::array(grown));
 }
 
 void NodePool::append(BNode& parent, BNodePtr& child) {
-    reserve(parent, 1);
-    ChildBlock* list = parent.block();
-    list->slots()[list->size++] = child.release();
+    ChildBlock* block = parent.store().block();
+    if (block == nullptr || block->size == block->capacity) {
+        reserve(parent, 1);
+        block = parent.store().block();
+    }
+    if (block != nullptr) {
+        block->slots()[block->size++] = child.release();
+    } else {
+        parent.setStore(ChildStore::only(child.get()));
+        child.release();
+    }
 }
 
 void NodePool::truncate(BNode& parent, std::size_t size) noexcept {
-    ChildBlock* list = parent.block();
-    while (list != nullptr && list->size > size)
-        BNodePtr::adopt(list->slots()[--list->size]);
+    for (ChildStore kept = parent.store(); kept.size() > size;
+         kept = parent.store()) {
+        if (kept.isOnly()) {
+            parent.setStore(ChildStore());
+            BNodePtr::adopt(kept.child());
+        } else {
+            BNodePtr::adopt(kept.block()->slots()[--kept.block()->size]);
+        }
+    }
 }
 
 std::size_t NodeMemory::nodeBytes(const BNode& node) noexcept {
     const bool isLong = node.head >> BNode::lengthShift == BNode::longLength;
-    const bool ownsList = (node.head & BNode::ownsListFlag) != 0;
+    const bool ownsStore = (node.head & BNode::ownsStoreFlag) != 0;
     return roundUp(
-        (ownsList ? sizeof(ChildBlock*) : 0) + offsetof(BNode, head) + 1 +
+        (ownsStore ? sizeof(ChildStore) : 0) + offsetof(BNode, head) + 1 +
             (isLong ? sizeof(std::uint64_t) : 0) + node.value().size(),
         nodeAlignment);
 }
 
 std::size_t NodeMemory::childListBytes(const BNode& node) noexcept {
-    return allocatedBytes(node.block());
+    return allocatedBytes(node.store().block());
 }
 
 std::pair<const void*, std::size_t> NodeMemory::slab(

@@ -130,6 +130,27 @@ TEST(MemoryUsageParts, TheTotalIsTheirSum) {
     EXPECT_EQ(usage.total(), 7654321U);
 }
 
+// The children's arrays of a tree whose folder has so many files, at the end
+// of a chain of folders.
+std::size_t listBytes(std::size_t files) {
+    tessel::BPathTree tree;
+    tessel::Components folder = {{1}, {2}, {3}};
+    tessel::Components names;
+    for (std::size_t i = 0; i < files; ++i)
+        names.push_back({9, static_cast<std::uint8_t>(i)});
+    tessel::PathTrack track;
+    std::uint64_t first = 0;
+    tree.addPath(folder, names, track, first);
+    return tree.memoryUsage().childLists;
+}
+
+TEST(MemoryUsageParts, AnOnlyChildNeedsNoArray) {
+    EXPECT_EQ(listBytes(0), 0U);
+    EXPECT_EQ(listBytes(1), 0U);
+    EXPECT_GT(listBytes(2), 0U);
+    EXPECT_GE(listBytes(200), 200 * sizeof(void*));
+}
+
 TEST(MemoryUsageParts, AFreshCoderTakesLittle) {
     const HuffmanPathTree coder;
     const HuffmanPathTree::MemoryUsage usage = coder.memoryUsage();

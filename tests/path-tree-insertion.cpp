@@ -268,6 +268,27 @@ TEST(PathTreeInsertion, NodesOfEveryLengthCanGetChildren) {
 
 // ---- Searching among children ----
 
+// One child stands in its parent's node, several in an array: all must be
+// found, kept and in order on the way from none to many, whether the parent
+// was made as a folder or as a file.
+TEST(PathTreeInsertion, ChildrenStayInOrderAsTheirListGrows) {
+    for (const bool madeAsFile : {false, true}) {
+        for (const std::size_t step : {1U, 2U, 3U}) {
+            BPathTree tree;
+            if (madeAsFile) addWhole(tree, {"f"});
+            Paths expected;
+            for (std::size_t round = 0; round < 9; ++round) {
+                Paths names;
+                for (std::size_t i = 0; i < step; ++i)
+                    names.push_back(support::numbered("", round * step + i));
+                addBatch(tree, {"f"}, names);
+                expected.insert(expected.end(), names.begin(), names.end());
+                EXPECT_EQ(childTexts(tree.root->children()[0]), expected);
+            }
+        }
+    }
+}
+
 TEST(PathTreeInsertion, FindNodeOnAnEmptyListFindsNothing) {
     const BPathTree tree;
     EXPECT_EQ(tree.findNode(component("a"), tree.root->children()), allOnes);
