@@ -143,9 +143,9 @@ void measureWorkers(const PathSplitter& splitter, int runs, Internals& result) {
         for (const unsigned workers : {1U, 2U}) {
             coder->asyncFolders = batch.folders;
             coder->asyncFiles = batch.files;
-            (workers == 1 ? one : two)
-                .push_back(
-                    secondsOf([&] { coder->encodeOnWorkers(workers); }));
+            (workers == 1 ? one : two).push_back(secondsOf([&] {
+                coder->encodeOnWorkers(workers);
+            }));
             coder->clearThreadResources();
         }
     }

@@ -36,6 +36,9 @@ public:
     // Adds the entry unless the character has one already.
     void insert(char16_t character, const Entry& entry);
 
+    // Takes every code away.
+    void clear() noexcept;
+
     // Characters that have a code.
     std::size_t size() const noexcept { return count; }
 

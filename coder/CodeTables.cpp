@@ -1,3 +1,5 @@
+#include <algorithm>
+
 #include "coder/CodeTable.hpp"
 #include "coder/DecodeTable.hpp"
 
@@ -17,6 +19,12 @@ void CodeTable::insert(char16_t character, const Entry& entry) {
     ++count;
 }
 
+void CodeTable::clear() noexcept {
+    std::fill(pageStart.begin(), pageStart.end(), 0U);
+    entries.resize(pageEntries);
+    count = 0;
+}
+
 void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
     const unsigned position = count();
     word |= std::uint64_t{character} << (position * characterBits);
@@ -29,6 +37,48 @@ void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
     }
 }
 
+namespace {
+
+constexpr std::size_t windows = std::size_t{1} << DecodeTable::windowBits;
+
+// The character that a window begins with, and the bits of its code; none,
+// and 0, if its code is longer than the window or leads off the tree.
+struct FirstCharacter {
+    char16_t character = 0;
+    unsigned bits = 0;
+};
+
+std::vector<FirstCharacter> firstCharacters(const std::vector<HNode>& nodes,
+                                            const HNode& root) {
+    struct Pending {
+        const HNode* node;
+        std::size_t code;
+        unsigned bits;
+    };
+    std::vector<FirstCharacter> firsts(windows);
+    std::vector<Pending> pending{{&root, 0, 0}};
+    while (!pending.empty()) {
+        const auto [node, code, bits] = pending.back();
+        pending.pop_back();
+        if (node->isLeaf()) {
+            for (std::size_t w = code; w < windows; w += std::size_t{1} << bits)
+                firsts[w] = {node->character, bits};
+            continue;
+        }
+        if (bits == DecodeTable::windowBits) continue;
+        const auto descend = [&](std::int32_t child, std::size_t bit) {
+            if (child >= 0)
+                pending.push_back({&nodes[static_cast<std::size_t>(child)],
+                                   code | bit << bits, bits + 1});
+        };
+        descend(node->left, 0);
+        descend(node->right, 1);
+    }
+    return firsts;
+}
+
+}  // namespace
+
 void DecodeTable::build(const std::vector<HNode>& nodes,
                         std::int32_t rootIndex) {
     clear();
@@ -36,19 +86,18 @@ void DecodeTable::build(const std::vector<HNode>& nodes,
         return;
     const HNode& root = nodes[static_cast<std::size_t>(rootIndex)];
     if (root.isLeaf()) return;
-    std::vector<Step> built(std::size_t{1} << windowBits);
-    for (std::size_t window = 0; window < built.size(); ++window) {
+    const auto firsts = firstCharacters(nodes, root);
+    std::vector<Step> built(windows);
+    for (std::size_t window = 0; window < windows; ++window) {
         Step& step = built[window];
-        const HNode* node = &root;
-        for (unsigned bit = 0; bit < windowBits; ++bit) {
-            const std::int32_t next =
-                ((window >> bit) & 1U) != 0 ? node->right : node->left;
-            if (next < 0) break;
-            node = &nodes[static_cast<std::size_t>(next)];
-            if (!node->isLeaf()) continue;
-            step.append(node->character, bit + 1);
+        // What is left of the window is filled up with zeros, which may look
+        // like a character but must not reach beyond the window's end.
+        FirstCharacter next = firsts[window];
+        for (unsigned end = next.bits; next.bits != 0 && end <= windowBits;
+             end += next.bits) {
+            step.append(next.character, end);
             if (step.count() == mostCharacters) break;
-            node = &root;
+            next = firsts[window >> end];
         }
     }
     steps = std::move(built);

@@ -42,9 +42,22 @@ void HuffmanPathTree::requireNoCode() const {
         throw std::logic_error("The coder has a code already.");
 }
 
-void HuffmanPathTree::finishBuild() {
-    generateCode();
-    codeBuilt = true;
+// Runs `build`, which makes `nodes`, and derives the code. If memory runs
+// out, there is no code, as before.
+template <class Build>
+void HuffmanPathTree::buildCode(Build build) {
+    try {
+        build();
+        generateCode();
+    } catch (...) {
+        decodeTable.clear();
+        releaseContents(nodes);
+        releaseContents(parentOf);
+        codes.clear();
+        rootIndex = 0;
+        throw;
+    }
+    codeBuilt = !nodes.empty();
 }
 
 void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
@@ -52,9 +65,17 @@ void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
     requireNoCode();
     if (!boolTree.empty())
         throw std::logic_error("The coder has loaded a shape already.");
-    makeHeapAndTree(characterFrequencies, characters);
-    generateCompressedTree();
-    finishBuild();
+    try {
+        buildCode([&] {
+            makeHeapAndTree(characterFrequencies, characters);
+            generateCompressedTree();
+        });
+    } catch (...) {
+        boolTree.clear();
+        treeString.clear();
+        frequencies.clear();
+        throw;
+    }
 }
 
 void HuffmanPathTree::deflateHuffman(
@@ -91,7 +112,7 @@ void HuffmanPathTree::makeHeapAndTree(
 void HuffmanPathTree::generateTree(HeapQueue& queue) {
     decodeTable.clear();
     if (queue.size() < 2) {
-        rootIndex = -1;
+        rootIndex = queue.empty() ? -1 : queue.top().index;
         return;
     }
     std::int32_t next = 0;
@@ -165,6 +186,11 @@ std::vector<bool> HuffmanPathTree::codeOf(char16_t character) const {
     const CodeTable::Entry& entry = codes[character];
     if (!entry.exists()) throw CodeNotFoundException();
     std::vector<bool> bits;
+    if (!entry.isLong) {
+        for (unsigned i = 0; i < entry.length; ++i)
+            bits.push_back(((entry.bits >> i) & 1U) != 0);
+        return bits;
+    }
     for (std::int32_t child = entry.leaf; parentOf[at(child)] != -1;) {
         const std::int32_t parent = parentOf[at(child)];
         bits.push_back(nodes[at(parent)].left != child);
@@ -276,9 +302,10 @@ void HuffmanPathTree::inflateHuffman(const std::u16string& newTreeString) {
     const auto leaves = static_cast<std::size_t>(
         std::count(boolTree.begin(), boolTree.end(), true));
     if (newTreeString.size() != leaves) throw DamagedFormException();
-    setTreeString(newTreeString);
-    inflate();
-    finishBuild();
+    buildCode([&] {
+        setTreeString(newTreeString);
+        inflate();
+    });
 }
 
 }  // namespace tessel

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <exception>
 #include <functional>
+#include <map>
 #include <memory>
 #include <mutex>
 #include <queue>
@@ -171,17 +172,17 @@ public:
     // at another place.
     //
     // Throws std::invalid_argument, with nothing changed, if the lists
-    // differ in length. If texts cannot be encoded, or a thread cannot be
-    // started, the failure of the lowest folder is thrown after all workers
-    // have ended, and nothing is inserted. std::bad_alloc during insertion
-    // leaves the folders before it added.
+    // differ in length or are one and the same. If texts cannot be encoded, or
+    // a thread cannot be started, the failure of the lowest folder is thrown
+    // after all workers have ended, and nothing is inserted. std::bad_alloc
+    // during insertion leaves the folders before it added.
     void generateCodeAsyncAndAddPaths(FolderTexts& folders, FolderTexts& files);
     // The same as if the hardware ran `hardwareThreads` threads (0: two).
     void generateCodeAsyncAndAddPaths(FolderTexts& folders, FolderTexts& files,
                                       unsigned hardwareThreads);
 
-    // The folders that each worker takes, first and last, when n of them (at
-    // least one) meet that many hardware threads (0: two).
+    // The folders that each worker begins with, first and last, when n of
+    // them meet that many hardware threads (0: two).
     static std::vector<std::pair<std::uint64_t, std::uint64_t>> splitFolders(
         std::uint64_t n, unsigned hardwareThreads);
 
@@ -245,15 +246,15 @@ public:
     // partition met: its folder's components are appended to folderPaths and
     // the encoded names of the files asked for to filePaths. Numbers are
     // truncated; those beyond the last partition end the collection. Numbers
-    // out of order are answered in the order given as long as they stay in
-    // the partition at hand.
+    // out of order are answered in the order given as long as none is beyond
+    // the partition at hand: one before it counts back from its first file,
+    // which gives files that the same folder got earlier.
     //
     // In a coder that was loaded with tracks and no ends, numbers are those
     // of partitions, whose folders are appended to folderPaths alone.
     //
-    // Throws std::out_of_range for NaN, for a number below 1, for one too far
-    // out of order and for one that leads outside the tree; the outputs are
-    // then unchanged.
+    // Throws std::out_of_range for NaN, for a negative number and for one
+    // that leads outside the tree; the outputs are then unchanged.
     // Cost: for each partition met a search in partitionEnds and its track.
     void getPath(std::vector<Components>& folderPaths,
                  std::vector<Components>& filePaths,
@@ -309,7 +310,9 @@ public:
     std::u16string treeString;   // the leaves' characters in pre-order
     std::unique_ptr<BPathTree> pathTree;
     // Path number of a repeated whole path -> track of the stored one.
-    std::unordered_map<std::uint64_t, PathTrack> duplicates;
+    // Ordered: no numbers that a stored form may bring make it slow, and the
+    // same content is always written as the same bytes.
+    std::map<std::uint64_t, PathTrack> duplicates;
     std::vector<std::uint64_t> partitionEnds;  // pathCount after partition k
     // The folder's track, and the position of the batch's first file if the
     // folder was there before.
@@ -343,7 +346,8 @@ private:
     struct LoadedForm;
 
     void requireNoCode() const;
-    void finishBuild();
+    template <class Build>
+    void buildCode(Build build);
 
     std::size_t encodedBytes(const std::u16string& text) const;
     void encodeTo(const std::u16string& text, std::uint8_t* to) const;

@@ -9,13 +9,13 @@ std::size_t bytesOf(const std::vector<T>& list) {
     return list.capacity() * sizeof(T);
 }
 
-// A standard unordered map's bytes without those that its values own.
+// A standard map's bytes without those that its values own: a node has a
+// color and three links, and the allocator's overhead.
 template <class Map>
 std::size_t bytesOfMap(const Map& map) {
-    if (map.empty()) return 0;
     constexpr std::size_t nodeBytes =
-        sizeof(typename Map::value_type) + 2 * sizeof(void*);
-    return map.size() * nodeBytes + map.bucket_count() * sizeof(void*);
+        sizeof(typename Map::value_type) + 6 * sizeof(void*);
+    return map.size() * nodeBytes;
 }
 
 }  // namespace

@@ -80,8 +80,8 @@ private:
 // A path number as it stands among the numbers of a request. Infinity and
 // whatever 64 bits cannot hold is above every number in use.
 std::uint64_t pathNumberOf(double value) {
-    if (std::isnan(value) || value < 1)
-        throw std::out_of_range("A path number is below 1 or not a number.");
+    if (std::isnan(value) || value <= -1)
+        throw std::out_of_range("A path number is negative or not a number.");
     constexpr double beyondAll = 18446744073709551616.0;  // 2 to the 64th
     return value >= beyondAll ? std::numeric_limits<std::uint64_t>::max()
                               : static_cast<std::uint64_t>(value);
@@ -260,8 +260,6 @@ void HuffmanPathTree::getPathByNumber(
         const std::uint64_t base = k > 0 ? partitionEnds[k - 1] : 0;
         offsets.clear();
         while (number <= partitionEnds[k]) {
-            if (number <= base)
-                throw std::out_of_range("A path number is out of order.");
             offsets.push_back(number - base);
             if (++i == partitions.size()) break;
             number = pathNumberOf(partitions[i]);
@@ -269,8 +267,11 @@ void HuffmanPathTree::getPathByNumber(
         if (k >= partitionTracks.size())
             throw std::out_of_range("A partition has no track.");
         partitionTracks.get(k, track);
-        pathTree->getBatch(folderPaths.emplace_back(), filePaths.emplace_back(),
-                           track, offsets);
+        Components folder;
+        Components files;
+        pathTree->getBatch(folder, files, track, offsets);
+        folderPaths.push_back(std::move(folder));
+        filePaths.push_back(std::move(files));
     }
 }
 

@@ -158,6 +158,7 @@ struct alignas(64) HuffmanPathTree::Worker {
 
 std::vector<std::pair<std::uint64_t, std::uint64_t>>
 HuffmanPathTree::splitFolders(std::uint64_t n, unsigned hardwareThreads) {
+    if (n == 0) return {};
     const std::uint64_t threads =
         hardwareThreads == 0 ? threadsIfUnknown : hardwareThreads;
     const std::uint64_t workers = std::min(threads, n);
@@ -178,16 +179,20 @@ void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
 void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
                                                    FolderTexts& files,
                                                    unsigned hardwareThreads) {
-    if (folders.size() != files.size())
+    if (folders.size() != files.size() ||
+        (&folders == &files && !folders.empty()))
         throw std::invalid_argument(
             "Each folder needs exactly one list of files.");
     if (folders.empty()) return;
     joinAllGenThreads();
+    // They may be what a batch that was refused has left in this very object.
+    FolderTexts newFolders = std::exchange(folders, {});
+    FolderTexts newFiles = std::exchange(files, {});
     clearThreadResources();
-    encodedFolders.resize(folders.size());
-    encodedFiles.resize(folders.size());
-    asyncFolders = std::exchange(folders, {});
-    asyncFiles = std::exchange(files, {});
+    encodedFolders.resize(newFolders.size());
+    encodedFiles.resize(newFolders.size());
+    asyncFolders = std::move(newFolders);
+    asyncFiles = std::move(newFiles);
     if (asyncFolders.size() == 1)
         generateCodeForPath(0, 0);
     else

@@ -39,7 +39,12 @@ std::size_t BPathTree::deserialize(std::vector<std::uint8_t>& structure,
     if (structure.empty() && values.empty()) return 0;
     for (std::size_t i = 0; !builder.complete(); ++i) {
         if (i == values.size()) throw DamagedFormException();
-        builder.add(values[i]);
+        try {
+            builder.add(values[i]);
+        } catch (const UnknownNodeTypeException&) {
+            releaseContents(values[i]);  // it became a node all the same
+            throw;
+        }
         releaseContents(values[i]);
     }
     return builder.leaves();

@@ -209,7 +209,7 @@ struct HuffmanPathTree::LoadedForm {
     std::unique_ptr<BPathTree> pathTree = std::make_unique<BPathTree>();
     std::uint64_t pathCount = 0;
     std::uint64_t maxCodeBytes = 0;
-    std::unordered_map<std::uint64_t, PathTrack> duplicates;
+    std::map<std::uint64_t, PathTrack> duplicates;
     std::vector<std::uint64_t> partitionEnds;
     PathTracks partitionTracks;
     bool endsAscend = true;

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <stdexcept>
 
 #include "tests/support/Coders.hpp"
@@ -289,6 +290,16 @@ TEST(CoderForm, DuplicatesAreReadInAnyOrder) {
         EXPECT_EQ(coder.maxDuplicateTrackLength, 2U);
         EXPECT_EQ(coder.pathCount, 4U);
     }
+}
+
+TEST(CoderForm, DuplicatesAreWrittenInTheOrderOfTheirNumbers) {
+    const Bytes entries = {2, 1, 0, 5, 2, 0, 1, 9, 1, 1};
+    const Bytes shuffled = {9, 1, 1, 2, 1, 0, 5, 2, 0, 1};
+    HuffmanPathTree coder;
+    load(coder, plainForm({shapeOfTwo, onePath, {0x00, 0, 0, 0}, shuffled}));
+    const Bytes form = formOf(coder, false);
+    ASSERT_GT(form.size(), entries.size());
+    EXPECT_TRUE(std::equal(entries.begin(), entries.end(), form.end() - 10));
 }
 
 TEST(CoderForm, OfTwoEntriesWithOneNumberTheLaterCounts) {

@@ -206,6 +206,18 @@ TEST(HuffmanCode, AddCodeKeepsTheCodeThatACharacterHas) {
     EXPECT_EQ(coder->codes.size(), 3U);
 }
 
+// Whatever a second tree in the same coder leads to, no code changes.
+TEST(HuffmanCode, CodesOfAnEarlierTreeStay) {
+    const CoderPtr coder = coderWith(u"abc", {2, 1, 1});
+    const double frequencies[] = {1, 1};
+    coder->makeHeapAndTree(frequencies, u"xy");
+    coder->generateCode();
+    EXPECT_EQ(codeText(*coder, u'a'), "0");
+    EXPECT_EQ(codeText(*coder, u'b'), "10");
+    EXPECT_EQ(codeText(*coder, u'c'), "11");
+    EXPECT_EQ(coder->generateCodeFor(u"cab"), (support::Bytes{0b01011, 5}));
+}
+
 TEST(HuffmanCode, ACharacterWithoutALeafHasNoCode) {
     const CoderPtr coder = coderWith(u"abc", {2, 1, 1});
     EXPECT_THROW(coder->codeOf(u'd'), tessel::CodeNotFoundException);
@@ -289,6 +301,25 @@ TEST(HuffmanCode, AnEmptyMapGivesNoCode) {
     coder.deflateHuffman(std::unordered_map<char16_t, double>());
     EXPECT_EQ(coder.rootIndex, -1);
     EXPECT_THROW(coder.generateCodeFor(u"a"), tessel::CodeNotFoundException);
+}
+
+TEST(HuffmanCode, AQueueOfOneNodeMakesItTheRoot) {
+    HuffmanPathTree coder;
+    HuffmanPathTree::HeapQueue queue;
+    tessel::HNode node;
+    node.index = 3;
+    queue.push(node);
+    coder.generateTree(queue);
+    EXPECT_EQ(coder.rootIndex, 3);
+    EXPECT_TRUE(coder.nodes.empty());
+}
+
+TEST(HuffmanCode, ACoderThatGotNoCodeCanStillGetOne) {
+    const CoderPtr coder = coderWith(u"a", {1});
+    const double frequencies[] = {2, 1, 1};
+    coder->deflateHuffman(frequencies, u"abc");
+    EXPECT_EQ(codeText(*coder, u'b'), "10");
+    EXPECT_THROW(coder->deflateHuffman(frequencies, u"abc"), std::logic_error);
 }
 
 TEST(HuffmanCode, TraversingWithoutATreeVisitsNothing) {

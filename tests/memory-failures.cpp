@@ -58,6 +58,40 @@ CoderPtr filledCoder() {
     return coder;
 }
 
+TEST(MemoryFailures, ACodeIsBuiltOrTheCoderCanStillGetOne) {
+    const std::vector<double> frequencies = {5, 1, 2, 1, 3};
+    const std::u16string characters = u"abc\x161\x4e2d";
+    const CoderPtr expected = support::coderWith(characters, frequencies);
+    const auto compare = [&](const HuffmanPathTree& coder) {
+        EXPECT_EQ(coder.getBoolTree(), expected->getBoolTree());
+        EXPECT_EQ(coder.getTreeString(), expected->getTreeString());
+        EXPECT_EQ(coder.codes.size(), characters.size());
+        for (const char16_t character : characters)
+            EXPECT_EQ(coder.codeOf(character), expected->codeOf(character));
+    };
+    forEachAllocation([&](std::size_t n) {
+        HuffmanPathTree coder;
+        const bool built = succeedsWith(
+            n, [&] { coder.deflateHuffman(frequencies.data(), characters); });
+        if (!built) {
+            EXPECT_EQ(coder.codes.size(), 0U);
+            EXPECT_TRUE(coder.nodes.empty());
+            coder.deflateHuffman(frequencies.data(), characters);
+        }
+        compare(coder);
+        return built;
+    });
+    forEachAllocation([&](std::size_t n) {
+        HuffmanPathTree coder;
+        coder.boolTree = expected->boolTree;
+        const bool built = succeedsWith(
+            n, [&] { coder.inflateHuffman(expected->treeString); });
+        if (!built) coder.inflateHuffman(expected->treeString);
+        compare(coder);
+        return built;
+    });
+}
+
 TEST(MemoryFailures, ABatchLeavesTheFoldersBeforeTheFailureAdded) {
     const std::vector<Texts> folders = {{u"b", std::u16string(300, u'a')}};
     forEachAllocation([&](std::size_t n) {

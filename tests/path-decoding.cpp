@@ -372,12 +372,38 @@ TEST(PathLookup, ANumberThatIsNoneIsOutOfRange) {
     }
 }
 
-TEST(PathLookup, ANumberOutOfOrderBeforeItsPartitionIsOutOfRange) {
+// Such a number counts back from the partition's first file, so it gives a
+// file that the folder got earlier, if there is one.
+TEST(PathLookup, ANumberBeforeThePartitionAtHandCountsBackInItsFolder) {
+    const CoderPtr coder = fourLetterCoder();
+    support::addBatch(*coder, {u"a"}, {u"a", u"b", u"c"});
+    support::addBatch(*coder, {u"d"}, {u"a", u"b"});
+    support::addBatch(*coder, {u"a"}, {u"aa", u"bb"});
+    EXPECT_EQ(answerFor(*coder, {7, 5, 4}),
+              (Answer{{{u"a"}}, {{u"bb", u"c", u"b"}}}));
+    EXPECT_EQ(answerFor(*coder, {4, 6, 5, 7, 3}),
+              (Answer{{{u"d"}, {u"a"}}, {{u"a"}, {u"aa", u"c", u"bb", u"a"}}}));
+    expectRefused(*coder, {7, 2});
+    expectRefused(*coder, {7, 0});
+    expectRefused(*coder, {5, 3});
+    expectRefused(*coder, {4, 0.5});
+}
+
+TEST(PathLookup, BothOutputsMayBeOneList) {
     const CoderPtr coder = threePartitions();
-    expectRefused(*coder, {4, 3});
-    expectRefused(*coder, {5, 1});
-    expectRefused(*coder, {6, 5});
-    expectRefused(*coder, {1, 9, 2});
+    std::vector<Components> folders;
+    std::vector<Components> files;
+    coder->getPath(folders, files, {1, 5, 9});
+    std::vector<Components> both;
+    coder->getPath(both, both, {1, 5, 9});
+    ASSERT_EQ(both.size(), folders.size() + files.size());
+    for (std::size_t i = 0; i < folders.size(); ++i) {
+        EXPECT_EQ(both[2 * i], folders[i]);
+        EXPECT_EQ(both[2 * i + 1], files[i]);
+    }
+    const auto before = both;
+    EXPECT_THROW(coder->getPath(both, both, {1, 5, nan}), std::out_of_range);
+    EXPECT_EQ(both, before);
 }
 
 TEST(PathLookup, ANumberThatLeadsOutsideTheTreeIsOutOfRange) {

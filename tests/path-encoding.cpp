@@ -2,7 +2,9 @@
 // on workers, whole paths, and the bookkeeping of both.
 
 #include <gtest/gtest.h>
+#include <rapidcheck/gtest.h>
 
+#include <algorithm>
 #include <stdexcept>
 #include <string>
 
@@ -122,6 +124,7 @@ TEST(PathEncoding, TenFoldersOnFourThreadsLeaveTheRemainderToTheLast) {
 }
 
 TEST(PathEncoding, MoreThreadsThanFoldersGiveEachFolderAWorker) {
+    EXPECT_TRUE(HuffmanPathTree::splitFolders(0, 4).empty());
     EXPECT_EQ(HuffmanPathTree::splitFolders(3, 8),
               (std::vector<Range>{{0, 0}, {1, 1}, {2, 2}}));
 }
@@ -272,6 +275,29 @@ TEST(PathEncoding, ABatchOfNoFoldersReturnsAtOnce) {
     EXPECT_TRUE(coder->partitionTracks.empty());
 }
 
+TEST(PathEncoding, ARefusedFoldersTextsCanBeMendedAndTriedAgain) {
+    const CoderPtr coder = fourLetterCoder();
+    std::vector<Texts> folders = {{u"a", u"b"}};
+    std::vector<Texts> files = {{u"c", u"x"}};
+    EXPECT_THROW(coder->generateCodeAsyncAndAddPaths(folders, files),
+                 tessel::CodeNotFoundException);
+    EXPECT_EQ(coder->asyncFolders, (std::vector<Texts>{{u"a", u"b"}}));
+    EXPECT_EQ(coder->asyncFiles, (std::vector<Texts>{{u"c", u"x"}}));
+    coder->asyncFiles[0].pop_back();
+    coder->generateCodeAsyncAndAddPaths(coder->asyncFolders, coder->asyncFiles);
+    EXPECT_EQ(support::iterated(*coder),
+              (std::vector<Texts>{{u"a", u"b", u"c"}}));
+    EXPECT_TRUE(coder->asyncFolders.empty());
+}
+
+TEST(PathEncoding, OneListForFoldersAndFilesIsRefused) {
+    const CoderPtr coder = fourLetterCoder();
+    std::vector<Texts> both = {{u"a"}, {u"b"}};
+    EXPECT_THROW(coder->generateCodeAsyncAndAddPaths(both, both),
+                 std::invalid_argument);
+    EXPECT_EQ(both, (std::vector<Texts>{{u"a"}, {u"b"}}));
+}
+
 TEST(PathEncoding, ListsOfDifferentLengthAreRefusedAndNothingChanges) {
     const CoderPtr coder = fourLetterCoder();
     support::addBatch(*coder, {u"a"}, {u"b"});
@@ -385,6 +411,101 @@ TEST(PathEncoding, WhatARefusedBatchLeavesDoesNotDependOnTheThreads) {
                       support::formOf(*first, false));
         }
     }
+}
+
+// Long folders at the front keep their worker busy, so that the others come
+// to its range with many folders left, in steps of several folders.
+Batch lopsidedBatch() {
+    constexpr std::size_t folders = 700;
+    Batch batch;
+    batch.folders.assign(folders, Texts{u"a", u"b"});
+    batch.files.assign(folders, Texts{u"c"});
+    for (std::size_t i = 0; i < folders / 8; ++i)
+        batch.files[i] = Texts(i < 3 ? 3000 : 60, u"abcdabcdabcdabcd");
+    return batch;
+}
+
+TEST(PathEncoding, ALopsidedBatchIsInsertedInOrderOnAnyNumberOfThreads) {
+    Batch batch = lopsidedBatch();
+    for (std::size_t i = 0; i < batch.folders.size(); ++i)
+        batch.folders[i] = {std::u16string(i % 29, u'b') + u"a"};
+    const CoderPtr first = fourLetterCoder();
+    refusalOf(*first, batch, 1);
+    EXPECT_EQ(first->partitionEnds.size(), batch.folders.size());
+    for (const unsigned threads : {2U, 3U, 7U}) {
+        const CoderPtr coder = fourLetterCoder();
+        EXPECT_EQ(refusalOf(*coder, batch, threads), Refused::no);
+        EXPECT_EQ(support::formOf(*coder, false),
+                  support::formOf(*first, false));
+        EXPECT_EQ(coder->maxCodeBytes, first->maxCodeBytes);
+    }
+}
+
+// The failure of the lowest folder, and the longest component up to it,
+// whichever worker met it and whatever else failed.
+RC_GTEST_PROP(PathEncoding, ALopsidedBatchIsRefusedAsInOrder, ()) {
+    Batch batch = lopsidedBatch();
+    const auto position = rc::gen::inRange<std::size_t>(0, 700);
+    const auto bad = *rc::gen::nonEmpty(
+        rc::gen::container<std::vector<std::size_t>>(position));
+    for (std::size_t k = 0; k < bad.size(); ++k) {
+        Texts& list = k % 3 == 0 ? batch.folders[bad[k]] : batch.files[bad[k]];
+        list.push_back(k % 2 == 0 ? u"" : u"x");
+    }
+    const std::size_t tall = *position;
+    batch.files[tall].insert(batch.files[tall].begin(),
+                             std::u16string(900, u'a'));
+    const CoderPtr first = fourLetterCoder();
+    const Refused expected = refusalOf(*first, batch, 1);
+    RC_ASSERT(expected != Refused::no);
+    for (const unsigned threads : {2U, 3U, 7U}) {
+        const CoderPtr coder = fourLetterCoder();
+        RC_ASSERT(refusalOf(*coder, batch, threads) == expected);
+        RC_ASSERT(coder->maxCodeBytes == first->maxCodeBytes);
+        RC_ASSERT(coder->pathCount == 0U);
+    }
+    const bool inOrder = tall <= *std::min_element(bad.begin(), bad.end());
+    if (!inOrder) RC_ASSERT(first->maxCodeBytes < 200U);
+}
+
+TEST(PathEncoding, EncodingAFolderLeavesItsTexts) {
+    const CoderPtr coder = fourLetterCoder();
+    coder->asyncFolders = {{u"a"}, {u"b"}};
+    coder->asyncFiles = {{u"c"}, {u"d"}};
+    coder->encodedFolders.resize(2);
+    coder->encodedFiles.resize(2);
+    coder->generateCodeForPath(0, 1);
+    EXPECT_EQ(coder->asyncFolders, (std::vector<Texts>{{u"a"}, {u"b"}}));
+    EXPECT_EQ(coder->asyncFiles, (std::vector<Texts>{{u"c"}, {u"d"}}));
+    EXPECT_EQ(coder->encodedFolders.size(), 2U);
+}
+
+TEST(PathEncoding, WorkersReleaseTheTextsThatTheyEncoded) {
+    for (const unsigned threads : threadCounts) {
+        const CoderPtr coder = fourLetterCoder();
+        Batch batch = lopsidedBatch();
+        coder->asyncFolders = batch.folders;
+        coder->asyncFiles = batch.files;
+        coder->encodeOnWorkers(threads);
+        EXPECT_EQ(coder->asyncFolders,
+                  std::vector<Texts>(batch.folders.size()));
+        EXPECT_EQ(coder->asyncFiles, std::vector<Texts>(batch.files.size()));
+        EXPECT_TRUE(coder->genThreads.empty());
+        EXPECT_EQ(coder->pathCount, 0U);
+        coder->addPathToBTreeFromAsyncData();
+        const CoderPtr whole = fourLetterCoder();
+        refusalOf(*whole, batch, threads);
+        EXPECT_EQ(support::formOf(*coder, false),
+                  support::formOf(*whole, false));
+    }
+}
+
+TEST(PathEncoding, NothingToEncodeNeedsNoWorkers) {
+    const CoderPtr coder = fourLetterCoder();
+    coder->encodeOnWorkers(4);
+    EXPECT_TRUE(coder->encodedFolders.empty());
+    coder->addPathToBTreeFromAsyncData();
+    EXPECT_EQ(coder->pathCount, 0U);
 }
 
 TEST(PathEncoding, ACoderWithoutACodeRefusesEveryBatch) {

@@ -243,6 +243,15 @@ TEST(PathTreeForm, ACodeOfFourIsUnknown) {
     EXPECT_EQ(support::childTexts(*tree.root), Paths{"1"});
 }
 
+TEST(PathTreeForm, TheValueOfAnUnknownCodeIsTakenOver) {
+    BPathTree tree;
+    Bytes structure = {0x03, 0x02, 0x09};
+    tessel::Components values = support::components({"a", "b", "c", "d"});
+    EXPECT_THROW(tree.deserialize(structure, values),
+                 tessel::UnknownNodeTypeException);
+    EXPECT_EQ(values, (support::components({"", "", "", "d"})));
+}
+
 TEST(PathTreeForm, EveryCodeAboveThreeIsUnknown) {
     for (unsigned code = 4; code < 256; ++code) {
         BPathTree tree;

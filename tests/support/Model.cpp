@@ -219,7 +219,7 @@ namespace {
 
 // A number as it is compared with partition ends; nothing if it is none.
 std::optional<std::uint64_t> wholeNumber(double value) {
-    if (std::isnan(value) || value < 1) return {};
+    if (std::isnan(value) || value <= -1) return {};
     if (value >= std::ldexp(1.0, 64)) return noPosition;
     return static_cast<std::uint64_t>(value);
 }
@@ -261,7 +261,6 @@ std::optional<Found> Coder::getPath(const std::vector<double>& numbers) const {
             const std::optional<std::uint64_t> number = wholeNumber(numbers[i]);
             if (!number) return {};
             if (*number > partitionEnds[k]) break;
-            if (*number <= base) return {};
             offsets.push_back(*number - base);
             ++i;
         }
