@@ -58,21 +58,22 @@ std::vector<FirstCharacter> firstCharacters(const std::vector<HNode>& nodes,
     std::vector<FirstCharacter> firsts(windows);
     std::vector<Pending> pending{{&root, 0, 0}};
     while (!pending.empty()) {
-        const auto [node, code, bits] = pending.back();
+        const Pending at = pending.back();
         pending.pop_back();
-        if (node->isLeaf()) {
-            for (std::size_t w = code; w < windows; w += std::size_t{1} << bits)
-                firsts[w] = {node->character, bits};
+        if (at.node->isLeaf()) {
+            const std::size_t step = std::size_t{1} << at.bits;
+            for (std::size_t window = at.code; window < windows; window += step)
+                firsts[window] = {at.node->character, at.bits};
             continue;
         }
-        if (bits == DecodeTable::windowBits) continue;
+        if (at.bits == DecodeTable::windowBits) continue;
         const auto descend = [&](std::int32_t child, std::size_t bit) {
-            if (child >= 0)
-                pending.push_back({&nodes[static_cast<std::size_t>(child)],
-                                   code | bit << bits, bits + 1});
+            if (child < 0) return;
+            pending.push_back({&nodes[static_cast<std::size_t>(child)],
+                               at.code | bit << at.bits, at.bits + 1});
         };
-        descend(node->left, 0);
-        descend(node->right, 1);
+        descend(at.node->left, 0);
+        descend(at.node->right, 1);
     }
     return firsts;
 }

@@ -196,6 +196,8 @@ private:
     }
     // Releases a node whose last share is gone, and all that it alone owns.
     static void destroy(BNode* dead) noexcept;
+    BNode* takeChild(ChildStore kept, BNode* above) noexcept;
+    BNode* takeWayUp() noexcept;
 
     std::atomic<std::uint32_t> references = 1;
     std::uint8_t head = 0;

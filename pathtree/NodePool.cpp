@@ -10,6 +10,7 @@
 #include <new>
 #include <stdexcept>
 #include <unordered_map>
+#include <utility>
 
 namespace tessel {
 
@@ -126,6 +127,27 @@ void BNode::setStore(ChildStore kept) {
     }
 }
 
+// Takes the last child away. If nobody else shares it, leaves `above` in its
+// place and returns it; otherwise returns null.
+BNode* BNode::takeChild(ChildStore kept, BNode* above) noexcept {
+    if (kept.isOnly()) {
+        const bool dead = kept.child()->unshare();
+        setStore(dead ? ChildStore::only(above) : ChildStore());
+        return dead ? kept.child() : nullptr;
+    }
+    BNode*& slot = kept.block()->slots()[--kept.block()->size];
+    if (!slot->unshare()) return nullptr;
+    return std::exchange(slot, above);
+}
+
+// What takeChild left in the place of the last child that it returned.
+BNode* BNode::takeWayUp() noexcept {
+    const ChildStore kept = store();
+    if (!kept.isOnly()) return kept.block()->slots()[kept.block()->size];
+    setStore(ChildStore());
+    return kept.child();
+}
+
 // Walks down and up through the dead nodes. On the way down the place that a
 // child stood in, which is free once the child is taken from it, remembers
 // the way up: the nodes themselves are the stack.
@@ -134,20 +156,10 @@ void BNode::destroy(BNode* dead) noexcept {
     for (;;) {
         const ChildStore kept = dead->store();
         if (kept.size() > 0) {
-            BNode* child = nullptr;
-            if (kept.isOnly()) {
-                child = kept.child();
-                const bool last = child->unshare();
-                dead->setStore(last ? ChildStore::only(above) : ChildStore());
-                if (!last) continue;
-            } else {
-                BNode** slot = &kept.block()->slots()[--kept.block()->size];
-                child = *slot;
-                if (!child->unshare()) continue;
-                *slot = above;
+            if (BNode* child = dead->takeChild(kept, above)) {
+                above = dead;
+                dead = child;
             }
-            above = dead;
-            dead = child;
             continue;
         }
         if ((dead->head & lateStoreFlag) != 0)
@@ -156,13 +168,7 @@ void BNode::destroy(BNode* dead) noexcept {
         NodeSlab::of(dead)->release();
         if (above == nullptr) return;
         dead = above;
-        const ChildStore open = dead->store();
-        if (open.isOnly()) {
-            above = open.child();
-            dead->setStore(ChildStore());
-        } else {
-            above = open.block()->slots()[open.block()->size];
-        }
+        above = dead->takeWayUp();
     }
 }
 
