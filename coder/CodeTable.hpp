@@ -1,6 +1,5 @@
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <vector>
@@ -36,7 +35,7 @@ public:
     // Adds the entry unless the character has one already.
     void insert(char16_t character, const Entry& entry);
 
-    // Takes every code away.
+    // Takes every code away; keeps the memory.
     void clear() noexcept;
 
     // Characters that have a code.

@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <utility>
 
 #include "coder/CodeTable.hpp"
 #include "coder/DecodeTable.hpp"

@@ -43,7 +43,7 @@ void HuffmanPathTree::requireNoCode() const {
 }
 
 // Runs `build`, which makes `nodes`, and derives the code. If memory runs
-// out, there is no code, as before.
+// out, there is no code, as before, and it can be built again.
 template <class Build>
 void HuffmanPathTree::buildCode(Build build) {
     try {

@@ -62,6 +62,7 @@ public:
                                           HNodeFrequencyComparator>;
     using Visitor = std::function<void(HuffmanPathTree*, HNode&)>;
     using FolderTexts = std::vector<std::vector<std::u16string>>;
+    using FirstAndLast = std::pair<std::uint64_t, std::uint64_t>;
 
     HuffmanPathTree();
     HuffmanPathTree(const HuffmanPathTree&) = delete;
@@ -94,8 +95,9 @@ public:
         const std::unordered_map<char16_t, double>& characterFrequencies);
 
     // Merges the queue's nodes into a tree and appends it to `nodes`, which
-    // should be empty. With fewer than two nodes it only sets rootIndex to
-    // -1. The queue is consumed down to the root.
+    // should be empty. With fewer than two nodes it only sets rootIndex: to
+    // the one node's index, which is -1 for a leaf, or to -1. The queue is
+    // consumed down to the root.
     void generateTree(HeapQueue& queue);
 
     // Calls visit with a copy of every node of the tree, in pre-order, left
@@ -103,7 +105,8 @@ public:
     void traverse(Visitor visit);
 
     // Rebuilds parentOf and adds the code of every leaf to `codes`. A
-    // character that has a code keeps it.
+    // character that has a code keeps it, except that codes of over 56 bits
+    // are always those of the present tree.
     void generateCode();
 
     // Adds to `codes` the code of a leaf of `nodes`, read off parentOf,
@@ -183,8 +186,8 @@ public:
 
     // The folders that each worker begins with, first and last, when n of
     // them meet that many hardware threads (0: two).
-    static std::vector<std::pair<std::uint64_t, std::uint64_t>> splitFolders(
-        std::uint64_t n, unsigned hardwareThreads);
+    static std::vector<FirstAndLast> splitFolders(std::uint64_t n,
+                                                  unsigned hardwareThreads);
 
     // Encodes the folders first to last of asyncFolders and asyncFiles into
     // encodedFolders and encodedFiles, which must be as long. Throws what
@@ -248,12 +251,12 @@ public:
     // truncated; those beyond the last partition end the collection. Numbers
     // out of order are answered in the order given as long as none is beyond
     // the partition at hand: one before it counts back from its first file,
-    // which gives files that the same folder got earlier.
+    // which gives the folder's earlier children.
     //
     // In a coder that was loaded with tracks and no ends, numbers are those
     // of partitions, whose folders are appended to folderPaths alone.
     //
-    // Throws std::out_of_range for NaN, for a negative number and for one
+    // Throws std::out_of_range for NaN, for -1 and below and for a number
     // that leads outside the tree; the outputs are then unchanged.
     // Cost: for each partition met a search in partitionEnds and its track.
     void getPath(std::vector<Components>& folderPaths,
@@ -329,11 +332,11 @@ public:
     CodeTable codes;
     std::vector<std::int32_t> parentOf;  // by position in nodes; -1: none
 
-    // Workers. Each has its own range of entries in asyncFolders, asyncFiles
-    // and the encoded lists; `codes`, which they share, nobody changes.
+    // Workers. An entry of these lists is that of the worker which took it;
+    // `codes`, which they share, nobody changes.
     std::vector<std::thread> genThreads;
-    FolderTexts asyncFolders;
-    FolderTexts asyncFiles;
+    FolderTexts asyncFolders;  // released under releaseMutex
+    FolderTexts asyncFiles;    // released under releaseMutex
     std::vector<PackedComponents> encodedFolders;  // under folderResultMutex
     std::vector<PackedComponents> encodedFiles;    // under fileResultMutex
     std::vector<ComponentBuffers> encodedBuffers;  // under folderResultMutex

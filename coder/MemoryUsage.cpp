@@ -9,8 +9,8 @@ std::size_t bytesOf(const std::vector<T>& list) {
     return list.capacity() * sizeof(T);
 }
 
-// A standard map's bytes without those that its values own: a node has a
-// color and three links, and the allocator's overhead.
+// A standard map's bytes without those that its values own: each node has a
+// color and three links, and the allocator adds a header and rounds up.
 template <class Map>
 std::size_t bytesOfMap(const Map& map) {
     constexpr std::size_t nodeBytes =

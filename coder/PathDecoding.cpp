@@ -159,33 +159,30 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
     };
     const BitReader reader(bytes);
     DecodeTable::Step step;
+    const auto take = [&](std::uint64_t& window) {
+        step = decodeTable[window];
+        step.writeTo(out);
+        out += step.count();
+        bit += step.bits();
+        window >>= step.bits();
+    };
     // As long as all steps of a window lie before the end. A step that knows
     // nothing takes no bits, so all that follow it know nothing either.
     while (end - bit >= bitsAWindow) {
         std::uint64_t window = reader.from(bit);
-        for (unsigned k = 0; k < stepsAWindow; ++k) {
-            step = decodeTable[window];
-            step.writeTo(out);
-            out += step.count();
-            bit += step.bits();
-            window >>= step.bits();
-        }
+        for (unsigned k = 0; k < stepsAWindow; ++k) take(window);
         if (step.count() == 0) {
             flush();
             return bit;
         }
         if (out >= flushAt) flush();
     }
+    // One window holds the bits that are left. The last step may take more
+    // than these: it is taken back and then as far as it fits.
     if (bit < end) {
         std::uint64_t window = reader.from(bit);
-        do {
-            step = decodeTable[window];
-            step.writeTo(out);
-            out += step.count();
-            bit += step.bits();
-            window >>= step.bits();
-        } while (bit < end && step.count() > 0);
-        // The last step may hold more characters than are there.
+        do take(window);
+        while (bit < end && step.count() > 0);
         if (bit > end) {
             bit -= step.bits();
             out -= step.count();

@@ -119,8 +119,6 @@ void HuffmanPathTree::raiseMaxCodeBytes(std::uint64_t length) noexcept {
 // line of its own: usually only its own worker touches it.
 class alignas(64) HuffmanPathTree::WorkerRange {
 public:
-    using FirstAndLast = std::pair<std::uint64_t, std::uint64_t>;
-
     void set(const FirstAndLast& folders) noexcept {
         next.store(folders.first, std::memory_order_relaxed);
         last = folders.second;
@@ -149,21 +147,21 @@ private:
 struct alignas(64) HuffmanPathTree::Worker {
     ComponentPacker packer;
     std::size_t buffersAt = 0;  // place of its buffers in encodedBuffers
-    std::vector<WorkerRange::FirstAndLast> unreleased;  // encoded texts
-    std::uint64_t folder = 0;                           // at hand
-    std::uint64_t longestInFolder = 0;  // component of the one at hand
-    std::uint64_t longest = 0;          // component of those before it
-    std::exception_ptr failure;         // in the folder at hand
+    std::vector<FirstAndLast> unreleased;  // folders with encoded texts
+    std::uint64_t folder = 0;              // at hand
+    std::uint64_t longestInFolder = 0;     // component of the one at hand
+    std::uint64_t longest = 0;             // component of those before it
+    std::exception_ptr failure;            // in or behind the folder at hand
 };
 
-std::vector<std::pair<std::uint64_t, std::uint64_t>>
-HuffmanPathTree::splitFolders(std::uint64_t n, unsigned hardwareThreads) {
+std::vector<HuffmanPathTree::FirstAndLast> HuffmanPathTree::splitFolders(
+    std::uint64_t n, unsigned hardwareThreads) {
     if (n == 0) return {};
     const std::uint64_t threads =
         hardwareThreads == 0 ? threadsIfUnknown : hardwareThreads;
     const std::uint64_t workers = std::min(threads, n);
     const std::uint64_t chunk = n / workers;
-    std::vector<std::pair<std::uint64_t, std::uint64_t>> ranges;
+    std::vector<FirstAndLast> ranges;
     for (std::uint64_t w = 0; w < workers; ++w)
         ranges.emplace_back(w * chunk, (w + 1) * chunk - 1);
     ranges.back().second = n - 1;
@@ -189,20 +187,22 @@ void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
     FolderTexts newFolders = std::exchange(folders, {});
     FolderTexts newFiles = std::exchange(files, {});
     clearThreadResources();
-    encodedFolders.resize(newFolders.size());
-    encodedFiles.resize(newFolders.size());
     asyncFolders = std::move(newFolders);
     asyncFiles = std::move(newFiles);
-    if (asyncFolders.size() == 1)
+    if (asyncFolders.size() == 1) {
+        encodedFolders.resize(1);
+        encodedFiles.resize(1);
         generateCodeForPath(0, 0);
-    else
+    } else {
         encodeOnWorkers(hardwareThreads);
+    }
     releaseContents(asyncFolders);
     releaseContents(asyncFiles);
     addPathToBTreeFromAsyncData();
 }
 
 void HuffmanPathTree::encodeOnWorkers(unsigned hardwareThreads) {
+    joinAllGenThreads();
     encodedFolders.resize(asyncFolders.size());
     encodedFiles.resize(asyncFolders.size());
     if (asyncFolders.empty()) return;
@@ -263,9 +263,9 @@ void HuffmanPathTree::releaseEncoded(Worker& worker) noexcept {
 }
 
 // Notes the longest component and throws the failure of the lowest folder.
-// A worker leaves its own range only when all of it is taken, and the folders
-// of a range are taken in order: so every folder below the lowest that failed
-// has been encoded.
+// A worker leaves its own range only when it fails or when all of it is taken,
+// and the folders of a range are taken in order: so every folder below the
+// lowest that failed has been encoded.
 void HuffmanPathTree::collect(const std::vector<Worker>& workers) {
     const Worker* failed = nullptr;
     for (const Worker& worker : workers)
@@ -278,11 +278,14 @@ void HuffmanPathTree::collect(const std::vector<Worker>& workers) {
     }
     // What encoding in order would have met.
     raiseMaxCodeBytes(failed->longestInFolder);
-    for (std::uint64_t i = 0; i < failed->folder; ++i)
-        for (const PackedComponents& list :
-             {encodedFolders[i], encodedFiles[i]})
-            for (const ComponentView component : list)
-                raiseMaxCodeBytes(component.size());
+    const auto include = [this](const PackedComponents& list) {
+        for (const ComponentView component : list)
+            raiseMaxCodeBytes(component.size());
+    };
+    for (std::uint64_t i = 0; i < failed->folder; ++i) {
+        include(encodedFolders[i]);
+        include(encodedFiles[i]);
+    }
     std::rethrow_exception(failed->failure);
 }
 

@@ -73,9 +73,8 @@ private:
     BNode* owner;
 };
 
-// The array that a node's children stand in if there are several: one
-// allocation, owned by the node, of which each used slot owns a share of a
-// child.
+// The array that several children of a node stand in: one allocation, owned by
+// the node, of which each used slot owns a share of a child.
 struct ChildBlock {
     std::uint32_t size;
     std::uint32_t capacity;
@@ -85,7 +84,8 @@ struct ChildBlock {
 
 // What a node keeps its children by, in one word: nothing, the share of an
 // only child, which many folders have, or an array. Both are aligned to four
-// bytes, so the lowest bit can tell them apart.
+// bytes, so the lowest bit can tell them apart. While a node is released, the
+// child's place may hold the node above it, or none.
 class ChildStore {
 public:
     ChildStore() noexcept = default;
@@ -217,6 +217,8 @@ inline BNodePtr BNodePtr::adopt(BNode* owned) noexcept {
     return handle;
 }
 
+static_assert(alignof(BNode) >= 4 && alignof(ChildBlock) >= 4);
+
 inline std::size_t ChildList::size() const noexcept {
     return owner->store().size();
 }
@@ -229,7 +231,7 @@ inline BNode& ChildList::operator[](std::size_t i) const noexcept {
 struct NodeMemory {
     // The node's piece of its slab, its children's array not included.
     static std::size_t nodeBytes(const BNode& node) noexcept;
-    // The array of the node's children; 0 if it has none or one.
+    // The array of the node's children; 0 if it has no array.
     static std::size_t childListBytes(const BNode& node) noexcept;
     // Identity and size of the slab that the node lives in.
     static std::pair<const void*, std::size_t> slab(const BNode& node) noexcept;

@@ -55,8 +55,9 @@ using Components = std::vector<Component>;
 // Threads: no locks. Use a tree and its copies from one thread at a time;
 //   releasing them on different threads is safe.
 // Cost: a file takes its encoded name, 5 to 8 bytes, and 8 bytes in its
-//   folder's child list; a folder about 30 bytes more. Finding a child takes
-//   constant time on average.
+//   folder's child list; a folder takes 8 bytes more, and about 20 for the
+//   list if it has more than one child. Finding a child takes constant time
+//   on average.
 class BPathTree {
 public:
     // No position: what a search answers that finds nothing.

@@ -206,7 +206,8 @@ TEST(HuffmanCode, AddCodeKeepsTheCodeThatACharacterHas) {
     EXPECT_EQ(coder->codes.size(), 3U);
 }
 
-// Whatever a second tree in the same coder leads to, no code changes.
+// Whatever a second tree in the same coder leads to, the codes stay, as long
+// as they stand in the table.
 TEST(HuffmanCode, CodesOfAnEarlierTreeStay) {
     const CoderPtr coder = coderWith(u"abc", {2, 1, 1});
     const double frequencies[] = {1, 1};

@@ -136,6 +136,21 @@ TEST(MemoryFailures, ABatchOnWorkersIsRefusedOrAddedInPart) {
     });
 }
 
+TEST(MemoryFailures, ABatchThatFailsBeforeItIsEncodedKeepsItsTexts) {
+    for (const std::size_t n : {0U, 1U, 2U, 3U}) {
+        const CoderPtr coder = filledCoder();
+        std::vector<Texts> folders = {{u"b"}, {u"a"}};
+        std::vector<Texts> files(2, Texts{u"a", u"b"});
+        const std::vector<Texts> folderTexts = folders;
+        const std::vector<Texts> fileTexts = files;
+        ASSERT_FALSE(succeedsWith(n, [&] {
+            coder->generateCodeAsyncAndAddPaths(folders, files, 2);
+        }));
+        EXPECT_EQ(coder->asyncFolders, folderTexts) << n;
+        EXPECT_EQ(coder->asyncFiles, fileTexts) << n;
+    }
+}
+
 TEST(MemoryFailures, APartitionIsAddedOrNot) {
     forEachAllocation([](std::size_t n) {
         const CoderPtr coder = filledCoder();

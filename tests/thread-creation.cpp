@@ -84,6 +84,26 @@ TEST(ThreadCreation, TheErrorIsThePlatforms) {
     }
 }
 
+// The workers that are there take over the folders of those that are not.
+TEST(ThreadCreation, AWorkerThatIsDoneHelpsWithTheOtherFolders) {
+    for (const int possible : {1, 2, 3}) {
+        const CoderPtr coder = support::fourLetterCoder();
+        coder->asyncFolders = folders();
+        coder->asyncFiles = files();
+        {
+            const FewThreads few(possible);
+            EXPECT_THROW(coder->encodeOnWorkers(4), std::system_error);
+        }
+        EXPECT_EQ(coder->asyncFolders, std::vector<Texts>(8));
+        EXPECT_EQ(coder->asyncFiles, std::vector<Texts>(8));
+        coder->addPathToBTreeFromAsyncData();
+        const CoderPtr expected = support::fourLetterCoder();
+        support::addBatches(*expected, folders(), files(), 1);
+        EXPECT_EQ(support::formOf(*coder, false),
+                  support::formOf(*expected, false));
+    }
+}
+
 TEST(ThreadCreation, OneFolderNeedsNoThread) {
     const CoderPtr coder = support::fourLetterCoder();
     const FewThreads none(0);
