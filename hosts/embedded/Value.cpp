@@ -153,6 +153,20 @@ Value Value::cellColumn(std::vector<Value> elements) {
     return {{count, 1}, std::move(elements)};
 }
 
+Value Value::texts(const std::vector<std::u16string>& rows) {
+    std::vector<Value> elements;
+    elements.reserve(rows.size());
+    for (const std::u16string& row : rows) elements.push_back(text(row));
+    return cellColumn(std::move(elements));
+}
+
+Value Value::textLists(const std::vector<std::vector<std::u16string>>& lists) {
+    std::vector<Value> elements;
+    elements.reserve(lists.size());
+    for (const auto& rows : lists) elements.push_back(texts(rows));
+    return cellColumn(std::move(elements));
+}
+
 ValueClass Value::valueClass() const noexcept {
     return static_cast<ValueClass>(elements.index());
 }

@@ -77,6 +77,10 @@ public:
     static Value byteColumn(std::vector<std::uint8_t> values);
     static Value cellRow(std::vector<Value> elements);
     static Value cellColumn(std::vector<Value> elements);
+    // A cell column of char rows, and one of such cells.
+    static Value texts(const std::vector<std::u16string>& rows);
+    static Value textLists(
+        const std::vector<std::vector<std::u16string>>& lists);
 
     ValueClass valueClass() const noexcept;
     Dimensions dimensions() const;

@@ -1,5 +1,6 @@
 #include "tests/host/HostFixture.hpp"
 
+#include <numeric>
 #include <utility>
 
 namespace tessel::embedded {
@@ -27,27 +28,20 @@ std::u16string alphabetOf(const Listing& listing) {
     return alphabet;
 }
 
-Value cellOf(const Texts& texts) {
-    std::vector<Value> elements;
-    for (const std::u16string& text : texts) {
-        elements.push_back(Value::text(text));
-    }
-    return Value::cellColumn(std::move(elements));
-}
-
-Value cellsOf(const std::vector<Texts>& lists) {
-    std::vector<Value> elements;
-    for (const Texts& texts : lists) elements.push_back(cellOf(texts));
-    return Value::cellColumn(std::move(elements));
-}
-
 Value foldersAndFiles(const Listing& listing) {
     std::vector<Value> elements;
     for (const Texts& folder : listing.folders) {
-        elements.push_back(cellOf(folder));
+        elements.push_back(Value::texts(folder));
     }
-    for (const Texts& files : listing.files) elements.push_back(cellOf(files));
+    for (const Texts& files : listing.files)
+        elements.push_back(Value::texts(files));
     return Value::cellColumn(std::move(elements));
+}
+
+std::vector<double> numbersTo(std::size_t count) {
+    std::vector<double> numbers(count);
+    std::iota(numbers.begin(), numbers.end(), 1.0);
+    return numbers;
 }
 
 Texts textsOf(const Value& cell) {

@@ -30,12 +30,11 @@ std::vector<Texts> pathsOf(const Listing& listing);
 // All characters of a listing, each once, in order of appearance.
 std::u16string alphabetOf(const Listing& listing);
 
-// A cell column of char rows, and a cell column of such cells.
-Value cellOf(const Texts& texts);
-Value cellsOf(const std::vector<Texts>& lists);
-
 // The input 2 of mode "files".
 Value foldersAndFiles(const Listing& listing);
+
+// The numbers from 1 to count.
+std::vector<double> numbersTo(std::size_t count);
 
 // The texts of a cell of char rows, which must be a column.
 Texts textsOf(const Value& cell);
@@ -74,8 +73,8 @@ protected:
     }
 
     void add(const Value& instance, const Listing& listing) {
-        host.call(0, instance, "addPaths", cellsOf(listing.folders),
-                  cellsOf(listing.files));
+        host.call(0, instance, "addPaths", Value::textLists(listing.folders),
+                  Value::textLists(listing.files));
     }
     // All paths from a reset to the end.
     std::vector<Texts> iterated(const Value& instance);

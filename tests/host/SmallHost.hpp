@@ -15,13 +15,22 @@
 // raising errors, and keeps count of everything it gives away.
 namespace small {
 
+// Counts those of a kind that are alive.
+class Counted {
+public:
+    explicit Counted(long& aliveCount) : alive(aliveCount) { ++alive; }
+    Counted(const Counted&) = delete;
+    Counted& operator=(const Counted&) = delete;
+    ~Counted() { --alive; }
+
+private:
+    long& alive;
+};
+
 // An array of any class; which of the parts counts is up to its user.
 class Box final : public tessel::HostArray {
 public:
-    explicit Box(long& aliveCount) : alive(aliveCount) { ++alive; }
-    Box(const Box&) = delete;
-    Box& operator=(const Box&) = delete;
-    ~Box() { --alive; }
+    explicit Box(long& aliveCount) : counted(aliveCount) {}
 
     std::vector<std::size_t> dimensions = {0, 0};
     bool isCell = false;
@@ -34,7 +43,7 @@ public:
     void* native = nullptr;
 
 private:
-    long& alive;
+    Counted counted;
 };
 
 using Array = std::unique_ptr<Box>;
@@ -47,14 +56,11 @@ public:
 
 class Signature final : public tessel::HostSignature {
 public:
-    explicit Signature(long& aliveCount) : alive(aliveCount) { ++alive; }
-    Signature(const Signature&) = delete;
-    Signature& operator=(const Signature&) = delete;
-    ~Signature() { --alive; }
+    explicit Signature(long& aliveCount) : counted(aliveCount) {}
     std::vector<std::string> calls;
 
 private:
-    long& alive;
+    Counted counted;
 };
 
 // What this host throws when it raises an error.

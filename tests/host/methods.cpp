@@ -38,14 +38,6 @@ protected:
     }
 };
 
-std::vector<double> upTo(std::size_t count) {
-    std::vector<double> numbers;
-    for (std::size_t i = 1; i <= count; ++i) {
-        numbers.push_back(static_cast<double>(i));
-    }
-    return numbers;
-}
-
 }  // namespace
 
 // --- Constructor -------------------------------------------------------------
@@ -121,7 +113,7 @@ TEST_F(MethodsTest, FrequenciesModeRefusesWhatIsNotRealDouble) {
 
 TEST_F(MethodsTest, FilesModeWithOddElementCountRaisesFileListNotEven) {
     const HostException error = errorOf([&] {
-        make(Value::text(u"files"), cellsOf({{u"a"}, {u"b"}, {u"c"}}));
+        make(Value::text(u"files"), Value::textLists({{u"a"}, {u"b"}, {u"c"}}));
     });
     EXPECT_EQ(error.identifier(), componentName + "fileListNotEven");
     EXPECT_TRUE(error.arguments().empty());
@@ -134,10 +126,10 @@ TEST_F(MethodsTest, FilesModeCountsCharFoldersLikeCellFolders) {
     Value charFolders = Value::cell({4, 1});
     charFolders.setElement(0, Value::text(u"aab"));
     charFolders.setElement(1, Value::text(u"c"));
-    charFolders.setElement(2, cellOf({u"abb", u"d"}));
-    charFolders.setElement(3, cellOf({u"ddddd"}));
+    charFolders.setElement(2, Value::texts({u"abb", u"d"}));
+    charFolders.setElement(3, Value::texts({u"ddddd"}));
     const Value cellFolders =
-        cellsOf({{u"a", u"ab"}, {u"c"}, {u"abb", u"d"}, {u"ddddd"}});
+        Value::textLists({{u"a", u"ab"}, {u"c"}, {u"abb", u"d"}, {u"ddddd"}});
     const Value fromChars = make(Value::text(u"files"), charFolders);
     const Value fromCells = make(Value::text(u"files"), cellFolders);
     EXPECT_EQ(treeString(fromChars), treeString(fromCells));
@@ -150,16 +142,16 @@ TEST_F(MethodsTest, FilesModeCountsCharFoldersLikeCellFolders) {
 TEST_F(MethodsTest, FilesModeDecidesFolderFormByFirstElementAlone) {
     Value list = Value::cell({4, 1});
     list.setElement(0, Value::text(u"ab"));
-    list.setElement(1, cellOf({u"cd"}));  // not the form of the first
-    list.setElement(2, cellOf({u"e"}));
-    list.setElement(3, cellOf({u"f"}));
+    list.setElement(1, Value::texts({u"cd"}));  // not the form of the first
+    list.setElement(2, Value::texts({u"e"}));
+    list.setElement(3, Value::texts({u"f"}));
     EXPECT_EQ(errorOf([&] { make(Value::text(u"files"), list); }).identifier(),
               "VELOX:embedded:wrongClass");
     Value mirrored = Value::cell({4, 1});
-    mirrored.setElement(0, cellOf({u"cd"}));
+    mirrored.setElement(0, Value::texts({u"cd"}));
     mirrored.setElement(1, Value::text(u"ab"));
-    mirrored.setElement(2, cellOf({u"e"}));
-    mirrored.setElement(3, cellOf({u"f"}));
+    mirrored.setElement(2, Value::texts({u"e"}));
+    mirrored.setElement(3, Value::texts({u"f"}));
     EXPECT_EQ(
         errorOf([&] { make(Value::text(u"files"), mirrored); }).identifier(),
         "VELOX:embedded:wrongClass");
@@ -236,26 +228,20 @@ TEST_F(MethodsTest, TreeModeReadsNothingOutsideArraysOfOtherClasses) {
     const Value text = Value::text(treeString(source));
     const Value bytes = Value::byteColumn(storedForm(source));
     const Value numbers = host.get(source, "Frequencies");
+    const auto refusal = [&](const Value& form, const Value& frequencies) {
+        return errorOf(
+                   [&] { make(Value::text(u"tree"), text, form, frequencies); })
+            .identifier();
+    };
+    const std::string wrongClass = "VELOX:embedded:wrongClass";
     for (const Value& wrong : {Value::text(u"x"), Value::cell({2, 2}),
                                Value::logical(true), Value::structure()}) {
-        EXPECT_EQ(errorOf([&] {
-                      make(Value::text(u"tree"), text, wrong, numbers);
-                  }).identifier(),
-                  "VELOX:embedded:wrongClass");
-        EXPECT_EQ(errorOf([&] {
-                      make(Value::text(u"tree"), text, bytes, wrong);
-                  }).identifier(),
-                  "VELOX:embedded:wrongClass");
+        EXPECT_EQ(refusal(wrong, numbers), wrongClass);
+        EXPECT_EQ(refusal(bytes, wrong), wrongClass);
     }
     // Each the other's class: eight times too few bytes, or too many.
-    EXPECT_EQ(errorOf([&] {
-                  make(Value::text(u"tree"), text, numbers, bytes);
-              }).identifier(),
-              "VELOX:embedded:wrongClass");
-    EXPECT_EQ(errorOf([&] {
-                  make(Value::text(u"tree"), text, bytes, bytes);
-              }).identifier(),
-              "VELOX:embedded:wrongClass");
+    EXPECT_EQ(refusal(numbers, bytes), wrongClass);
+    EXPECT_EQ(refusal(bytes, bytes), wrongClass);
 }
 
 // --- addPaths ----------------------------------------------------------------
@@ -263,8 +249,8 @@ TEST_F(MethodsTest, TreeModeReadsNothingOutsideArraysOfOtherClasses) {
 TEST_F(MethodsTest, AddPathsWithUnequalCountsRaisesAndInsertsNothing) {
     const Value instance = filled(smallListing());
     const HostException error =
-        refusedAdd(instance, cellsOf({{u"/"}, {u"/"}, {u"/"}}),
-                   cellsOf({{u"env"}, {u"env"}}));
+        refusedAdd(instance, Value::textLists({{u"/"}, {u"/"}, {u"/"}}),
+                   Value::textLists({{u"env"}, {u"env"}}));
     EXPECT_EQ(error.identifier(), componentName + "unequalNumFolderFileList");
     EXPECT_TRUE(error.arguments().empty());
     EXPECT_STREQ(error.what(),
@@ -274,8 +260,8 @@ TEST_F(MethodsTest, AddPathsWithUnequalCountsRaisesAndInsertsNothing) {
 TEST_F(MethodsTest, AddPathsWithThirdFolderEmptyRaisesWithThree) {
     const Value instance = filled(smallListing());
     const HostException error =
-        refusedAdd(instance, cellsOf({{u"/"}, {u"/"}, {}}),
-                   cellsOf({{u"env"}, {u"env"}, {u"env"}}));
+        refusedAdd(instance, Value::textLists({{u"/"}, {u"/"}, {}}),
+                   Value::textLists({{u"env"}, {u"env"}, {u"env"}}));
     EXPECT_EQ(error.identifier(), componentName + "folderElementEmpty");
     EXPECT_EQ(argumentsOf(error), (std::vector<std::string>{"3"}));
     EXPECT_STREQ(error.what(), "Element 3 of the folders is empty.");
@@ -284,8 +270,8 @@ TEST_F(MethodsTest, AddPathsWithThirdFolderEmptyRaisesWithThree) {
 TEST_F(MethodsTest, AddPathsWithFourthTextOfSecondFilesEmptyRaisesWithBoth) {
     const Value instance = filled(smallListing());
     const HostException error =
-        refusedAdd(instance, cellsOf({{u"/"}, {u"/"}}),
-                   cellsOf({{u"env"}, {u"a", u"b", u"c", u"", u""}}));
+        refusedAdd(instance, Value::textLists({{u"/"}, {u"/"}}),
+                   Value::textLists({{u"env"}, {u"a", u"b", u"c", u"", u""}}));
     EXPECT_EQ(error.identifier(), componentName + "fileElementEmpty");
     EXPECT_EQ(argumentsOf(error), (std::vector<std::string>{"2, 4"}));
     EXPECT_STREQ(error.what(), "Element 2, 4 of the files is empty.");
@@ -293,8 +279,8 @@ TEST_F(MethodsTest, AddPathsWithFourthTextOfSecondFilesEmptyRaisesWithBoth) {
 
 TEST_F(MethodsTest, AddPathsWithFirstFolderEmptyRaisesWithOne) {
     const Value instance = filled(smallListing());
-    const HostException error =
-        refusedAdd(instance, cellsOf({{}}), cellsOf({{u"env"}}));
+    const HostException error = refusedAdd(instance, Value::textLists({{}}),
+                                           Value::textLists({{u"env"}}));
     EXPECT_EQ(argumentsOf(error), (std::vector<std::string>{"1"}));
 }
 
@@ -303,39 +289,43 @@ TEST_F(MethodsTest, AddPathsWithThirdTextOfTwelfthFilesEmptyRaisesWithBoth) {
     std::vector<Texts> files(12, Texts{u"env", u"ls", u"cat"});
     files[11][2].clear();
     const HostException error = refusedAdd(
-        instance, cellsOf(std::vector<Texts>(12, Texts{u"/"})), cellsOf(files));
+        instance, Value::textLists(std::vector<Texts>(12, Texts{u"/"})),
+        Value::textLists(files));
     EXPECT_EQ(error.identifier(), componentName + "fileElementEmpty");
     EXPECT_EQ(argumentsOf(error), (std::vector<std::string>{"12, 3"}));
 }
 
 TEST_F(MethodsTest, AddPathsChecksAllFoldersBeforeAnyFile) {
     const Value instance = filled(smallListing());
-    const HostException error = refusedAdd(
-        instance, cellsOf({{u"/"}, {u"/", u""}}), cellsOf({{}, {u"env"}}));
+    const HostException error =
+        refusedAdd(instance, Value::textLists({{u"/"}, {u"/", u""}}),
+                   Value::textLists({{}, {u"env"}}));
     EXPECT_EQ(error.identifier(), componentName + "folderElementEmpty");
     EXPECT_EQ(argumentsOf(error), (std::vector<std::string>{"2, 2"}));
 }
 
 TEST_F(MethodsTest, AddPathsChecksCountsBeforeElements) {
     const Value instance = filled(smallListing());
-    EXPECT_EQ(refusedAdd(instance, cellsOf({{}}), cellsOf({})).identifier(),
+    EXPECT_EQ(refusedAdd(instance, Value::textLists({{}}), Value::textLists({}))
+                  .identifier(),
               componentName + "unequalNumFolderFileList");
 }
 
 TEST_F(MethodsTest, AddPathsTakesEmptyArraysOfAnyClassForEmptyElements) {
     const Value instance = filled(smallListing());
     const HostException entry =
-        refusedAdd(instance, Value::cell({1, 1}), cellsOf({{u"env"}}));
+        refusedAdd(instance, Value::cell({1, 1}), Value::textLists({{u"env"}}));
     EXPECT_EQ(entry.identifier(), componentName + "folderElementEmpty");
     EXPECT_EQ(argumentsOf(entry), (std::vector<std::string>{"1"}));
-    const HostException inner = refusedAdd(
-        instance, Value::cellRow({Value::cell({2, 1})}), cellsOf({{u"env"}}));
+    const HostException inner =
+        refusedAdd(instance, Value::cellRow({Value::cell({2, 1})}),
+                   Value::textLists({{u"env"}}));
     EXPECT_EQ(argumentsOf(inner), (std::vector<std::string>{"1, 1"}));
 }
 
 TEST_F(MethodsTest, AddPathsRefusesElementsThatAreNoCellsOfTexts) {
     const Value instance = filled(smallListing());
-    const Value files = cellsOf({{u"env"}});
+    const Value files = Value::textLists({{u"env"}});
     const Value number = Value::cellRow({Value::scalar(7)});
     const Value innerNumber = Value::cellRow({number});
     EXPECT_EQ(refusedAdd(instance, number, files).identifier(),
@@ -354,8 +344,9 @@ TEST_F(MethodsTest, AddPathsWithUnknownCharacterIsHostErrorAndInsertsNothing) {
         std::vector<Texts> files(folders, Texts{u"env"});
         files.back() = {u"ls", u"#"};
         const HostException error = refusedAdd(
-            instance, cellsOf(std::vector<Texts>(folders, Texts{u"/"})),
-            cellsOf(files));
+            instance,
+            Value::textLists(std::vector<Texts>(folders, Texts{u"/"})),
+            Value::textLists(files));
         EXPECT_EQ(error.identifier(), "VELOX:embedded:nativeError");
         EXPECT_EQ(argumentsOf(error),
                   (std::vector<std::string>{
@@ -378,7 +369,7 @@ TEST_F(MethodsTest, AddPathsAppendsBatchAfterBatch) {
     const Value instance = filled(smallListing());
     add(instance, {{{u"/", u"usr", u"bin"}}, {{u"sbin"}}});
     EXPECT_EQ(
-        joined(instance, upTo(6), u"/"),
+        joined(instance, numbersTo(6), u"/"),
         (Texts{u"/usr/bin/env", u"/usr/bin/ls", u"/usr/bin/cat",
                u"/usr/lib/gcc/cc1", u"/usr/lib/gcc/crt.o", u"/usr/bin/sbin"}));
 }
@@ -390,7 +381,7 @@ TEST_F(MethodsTest, TextIsTakenInColumnMajorOrder) {
     EXPECT_EQ(treeString(instance), u"acbd");
     Value file = Value::cell({1, 1});
     file.setElement(0, Value::cellRow({Value::chars({2, 1, 2}, u"dcba")}));
-    host.call(0, instance, "addPaths", cellsOf({{u"a"}}), file);
+    host.call(0, instance, "addPaths", Value::textLists({{u"a"}}), file);
     EXPECT_EQ(joined(instance, {1}, u""), (Texts{u"adcba"}));
 }
 

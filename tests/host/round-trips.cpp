@@ -58,14 +58,6 @@ Listing randomListing() {
     return listing;
 }
 
-std::vector<double> allNumbers(std::size_t count) {
-    std::vector<double> numbers;
-    for (std::size_t i = 1; i <= count; ++i) {
-        numbers.push_back(static_cast<double>(i));
-    }
-    return numbers;
-}
-
 // The joined text of each path.
 Texts joinedTexts(const std::vector<Texts>& paths,
                   const std::u16string& separator) {
@@ -100,7 +92,7 @@ protected:
     };
     Content contentOf(const Value& instance, std::size_t count) {
         Content content{
-            iterated(instance), fetched(instance, allNumbers(count)), {}};
+            iterated(instance), fetched(instance, numbersTo(count)), {}};
         const std::u16string characters = treeString(instance);
         const std::vector<double> values = frequencies(instance);
         for (std::size_t i = 0; i < characters.size(); ++i) {
@@ -123,11 +115,11 @@ protected:
         const Value made =
             make(Value::text(u"frequencies"), host.get(instance, "StringTree"),
                  host.get(instance, "Frequencies"));
-        add(made, fetched(instance, allNumbers(count)));
+        add(made, fetched(instance, numbersTo(count)));
         return made;
     }
     Value throughFiles(const Value& instance, std::size_t count) {
-        const Listing listing = fetched(instance, allNumbers(count));
+        const Listing listing = fetched(instance, numbersTo(count));
         const Value made = makeFor(listing);
         add(made, listing);
         return made;
@@ -172,7 +164,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, InstanceGivesBackWhatWasAdded, ()) {
     std::sort(iteratedPaths.begin(), iteratedPaths.end());
     std::sort(sortedPaths.begin(), sortedPaths.end());
     RC_ASSERT(iteratedPaths == sortedPaths);
-    const std::vector<double> numbers = allNumbers(paths.size());
+    const std::vector<double> numbers = numbersTo(paths.size());
     RC_ASSERT(pathsOf(fetched(instance, numbers)) == paths);
     RC_ASSERT(joined(instance, numbers, u"/") == joinedTexts(paths, u"/"));
     const auto number = *rc::gen::inRange<std::size_t>(0, paths.size());
@@ -211,7 +203,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, RestoredInstanceTakesFurtherPaths, ()) {
     const std::vector<Texts> paths = pathsOf(listing);
     std::vector<Texts> twice = paths;
     twice.insert(twice.end(), paths.begin(), paths.end());
-    RC_ASSERT(pathsOf(fetched(restored, allNumbers(twice.size()))) == twice);
+    RC_ASSERT(pathsOf(fetched(restored, numbersTo(twice.size()))) == twice);
     RC_ASSERT(iterated(source).size() == paths.size());
 }
 

@@ -17,22 +17,6 @@ namespace {
 constexpr std::size_t pathsPerBatch = 20'000;
 constexpr std::size_t numbersAtOnce = 50'000;
 
-Value cellOf(const std::vector<std::u16string>& texts) {
-    std::vector<Value> elements;
-    elements.reserve(texts.size());
-    for (const std::u16string& text : texts) {
-        elements.push_back(Value::text(text));
-    }
-    return Value::cellColumn(std::move(elements));
-}
-
-Value cellOfCells(const paths::FolderTexts& lists) {
-    std::vector<Value> elements;
-    elements.reserve(lists.size());
-    for (const auto& texts : lists) elements.push_back(cellOf(texts));
-    return Value::cellColumn(std::move(elements));
-}
-
 std::vector<std::u16string> textsOf(const Value& cell) {
     std::vector<std::u16string> texts;
     for (std::size_t i = 0; i < cell.numel(); ++i) {
@@ -54,6 +38,13 @@ std::string toPath(std::u16string_view joined) {
     std::string path;
     if (!paths::textToPath(joined, path)) path = "(the text of no path)";
     return path;
+}
+
+void requireCount(std::size_t count, std::size_t wanted,
+                  const std::string& route) {
+    if (count == wanted) return;
+    throw DifferenceException(route + ": " + std::to_string(count) +
+                              " paths instead of " + std::to_string(wanted));
 }
 
 std::size_t heapBytes() {
@@ -113,8 +104,9 @@ Value HostJob::makeInstance() {
     }
     std::vector<Value> elements;
     elements.reserve(2 * all.folders.size());
-    for (const auto& folder : all.folders) elements.push_back(cellOf(folder));
-    for (const auto& files : all.files) elements.push_back(cellOf(files));
+    for (const auto& folder : all.folders)
+        elements.push_back(Value::texts(folder));
+    for (const auto& files : all.files) elements.push_back(Value::texts(files));
     all = {};
     const Value foldersAndFiles = Value::cellColumn(std::move(elements));
     Value instance;
@@ -130,8 +122,8 @@ void HostJob::addPaths(const Value& instance) {
         paths::BatchReader reader(splitter, pathsPerBatch);
         paths::Batch batch;
         while (reader.next(batch)) {
-            host.call(0, instance, "addPaths", cellOfCells(batch.folders),
-                      cellOfCells(batch.files));
+            host.call(0, instance, "addPaths", Value::textLists(batch.folders),
+                      Value::textLists(batch.files));
         }
     });
 }
@@ -175,11 +167,7 @@ void HostJob::iterate(const Value& instance, const std::string& name) {
     std::iota(order.begin(), order.end(), std::size_t{0});
     std::sort(order.begin(), order.end(),
               [&](std::size_t a, std::size_t b) { return list[a] < list[b]; });
-    if (iterated.size() != order.size()) {
-        throw DifferenceException(
-            name + ": " + std::to_string(iterated.size()) +
-            " paths instead of " + std::to_string(order.size()));
-    }
+    requireCount(iterated.size(), order.size(), name);
     for (std::size_t i = 0; i < order.size(); ++i) {
         if (iterated[i] == list[order[i]]) continue;
         throw DifferenceException(name + ": " + std::string(list[order[i]]) +
@@ -190,39 +178,43 @@ void HostJob::iterate(const Value& instance, const std::string& name) {
 void HostJob::fetchJoined(const Value& instance, const std::string& name) {
     const Value separator = Value::text(u"/");
     step(name, [&] {
-        forNumbers([&](const Value& numbers, std::size_t first) {
+        forNumbers(name, [&](const Value& numbers, std::size_t first) {
             const Value fetched =
                 host.call(1, instance, "getPaths", numbers, separator)[0];
             for (std::size_t i = 0; i < fetched.numel(); ++i) {
                 compareInOrder(first + i, fetched.element(i).charData(), name);
             }
+            return fetched.numel();
         });
     });
 }
 
 void HostJob::fetchParts(const Value& instance, const std::string& name) {
     step(name, [&] {
-        forNumbers([&](const Value& numbers, std::size_t first) {
+        forNumbers(name, [&](const Value& numbers, std::size_t first) {
             const std::vector<Value> parts =
                 host.call(2, instance, "getPaths", numbers);
+            std::size_t count = 0;
             for (std::size_t i = 0; i < parts[0].numel(); ++i) {
                 std::u16string folder;
                 paths::appendFolder(textsOf(parts[0].element(i)), folder);
                 for (const auto& file : textsOf(parts[1].element(i))) {
-                    compareInOrder(first++, folder + file, name);
+                    compareInOrder(first + count++, folder + file, name);
                 }
             }
+            return count;
         });
     });
 }
 
-void HostJob::forNumbers(
-    const std::function<void(const Value&, std::size_t)>& visit) const {
+void HostJob::forNumbers(const std::string& route, const Visit& visit) const {
     for (std::size_t first = 1; first <= list.size(); first += numbersAtOnce) {
         std::vector<double> numbers(
             std::min(numbersAtOnce, list.size() - first + 1));
         std::iota(numbers.begin(), numbers.end(), static_cast<double>(first));
-        visit(Value::column(std::move(numbers)), first);
+        const std::size_t asked = numbers.size();
+        requireCount(visit(Value::column(std::move(numbers)), first), asked,
+                     route);
     }
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <functional>
+#include <stdexcept>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -59,8 +60,9 @@ private:
     void compareInOrder(std::size_t number, std::u16string_view joined,
                         const std::string& route) const;
     // Calls visit(numbers, first number) for all path numbers, some at a time.
-    void forNumbers(
-        const std::function<void(const Value&, std::size_t)>& visit) const;
+    // It returns how many paths it got, which must be as many.
+    using Visit = std::function<std::size_t(const Value&, std::size_t)>;
+    void forNumbers(const std::string& route, const Visit& visit) const;
     // Times a step on all paths.
     void step(const std::string& name, const std::function<void()>& action);
 
