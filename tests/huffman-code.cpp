@@ -416,6 +416,25 @@ TEST(HuffmanCode, CopyTreeToItselfKeepsTheCodeAndMakesAFreshPathTree) {
     EXPECT_EQ(support::iterated(*coder).size(), 2U);
 }
 
+TEST(HuffmanCode, CopyTreeToItselfKeepsEveryPartOfTheCode) {
+    const CoderPtr coder = coderWith(u"abcde", {5, 1, 2, 1, 3});
+    const auto parents = coder->parentOf;
+    coder->copyTree(*coder);
+    EXPECT_EQ(codeText(*coder, u'a'), "0");
+    EXPECT_EQ(codeText(*coder, u'e'), "10");
+    EXPECT_EQ(codeText(*coder, u'c'), "110");
+    EXPECT_EQ(codeText(*coder, u'b'), "1110");
+    EXPECT_EQ(codeText(*coder, u'd'), "1111");
+    EXPECT_EQ(coder->codes.size(), 5U);
+    EXPECT_EQ(bitText(coder->getBoolTree()), "010101011");
+    EXPECT_EQ(coder->getTreeString(), u"aecbd");
+    EXPECT_EQ(coder->getFrequencies(), (Frequencies{5, 3, 2, 1, 1}));
+    EXPECT_EQ(coder->nodes.size(), 9U);
+    EXPECT_EQ(coder->rootIndex, 8);
+    EXPECT_EQ(coder->parentOf, parents);
+    EXPECT_EQ(support::brokenInvariant(*coder), "");
+}
+
 TEST(HuffmanCode, ACopyHasTheCodeTheCountersAndThePaths) {
     const CoderPtr source = coderWith(u"abcd", {1, 1, 1, 1});
     support::addBatch(*source, {u"a"}, {u"b", u"c"});

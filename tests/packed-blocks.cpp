@@ -114,6 +114,22 @@ TEST(PackedBlocks, TheLengthComesBeforeTheBytes) {
     EXPECT_EQ(data, (Bytes{7, 8, 9}));
 }
 
+TEST(PackedBlocks, ALengthThatDoesNotFitIsFollowedByEveryByte) {
+    Bytes data;
+    for (unsigned i = 0; i < 300; ++i)
+        data.push_back(static_cast<std::uint8_t>(i * 7));
+    Bytes out;
+    packVector(data, out, PackedSizeT::Uint8);
+    ASSERT_EQ(out.size(), 301U);
+    EXPECT_EQ(out[0], 0x2C);
+    EXPECT_EQ(Bytes(out.begin() + 1, out.end()), data);
+    Bytes back;
+    auto it = out.cbegin();
+    unpackVector(back, it, PackedSizeT::Uint8);
+    EXPECT_EQ(back, Bytes(data.begin(), data.begin() + 44));
+    EXPECT_EQ(it - out.cbegin(), 45);
+}
+
 TEST(PackedBlocks, ALengthThatDoesNotFitIsCutAndTheRestStaysUnread) {
     Bytes data(300, 0xAB);
     Bytes out;

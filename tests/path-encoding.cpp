@@ -9,6 +9,7 @@
 #include <string>
 
 #include "tests/support/Coders.hpp"
+#include "tests/support/Exceptions.hpp"
 
 namespace {
 
@@ -103,17 +104,14 @@ TEST(PathEncoding, ABatchOfACodeThatIsOneLeafIsStoredAndReadBack) {
 }
 
 TEST(PathEncoding, TheExceptionsDeriveFromTheStandardBaseAlone) {
-    const auto onlyStandard = [](const auto& failure) {
-        using Failure = std::decay_t<decltype(failure)>;
-        return std::is_convertible_v<Failure*, std::exception*> &&
-               !std::is_convertible_v<Failure*, std::runtime_error*> &&
-               !std::is_convertible_v<Failure*, std::logic_error*> &&
-               sizeof(Failure) == sizeof(std::exception);
-    };
-    EXPECT_TRUE(onlyStandard(tessel::NoCodeForEmptyString()));
-    EXPECT_TRUE(onlyStandard(tessel::CodeNotFoundException()));
-    EXPECT_TRUE(onlyStandard(tessel::DamagedFormException()));
-    EXPECT_TRUE(onlyStandard(tessel::InvalidUintConversionException()));
+    EXPECT_TRUE(
+        support::derivesFromStandardBaseAlone<tessel::NoCodeForEmptyString>());
+    EXPECT_TRUE(
+        support::derivesFromStandardBaseAlone<tessel::CodeNotFoundException>());
+    EXPECT_TRUE(
+        support::derivesFromStandardBaseAlone<tessel::DamagedFormException>());
+    EXPECT_TRUE(support::derivesFromStandardBaseAlone<
+                tessel::InvalidUintConversionException>());
 }
 
 // ---- How a batch is split ----
@@ -167,6 +165,19 @@ TEST(PathEncoding, ANewFoldersTrackHasOnePositionPerComponent) {
     EXPECT_EQ(coder->maxPartitionTrackLength, 0U);
     EXPECT_EQ(coder->partitionEnds, (Ends{2}));
     EXPECT_EQ(coder->pathCount, 2U);
+}
+
+TEST(PathEncoding, ANewFolderLeavesTheLongestPartitionTrackAsItWas) {
+    const CoderPtr coder = fourLetterCoder();
+    support::addBatch(*coder, {u"a", u"b"}, {u"c"});
+    support::addBatch(*coder, {u"a", u"b"}, {u"d"});
+    ASSERT_EQ(coder->maxPartitionTrackLength, 3U);
+    support::addBatch(*coder, {u"d"}, {u"a"});
+    EXPECT_EQ(coder->partitionTracks[2], (PathTrack{1}));
+    EXPECT_EQ(coder->maxPartitionTrackLength, 3U);
+    support::addBatch(*coder, {u"c", u"a", u"b", u"d"}, {u"a"});
+    EXPECT_EQ(coder->partitionTracks[3], (PathTrack{2, 0, 0, 0}));
+    EXPECT_EQ(coder->maxPartitionTrackLength, 3U);
 }
 
 TEST(PathEncoding, AStoredFoldersTrackEndsWithTheFirstNewFile) {

@@ -5,6 +5,7 @@
 #include <type_traits>
 
 #include "pathtree/BPathTree.hpp"
+#include "tests/support/Exceptions.hpp"
 #include "tests/support/Trees.hpp"
 
 namespace {
@@ -53,17 +54,14 @@ TEST(PathTreeInsertion, TheExceptionsSayTheirTexts) {
 }
 
 TEST(PathTreeInsertion, TheExceptionsDeriveFromTheStandardBaseAlone) {
-    const auto onlyStandard = [](const auto& failure) {
-        using Failure = std::decay_t<decltype(failure)>;
-        return std::is_convertible_v<Failure*, std::exception*> &&
-               !std::is_convertible_v<Failure*, std::runtime_error*> &&
-               !std::is_convertible_v<Failure*, std::logic_error*> &&
-               sizeof(Failure) == sizeof(std::exception);
-    };
-    EXPECT_TRUE(onlyStandard(tessel::NoMorePathException()));
-    EXPECT_TRUE(onlyStandard(tessel::NoTreeToTraverseException()));
-    EXPECT_TRUE(onlyStandard(tessel::EmptyPathForTraverseException()));
-    EXPECT_TRUE(onlyStandard(tessel::UnknownNodeTypeException()));
+    EXPECT_TRUE(
+        support::derivesFromStandardBaseAlone<tessel::NoMorePathException>());
+    EXPECT_TRUE(support::derivesFromStandardBaseAlone<
+                tessel::NoTreeToTraverseException>());
+    EXPECT_TRUE(support::derivesFromStandardBaseAlone<
+                tessel::EmptyPathForTraverseException>());
+    EXPECT_TRUE(support::derivesFromStandardBaseAlone<
+                tessel::UnknownNodeTypeException>());
 }
 
 // ---- Whole paths ----
@@ -141,6 +139,21 @@ TEST(PathTreeInsertion, AStoredFolderReportsWhereTheBatchStarts) {
     EXPECT_EQ(addBatch(tree, {"a"}, {"i", "j"}), (BatchAdded{true, {0}, 3}));
     EXPECT_EQ(childTexts(tree.root->children()[0]),
               (Paths{"f", "g", "h", "i", "j"}));
+}
+
+TEST(PathTreeInsertion, AStoredFoldersPositionsAreAppendedToTheTrack) {
+    BPathTree tree;
+    addBatch(tree, {"x"}, {"y"});
+    addBatch(tree, {"a"}, {"f", "g", "h"});
+    Components folder = components({"a"});
+    Components files = components({"i"});
+    PathTrack track = {9};
+    std::uint64_t firstFile = 0;
+    EXPECT_TRUE(tree.addPath(folder, files, track, firstFile));
+    EXPECT_EQ(track, (PathTrack{9, 1}));
+    EXPECT_EQ(firstFile, 3U);
+    EXPECT_EQ(childTexts(tree.root->children()[1]),
+              (Paths{"f", "g", "h", "i"}));
 }
 
 TEST(PathTreeInsertion, ANewFolderInAStoredOneIsNew) {
