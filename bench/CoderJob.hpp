@@ -7,6 +7,7 @@
 
 #include "coder/HuffmanPathTree.hpp"
 #include "hosts/common/Batches.hpp"
+#include "pathtree/containers.hpp"
 
 // What every benchmark does with the coder.
 namespace bench {
@@ -57,8 +58,8 @@ void fetch(const tessel::HuffmanPathTree& coder,
             coder.appendPathFrom(file, text);
             visit(static_cast<const std::u16string&>(text));
         }
-        tessel::Components().swap(folders[i]);
-        tessel::Components().swap(files[i]);
+        tessel::releaseContents(folders[i]);
+        tessel::releaseContents(files[i]);
     }
 }
 

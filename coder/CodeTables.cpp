@@ -33,7 +33,7 @@ void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
     // From its own place on to that of all characters.
     for (unsigned i = position + 1; i <= mostCharacters; ++i) {
         const unsigned at = fieldsAt + i * fieldBits;
-        word &= ~(((std::uint64_t{1} << fieldBits) - 1) << at);
+        word &= ~(fieldMask << at);
         word |= std::uint64_t{bitCount} << at;
     }
 }

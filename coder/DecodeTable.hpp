@@ -60,11 +60,12 @@ public:
         static constexpr unsigned characterBits = 16;
         static constexpr unsigned fieldBits = 4;
         static constexpr unsigned fieldsAt = mostCharacters * characterBits;
+        static constexpr std::uint64_t fieldMask = (1U << fieldBits) - 1;
         static_assert(windowBits < 1U << fieldBits);
 
         unsigned field(unsigned i) const noexcept {
-            return static_cast<unsigned>(word >> (fieldsAt + i * fieldBits)) &
-                   ((1U << fieldBits) - 1);
+            return static_cast<unsigned>((word >> (fieldsAt + i * fieldBits)) &
+                                         fieldMask);
         }
 
         std::uint64_t word = 0;

@@ -38,8 +38,7 @@ HuffmanPathTree::~HuffmanPathTree() {
 // ---- Construction ----
 
 void HuffmanPathTree::requireNoCode() const {
-    if (codeBuilt || !nodes.empty())
-        throw std::logic_error("The coder has a code already.");
+    if (!nodes.empty()) throw std::logic_error("The coder has a code already.");
 }
 
 // Runs `build`, which makes `nodes`, and derives the code. If memory runs
@@ -57,7 +56,6 @@ void HuffmanPathTree::buildCode(Build build) {
         rootIndex = 0;
         throw;
     }
-    codeBuilt = !nodes.empty();
 }
 
 void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
@@ -227,7 +225,6 @@ void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
         codes = other.codes;
         parentOf = other.parentOf;
         decodeTable = other.decodeTable;
-        codeBuilt = other.codeBuilt;
         endsAscend = other.endsAscend;
     }
     pathTree = std::make_unique<BPathTree>(*other.pathTree);

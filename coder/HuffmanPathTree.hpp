@@ -196,8 +196,9 @@ public:
 
     // Encodes all of asyncFolders and asyncFiles, which must be equally long,
     // on as many workers as splitFolders gives ranges, and releases the texts
-    // on the way. A worker whose range is done helps with the others'. Throws
-    // what generateCodeAsyncAndAddPaths throws; what was encoded stays.
+    // on the way. A worker whose range is done helps with the others'. A
+    // single folder needs no worker and keeps its texts. Throws what
+    // generateCodeAsyncAndAddPaths throws; what was encoded stays.
     void encodeOnWorkers(unsigned hardwareThreads);
 
     // Waits for the workers and forgets them.
@@ -387,8 +388,7 @@ private:
 
     std::mutex releaseMutex;  // held by the worker that releases texts
     DecodeTable decodeTable;  // derived from nodes; empty: walk the tree
-    bool codeBuilt = false;
-    bool endsAscend = true;  // partitionEnds can be searched
+    bool endsAscend = true;   // partitionEnds can be searched
 };
 
 }  // namespace tessel

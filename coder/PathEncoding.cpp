@@ -189,13 +189,7 @@ void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
     clearThreadResources();
     asyncFolders = std::move(newFolders);
     asyncFiles = std::move(newFiles);
-    if (asyncFolders.size() == 1) {
-        encodedFolders.resize(1);
-        encodedFiles.resize(1);
-        generateCodeForPath(0, 0);
-    } else {
-        encodeOnWorkers(hardwareThreads);
-    }
+    encodeOnWorkers(hardwareThreads);
     releaseContents(asyncFolders);
     releaseContents(asyncFiles);
     addPathToBTreeFromAsyncData();
@@ -205,7 +199,10 @@ void HuffmanPathTree::encodeOnWorkers(unsigned hardwareThreads) {
     joinAllGenThreads();
     encodedFolders.resize(asyncFolders.size());
     encodedFiles.resize(asyncFolders.size());
-    if (asyncFolders.empty()) return;
+    if (asyncFolders.size() < 2) {
+        generateCodeForPath(0, 0);
+        return;
+    }
     const auto split = splitFolders(asyncFolders.size(), hardwareThreads);
     std::vector<WorkerRange> ranges(split.size());
     for (std::size_t w = 0; w < split.size(); ++w) ranges[w].set(split[w]);

@@ -43,16 +43,14 @@ void TreeBuilder::add(ComponentView value) {
     const std::uint8_t code = codes[nextCode++];
     const bool known = code <= nodecode::largest;
     const bool isFolder = known && (code & nodecode::hasChildren) != 0;
-    BNode* parent = open.back();
-    BNodePtr made = BNodePtr::adopt(tree.pool.make(
-        value, isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf));
-    BNode* node = made.get();
-    NodePool::append(*parent, made);
+    BNode& node =
+        tree.pool.add(*open.back(), value,
+                      isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf);
     if (!known) throw UnknownNodeTypeException();
     if ((code & nodecode::siblingFollows) == 0) open.pop_back();
     if (isFolder) {
-        reserveChildren(*node);
-        open.push_back(node);
+        reserveChildren(node);
+        open.push_back(&node);
     } else {
         ++leafCount;
     }

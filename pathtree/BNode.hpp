@@ -196,7 +196,8 @@ private:
     }
     // Releases a node whose last share is gone, and all that it alone owns.
     static void destroy(BNode* dead) noexcept;
-    BNode* takeChild(ChildStore kept, BNode* above) noexcept;
+    BNode* popChild() noexcept;
+    void leaveWayUp(BNode* above) noexcept;
     BNode* takeWayUp() noexcept;
 
     std::atomic<std::uint32_t> references = 1;

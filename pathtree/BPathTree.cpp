@@ -89,8 +89,7 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     const std::uint64_t found = findNode(value, nodes);
     existed = found != allOnes;
     if (existed) return found;
-    BNodePtr made = BNodePtr::adopt(pool.make(value, NodePool::Kind::leaf));
-    NodePool::append(nodes.node(), made);
+    pool.add(nodes.node(), value, NodePool::Kind::leaf);
     takeOver(value);
     return nodes.size() - 1;
 }
@@ -101,11 +100,9 @@ ChildFinder::Found BPathTree::findOrAppend(BNode& parent, ComponentView value,
     const ChildFinder::Found found = finder.find(parent, value);
     existed = found.child != nullptr;
     if (existed) return found;
-    BNodePtr made = BNodePtr::adopt(pool.make(value, kind));
-    NodePool::append(parent, made);
+    BNode& made = pool.add(parent, value, kind);
     finder.noteAppended(parent);
-    const ChildList children = parent.children();
-    return {&children.back(), children.size() - 1};
+    return {&made, parent.children().size() - 1};
 }
 
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
@@ -146,11 +143,8 @@ std::uint64_t BPathTree::appendFiles(BNode& folder, Files& fileNames) {
     if (fileNames.empty()) return before;
     NodePool::reserve(folder, fileNames.size());
     try {
-        for (auto&& name : fileNames) {
-            BNodePtr file =
-                BNodePtr::adopt(pool.make(name, NodePool::Kind::leaf));
-            NodePool::append(folder, file);
-        }
+        for (auto&& name : fileNames)
+            pool.add(folder, name, NodePool::Kind::leaf);
     } catch (...) {
         NodePool::truncate(folder, before);
         throw;

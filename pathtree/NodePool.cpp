@@ -10,7 +10,6 @@
 #include <new>
 #include <stdexcept>
 #include <unordered_map>
-#include <utility>
 
 namespace tessel {
 
@@ -127,20 +126,24 @@ void BNode::setStore(ChildStore kept) {
     }
 }
 
-// Takes the last child away. If nobody else shares it, leaves `above` in its
-// place and returns it; otherwise returns null.
-BNode* BNode::takeChild(ChildStore kept, BNode* above) noexcept {
-    if (kept.isOnly()) {
-        const bool dead = kept.child()->unshare();
-        setStore(dead ? ChildStore::only(above) : ChildStore());
-        return dead ? kept.child() : nullptr;
-    }
-    BNode*& slot = kept.block()->slots()[--kept.block()->size];
-    if (!slot->unshare()) return nullptr;
-    return std::exchange(slot, above);
+// Takes the last child, of which there must be one, out of the list; its
+// share goes to the caller.
+BNode* BNode::popChild() noexcept {
+    const ChildStore kept = store();
+    if (!kept.isOnly()) return kept.block()->slots()[--kept.block()->size];
+    setStore(ChildStore());
+    return kept.child();
 }
 
-// What takeChild left in the place of the last child that it returned.
+// Remembers the way up, or none, in the place that popChild made free.
+void BNode::leaveWayUp(BNode* above) noexcept {
+    ChildBlock* block = store().block();
+    if (block != nullptr)
+        block->slots()[block->size] = above;
+    else
+        setStore(ChildStore::only(above));
+}
+
 BNode* BNode::takeWayUp() noexcept {
     const ChildStore kept = store();
     if (!kept.isOnly()) return kept.block()->slots()[kept.block()->size];
@@ -149,22 +152,22 @@ BNode* BNode::takeWayUp() noexcept {
 }
 
 // Walks down and up through the dead nodes. On the way down the place that a
-// child stood in, which is free once the child is taken from it, remembers
-// the way up: the nodes themselves are the stack.
+// child stood in remembers the way up: the nodes themselves are the stack.
 void BNode::destroy(BNode* dead) noexcept {
     BNode* above = nullptr;
     for (;;) {
-        const ChildStore kept = dead->store();
-        if (kept.size() > 0) {
-            if (BNode* child = dead->takeChild(kept, above)) {
-                above = dead;
-                dead = child;
-            }
+        if (!dead->isLeaf()) {
+            BNode* child = dead->popChild();
+            if (!child->unshare()) continue;
+            dead->leaveWayUp(above);
+            above = dead;
+            dead = child;
             continue;
         }
+        const ChildStore emptied = dead->store();
         if ((dead->head & lateStoreFlag) != 0)
             NodeSlab::of(dead)->forgetLateStore(dead);
-        std::free(kept.block());
+        std::free(emptied.block());
         NodeSlab::of(dead)->release();
         if (above == nullptr) return;
         dead = above;
@@ -248,6 +251,13 @@ void NodePool::reserve(BNode& parent, std::size_t count) {
     parent.setStore(ChildStore::array(grown));
 }
 
+BNode& NodePool::add(BNode& parent, ComponentView value, Kind kind) {
+    BNodePtr handle = BNodePtr::adopt(make(value, kind));
+    BNode& child = *handle;
+    append(parent, handle);
+    return child;
+}
+
 void NodePool::append(BNode& parent, BNodePtr& child) {
     ChildBlock* block = parent.store().block();
     if (block == nullptr || block->size == block->capacity) {
@@ -263,15 +273,7 @@ void NodePool::append(BNode& parent, BNodePtr& child) {
 }
 
 void NodePool::truncate(BNode& parent, std::size_t size) noexcept {
-    for (ChildStore kept = parent.store(); kept.size() > size;
-         kept = parent.store()) {
-        if (kept.isOnly()) {
-            parent.setStore(ChildStore());
-            BNodePtr::adopt(kept.child());
-        } else {
-            BNodePtr::adopt(kept.block()->slots()[--kept.block()->size]);
-        }
-    }
+    while (parent.children().size() > size) BNodePtr::adopt(parent.popChild());
 }
 
 std::size_t NodeMemory::nodeBytes(const BNode& node) noexcept {

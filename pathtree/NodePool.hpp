@@ -34,6 +34,10 @@ public:
     // owns its one share. Throws std::bad_alloc.
     BNode* make(ComponentView value, Kind kind);
 
+    // Makes a node and appends it to the children of parent; returns it.
+    // Throws as make and append do, with nothing changed.
+    BNode& add(BNode& parent, ComponentView value, Kind kind);
+
     // Appends child to the children of parent, whose list takes over the
     // handle's share; the handle is left empty. Throws std::bad_alloc, or
     // std::length_error at 2^32 - 1 children, with nothing changed.
