@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
-#include "hosts/common/Batches.hpp"
+#include "paths/Batches.hpp"
 #include "pathtree/containers.hpp"
 
 // What every benchmark does with the coder.

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "bench/Report.hpp"
-#include "hosts/common/PathSplitter.hpp"
+#include "paths/PathSplitter.hpp"
 
 namespace bench {
 

@@ -7,7 +7,7 @@
 
 #include "bench/Subject.hpp"
 #include "bench/Timing.hpp"
-#include "hosts/common/PathText.hpp"
+#include "paths/PathText.hpp"
 
 namespace bench {
 

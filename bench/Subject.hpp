@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "hosts/common/PathSplitter.hpp"
+#include "paths/PathSplitter.hpp"
 
 namespace bench {
 

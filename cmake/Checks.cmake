@@ -26,7 +26,7 @@ qztesselAddCheck(
 file(
   GLOB_RECURSE tidySources CONFIGURE_DEPENDS
   RELATIVE ${PROJECT_SOURCE_DIR}
-  binding/*.cpp hosts/*.cpp bench/*.cpp fuzz/*.cpp)
+  paths/*.cpp archive/*.cpp binding/*.cpp hosts/*.cpp bench/*.cpp fuzz/*.cpp)
 foreach(source IN LISTS coreSources tidySources)
   add_test(
     NAME tidy.${source}

@@ -6,10 +6,6 @@
 
 namespace tessel {
 
-const char* DamagedFormException::what() const noexcept {
-    return "The stored form is truncated or damaged.";
-}
-
 namespace sixpacks {
 
 namespace {
@@ -20,50 +16,7 @@ constexpr std::uint64_t maxInflationFactor = 1032;
 
 constexpr int compressionLevel = 9;
 
-// Sum of byte j shifted left by 8 j over the given bytes.
-std::uint64_t fromLittleEndian(std::span<const std::uint8_t> bytes) {
-    std::uint64_t value = 0;
-    for (std::size_t j = bytes.size(); j-- > 0;)
-        value = (value << 8) | bytes[j];
-    return value;
-}
-
 }  // namespace
-
-const char* InvalidUintConversionException::what() const noexcept {
-    return "Invalid uint type conversion.";
-}
-
-// The only place where an outside length meets the end of the data.
-std::span<const std::uint8_t> ByteCursor::take(std::uint64_t n) {
-    if (n > rest.size()) throw DamagedFormException();
-    const auto head = rest.first(static_cast<std::size_t>(n));
-    rest = rest.subspan(static_cast<std::size_t>(n));
-    return head;
-}
-
-std::uint64_t ByteCursor::takeUint(PackedSizeT width) {
-    return fromLittleEndian(take(widthBytes(width)));
-}
-
-void ByteCursor::requireItems(std::uint64_t count,
-                              std::size_t bytesEach) const {
-    if (count > rest.size() / bytesEach) throw DamagedFormException();
-}
-
-std::size_t widthBytes(PackedSizeT width) {
-    switch (width) {
-        case PackedSizeT::Uint8:
-            return sizeof(std::uint8_t);
-        case PackedSizeT::Uint16:
-            return sizeof(std::uint16_t);
-        case PackedSizeT::Uint32:
-            return sizeof(std::uint32_t);
-        case PackedSizeT::Uint64:
-            return sizeof(std::uint64_t);
-    }
-    throw InvalidUintConversionException();
-}
 
 template <class UintT, class ValueT>
 void PackerUnpackerUint<UintT, ValueT>::packValues(

@@ -2,6 +2,7 @@
 # Usage: format.sh CLANG_FORMAT
 # Fails with the places where a source of ours is not formatted.
 set -euo pipefail
-find packing pathtree coder binding hosts tests bench fuzz \
+find packing pathtree coder paths archive binding hosts tests bench fuzz \
+    examples \
     \( -name '*.cpp' -o -name '*.hpp' \) -print0 2>/dev/null |
     xargs -0 -r -n 16 -P 2 "$1" --dry-run --Werror

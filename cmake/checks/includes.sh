@@ -4,25 +4,29 @@
 # Checks which folder includes which, and that each of our own headers is
 # named by its path from the root. Prints every line that breaks a rule.
 #
-#   packing/sixpacks*        packing/sixpacks*
-#   packing/ (stored forms)  packing pathtree coder
-#   pathtree/                pathtree
-#   coder/                   packing pathtree coder
-#   binding/                 packing pathtree coder binding
-#   hosts/NAME/              hosts, and of binding only its host interface
-#   bench/ fuzz/ tests/      anything
+# Each room includes itself and those before it, in one straight order:
+#
+#   packing/       nothing else of ours
+#   pathtree/      packing
+#   coder/         packing pathtree
+#   paths/         packing pathtree coder
+#   archive/       packing
+#   binding/       packing pathtree coder
+#   hosts/         paths, archive, and of binding only its host interface
+#   bench/ fuzz/ tests/ examples/   anything
 set -euo pipefail
 cd "$1"
 
 # Prints what the given file may include, as a regular expression.
 allowedFor() {
     case $1 in
-    packing/sixpacks*) echo 'packing/sixpacks' ;;
-    packing/*) echo '(packing|pathtree|coder)/' ;;
-    pathtree/*) echo 'pathtree/' ;;
+    packing/*) echo 'packing/' ;;
+    pathtree/*) echo '(packing|pathtree)/' ;;
     coder/*) echo '(packing|pathtree|coder)/' ;;
+    paths/*) echo '(packing|pathtree|coder|paths)/' ;;
+    archive/*) echo '(packing|archive)/' ;;
     binding/*) echo '(packing|pathtree|coder|binding)/' ;;
-    hosts/*) echo '(hosts/|binding/HostInterface\.hpp$)' ;;
+    hosts/*) echo '(paths/|archive/|hosts/|binding/HostInterface\.hpp$)' ;;
     *) echo '' ;;
     esac
 }
@@ -37,7 +41,7 @@ report() {
 while IFS=: read -r file line text; do
     header=$(sed -E 's/^[^"<]*["<]([^">]*)[">].*/\1/' <<<"$text")
     if [[ $text != *'"'* ]]; then
-        if [[ $header =~ ^(packing|pathtree|coder|binding|hosts)/ ]]; then
+        if [[ $header =~ ^(packing|pathtree|coder|paths|archive|binding|hosts)/ ]]; then
             report "$file:$line: <$header> is ours: quote it"
         fi
     elif [[ ! -f $header ]]; then
@@ -46,6 +50,7 @@ while IFS=: read -r file line text; do
         report "$file:$line: may not include \"$header\""
     fi
 done < <(grep -rEn --include='*.?pp' '^[[:space:]]*#[[:space:]]*include' \
-    packing pathtree coder binding hosts bench fuzz tests 2>/dev/null || true)
+    packing pathtree coder paths archive binding hosts bench fuzz tests \
+    examples 2>/dev/null || true)
 
 ((breaches == 0))

@@ -42,7 +42,7 @@ struct ClassExtension {
 // property name.
 //
 // A program that links this library exports VXHostInterface, which leads
-// modules to its Host. Link it with tessel_embedded's own options, which take
+// modules to its Host. Link it with qztessel_embedded's own options, which take
 // care of that.
 // Invariants: at most one Host exists in a process at a time.
 // Ownership: owns modules and classes. Values may outlive it; instances do not,

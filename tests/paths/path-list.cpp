@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "hosts/common/PathList.hpp"
+#include "paths/PathList.hpp"
 
 namespace {
 

@@ -12,9 +12,9 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
-#include "hosts/common/Batches.hpp"
-#include "hosts/common/PathSplitter.hpp"
-#include "hosts/common/PathText.hpp"
+#include "paths/Batches.hpp"
+#include "paths/PathSplitter.hpp"
+#include "paths/PathText.hpp"
 
 namespace {
 

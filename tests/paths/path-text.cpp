@@ -6,7 +6,7 @@
 
 #include <string>
 
-#include "hosts/common/PathText.hpp"
+#include "paths/PathText.hpp"
 
 namespace {
 

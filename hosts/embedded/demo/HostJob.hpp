@@ -6,9 +6,9 @@
 #include <string_view>
 #include <vector>
 
-#include "hosts/common/Batches.hpp"
-#include "hosts/common/PathList.hpp"
-#include "hosts/common/PathSplitter.hpp"
+#include "paths/Batches.hpp"
+#include "paths/PathList.hpp"
+#include "paths/PathSplitter.hpp"
 #include "hosts/embedded/Host.hpp"
 
 namespace tessel::embedded {

@@ -5,7 +5,7 @@
 
 #include "hosts/embedded/demo/HostJob.hpp"
 
-// Usage: tessel_host_demo LIST-OR-FOLDER [PLUG-IN]
+// Usage: qztessel_host_demo LIST-OR-FOLDER [PLUG-IN]
 //
 // Loads the plug-in into the embedded host and keeps the list's paths there,
 // then reads, stores, restores and compares them. Prints a table of sizes and
@@ -61,7 +61,7 @@ void run(const std::string& listOrFolder, const std::string& plugin) {
 
 int main(int argumentCount, char** arguments) {
     if (argumentCount < 2 || argumentCount > 3) {
-        std::fputs("Usage: tessel_host_demo LIST-OR-FOLDER [PLUG-IN]\n",
+        std::fputs("Usage: qztessel_host_demo LIST-OR-FOLDER [PLUG-IN]\n",
                    stderr);
         return 1;
     }

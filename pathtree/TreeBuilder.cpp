@@ -1,4 +1,4 @@
-#include "packing/TreeBuilder.hpp"
+#include "pathtree/TreeBuilder.hpp"
 
 #include "packing/sixpacks.hpp"
 

@@ -28,7 +28,7 @@
 #include <stdexcept>
 
 #include "coder/HuffmanPathTree.hpp"
-#include "packing/TreeBuilder.hpp"
+#include "pathtree/TreeBuilder.hpp"
 #include "packing/sixpacks.hpp"
 #include "pathtree/NodeWalk.hpp"
 

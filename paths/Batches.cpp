@@ -1,9 +1,9 @@
-#include "hosts/common/Batches.hpp"
+#include "paths/Batches.hpp"
 
 #include <cstdint>
 #include <functional>
 
-#include "hosts/common/PathText.hpp"
+#include "paths/PathText.hpp"
 
 namespace tessel::paths {
 

@@ -13,7 +13,7 @@
 
 #include <algorithm>
 
-#include "packing/TreeBuilder.hpp"
+#include "pathtree/TreeBuilder.hpp"
 #include "packing/sixpacks.hpp"
 #include "pathtree/BPathTree.hpp"
 #include "pathtree/NodeWalk.hpp"

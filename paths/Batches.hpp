@@ -5,8 +5,8 @@
 #include <string_view>
 #include <vector>
 
-#include "hosts/common/PathList.hpp"
-#include "hosts/common/PathSplitter.hpp"
+#include "paths/PathList.hpp"
+#include "paths/PathSplitter.hpp"
 
 // The way of a list into the coder, and of the coder's texts back to paths.
 // Consecutive paths of one folder make one folder entry with several files.

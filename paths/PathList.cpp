@@ -1,4 +1,4 @@
-#include "hosts/common/PathList.hpp"
+#include "paths/PathList.hpp"
 
 #include <fcntl.h>
 #include <sys/stat.h>

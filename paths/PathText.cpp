@@ -1,4 +1,4 @@
-#include "hosts/common/PathText.hpp"
+#include "paths/PathText.hpp"
 
 namespace tessel::paths {
 

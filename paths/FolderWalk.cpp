@@ -8,7 +8,7 @@
 #include <system_error>
 #include <utility>
 
-#include "hosts/common/PathList.hpp"
+#include "paths/PathList.hpp"
 
 namespace tessel::paths {
 

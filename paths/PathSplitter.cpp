@@ -1,10 +1,10 @@
-#include "hosts/common/PathSplitter.hpp"
+#include "paths/PathSplitter.hpp"
 
 #include <algorithm>
 #include <cstdint>
 #include <functional>
 
-#include "hosts/common/PathText.hpp"
+#include "paths/PathText.hpp"
 
 namespace tessel::paths {
 

@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "hosts/common/PathList.hpp"
+#include "paths/PathList.hpp"
 
 namespace tessel::paths {
 
