@@ -28,24 +28,24 @@ public:
     FileTracks(const HuffmanPathTree& coder, const PathSplitter& splitter) {
         std::size_t firstPath = 0;
         coder.partitionTracks.forEach([&](const tessel::PathTrack& track) {
-            positions.insert(positions.end(), track.begin(), track.end());
+            positions_.insert(positions_.end(), track.begin(), track.end());
             // A folder that was new has no position of a file behind its own.
             if (track.size() == folderDepth(splitter, firstPath)) {
-                positions.push_back(0);
+                positions_.push_back(0);
             }
-            firstPath = coder.partitionEnds[ends.size()];
-            ends.push_back(positions.size());
+            firstPath = coder.partitionEnds[ends_.size()];
+            ends_.push_back(positions_.size());
         });
     }
 
     std::span<const std::uint64_t> operator[](std::size_t i) const {
-        const std::size_t start = i == 0 ? 0 : ends[i - 1];
-        return {positions.data() + start, ends[i] - start};
+        const std::size_t start = i == 0 ? 0 : ends_[i - 1];
+        return {positions_.data() + start, ends_[i] - start};
     }
 
     // The partitions in the order of their tracks.
     std::vector<std::size_t> order() const {
-        std::vector<std::size_t> partitions(ends.size());
+        std::vector<std::size_t> partitions(ends_.size());
         std::iota(partitions.begin(), partitions.end(), std::size_t{0});
         std::sort(partitions.begin(), partitions.end(),
                   [&](std::size_t a, std::size_t b) {
@@ -56,8 +56,8 @@ public:
     }
 
 private:
-    std::vector<std::uint64_t> positions;
-    std::vector<std::size_t> ends;
+    std::vector<std::uint64_t> positions_;
+    std::vector<std::size_t> ends_;
 };
 
 }  // namespace

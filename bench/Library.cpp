@@ -33,10 +33,10 @@ CharacterCounts sumOf(const std::map<char16_t, double>& sums) {
 class Library : public Subject {
 public:
     explicit Library(const PathSplitter& pathSplitter)
-        : splitter(&pathSplitter) {}
+        : splitter_(&pathSplitter) {}
 
     std::string name() const override { return "qztessel"; }
-    std::size_t paths() const override { return splitter->list().size(); }
+    std::size_t paths() const override { return splitter_->list().size(); }
 
     // Counts, makes the code, encodes and inserts; the lists of UTF-16
     // strings are there before. They are released while they are added.
@@ -44,24 +44,24 @@ public:
         Batch batch;
         CharacterCounts counts;
         double seconds = countAll(batch, counts);
-        seconds += secondsOf([&] { coder = coderFor(std::move(counts)); });
+        seconds += secondsOf([&] { coder_ = coderFor(std::move(counts)); });
         if (!batch.folders.empty()) return seconds + add(batch);
-        BatchReader reader(*splitter, pathsPerBatch);
+        BatchReader reader(*splitter_, pathsPerBatch);
         while (reader.next(batch)) seconds += add(batch);
         return seconds;
     }
 
     double iterate() override {
         return secondsOf([&] {
-            bench::iterate(*coder,
+            bench::iterate(*coder_,
                            [](const std::u16string& text) { keep(text); });
         });
     }
 
     double fetchAll() override {
-        const auto numbers = numbersFrom(1, splitter->list().size());
+        const auto numbers = numbersFrom(1, splitter_->list().size());
         return secondsOf([&] {
-            fetch(*coder, numbers,
+            fetch(*coder_, numbers,
                   [](const std::u16string& text) { keep(text); });
         });
     }
@@ -71,46 +71,46 @@ public:
         return secondsOf([&] {
             for (const double number : numbers) {
                 one[0] = number;
-                fetch(*coder, one,
+                fetch(*coder_, one,
                       [](const std::u16string& text) { keep(text); });
             }
         });
     }
 
     double store() override {
-        form.clear();
-        form.shrink_to_fit();
+        form_.clear();
+        form_.shrink_to_fit();
         return secondsOf([&] {
-            coder->serialize(form, true);
-            treeString = coder->getTreeString();
+            coder_->serialize(form_, true);
+            treeString_ = coder_->getTreeString();
         });
     }
 
     double restore() override {
         return secondsOf([&] {
-            restored = std::make_unique<HuffmanPathTree>();
-            restored->deserialize(form, true);
-            restored->inflateHuffman(treeString);
+            restored_ = std::make_unique<HuffmanPathTree>();
+            restored_->deserialize(form_, true);
+            restored_->inflateHuffman(treeString_);
         });
     }
 
     double destroyRestored() override {
-        return secondsOf([&] { restored.reset(); });
+        return secondsOf([&] { restored_.reset(); });
     }
     double destroy() override {
-        return secondsOf([&] { coder.reset(); });
+        return secondsOf([&] { coder_.reset(); });
     }
 
     std::size_t storedBytes() const override {
-        return form.size() + treeString.size() * sizeof(char16_t);
+        return form_.size() + treeString_.size() * sizeof(char16_t);
     }
-    bool verify() override { return isList(*coder); }
-    bool verifyRestored() override { return isList(*restored); }
+    bool verify() override { return isList(*coder_); }
+    bool verifyRestored() override { return isList(*restored_); }
 
 private:
     // Leaves the batch in place if it is the only one.
     double countAll(Batch& batch, CharacterCounts& counts) const {
-        BatchReader reader(*splitter, pathsPerBatch);
+        BatchReader reader(*splitter_, pathsPerBatch);
         std::map<char16_t, double> sums;
         double seconds = 0;
         while (reader.next(batch)) {
@@ -121,7 +121,7 @@ private:
                     sums[counts.characters[i]] += counts.frequencies[i];
                 }
             });
-            if (batch.pathCount == splitter->list().size()) return seconds;
+            if (batch.pathCount == splitter_->list().size()) return seconds;
         }
         counts = sumOf(sums);
         return seconds;
@@ -129,18 +129,18 @@ private:
 
     double add(Batch& batch) const {
         return secondsOf([&] {
-            coder->generateCodeAsyncAndAddPaths(batch.folders, batch.files);
+            coder_->generateCodeAsyncAndAddPaths(batch.folders, batch.files);
         });
     }
 
     bool isList(HuffmanPathTree& tested) const {
         std::size_t fetched = 0;
         bool same = true;
-        fetch(tested, numbersFrom(1, splitter->list().size()),
+        fetch(tested, numbersFrom(1, splitter_->list().size()),
               [&](const std::u16string& text) {
                   same = same && isPath(text, fetched++);
               });
-        const auto order = iterationOrder(tested, *splitter);
+        const auto order = iterationOrder(tested, *splitter_);
         std::size_t met = 0;
         bench::iterate(tested, [&](const std::u16string& text) {
             same = same && met < order.size() && isPath(text, order[met]);
@@ -151,16 +151,16 @@ private:
 
     bool isPath(const std::u16string& text, std::size_t position) const {
         std::string path;
-        return position < splitter->list().size() &&
+        return position < splitter_->list().size() &&
                tessel::paths::textToPath(text, path) &&
-               path == splitter->list()[position];
+               path == splitter_->list()[position];
     }
 
-    const PathSplitter* splitter;
-    CoderPtr coder;
-    CoderPtr restored;
-    std::vector<std::uint8_t> form;
-    std::u16string treeString;
+    const PathSplitter* splitter_;
+    CoderPtr coder_;
+    CoderPtr restored_;
+    std::vector<std::uint8_t> form_;
+    std::u16string treeString_;
 };
 
 }  // namespace

@@ -45,39 +45,40 @@ public:
     // So many texts should come in all.
     Comparison(const PathList& paths, std::size_t texts,
                std::string nameOfRoute)
-        : list(&paths), wanted(texts), route(std::move(nameOfRoute)) {}
+        : list_(&paths), wanted_(texts), route_(std::move(nameOfRoute)) {}
 
     // The next text should be that of path `position`, counted from 0.
     void expect(std::size_t position, const std::u16string& joined) {
-        ++count;
-        if (difference) return;
-        path.clear();
-        if (!tessel::paths::textToPath(joined, path)) {
-            path = "(no path's text)";
-        } else if (position < list->size() && path == (*list)[position]) {
+        ++count_;
+        if (difference_) return;
+        path_.clear();
+        if (!tessel::paths::textToPath(joined, path_)) {
+            path_ = "(no path's text)";
+        } else if (position < list_->size() && path_ == (*list_)[position]) {
             return;
         }
-        difference = route + ": path " + std::to_string(position + 1) +
-                     " should be\n  " +
-                     (position < list->size() ? std::string((*list)[position])
-                                              : "(behind the last)") +
-                     "\nand is\n  " + path;
+        difference_ =
+            route_ + ": path " + std::to_string(position + 1) +
+            " should be\n  " +
+            (position < list_->size() ? std::string((*list_)[position])
+                                      : "(behind the last)") +
+            "\nand is\n  " + path_;
     }
 
     // The first difference, which may be in the number of texts.
     std::optional<std::string> result() const {
-        if (difference || count == wanted) return difference;
-        return route + ": " + std::to_string(count) + " paths instead of " +
-               std::to_string(wanted);
+        if (difference_ || count_ == wanted_) return difference_;
+        return route_ + ": " + std::to_string(count_) + " paths instead of " +
+               std::to_string(wanted_);
     }
 
 private:
-    const PathList* list;
-    std::size_t wanted;
-    std::string route;
-    std::size_t count = 0;
-    std::string path;
-    std::optional<std::string> difference;
+    const PathList* list_;
+    std::size_t wanted_;
+    std::string route_;
+    std::size_t count_ = 0;
+    std::string path_;
+    std::optional<std::string> difference_;
 };
 
 // The job, step by step. Each step is timed under its name.
@@ -106,27 +107,28 @@ private:
 
     void read(const std::string& listOrFolder) {
         const Stopwatch watch;
-        list = tessel::paths::readPaths(listOrFolder, walk);
-        results.paths = list.size();
-        results.textBytes = list.textBytes();
-        results.steps.push_back({"read", watch.seconds(), list.size()});
+        list_ = tessel::paths::readPaths(listOrFolder, walk);
+        results.paths = list_.size();
+        results.textBytes = list_.textBytes();
+        results.steps.push_back({"read", watch.seconds(), list_.size()});
     }
 
     // Where each path is cut; the texts are made batch by batch.
     PathSplitter split() {
         const Stopwatch watch;
-        PathSplitter splitter(list);
-        splitSeconds = watch.seconds();
+        PathSplitter splitter(list_);
+        splitSeconds_ = watch.seconds();
         results.keptApart = splitter.keptApartCount();
         return splitter;
     }
 
     CoderPtr code(const PathSplitter& splitter) {
         tessel::paths::CharacterCounts counts;
-        step("count", list.size(),
+        step("count", list_.size(),
              [&] { counts = tessel::paths::countCharacters(splitter); });
         CoderPtr coder;
-        step("code", list.size(), [&] { coder = coderFor(std::move(counts)); });
+        step("code", list_.size(),
+             [&] { coder = coderFor(std::move(counts)); });
         return coder;
     }
 
@@ -137,27 +139,27 @@ private:
         for (;;) {
             const Stopwatch watch;
             const bool more = reader.next(batch);
-            splitSeconds += watch.seconds();
+            splitSeconds_ += watch.seconds();
             if (!more) break;
             addSeconds += secondsOf([&] {
                 coder.generateCodeAsyncAndAddPaths(batch.folders, batch.files);
             });
         }
         results.steps.insert(results.steps.begin() + 1,
-                             {"split", splitSeconds, list.size()});
-        results.steps.push_back({"add", addSeconds, list.size()});
+                             {"split", splitSeconds_, list_.size()});
+        results.steps.push_back({"add", addSeconds, list_.size()});
     }
 
     // Serializes the coder, releases it, and restores another one.
     CoderPtr throughForm(CoderPtr coder) {
         std::vector<std::uint8_t> form;
-        step("serialize", list.size(), [&] { coder->serialize(form, true); });
+        step("serialize", list_.size(), [&] { coder->serialize(form, true); });
         results.storedBytes =
             form.size() + coder->treeString.size() * sizeof(char16_t);
         const std::u16string treeString = coder->getTreeString();
         coder.reset();
         auto restored = std::make_unique<HuffmanPathTree>();
-        step("restore", list.size(), [&] {
+        step("restore", list_.size(), [&] {
             restored->deserialize(form, true);
             restored->inflateHuffman(treeString);
         });
@@ -165,13 +167,13 @@ private:
     }
 
     void iterateAll(HuffmanPathTree& coder) {
-        step("iterate all", list.size(), [&] {
+        step("iterate all", list_.size(), [&] {
             iterate(coder, [](const std::u16string& text) { keep(text); });
         });
     }
 
     void fetchRandom(const HuffmanPathTree& coder) {
-        const auto numbers = randomNumbers(randomFetches, list.size());
+        const auto numbers = randomNumbers(randomFetches, list_.size());
         step("random getPath", numbers.size(), [&] {
             for (const double number : numbers) {
                 fetch(coder, {number},
@@ -183,7 +185,7 @@ private:
     std::optional<std::string> compare(HuffmanPathTree& coder,
                                        const PathSplitter& splitter) {
         std::optional<std::string> difference;
-        step("compare", 2 * list.size() + randomFetches, [&] {
+        step("compare", 2 * list_.size() + randomFetches, [&] {
             difference = compareByNumber(coder);
             if (!difference) difference = compareRandom(coder);
             if (!difference) difference = compareIteration(coder, splitter);
@@ -192,10 +194,10 @@ private:
     }
 
     std::optional<std::string> compareByNumber(const HuffmanPathTree& coder) {
-        Comparison comparison(list, list.size(), "by number");
-        for (std::size_t first = 0; first < list.size();) {
+        Comparison comparison(list_, list_.size(), "by number");
+        for (std::size_t first = 0; first < list_.size();) {
             const std::size_t end =
-                std::min(list.size(), first + comparedAtOnce);
+                std::min(list_.size(), first + comparedAtOnce);
             fetch(coder, numbersFrom(first + 1, end),
                   [&](const std::u16string& text) {
                       comparison.expect(first++, text);
@@ -206,8 +208,8 @@ private:
     }
 
     std::optional<std::string> compareRandom(const HuffmanPathTree& coder) {
-        Comparison comparison(list, randomFetches, "random getPath");
-        for (const double number : randomNumbers(randomFetches, list.size())) {
+        Comparison comparison(list_, randomFetches, "random getPath");
+        for (const double number : randomNumbers(randomFetches, list_.size())) {
             fetch(coder, {number}, [&](const std::u16string& text) {
                 comparison.expect(static_cast<std::size_t>(number) - 1, text);
             });
@@ -217,18 +219,18 @@ private:
 
     std::optional<std::string> compareIteration(HuffmanPathTree& coder,
                                                 const PathSplitter& splitter) {
-        Comparison comparison(list, list.size(), "iterated");
+        Comparison comparison(list_, list_.size(), "iterated");
         const auto order = iterationOrder(coder, splitter);
         std::size_t i = 0;
         iterate(coder, [&](const std::u16string& text) {
-            comparison.expect(i < order.size() ? order[i] : list.size(), text);
+            comparison.expect(i < order.size() ? order[i] : list_.size(), text);
             ++i;
         });
         return comparison.result();
     }
 
-    PathList list;
-    double splitSeconds = 0;
+    PathList list_;
+    double splitSeconds_ = 0;
 };
 
 void sizeRow(Table& table, const char* name, std::size_t bytes,

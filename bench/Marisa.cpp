@@ -17,25 +17,25 @@ namespace {
 
 class Marisa : public Subject {
 public:
-    explicit Marisa(const PathList& paths) : list(&paths) {}
+    explicit Marisa(const PathList& paths) : list_(&paths) {}
 
     std::string name() const override { return "marisa-trie"; }
-    std::size_t paths() const override { return list->size(); }
+    std::size_t paths() const override { return list_->size(); }
 
     // From a keyset, which is there before.
     double build() override {
         marisa::Keyset keys;
-        for (std::size_t i = 0; i < list->size(); ++i) {
-            keys.push_back((*list)[i].data(), (*list)[i].size());
+        for (std::size_t i = 0; i < list_->size(); ++i) {
+            keys.push_back((*list_)[i].data(), (*list_)[i].size());
         }
         const double seconds = secondsOf([&] {
-            trie = std::make_unique<marisa::Trie>();
-            trie->build(keys);
+            trie_ = std::make_unique<marisa::Trie>();
+            trie_->build(keys);
         });
-        if (idOf.empty()) {
-            idOf.reserve(keys.size());
+        if (idOf_.empty()) {
+            idOf_.reserve(keys.size());
             for (std::size_t i = 0; i < keys.size(); ++i) {
-                idOf.push_back(static_cast<std::uint32_t>(keys[i].id()));
+                idOf_.push_back(static_cast<std::uint32_t>(keys[i].id()));
             }
         }
         return seconds;
@@ -44,8 +44,8 @@ public:
     double iterate() override {
         marisa::Agent agent;
         return secondsOf([&] {
-            for (std::size_t id = 0; id < trie->size(); ++id) {
-                lookUp(*trie, id, agent);
+            for (std::size_t id = 0; id < trie_->size(); ++id) {
+                lookUp(*trie_, id, agent);
             }
         });
     }
@@ -55,7 +55,7 @@ public:
         marisa::Agent agent;
         return secondsOf([&] {
             for (const double number : numbers) {
-                lookUp(*trie, idOf[static_cast<std::size_t>(number) - 1],
+                lookUp(*trie_, idOf_[static_cast<std::size_t>(number) - 1],
                        agent);
             }
         });
@@ -63,30 +63,30 @@ public:
 
     double store() override {
         std::ostringstream out;
-        const double seconds = secondsOf([&] { marisa::write(out, *trie); });
-        form = std::move(out).str();
+        const double seconds = secondsOf([&] { marisa::write(out, *trie_); });
+        form_ = std::move(out).str();
         return seconds;
     }
     double restore() override {
-        std::istringstream in(form);
+        std::istringstream in(form_);
         return secondsOf([&] {
-            restored = std::make_unique<marisa::Trie>();
-            marisa::read(in, restored.get());
+            restored_ = std::make_unique<marisa::Trie>();
+            marisa::read(in, restored_.get());
         });
     }
     double destroyRestored() override {
-        return secondsOf([&] { restored.reset(); });
+        return secondsOf([&] { restored_.reset(); });
     }
     double destroy() override {
-        return secondsOf([&] { trie.reset(); });
+        return secondsOf([&] { trie_.reset(); });
     }
 
-    std::size_t storedBytes() const override { return form.size(); }
+    std::size_t storedBytes() const override { return form_.size(); }
     std::size_t sideBytes() const override {
-        return idOf.capacity() * sizeof(std::uint32_t);
+        return idOf_.capacity() * sizeof(std::uint32_t);
     }
-    bool verify() override { return isList(*trie); }
-    bool verifyRestored() override { return isList(*restored); }
+    bool verify() override { return isList(*trie_); }
+    bool verifyRestored() override { return isList(*restored_); }
 
 private:
     static void lookUp(const marisa::Trie& in, std::size_t id,
@@ -98,21 +98,21 @@ private:
 
     bool isList(const marisa::Trie& tested) const {
         marisa::Agent agent;
-        for (std::size_t i = 0; i < list->size(); ++i) {
-            lookUp(tested, idOf[i], agent);
+        for (std::size_t i = 0; i < list_->size(); ++i) {
+            lookUp(tested, idOf_[i], agent);
             if (std::string_view(agent.key().ptr(), agent.key().length()) !=
-                (*list)[i]) {
+                (*list_)[i]) {
                 return false;
             }
         }
         return true;
     }
 
-    const PathList* list;
-    std::vector<std::uint32_t> idOf;  // by position in the list
-    std::unique_ptr<marisa::Trie> trie;
-    std::unique_ptr<marisa::Trie> restored;
-    std::string form;
+    const PathList* list_;
+    std::vector<std::uint32_t> idOf_;  // by position in the list
+    std::unique_ptr<marisa::Trie> trie_;
+    std::unique_ptr<marisa::Trie> restored_;
+    std::string form_;
 };
 
 }  // namespace

@@ -36,17 +36,17 @@ std::uint64_t readNumber(std::string_view& in, std::size_t bytes) {
 template <class Container>
 class Plain : public Subject {
 public:
-    explicit Plain(const PathList& paths) : list(&paths) {}
+    explicit Plain(const PathList& paths) : list_(&paths) {}
 
     std::string name() const override { return Container::name(); }
-    std::size_t paths() const override { return list->size(); }
+    std::size_t paths() const override { return list_->size(); }
 
     double build() override {
         return secondsOf([&] {
-            kept = std::make_unique<Container>();
-            kept->reserve(list->size(), list->textBytes());
-            for (std::size_t i = 0; i < list->size(); ++i) {
-                kept->add((*list)[i]);
+            kept_ = std::make_unique<Container>();
+            kept_->reserve(list_->size(), list_->textBytes());
+            for (std::size_t i = 0; i < list_->size(); ++i) {
+                kept_->add((*list_)[i]);
             }
         });
     }
@@ -54,7 +54,7 @@ public:
     double iterate() override {
         typename Container::Text text;
         return secondsOf([&] {
-            for (std::size_t i = 0; i < kept->size(); ++i) read(i, text);
+            for (std::size_t i = 0; i < kept_->size(); ++i) read(i, text);
         });
     }
     double fetchAll() override { return iterate(); }
@@ -68,50 +68,50 @@ public:
     }
 
     double store() override {
-        std::string().swap(form);
-        return secondsOf([&] { kept->write(form); });
+        std::string().swap(form_);
+        return secondsOf([&] { kept_->write(form_); });
     }
     double restore() override {
         return secondsOf([&] {
-            restored = std::make_unique<Container>();
-            restored->reserve(list->size(), list->textBytes());
-            restored->read(form);
+            restored_ = std::make_unique<Container>();
+            restored_->reserve(list_->size(), list_->textBytes());
+            restored_->read(form_);
         });
     }
     double destroyRestored() override {
-        return secondsOf([&] { restored.reset(); });
+        return secondsOf([&] { restored_.reset(); });
     }
     double destroy() override {
-        return secondsOf([&] { kept.reset(); });
+        return secondsOf([&] { kept_.reset(); });
     }
 
-    std::size_t storedBytes() const override { return form.size(); }
-    bool verify() override { return isList(*kept); }
-    bool verifyRestored() override { return isList(*restored); }
+    std::size_t storedBytes() const override { return form_.size(); }
+    bool verify() override { return isList(*kept_); }
+    bool verifyRestored() override { return isList(*restored_); }
 
 private:
     void read(std::size_t i, typename Container::Text& text) const {
-        text.assign(kept->text(i));
+        text.assign(kept_->text(i));
         keep(text);
     }
 
     bool isList(const Container& tested) const {
         std::string path;
-        if (tested.size() != list->size()) return false;
-        for (std::size_t i = 0; i < list->size(); ++i) {
+        if (tested.size() != list_->size()) return false;
+        for (std::size_t i = 0; i < list_->size(); ++i) {
             path.clear();
             if (!Container::toPath(tested.text(i), path) ||
-                path != (*list)[i]) {
+                path != (*list_)[i]) {
                 return false;
             }
         }
         return true;
     }
 
-    const PathList* list;
-    std::unique_ptr<Container> kept;
-    std::unique_ptr<Container> restored;
-    std::string form;
+    const PathList* list_;
+    std::unique_ptr<Container> kept_;
+    std::unique_ptr<Container> restored_;
+    std::string form_;
 };
 
 class TextVector {
@@ -120,20 +120,20 @@ public:
     static const char* name() { return "vector of u16string"; }
 
     void reserve(std::size_t paths, std::size_t /*bytes*/) {
-        texts.reserve(paths);
+        texts_.reserve(paths);
     }
     void add(std::string_view path) {
-        texts.push_back(tessel::paths::toText(path));
+        texts_.push_back(tessel::paths::toText(path));
     }
-    std::size_t size() const { return texts.size(); }
-    const Text& text(std::size_t i) const { return texts[i]; }
+    std::size_t size() const { return texts_.size(); }
+    const Text& text(std::size_t i) const { return texts_[i]; }
     static bool toPath(const Text& text, std::string& path) {
         return tessel::paths::appendBytes(text, path);
     }
 
     // Each text's length in 4 bytes and its units.
     void write(std::string& out) const {
-        for (const Text& text : texts) {
+        for (const Text& text : texts_) {
             appendNumber(out, text.size(), 4);
             const std::size_t before = out.size();
             const std::size_t bytes = text.size() * sizeof(char16_t);
@@ -143,7 +143,7 @@ public:
     }
     void read(std::string_view in) {
         while (!in.empty()) {
-            Text& text = texts.emplace_back(readNumber(in, 4), u'\0');
+            Text& text = texts_.emplace_back(readNumber(in, 4), u'\0');
             const std::size_t bytes = text.size() * sizeof(char16_t);
             std::memcpy(text.data(), in.data(), bytes);
             in.remove_prefix(bytes);
@@ -151,7 +151,7 @@ public:
     }
 
 private:
-    std::vector<Text> texts;
+    std::vector<Text> texts_;
 };
 
 class StringVector {
@@ -160,11 +160,11 @@ public:
     static const char* name() { return "vector of string"; }
 
     void reserve(std::size_t paths, std::size_t /*bytes*/) {
-        texts.reserve(paths);
+        texts_.reserve(paths);
     }
-    void add(std::string_view path) { texts.emplace_back(path); }
-    std::size_t size() const { return texts.size(); }
-    const Text& text(std::size_t i) const { return texts[i]; }
+    void add(std::string_view path) { texts_.emplace_back(path); }
+    std::size_t size() const { return texts_.size(); }
+    const Text& text(std::size_t i) const { return texts_[i]; }
     static bool toPath(const Text& text, std::string& path) {
         path = text;
         return true;
@@ -172,17 +172,17 @@ public:
 
     // Each text and a NUL.
     void write(std::string& out) const {
-        for (const Text& text : texts) out.append(text).push_back('\0');
+        for (const Text& text : texts_) out.append(text).push_back('\0');
     }
     void read(std::string_view in) {
         while (!in.empty()) {
-            texts.emplace_back(in.substr(0, in.find('\0')));
-            in.remove_prefix(texts.back().size() + 1);
+            texts_.emplace_back(in.substr(0, in.find('\0')));
+            in.remove_prefix(texts_.back().size() + 1);
         }
     }
 
 private:
-    std::vector<Text> texts;
+    std::vector<Text> texts_;
 };
 
 // All texts one behind the other, and where each ends.
@@ -196,17 +196,17 @@ public:
     }
 
     void reserve(std::size_t paths, std::size_t bytes) {
-        ends.reserve(paths);
-        buffer.reserve(bytes);
+        ends_.reserve(paths);
+        buffer_.reserve(bytes);
     }
     void add(std::string_view path) {
-        buffer.append(path);
-        ends.push_back(static_cast<Offset>(buffer.size()));
+        buffer_.append(path);
+        ends_.push_back(static_cast<Offset>(buffer_.size()));
     }
-    std::size_t size() const { return ends.size(); }
+    std::size_t size() const { return ends_.size(); }
     std::string_view text(std::size_t i) const {
-        const std::size_t start = i == 0 ? 0 : ends[i - 1];
-        return std::string_view(buffer).substr(start, ends[i] - start);
+        const std::size_t start = i == 0 ? 0 : ends_[i - 1];
+        return std::string_view(buffer_).substr(start, ends_[i] - start);
     }
     static bool toPath(std::string_view text, std::string& path) {
         path = text;
@@ -215,24 +215,24 @@ public:
 
     // Both lengths in 8 bytes, and both as they are.
     void write(std::string& out) const {
-        appendNumber(out, buffer.size(), 8);
-        appendNumber(out, ends.size(), 8);
-        out.append(buffer);
+        appendNumber(out, buffer_.size(), 8);
+        appendNumber(out, ends_.size(), 8);
+        out.append(buffer_);
         const std::size_t before = out.size();
-        out.resize(before + ends.size() * sizeof(Offset));
-        std::memcpy(out.data() + before, ends.data(), out.size() - before);
+        out.resize(before + ends_.size() * sizeof(Offset));
+        std::memcpy(out.data() + before, ends_.data(), out.size() - before);
     }
     void read(std::string_view in) {
         const std::uint64_t bytes = readNumber(in, 8);
-        ends.resize(readNumber(in, 8));
-        buffer.assign(in.substr(0, bytes));
-        std::memcpy(ends.data(), in.data() + bytes,
-                    ends.size() * sizeof(Offset));
+        ends_.resize(readNumber(in, 8));
+        buffer_.assign(in.substr(0, bytes));
+        std::memcpy(ends_.data(), in.data() + bytes,
+                    ends_.size() * sizeof(Offset));
     }
 
 private:
-    std::string buffer;
-    std::vector<Offset> ends;
+    std::string buffer_;
+    std::vector<Offset> ends_;
 };
 
 }  // namespace

@@ -68,17 +68,17 @@ std::string threeDigits(double number) {
 
 std::string Table::text() const {
     std::vector<std::size_t> widths;
-    for (const auto& cells : rows) {
+    for (const auto& cells : rows_) {
         widths.resize(std::max(widths.size(), cells.size()));
         for (std::size_t i = 0; i < cells.size(); ++i) {
             widths[i] = std::max(widths[i], cells[i].size());
         }
     }
     std::string all;
-    for (std::size_t r = 0; r < rows.size(); ++r) {
+    for (std::size_t r = 0; r < rows_.size(); ++r) {
         for (std::size_t i = 0; i < widths.size(); ++i) {
             const std::string cell =
-                i < rows[r].size() ? rows[r][i] : std::string();
+                i < rows_[r].size() ? rows_[r][i] : std::string();
             all += "| " + padded(cell, widths[i], i == 0) + ' ';
         }
         all += "|\n";
@@ -92,35 +92,35 @@ std::string Table::text() const {
 }
 
 void Json::key(std::string_view name) {
-    if (!body.empty()) body += ", ";
-    body += quoted(name) + ": ";
+    if (!body_.empty()) body_ += ", ";
+    body_ += quoted(name) + ": ";
 }
 
 Json& Json::number(std::string_view name, double value) {
     key(name);
-    body += std::isfinite(value) ? formatted("%.17g", value) : "null";
+    body_ += std::isfinite(value) ? formatted("%.17g", value) : "null";
     return *this;
 }
 
 Json& Json::text(std::string_view name, std::string_view value) {
     key(name);
-    body += quoted(value);
+    body_ += quoted(value);
     return *this;
 }
 
 Json& Json::object(std::string_view name, const Json& value) {
     key(name);
-    body += value.dump();
+    body_ += value.dump();
     return *this;
 }
 
 Json& Json::list(std::string_view name, const std::vector<Json>& values) {
     key(name);
-    body += '[';
+    body_ += '[';
     for (std::size_t i = 0; i < values.size(); ++i) {
-        body += (i == 0 ? "\n " : ",\n ") + values[i].dump();
+        body_ += (i == 0 ? "\n " : ",\n ") + values[i].dump();
     }
-    body += ']';
+    body_ += ']';
     return *this;
 }
 

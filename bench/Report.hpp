@@ -23,12 +23,12 @@ class Table {
 public:
     explicit Table(std::vector<std::string> heads) { row(std::move(heads)); }
     void row(std::vector<std::string> cells) {
-        rows.push_back(std::move(cells));
+        rows_.push_back(std::move(cells));
     }
     std::string text() const;
 
 private:
-    std::vector<std::vector<std::string>> rows;
+    std::vector<std::vector<std::string>> rows_;
 };
 
 // A JSON object, built in order.
@@ -38,11 +38,11 @@ public:
     Json& text(std::string_view name, std::string_view value);
     Json& object(std::string_view name, const Json& value);
     Json& list(std::string_view name, const std::vector<Json>& values);
-    std::string dump() const { return "{" + body + "}"; }
+    std::string dump() const { return "{" + body_ + "}"; }
 
 private:
     void key(std::string_view name);
-    std::string body;
+    std::string body_;
 };
 
 // One line each: compiler, processor, cores, system.

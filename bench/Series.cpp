@@ -23,40 +23,40 @@ void require(bool verified, const Subject& subject) {
 class Measurement {
 public:
     Measurement(std::vector<SubjectPtr>& measured, const Plan& plannedRuns)
-        : subjects(&measured), plan(plannedRuns) {
+        : subjects_(&measured), plan_(plannedRuns) {
         for (const SubjectPtr& subject : measured) {
-            Series& one = series.emplace_back();
+            Series& one = series_.emplace_back();
             one.name = subject->name();
             one.paths = subject->paths();
-            one.fetches = plan.fetches;
+            one.fetches = plan_.fetches;
         }
     }
 
     std::vector<Series> result() {
-        for (int i = 0; i < plan.runs; ++i) run(i == 0, i < plan.storeRuns);
-        return std::move(series);
+        for (int i = 0; i < plan_.runs; ++i) run(i == 0, i < plan_.storeRuns);
+        return std::move(series_);
     }
 
 private:
     void each(Operation operation,
               const std::function<double(Subject&)>& measured) {
-        for (std::size_t i = 0; i < subjects->size(); ++i) {
-            series[i].seconds[static_cast<std::size_t>(operation)].push_back(
-                measured(*(*subjects)[i]));
+        for (std::size_t i = 0; i < subjects_->size(); ++i) {
+            series_[i].seconds[static_cast<std::size_t>(operation)].push_back(
+                measured(*(*subjects_)[i]));
         }
     }
 
     void run(bool isFirst, bool stores) {
         buildAll(isFirst);
         if (isFirst) {
-            for (const auto& subject : *subjects) {
+            for (const auto& subject : *subjects_) {
                 require(subject->verify(), *subject);
             }
         }
         each(Operation::Iterate, [](Subject& s) { return s.iterate(); });
         each(Operation::FetchAll, [](Subject& s) { return s.fetchAll(); });
         each(Operation::FetchRandom, [&](Subject& s) {
-            return s.fetchRandom(randomNumbers(plan.fetches, s.paths()));
+            return s.fetchRandom(randomNumbers(plan_.fetches, s.paths()));
         });
         if (stores) storeAll(isFirst);
         each(Operation::Destroy, [](Subject& s) { return s.destroy(); });
@@ -68,7 +68,7 @@ private:
             const std::size_t before = heapInUse() - s.sideBytes();
             const double seconds = s.build();
             if (isFirst) {
-                series[i].memoryBytes = heapInUse() - s.sideBytes() - before;
+                series_[i].memoryBytes = heapInUse() - s.sideBytes() - before;
             }
             ++i;
             return seconds;
@@ -83,14 +83,14 @@ private:
             s.destroyRestored();
             return seconds;
         });
-        for (std::size_t i = 0; i < subjects->size(); ++i) {
-            series[i].storedBytes = (*subjects)[i]->storedBytes();
+        for (std::size_t i = 0; i < subjects_->size(); ++i) {
+            series_[i].storedBytes = (*subjects_)[i]->storedBytes();
         }
     }
 
-    std::vector<SubjectPtr>* subjects;
-    Plan plan;
-    std::vector<Series> series;
+    std::vector<SubjectPtr>* subjects_;
+    Plan plan_;
+    std::vector<Series> series_;
 };
 
 }  // namespace

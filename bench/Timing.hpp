@@ -11,12 +11,12 @@ namespace bench {
 class Stopwatch {
 public:
     double seconds() const {
-        return std::chrono::duration<double>(Clock::now() - begin).count();
+        return std::chrono::duration<double>(Clock::now() - begin_).count();
     }
 
 private:
     using Clock = std::chrono::steady_clock;
-    Clock::time_point begin = Clock::now();
+    Clock::time_point begin_ = Clock::now();
 };
 
 // How long a call takes, in seconds.

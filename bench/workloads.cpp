@@ -31,12 +31,12 @@ constexpr std::size_t randomFetches = 10'000;
 class Numbers {
 public:
     std::size_t below(std::size_t bound) {
-        state = state * 6364136223846793005U + 1442695040888963407U;
-        return static_cast<std::size_t>(state >> 33U) % bound;
+        state_ = state_ * 6364136223846793005U + 1442695040888963407U;
+        return static_cast<std::size_t>(state_ >> 33U) % bound;
     }
 
 private:
-    std::uint64_t state = 20230610;
+    std::uint64_t state_ = 20230610;
 };
 
 std::string name(Numbers& numbers, std::size_t syllables) {

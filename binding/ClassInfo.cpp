@@ -18,11 +18,11 @@ namespace {
 class MissingPackageException : public std::exception {
 public:
     explicit MissingPackageException(const char* name)
-        : text(std::string("The host has no package '") + name + "'.") {}
-    const char* what() const noexcept override { return text.c_str(); }
+        : text_(std::string("The host has no package '") + name + "'.") {}
+    const char* what() const noexcept override { return text_.c_str(); }
 
 private:
-    std::string text;
+    std::string text_;
 };
 
 HostPackage* found(HostPackage* package, const char* name) {

@@ -13,15 +13,15 @@ namespace {
 class MessageIdException {
 public:
     explicit MessageIdException(const MessageIdError& source)
-        : error(source.clone()) {}
+        : error_(source.clone()) {}
 
     void report() const {
-        host().HostError(error->identifier(), error->argumentList());
+        host().HostError(error_->identifier(), error_->argumentList());
     }
-    void rethrow() const { error->rethrow(); }
+    void rethrow() const { error_->rethrow(); }
 
 private:
-    std::unique_ptr<MessageIdError> error;
+    std::unique_ptr<MessageIdError> error_;
 };
 
 }  // namespace
@@ -29,10 +29,10 @@ private:
 MessageIdError::MessageIdError(
     std::vector<HostMessageArgument> messageArguments,
     std::string messageComponent, std::string messageKey)
-    : arguments(std::move(messageArguments)),
-      component(std::move(messageComponent)),
-      key(std::move(messageKey)),
-      fullIdentifier(component + ":" + key) {}
+    : arguments_(std::move(messageArguments)),
+      component_(std::move(messageComponent)),
+      key_(std::move(messageKey)),
+      fullIdentifier_(component_ + ":" + key_) {}
 
 void raiseHostError(const MessageIdError& error) {
     const MessageIdException wrapped(error);

@@ -17,12 +17,12 @@ namespace tessel {
 // Ownership: a plain value.
 class MessageIdError : public std::exception {
 public:
-    const std::string& identifier() const noexcept { return fullIdentifier; }
+    const std::string& identifier() const noexcept { return fullIdentifier_; }
     const std::vector<HostMessageArgument>& argumentList() const noexcept {
-        return arguments;
+        return arguments_;
     }
     const char* what() const noexcept override {
-        return fullIdentifier.c_str();
+        return fullIdentifier_.c_str();
     }
 
     virtual std::unique_ptr<MessageIdError> clone() const = 0;
@@ -35,10 +35,10 @@ protected:
                    std::string messageComponent, std::string messageKey);
 
 private:
-    std::vector<HostMessageArgument> arguments;
-    std::string component;
-    std::string key;
-    std::string fullIdentifier;
+    std::vector<HostMessageArgument> arguments_;
+    std::string component_;
+    std::string key_;
+    std::string fullIdentifier_;
 };
 
 // Raises an error of the host. If the host's entry returns, throws the error

@@ -15,11 +15,11 @@ namespace tessel {
 class HostRefusedException : public std::exception {
 public:
     explicit HostRefusedException(std::string reason)
-        : text(std::move(reason)) {}
-    const char* what() const noexcept override { return text.c_str(); }
+        : text_(std::move(reason)) {}
+    const char* what() const noexcept override { return text_.c_str(); }
 
 private:
-    std::string text;
+    std::string text_;
 };
 
 // An error operation of the host came back although it must not.

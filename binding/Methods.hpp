@@ -19,19 +19,19 @@ using OwnedSignature = std::unique_ptr<HostSignature, SignatureReleaser>;
 class HuffmanPathsMethod : public HostMethodInfo {
 public:
     const HostSignature* signature() const noexcept final {
-        return ownSignature.get();
+        return ownSignature_.get();
     }
     void execute(HostFrame& frame) final;
 
 protected:
     explicit HuffmanPathsMethod(OwnedSignature heldSignature) noexcept
-        : ownSignature(std::move(heldSignature)) {}
+        : ownSignature_(std::move(heldSignature)) {}
 
 private:
     // The method body.
     virtual void run(HostFrame& frame) const = 0;
 
-    OwnedSignature ownSignature;
+    OwnedSignature ownSignature_;
 };
 
 // A descriptor is named after its class and its method.

@@ -29,7 +29,7 @@ public:
     };
 
     const Entry& operator[](char16_t character) const noexcept {
-        return entries[pageStart[character >> 8] + (character & 0xFFU)];
+        return entries_[pageStart_[character >> 8] + (character & 0xFFU)];
     }
 
     // Adds the entry unless the character has one already.
@@ -39,22 +39,22 @@ public:
     void clear() noexcept;
 
     // Characters that have a code.
-    std::size_t size() const noexcept { return count; }
+    std::size_t size() const noexcept { return count_; }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
-        return pageStart.capacity() * sizeof(std::uint32_t) +
-               entries.capacity() * sizeof(Entry);
+        return pageStart_.capacity() * sizeof(std::uint32_t) +
+               entries_.capacity() * sizeof(Entry);
     }
 
 private:
     static constexpr std::size_t pageEntries = 256;
 
     // Page 0 has no codes and serves all code units whose page is not there.
-    std::vector<std::uint32_t> pageStart =
+    std::vector<std::uint32_t> pageStart_ =
         std::vector<std::uint32_t>(pageEntries, 0);
-    std::vector<Entry> entries = std::vector<Entry>(pageEntries);
-    std::size_t count = 0;
+    std::vector<Entry> entries_ = std::vector<Entry>(pageEntries);
+    std::size_t count_ = 0;
 };
 
 }  // namespace tessel

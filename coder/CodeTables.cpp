@@ -7,34 +7,34 @@
 namespace tessel {
 
 void CodeTable::insert(char16_t character, const Entry& entry) {
-    std::uint32_t& start = pageStart[character >> 8];
+    std::uint32_t& start = pageStart_[character >> 8];
     if (start == 0) {
-        const auto fresh = static_cast<std::uint32_t>(entries.size());
-        entries.reserve(entries.size() + pageEntries);
-        entries.resize(entries.size() + pageEntries);
+        const auto fresh = static_cast<std::uint32_t>(entries_.size());
+        entries_.reserve(entries_.size() + pageEntries);
+        entries_.resize(entries_.size() + pageEntries);
         start = fresh;
     }
-    Entry& place = entries[start + (character & 0xFFU)];
+    Entry& place = entries_[start + (character & 0xFFU)];
     if (place.exists()) return;
     place = entry;
-    ++count;
+    ++count_;
 }
 
 void CodeTable::clear() noexcept {
-    std::fill(pageStart.begin(), pageStart.end(), 0U);
-    entries.resize(pageEntries);
-    count = 0;
+    std::fill(pageStart_.begin(), pageStart_.end(), 0U);
+    entries_.resize(pageEntries);
+    count_ = 0;
 }
 
 void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
     const unsigned position = count();
-    word |= std::uint64_t{character} << (position * characterBits);
-    word += std::uint64_t{1} << fieldsAt;
+    word_ |= std::uint64_t{character} << (position * characterBits);
+    word_ += std::uint64_t{1} << fieldsAt;
     // From its own place on to that of all characters.
     for (unsigned i = position + 1; i <= mostCharacters; ++i) {
         const unsigned at = fieldsAt + i * fieldBits;
-        word &= ~(fieldMask << at);
-        word |= std::uint64_t{bitCount} << at;
+        word_ &= ~(fieldMask << at);
+        word_ |= std::uint64_t{bitCount} << at;
     }
 }
 
@@ -102,7 +102,7 @@ void DecodeTable::build(const std::vector<HNode>& nodes,
             next = firsts[window >> end];
         }
     }
-    steps = std::move(built);
+    steps_ = std::move(built);
 }
 
 }  // namespace tessel

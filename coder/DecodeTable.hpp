@@ -48,8 +48,8 @@ public:
         // Writes its characters and, behind them, what is to be overwritten.
         void writeTo(char16_t* out) const noexcept {
             static_assert(std::endian::native == std::endian::little);
-            static_assert(sizeof word == writtenCharacters * sizeof *out);
-            std::memcpy(out, &word, sizeof word);
+            static_assert(sizeof word_ == writtenCharacters * sizeof *out);
+            std::memcpy(out, &word_, sizeof word_);
         }
 
         // Appends a character that ends after so many bits of the window;
@@ -64,32 +64,32 @@ public:
         static_assert(windowBits < 1U << fieldBits);
 
         unsigned field(unsigned i) const noexcept {
-            return static_cast<unsigned>((word >> (fieldsAt + i * fieldBits)) &
+            return static_cast<unsigned>((word_ >> (fieldsAt + i * fieldBits)) &
                                          fieldMask);
         }
 
-        std::uint64_t word = 0;
+        std::uint64_t word_ = 0;
     };
 
     // Derives the table; an empty tree or one whose root is a leaf gives an
     // empty table.
     void build(const std::vector<HNode>& nodes, std::int32_t rootIndex);
 
-    void clear() noexcept { releaseContents(steps); }
-    bool empty() const noexcept { return steps.empty(); }
+    void clear() noexcept { releaseContents(steps_); }
+    bool empty() const noexcept { return steps_.empty(); }
 
     // The step for the next windowBits bits, the first one least significant.
     Step operator[](std::uint64_t window) const noexcept {
-        return steps[window & ((1U << windowBits) - 1)];
+        return steps_[window & ((1U << windowBits) - 1)];
     }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
-        return steps.capacity() * sizeof(Step);
+        return steps_.capacity() * sizeof(Step);
     }
 
 private:
-    std::vector<Step> steps;
+    std::vector<Step> steps_;
 };
 
 }  // namespace tessel

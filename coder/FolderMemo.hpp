@@ -46,16 +46,16 @@ public:
     void fetchNode(std::uint32_t hash) const noexcept;
 
     std::span<const std::uint64_t> trackOf(const Folder& folder) const {
-        return {positions.data() + folder.trackStart, folder.trackLength};
+        return {positions_.data() + folder.trackStart, folder.trackLength};
     }
 
 private:
     // The folder that find would look at first, if it may be the one.
     const Folder* likely(std::uint32_t hash) const noexcept;
 
-    HashIndex index;  // positions in `folders`
-    std::vector<Folder> folders;
-    std::vector<std::uint64_t> positions;  // tracks, one behind the other
+    HashIndex index_;  // positions in `folders`
+    std::vector<Folder> folders_;
+    std::vector<std::uint64_t> positions_;  // tracks, one behind the other
 };
 
 }  // namespace tessel

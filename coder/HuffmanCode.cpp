@@ -49,7 +49,7 @@ void HuffmanPathTree::buildCode(Build build) {
         build();
         generateCode();
     } catch (...) {
-        decodeTable.clear();
+        decodeTable_.clear();
         releaseContents(nodes);
         releaseContents(parentOf);
         codes.clear();
@@ -108,7 +108,7 @@ void HuffmanPathTree::makeHeapAndTree(
 }
 
 void HuffmanPathTree::generateTree(HeapQueue& queue) {
-    decodeTable.clear();
+    decodeTable_.clear();
     if (queue.size() < 2) {
         rootIndex = queue.empty() ? -1 : queue.top().index;
         return;
@@ -158,7 +158,7 @@ void HuffmanPathTree::generateCode() {
         if (node.right != -1) self->parentOf[at(node.right)] = node.index;
         if (node.isLeaf()) self->addCode(node);
     });
-    decodeTable.build(nodes, rootIndex);
+    decodeTable_.build(nodes, rootIndex);
 }
 
 void HuffmanPathTree::addCode(const HNode& leaf) {
@@ -224,8 +224,8 @@ void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
         nodes = other.nodes;
         codes = other.codes;
         parentOf = other.parentOf;
-        decodeTable = other.decodeTable;
-        endsAscend = other.endsAscend;
+        decodeTable_ = other.decodeTable_;
+        endsAscend_ = other.endsAscend_;
     }
     pathTree = std::make_unique<BPathTree>(*other.pathTree);
 }
@@ -253,7 +253,7 @@ std::size_t HuffmanPathTree::inflateFromBoolTree() {
     const auto leaves = static_cast<std::size_t>(
         std::count(boolTree.begin(), boolTree.end(), true));
     if (leaves > treeString.size()) throw DamagedFormException();
-    decodeTable.clear();
+    decodeTable_.clear();
     nodes.reserve(nodes.size() + boolTree.size());
     std::size_t character = 0;
     for (std::size_t k = 0; k < boolTree.size(); ++k) {
@@ -266,7 +266,7 @@ std::size_t HuffmanPathTree::inflateFromBoolTree() {
 }
 
 void HuffmanPathTree::inflateFromCompressedTree() {
-    decodeTable.clear();
+    decodeTable_.clear();
     rootIndex = 0;
     if (boolTree.empty() || boolTree.front()) return;
     std::vector<std::size_t> open{0};

@@ -386,9 +386,9 @@ private:
     void getPathByTrack(std::vector<Components>& folderPaths,
                         const std::vector<double>& partitions) const;
 
-    std::mutex releaseMutex;  // held by the worker that releases texts
-    DecodeTable decodeTable;  // derived from nodes; empty: walk the tree
-    bool endsAscend = true;   // partitionEnds can be searched
+    std::mutex releaseMutex_;  // held by the worker that releases texts
+    DecodeTable decodeTable_;  // derived from nodes; empty: walk the tree
+    bool endsAscend_ = true;   // partitionEnds can be searched
 };
 
 }  // namespace tessel

@@ -28,9 +28,9 @@
 #include <stdexcept>
 
 #include "coder/HuffmanPathTree.hpp"
-#include "pathtree/TreeBuilder.hpp"
 #include "packing/sixpacks.hpp"
 #include "pathtree/NodeWalk.hpp"
+#include "pathtree/TreeBuilder.hpp"
 
 namespace tessel {
 
@@ -320,7 +320,7 @@ void HuffmanPathTree::deserialize(std::vector<std::uint8_t>& in,
     loaded.maxPartitionTrackLength = maxPartitionTrackLength;
     loaded.maxDuplicateTrackLength = maxDuplicateTrackLength;
     loaded.maxDuplicatePathNumber = maxDuplicatePathNumber;
-    loaded.endsAscend = endsAscend;
+    loaded.endsAscend = endsAscend_;
     loaded.read(cursor);
 
     boolTree = std::move(loaded.boolTree);
@@ -330,7 +330,7 @@ void HuffmanPathTree::deserialize(std::vector<std::uint8_t>& in,
     duplicates = std::move(loaded.duplicates);
     partitionEnds = std::move(loaded.partitionEnds);
     partitionTracks = std::move(loaded.partitionTracks);
-    endsAscend = loaded.endsAscend;
+    endsAscend_ = loaded.endsAscend;
     maxPartitionTrackLength = loaded.maxPartitionTrackLength;
     maxDuplicateTrackLength = loaded.maxDuplicateTrackLength;
     maxDuplicatePathNumber = loaded.maxDuplicatePathNumber;

@@ -34,7 +34,7 @@ HuffmanPathTree::MemoryUsage HuffmanPathTree::memoryUsage() const {
     usage.code = boolTree.capacity() / 8 +
                  treeString.capacity() * sizeof(char16_t) +
                  bytesOf(frequencies) + bytesOf(nodes) + bytesOf(parentOf) +
-                 codes.memoryBytes() + decodeTable.memoryBytes();
+                 codes.memoryBytes() + decodeTable_.memoryBytes();
     usage.other = sizeof(HuffmanPathTree) + sizeof(BPathTree) + tree.finder +
                   tree.iteration;
     return usage;

@@ -35,17 +35,17 @@ bool bitAt(ComponentView bytes, std::size_t bit) {
 // Reads the bits of a component up to 64 at a time.
 class BitReader {
 public:
-    explicit BitReader(ComponentView component) noexcept : bytes(component) {
-        if (bytes.size() < sizeof whole) whole = shortComponent();
+    explicit BitReader(ComponentView component) noexcept : bytes_(component) {
+        if (bytes_.size() < sizeof whole_) whole_ = shortComponent();
     }
 
     // The bits from position `bit` on, least significant first, of which at
     // least sureBits are given as far as the component has them.
     static constexpr unsigned sureBits = 57;
     std::uint64_t from(std::size_t bit) const noexcept {
-        if (bytes.size() < sizeof whole) return whole >> bit;
+        if (bytes_.size() < sizeof whole_) return whole_ >> bit;
         const std::size_t base =
-            std::min(bit / bitsPerByte, bytes.size() - sizeof whole);
+            std::min(bit / bitsPerByte, bytes_.size() - sizeof whole_);
         return load<std::uint64_t>(base) >> (bit - base * bitsPerByte);
     }
 
@@ -54,13 +54,13 @@ private:
     Integer load(std::size_t at) const noexcept {
         static_assert(std::endian::native == std::endian::little);
         Integer value = 0;
-        std::memcpy(&value, bytes.data() + at, sizeof value);
+        std::memcpy(&value, bytes_.data() + at, sizeof value);
         return value;
     }
 
     // All bytes of a component of one to seven, from reads that overlap.
     std::uint64_t shortComponent() const noexcept {
-        const std::size_t size = bytes.size();
+        const std::size_t size = bytes_.size();
         const auto placed = [](std::uint64_t value, std::size_t at) {
             return value << (at * bitsPerByte);
         };
@@ -69,12 +69,12 @@ private:
             return load<std::uint32_t>(0) |
                    placed(load<std::uint32_t>(rest), rest);
         }
-        return bytes[0] | placed(bytes[size / 2], size / 2) |
-               placed(bytes[size - 1], size - 1);
+        return bytes_[0] | placed(bytes_[size / 2], size / 2) |
+               placed(bytes_[size - 1], size - 1);
     }
 
-    ComponentView bytes;
-    std::uint64_t whole = 0;  // of a component shorter than this
+    ComponentView bytes_;
+    std::uint64_t whole_ = 0;  // of a component shorter than this
 };
 
 // A path number as it stands among the numbers of a request. Infinity and
@@ -139,7 +139,7 @@ void HuffmanPathTree::appendPathFrom(ComponentView bytes,
 std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
                                          std::size_t end,
                                          std::u16string& text) const {
-    if (decodeTable.empty()) return bit;
+    if (decodeTable_.empty()) return bit;
     constexpr unsigned stepsAWindow =
         BitReader::sureBits / DecodeTable::windowBits;
     constexpr std::size_t bitsAWindow =
@@ -160,7 +160,7 @@ std::size_t HuffmanPathTree::stepThrough(ComponentView bytes, std::size_t bit,
     const BitReader reader(bytes);
     DecodeTable::Step step;
     const auto take = [&](std::uint64_t& window) {
-        step = decodeTable[window];
+        step = decodeTable_[window];
         step.writeTo(out);
         out += step.count();
         bit += step.bits();
@@ -281,7 +281,7 @@ std::size_t HuffmanPathTree::partitionAtOrAfter(std::size_t k,
         return begin + static_cast<std::ptrdiff_t>(i);
     };
     const auto holds = [number](std::uint64_t end) { return end >= number; };
-    if (!endsAscend)
+    if (!endsAscend_)
         return static_cast<std::size_t>(
             std::find_if(at(k), partitionEnds.end(), holds) - begin);
     // Strides that double, then a search within the last: a request for

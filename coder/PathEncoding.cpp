@@ -28,34 +28,34 @@ std::size_t bitBlockBytes(std::size_t bits) {
 // than the bits need.
 class BitWriter {
 public:
-    explicit BitWriter(std::uint8_t* to) noexcept : out(to) {}
+    explicit BitWriter(std::uint8_t* to) noexcept : out_(to) {}
 
     // Appends the `count` (at most 56) low bits; those above must be 0.
     void put(std::uint64_t bits, unsigned count) noexcept {
-        held |= bits << heldBits;
-        heldBits += count;
+        held_ |= bits << heldBits_;
+        heldBits_ += count;
         flush();
     }
 
     // Ends the block: the last bits, then how many they are.
     void finish() noexcept {
-        *out++ = static_cast<std::uint8_t>(held);
-        *out++ = static_cast<std::uint8_t>(heldBits);
+        *out_++ = static_cast<std::uint8_t>(held_);
+        *out_++ = static_cast<std::uint8_t>(heldBits_);
     }
 
 private:
     void flush() noexcept {
         static_assert(std::endian::native == std::endian::little);
-        std::memcpy(out, &held, sizeof held);
-        const unsigned full = heldBits / bitsPerByte;
-        out += full;
-        held = full == sizeof held ? 0 : held >> (full * bitsPerByte);
-        heldBits %= bitsPerByte;
+        std::memcpy(out_, &held_, sizeof held_);
+        const unsigned full = heldBits_ / bitsPerByte;
+        out_ += full;
+        held_ = full == sizeof held_ ? 0 : held_ >> (full * bitsPerByte);
+        heldBits_ %= bitsPerByte;
     }
 
-    std::uint8_t* out;
-    std::uint64_t held = 0;
-    unsigned heldBits = 0;  // below 8 between calls
+    std::uint8_t* out_;
+    std::uint64_t held_ = 0;
+    unsigned heldBits_ = 0;  // below 8 between calls
 };
 
 }  // namespace
@@ -120,26 +120,26 @@ void HuffmanPathTree::raiseMaxCodeBytes(std::uint64_t length) noexcept {
 class alignas(64) HuffmanPathTree::WorkerRange {
 public:
     void set(const FirstAndLast& folders) noexcept {
-        next.store(folders.first, std::memory_order_relaxed);
-        last = folders.second;
-        step = std::clamp((last - folders.first + 1) / leastSteps,
-                          std::uint64_t{1}, mostFoldersAStep);
+        next_.store(folders.first, std::memory_order_relaxed);
+        last_ = folders.second;
+        step_ = std::clamp((last_ - folders.first + 1) / leastSteps,
+                           std::uint64_t{1}, mostFoldersAStep);
     }
 
     // The next few folders; none if the first lies behind the last.
     FirstAndLast take() noexcept {
         const std::uint64_t first =
-            next.fetch_add(step, std::memory_order_relaxed);
-        return {first, std::min(first + step - 1, last)};
+            next_.fetch_add(step_, std::memory_order_relaxed);
+        return {first, std::min(first + step_ - 1, last_)};
     }
 
 private:
     static constexpr std::uint64_t leastSteps = 64;
     static constexpr std::uint64_t mostFoldersAStep = 64;
 
-    std::atomic<std::uint64_t> next = 0;
-    std::uint64_t last = 0;
-    std::uint64_t step = 1;
+    std::atomic<std::uint64_t> next_ = 0;
+    std::uint64_t last_ = 0;
+    std::uint64_t step_ = 1;
 };
 
 // What one worker has at hand and leaves behind; on cache lines of its own,
@@ -232,7 +232,7 @@ void HuffmanPathTree::work(std::vector<WorkerRange>& ranges, std::size_t own,
                  folders = range.take()) {
                 encodeFolders(folders.first, folders.second, worker);
                 worker.unreleased.push_back(folders);
-                const std::unique_lock turn(releaseMutex, std::try_to_lock);
+                const std::unique_lock turn(releaseMutex_, std::try_to_lock);
                 if (turn) releaseEncoded(worker);
             }
         }
@@ -240,7 +240,7 @@ void HuffmanPathTree::work(std::vector<WorkerRange>& ranges, std::size_t own,
         worker.failure = std::current_exception();
     }
     keepBuffers(worker);
-    const std::lock_guard turn(releaseMutex);
+    const std::lock_guard turn(releaseMutex_);
     releaseEncoded(worker);
 }
 
@@ -366,18 +366,18 @@ class FoldersAhead {
 public:
     FoldersAhead(const std::vector<PackedComponents>& list,
                  const FolderMemo& batchMemo)
-        : folders(list), memo(batchMemo) {
+        : folders_(list), memo_(batchMemo) {
         for (std::size_t i = 0; i < farthest; ++i) begin(i);
     }
 
     // The hash of folder i; folders are asked for one after the other.
     std::uint32_t hashOf(std::size_t i) {
         begin(i + farthest);
-        if (i + 2 * stride < folders.size())
-            memo.fetchFolder(hashes[(i + 2 * stride) % ring]);
-        if (i + stride < folders.size())
-            memo.fetchNode(hashes[(i + stride) % ring]);
-        return hashes[i % ring];
+        if (i + 2 * stride < folders_.size())
+            memo_.fetchFolder(hashes_[(i + 2 * stride) % ring]);
+        if (i + stride < folders_.size())
+            memo_.fetchNode(hashes_[(i + stride) % ring]);
+        return hashes_[i % ring];
     }
 
 private:
@@ -387,14 +387,14 @@ private:
     static_assert(ring > farthest);
 
     void begin(std::size_t i) {
-        if (i >= folders.size()) return;
-        hashes[i % ring] = FolderMemo::hashOf(folders[i]);
-        memo.fetchEntry(hashes[i % ring]);
+        if (i >= folders_.size()) return;
+        hashes_[i % ring] = FolderMemo::hashOf(folders_[i]);
+        memo_.fetchEntry(hashes_[i % ring]);
     }
 
-    const std::vector<PackedComponents>& folders;
-    const FolderMemo& memo;
-    std::array<std::uint32_t, ring> hashes{};
+    const std::vector<PackedComponents>& folders_;
+    const FolderMemo& memo_;
+    std::array<std::uint32_t, ring> hashes_{};
 };
 
 }  // namespace
@@ -468,8 +468,8 @@ void HuffmanPathTree::notePartition(PathTrack& track, bool existed,
             std::max<std::uint64_t>(maxPartitionTrackLength, track.size());
     }
     pathCount += fileCount;
-    endsAscend = endsAscend &&
-                 (partitionEnds.empty() || partitionEnds.back() <= pathCount);
+    endsAscend_ = endsAscend_ &&
+                  (partitionEnds.empty() || partitionEnds.back() <= pathCount);
     partitionEnds.push_back(pathCount);
     partitionTracks.push_back(track);
 }

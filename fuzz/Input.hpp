@@ -19,14 +19,14 @@ namespace tessel::fuzz {
 // end there are only zeros and empty ranges. Borrows the bytes.
 class Input {
 public:
-    Input(const std::uint8_t* data, std::size_t size) : rest(data, size) {}
+    Input(const std::uint8_t* data, std::size_t size) : rest_(data, size) {}
 
-    bool empty() const { return rest.empty(); }
+    bool empty() const { return rest_.empty(); }
 
     std::uint8_t byte() {
-        if (rest.empty()) return 0;
-        const std::uint8_t first = rest.front();
-        rest = rest.subspan(1);
+        if (rest_.empty()) return 0;
+        const std::uint8_t first = rest_.front();
+        rest_ = rest_.subspan(1);
         return first;
     }
 
@@ -37,8 +37,8 @@ public:
 
     // At most n bytes.
     std::vector<std::uint8_t> bytes(std::size_t n) {
-        const auto head = rest.first(std::min(n, rest.size()));
-        rest = rest.subspan(head.size());
+        const auto head = rest_.first(std::min(n, rest_.size()));
+        rest_ = rest_.subspan(head.size());
         return {head.begin(), head.end()};
     }
 
@@ -46,18 +46,18 @@ public:
     std::vector<std::uint8_t> block() { return bytes(byte()); }
 
     // All that is left.
-    std::vector<std::uint8_t> remainder() { return bytes(rest.size()); }
+    std::vector<std::uint8_t> remainder() { return bytes(rest_.size()); }
 
     // At most n UTF-16 code units, two bytes each.
     std::u16string text(std::size_t n) {
         std::u16string units;
-        while (units.size() < n && !rest.empty())
+        while (units.size() < n && !rest_.empty())
             units.push_back(static_cast<char16_t>(number()));
         return units;
     }
 
 private:
-    std::span<const std::uint8_t> rest;
+    std::span<const std::uint8_t> rest_;
 };
 
 // Ends the process, as a fuzzing engine expects of a finding.

@@ -21,9 +21,9 @@ std::uint64_t fromLittleEndian(std::span<const std::uint8_t> bytes) noexcept {
 
 // The only place where an outside length meets the end of the data.
 std::span<const std::uint8_t> ByteCursor::take(std::uint64_t n) {
-    if (n > rest.size()) throw DamagedFormException();
-    const auto head = rest.first(static_cast<std::size_t>(n));
-    rest = rest.subspan(static_cast<std::size_t>(n));
+    if (n > rest_.size()) throw DamagedFormException();
+    const auto head = rest_.first(static_cast<std::size_t>(n));
+    rest_ = rest_.subspan(static_cast<std::size_t>(n));
     return head;
 }
 
@@ -33,7 +33,7 @@ std::uint64_t ByteCursor::takeUint(PackedSizeT width) {
 
 void ByteCursor::requireItems(std::uint64_t count,
                               std::size_t bytesEach) const {
-    if (count > rest.size() / bytesEach) throw DamagedFormException();
+    if (count > rest_.size() / bytesEach) throw DamagedFormException();
 }
 
 std::size_t widthBytes(PackedSizeT width) {

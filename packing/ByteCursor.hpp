@@ -40,10 +40,10 @@ std::uint64_t fromLittleEndian(std::span<const std::uint8_t> bytes) noexcept;
 class ByteCursor {
 public:
     explicit ByteCursor(std::span<const std::uint8_t> bytes) noexcept
-        : rest(bytes) {}
+        : rest_(bytes) {}
 
-    bool empty() const noexcept { return rest.empty(); }
-    std::size_t remaining() const noexcept { return rest.size(); }
+    bool empty() const noexcept { return rest_.empty(); }
+    std::size_t remaining() const noexcept { return rest_.size(); }
 
     // The next n bytes; advances past them.
     std::span<const std::uint8_t> take(std::uint64_t n);
@@ -61,7 +61,7 @@ public:
     void requireItems(std::uint64_t count, std::size_t bytesEach) const;
 
 private:
-    std::span<const std::uint8_t> rest;
+    std::span<const std::uint8_t> rest_;
 };
 
 // Bytes taken by an integer of this width. Throws

@@ -35,23 +35,23 @@ std::size_t visitPaths(const PathSplitter& splitter, std::size_t first,
 // The counts of all code units.
 class UnitCounter {
 public:
-    void operator()(char16_t unit) noexcept { ++counts[unit]; }
+    void operator()(char16_t unit) noexcept { ++counts_[unit]; }
     void operator()(std::u16string_view text) noexcept {
-        for (const char16_t unit : text) ++counts[unit];
+        for (const char16_t unit : text) ++counts_[unit];
     }
 
     CharacterCounts result() const {
         CharacterCounts all;
-        for (std::size_t unit = 0; unit < counts.size(); ++unit) {
-            if (counts[unit] == 0) continue;
+        for (std::size_t unit = 0; unit < counts_.size(); ++unit) {
+            if (counts_[unit] == 0) continue;
             all.characters.push_back(static_cast<char16_t>(unit));
-            all.frequencies.push_back(static_cast<double>(counts[unit]));
+            all.frequencies.push_back(static_cast<double>(counts_[unit]));
         }
         return all;
     }
 
 private:
-    std::vector<std::uint64_t> counts =
+    std::vector<std::uint64_t> counts_ =
         std::vector<std::uint64_t>(std::size_t{1} << 16U);
 };
 
@@ -59,9 +59,9 @@ private:
 
 bool BatchReader::next(Batch& batch) {
     batch = Batch();
-    const std::size_t first = position;
-    position = visitPaths(
-        *splitter, first,
+    const std::size_t first = position_;
+    position_ = visitPaths(
+        *splitter_, first,
         [&](std::string_view path, const PathSplit& split) {
             batch.folders.push_back(folderTexts(path, split));
             batch.files.emplace_back();
@@ -70,8 +70,8 @@ bool BatchReader::next(Batch& batch) {
             appendText(path.substr(split.fileStart),
                        batch.files.back().emplace_back());
         },
-        [&](std::size_t visited) { return visited >= pathsPerBatch; });
-    batch.pathCount = position - first;
+        [&](std::size_t visited) { return visited >= pathsPerBatch_; });
+    batch.pathCount = position_ - first;
     return batch.pathCount != 0;
 }
 

@@ -33,16 +33,16 @@ public:
     // A batch ends at the first change of folder behind so many paths.
     explicit BatchReader(const PathSplitter& pathSplitter,
                          std::size_t batchPaths = usualPathsPerBatch)
-        : splitter(&pathSplitter), pathsPerBatch(batchPaths) {}
+        : splitter_(&pathSplitter), pathsPerBatch_(batchPaths) {}
 
     // Replaces `batch` by the next one. Returns false, with `batch` empty,
     // behind the last.
     bool next(Batch& batch);
 
 private:
-    const PathSplitter* splitter;
-    std::size_t pathsPerBatch;
-    std::size_t position = 0;
+    const PathSplitter* splitter_;
+    std::size_t pathsPerBatch_;
+    std::size_t position_ = 0;
 };
 
 // The components of the folder of a path that is cut there, root first.

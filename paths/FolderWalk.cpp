@@ -21,16 +21,16 @@ struct Entries {
 
 class OpenFolder {
 public:
-    explicit OpenFolder(DIR* stream) : folder(stream) {}
+    explicit OpenFolder(DIR* stream) : folder_(stream) {}
     OpenFolder(const OpenFolder&) = delete;
     OpenFolder& operator=(const OpenFolder&) = delete;
     ~OpenFolder() {
-        if (folder != nullptr) ::closedir(folder);
+        if (folder_ != nullptr) ::closedir(folder_);
     }
-    DIR* get() const noexcept { return folder; }
+    DIR* get() const noexcept { return folder_; }
 
 private:
-    DIR* folder;
+    DIR* folder_;
 };
 
 DIR* openStream(const std::string& name, bool followLink) {

@@ -20,16 +20,16 @@ PathListError cannotRead(const std::string& name, int error) {
 
 class FileDescriptor {
 public:
-    explicit FileDescriptor(int descriptor) : number(descriptor) {}
+    explicit FileDescriptor(int descriptor) : number_(descriptor) {}
     FileDescriptor(const FileDescriptor&) = delete;
     FileDescriptor& operator=(const FileDescriptor&) = delete;
     ~FileDescriptor() {
-        if (number >= 0) ::close(number);
+        if (number_ >= 0) ::close(number_);
     }
-    int get() const noexcept { return number; }
+    int get() const noexcept { return number_; }
 
 private:
-    int number;
+    int number_;
 };
 
 // The size of what is open there, as far as that can be told; at least one
@@ -62,9 +62,9 @@ std::string readAll(const std::string& name) {
 
 void PathList::append(std::string_view path) {
     if (path.empty()) throw std::invalid_argument("A path is empty.");
-    text.append(path);
-    text.push_back('\0');
-    ends.push_back(text.size() - 1);
+    text_.append(path);
+    text_.push_back('\0');
+    ends_.push_back(text_.size() - 1);
 }
 
 PathList PathList::fromText(std::string text, const std::string& name) {
@@ -72,7 +72,7 @@ PathList PathList::fromText(std::string text, const std::string& name) {
     if (!text.empty() && text.back() != separator) text.push_back(separator);
 
     PathList list;
-    list.ends.reserve(static_cast<std::size_t>(
+    list.ends_.reserve(static_cast<std::size_t>(
         std::count(text.begin(), text.end(), separator)));
     for (std::size_t start = 0; start < text.size();) {
         const std::size_t end = text.find(separator, start);
@@ -81,10 +81,10 @@ PathList PathList::fromText(std::string text, const std::string& name) {
                 name + ", " + (separator == '\n' ? "line " : "entry ") +
                 std::to_string(list.size() + 1) + ": an empty path.");
         }
-        list.ends.push_back(end);
+        list.ends_.push_back(end);
         start = end + 1;
     }
-    list.text = std::move(text);
+    list.text_ = std::move(text);
     return list;
 }
 

@@ -24,17 +24,17 @@ public:
 // Cost: the text, one byte and eight more a path.
 class PathList {
 public:
-    std::size_t size() const noexcept { return ends.size(); }
-    bool empty() const noexcept { return ends.empty(); }
+    std::size_t size() const noexcept { return ends_.size(); }
+    bool empty() const noexcept { return ends_.empty(); }
 
     // Path i, counted from 0; i must be below size().
     std::string_view operator[](std::size_t i) const noexcept {
-        const std::size_t start = i == 0 ? 0 : ends[i - 1] + 1;
-        return {text.data() + start, ends[i] - start};
+        const std::size_t start = i == 0 ? 0 : ends_[i - 1] + 1;
+        return {text_.data() + start, ends_[i] - start};
     }
 
     // Bytes of all paths, nothing between them counted.
-    std::size_t textBytes() const noexcept { return text.size() - size(); }
+    std::size_t textBytes() const noexcept { return text_.size() - size(); }
 
     // Throws std::invalid_argument if the path is empty.
     void append(std::string_view path);
@@ -47,8 +47,8 @@ public:
     static PathList fromText(std::string text, const std::string& name);
 
 private:
-    std::string text;                 // each path with one byte behind it
-    std::vector<std::uint64_t> ends;  // where that byte is
+    std::string text_;                 // each path with one byte behind it
+    std::vector<std::uint64_t> ends_;  // where that byte is
 };
 
 // What a walk left out.

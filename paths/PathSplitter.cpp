@@ -16,18 +16,18 @@ class FolderSet {
 public:
     // Returns false if it was there before.
     bool insert(std::string_view folder) {
-        if (2 * (count + 1) > slots.size()) grow();
+        if (2 * (count_ + 1) > slots_.size()) grow();
         const std::uint64_t hash = hashOf(folder);
-        Slot& slot = slots[find(folder, hash)];
+        Slot& slot = slots_[find(folder, hash)];
         if (slot.folder.data() != nullptr) return false;
         slot = {folder, hash};
-        ++count;
+        ++count_;
         return true;
     }
 
     bool contains(std::string_view folder) const {
-        return count != 0 &&
-               slots[find(folder, hashOf(folder))].folder.data() != nullptr;
+        return count_ != 0 &&
+               slots_[find(folder, hashOf(folder))].folder.data() != nullptr;
     }
 
 private:
@@ -41,29 +41,29 @@ private:
     }
 
     std::size_t find(std::string_view folder, std::uint64_t hash) const {
-        const std::size_t mask = slots.size() - 1;
+        const std::size_t mask = slots_.size() - 1;
         std::size_t at = hash & mask;
-        while (slots[at].folder.data() != nullptr &&
-               (slots[at].hash != hash || slots[at].folder != folder)) {
+        while (slots_[at].folder.data() != nullptr &&
+               (slots_[at].hash != hash || slots_[at].folder != folder)) {
             at = (at + 1) & mask;
         }
         return at;
     }
 
     void grow() {
-        std::vector<Slot> old(std::max<std::size_t>(64, slots.size() * 2));
-        old.swap(slots);
-        const std::size_t mask = slots.size() - 1;
+        std::vector<Slot> old(std::max<std::size_t>(64, slots_.size() * 2));
+        old.swap(slots_);
+        const std::size_t mask = slots_.size() - 1;
         for (const Slot& slot : old) {
             if (slot.folder.data() == nullptr) continue;
             std::size_t at = slot.hash & mask;
-            while (slots[at].folder.data() != nullptr) at = (at + 1) & mask;
-            slots[at] = slot;
+            while (slots_[at].folder.data() != nullptr) at = (at + 1) & mask;
+            slots_[at] = slot;
         }
     }
 
-    std::vector<Slot> slots;
-    std::size_t count = 0;
+    std::vector<Slot> slots_;
+    std::size_t count_ = 0;
 };
 
 std::size_t firstNameEnd(std::string_view path, std::size_t from) noexcept {
@@ -135,7 +135,7 @@ std::size_t findSeparator(std::string_view path, std::size_t from) noexcept {
 }
 
 PathSplitter::PathSplitter(const PathList& paths)
-    : all(&paths), keptApart(paths.size(), false) {
+    : all_(&paths), keptApart_(paths.size(), false) {
     FolderSet folders;
     std::string_view lastFolder;
     for (std::size_t i = 0; i < paths.size(); ++i) {
@@ -149,16 +149,16 @@ PathSplitter::PathSplitter(const PathList& paths)
         if (!folders.contains(paths[i])) continue;
         // Only here is a root of one character followed by one character.
         if (splitBelowRoot(paths[i], 1).rootEnd == 0) {
-            if (!std::binary_search(longRoots.begin(), longRoots.end(),
+            if (!std::binary_search(longRoots_.begin(), longRoots_.end(),
                                     paths[i])) {
-                longRoots.insert(std::upper_bound(longRoots.begin(),
-                                                  longRoots.end(), paths[i]),
-                                 std::string(paths[i]));
+                longRoots_.insert(std::upper_bound(longRoots_.begin(),
+                                                   longRoots_.end(), paths[i]),
+                                  std::string(paths[i]));
             }
             continue;
         }
-        keptApart[i] = true;
-        ++apartCount;
+        keptApart_[i] = true;
+        ++apartCount_;
     }
 }
 
@@ -167,10 +167,10 @@ PathSplitter::PathSplitter(const PathList& paths)
 std::size_t PathSplitter::rootEnd(std::string_view path) const noexcept {
     if (path.front() != '/') return slashesEnd(path, firstNameEnd(path, 0));
     const std::size_t usual = slashesEnd(path, 0);
-    if (longRoots.empty() || usual != 1) return usual;
+    if (longRoots_.empty() || usual != 1) return usual;
     const std::size_t separator = firstNameEnd(path, 1);
     if (findSeparator(path, separator) != separator ||
-        !std::binary_search(longRoots.begin(), longRoots.end(),
+        !std::binary_search(longRoots_.begin(), longRoots_.end(),
                             path.substr(0, separator))) {
         return usual;
     }
@@ -193,9 +193,9 @@ PathSplit PathSplitter::usualSplit(std::string_view path) const noexcept {
 }
 
 PathSplit PathSplitter::split(std::size_t i) const {
-    const std::string_view path = (*all)[i];
+    const std::string_view path = (*all_)[i];
     PathSplit usual = usualSplit(path);
-    if (!keptApart[i]) return usual;
+    if (!keptApart_[i]) return usual;
     if (usual.fileStart == usual.rootEnd) {
         return splitBelowRoot(path, usual.rootEnd);
     }

@@ -63,20 +63,20 @@ public:
     PathSplit split(std::size_t i) const;
 
     // True if path i is cut in another place because others lie below it.
-    bool isKeptApart(std::size_t i) const { return keptApart[i]; }
-    std::size_t keptApartCount() const noexcept { return apartCount; }
+    bool isKeptApart(std::size_t i) const { return keptApart_[i]; }
+    std::size_t keptApartCount() const noexcept { return apartCount_; }
 
-    const PathList& list() const noexcept { return *all; }
+    const PathList& list() const noexcept { return *all_; }
 
 private:
     std::size_t rootEnd(std::string_view path) const noexcept;
     PathSplit usualSplit(std::string_view path) const noexcept;
 
-    const PathList* all;
-    std::vector<bool> keptApart;
-    std::size_t apartCount = 0;
+    const PathList* all_;
+    std::vector<bool> keptApart_;
+    std::size_t apartCount_ = 0;
     // Paths `/a` of one character below "/" that are folders, too.
-    std::vector<std::string> longRoots;
+    std::vector<std::string> longRoots_;
 };
 
 }  // namespace tessel::paths

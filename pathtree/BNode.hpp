@@ -32,9 +32,9 @@ public:
     explicit BNodePtr(BNode* target) noexcept;  // takes a new share
     BNodePtr(const BNodePtr& other) noexcept;
     BNodePtr(BNodePtr&& other) noexcept
-        : node(std::exchange(other.node, nullptr)) {}
+        : node_(std::exchange(other.node_, nullptr)) {}
     BNodePtr& operator=(BNodePtr other) noexcept {
-        std::swap(node, other.node);
+        std::swap(node_, other.node_);
         return *this;
     }
     ~BNodePtr();
@@ -42,35 +42,35 @@ public:
     // The handle that takes over a share which the caller owns.
     static BNodePtr adopt(BNode* owned) noexcept;
     // Hands the share over to the caller and leaves the handle empty.
-    BNode* release() noexcept { return std::exchange(node, nullptr); }
+    BNode* release() noexcept { return std::exchange(node_, nullptr); }
 
-    BNode* get() const noexcept { return node; }
-    BNode& operator*() const noexcept { return *node; }
-    BNode* operator->() const noexcept { return node; }
-    explicit operator bool() const noexcept { return node != nullptr; }
+    BNode* get() const noexcept { return node_; }
+    BNode& operator*() const noexcept { return *node_; }
+    BNode* operator->() const noexcept { return node_; }
+    explicit operator bool() const noexcept { return node_ != nullptr; }
     friend bool operator==(const BNodePtr& a, const BNodePtr& b) noexcept {
-        return a.node == b.node;
+        return a.node_ == b.node_;
     }
 
 private:
-    BNode* node = nullptr;
+    BNode* node_ = nullptr;
 };
 
 // The children of one node in the order of insertion: a view, valid as long
 // as the node. Children are only ever appended.
 class ChildList {
 public:
-    explicit ChildList(BNode& node) noexcept : owner(&node) {}
+    explicit ChildList(BNode& node) noexcept : owner_(&node) {}
 
     std::size_t size() const noexcept;
     bool empty() const noexcept { return size() == 0; }
     // The child at position i, which must be below size().
     BNode& operator[](std::size_t i) const noexcept;
     BNode& back() const noexcept { return (*this)[size() - 1]; }
-    BNode& node() const noexcept { return *owner; }
+    BNode& node() const noexcept { return *owner_; }
 
 private:
-    BNode* owner;
+    BNode* owner_;
 };
 
 // The array that several children of a node stand in: one allocation, owned by
@@ -96,25 +96,25 @@ public:
         return ChildStore(reinterpret_cast<std::uintptr_t>(block));
     }
 
-    bool isOnly() const noexcept { return (word & onlyFlag) != 0; }
+    bool isOnly() const noexcept { return (word_ & onlyFlag) != 0; }
     BNode* child() const noexcept {
-        return reinterpret_cast<BNode*>(word & ~onlyFlag);
+        return reinterpret_cast<BNode*>(word_ & ~onlyFlag);
     }
     // Null if there is none.
     ChildBlock* block() const noexcept {
-        return isOnly() ? nullptr : reinterpret_cast<ChildBlock*>(word);
+        return isOnly() ? nullptr : reinterpret_cast<ChildBlock*>(word_);
     }
     std::size_t size() const noexcept {
         if (isOnly()) return 1;
-        return word == 0 ? 0 : block()->size;
+        return word_ == 0 ? 0 : block()->size;
     }
 
 private:
     static constexpr std::uintptr_t onlyFlag = 1;
 
-    explicit ChildStore(std::uintptr_t value) noexcept : word(value) {}
+    explicit ChildStore(std::uintptr_t value) noexcept : word_(value) {}
 
-    std::uintptr_t word = 0;
+    std::uintptr_t word_ = 0;
 };
 
 // One component of the trie: its value, its children and its share count,
@@ -141,7 +141,7 @@ public:
     // The component's encoded bytes, valid as long as the node.
     ComponentView value() const noexcept {
         const std::uint8_t* at = afterHead();
-        const unsigned shortLength = head >> lengthShift;
+        const unsigned shortLength = head_ >> lengthShift;
         if (shortLength != longLength) return {at, shortLength};
         std::uint64_t length = 0;
         std::memcpy(&length, at, sizeof length);
@@ -167,8 +167,8 @@ private:
 
     BNode() noexcept = default;
 
-    const std::uint8_t* afterHead() const noexcept { return &head + 1; }
-    std::uint8_t* afterHead() noexcept { return &head + 1; }
+    const std::uint8_t* afterHead() const noexcept { return &head_ + 1; }
+    std::uint8_t* afterHead() noexcept { return &head_ + 1; }
 
     void* storeSlot() const noexcept {
         return const_cast<char*>(reinterpret_cast<const char*>(this)) -
@@ -176,9 +176,9 @@ private:
     }
     ChildStore store() const noexcept {
         ChildStore kept;
-        if ((head & ownsStoreFlag) != 0)
+        if ((head_ & ownsStoreFlag) != 0)
             std::memcpy(&kept, storeSlot(), sizeof kept);
-        else if ((head & lateStoreFlag) != 0)
+        else if ((head_ & lateStoreFlag) != 0)
             kept = lateStore();
         return kept;
     }
@@ -188,11 +188,11 @@ private:
     void setStore(ChildStore kept);
 
     void share() noexcept {
-        references.fetch_add(1, std::memory_order_relaxed);
+        references_.fetch_add(1, std::memory_order_relaxed);
     }
     // Gives one share back; true when it was the last.
     bool unshare() noexcept {
-        return references.fetch_sub(1, std::memory_order_acq_rel) == 1;
+        return references_.fetch_sub(1, std::memory_order_acq_rel) == 1;
     }
     // Releases a node whose last share is gone, and all that it alone owns.
     static void destroy(BNode* dead) noexcept;
@@ -200,31 +200,31 @@ private:
     void leaveWayUp(BNode* above) noexcept;
     BNode* takeWayUp() noexcept;
 
-    std::atomic<std::uint32_t> references = 1;
-    std::uint8_t head = 0;
+    std::atomic<std::uint32_t> references_ = 1;
+    std::uint8_t head_ = 0;
 };
 
-inline BNodePtr::BNodePtr(BNode* target) noexcept : node(target) {
-    if (node != nullptr) node->share();
+inline BNodePtr::BNodePtr(BNode* target) noexcept : node_(target) {
+    if (node_ != nullptr) node_->share();
 }
 inline BNodePtr::BNodePtr(const BNodePtr& other) noexcept
-    : BNodePtr(other.node) {}
+    : BNodePtr(other.node_) {}
 inline BNodePtr::~BNodePtr() {
-    if (node != nullptr && node->unshare()) BNode::destroy(node);
+    if (node_ != nullptr && node_->unshare()) BNode::destroy(node_);
 }
 inline BNodePtr BNodePtr::adopt(BNode* owned) noexcept {
     BNodePtr handle;
-    handle.node = owned;
+    handle.node_ = owned;
     return handle;
 }
 
 static_assert(alignof(BNode) >= 4 && alignof(ChildBlock) >= 4);
 
 inline std::size_t ChildList::size() const noexcept {
-    return owner->store().size();
+    return owner_->store().size();
 }
 inline BNode& ChildList::operator[](std::size_t i) const noexcept {
-    const ChildStore kept = owner->store();
+    const ChildStore kept = owner_->store();
     return kept.isOnly() ? *kept.child() : *kept.block()->slots()[i];
 }
 

@@ -59,7 +59,7 @@ const char* UnknownNodeTypeException::what() const noexcept {
 }
 
 BPathTree::BPathTree() {
-    root = BNodePtr::adopt(pool.make({}, NodePool::Kind::folder));
+    root = BNodePtr::adopt(pool_.make({}, NodePool::Kind::folder));
 }
 
 BPathTree::BPathTree(const BPathTree& other)
@@ -89,7 +89,7 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     const std::uint64_t found = findNode(value, nodes);
     existed = found != allOnes;
     if (existed) return found;
-    pool.add(nodes.node(), value, NodePool::Kind::leaf);
+    pool_.add(nodes.node(), value, NodePool::Kind::leaf);
     takeOver(value);
     return nodes.size() - 1;
 }
@@ -97,11 +97,11 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
 ChildFinder::Found BPathTree::findOrAppend(BNode& parent, ComponentView value,
                                            NodePool::Kind kind,
                                            bool& existed) const {
-    const ChildFinder::Found found = finder.find(parent, value);
+    const ChildFinder::Found found = finder_.find(parent, value);
     existed = found.child != nullptr;
     if (existed) return found;
-    BNode& made = pool.add(parent, value, kind);
-    finder.noteAppended(parent);
+    BNode& made = pool_.add(parent, value, kind);
+    finder_.noteAppended(parent);
     return {&made, parent.children().size() - 1};
 }
 
@@ -144,7 +144,7 @@ std::uint64_t BPathTree::appendFiles(BNode& folder, Files& fileNames) {
     NodePool::reserve(folder, fileNames.size());
     try {
         for (auto&& name : fileNames)
-            pool.add(folder, name, NodePool::Kind::leaf);
+            pool_.add(folder, name, NodePool::Kind::leaf);
     } catch (...) {
         NodePool::truncate(folder, before);
         throw;
@@ -177,7 +177,7 @@ bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::releaseFinder(std::size_t most) noexcept {
-    if (finder.indexedChildren() <= most) finder.clear();
+    if (finder_.indexedChildren() <= most) finder_.clear();
 }
 
 // ---- Iteration ----
@@ -202,7 +202,7 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::reset() {
-    finder.clear();
+    finder_.clear();
     if (root->isLeaf()) return;
     pendingNodes.clear();
     pushAllChildren(root);
@@ -323,7 +323,7 @@ BPathTree::MemoryUsage BPathTree::memoryUsage() const {
     account(*root);
     for (NodeWalk walk(*root); walk.next();) account(walk.node());
     usage.nodes -= usage.names;
-    usage.finder = finder.memoryBytes();
+    usage.finder = finder_.memoryBytes();
     usage.iteration = pendingNodes.memoryBytes() + parentNodes.memoryBytes() +
                       componentBytes(currentPrefix);
     return usage;

@@ -230,8 +230,8 @@ private:
 
     // Helpers of insertion, which is const for addIfExistsAndFind: the tree
     // is in the nodes, not in them.
-    mutable NodePool pool;
-    mutable ChildFinder finder;
+    mutable NodePool pool_;
+    mutable ChildFinder finder_;
 };
 
 }  // namespace tessel

@@ -13,10 +13,10 @@
 
 #include <algorithm>
 
-#include "pathtree/TreeBuilder.hpp"
 #include "packing/sixpacks.hpp"
 #include "pathtree/BPathTree.hpp"
 #include "pathtree/NodeWalk.hpp"
+#include "pathtree/TreeBuilder.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {

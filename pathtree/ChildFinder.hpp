@@ -40,7 +40,7 @@ public:
     void noteAppended(BNode& parent) noexcept;
 
     // Children in all tables.
-    std::size_t indexedChildren() const noexcept { return indexed; }
+    std::size_t indexedChildren() const noexcept { return indexed_; }
 
     // Forgets everything and releases the memory.
     void clear() noexcept;
@@ -57,12 +57,12 @@ private:
         std::size_t find(const ChildList& children, ComponentView value,
                          std::uint32_t hash) const;
         std::size_t memoryBytes() const noexcept {
-            return positions.memoryBytes();
+            return positions_.memoryBytes();
         }
 
     private:
-        HashIndex positions;
-        std::size_t held = 0;  // children 0 to held - 1 are in
+        HashIndex positions_;
+        std::size_t held_ = 0;  // children 0 to held - 1 are in
     };
 
     struct LastFound {
@@ -73,9 +73,9 @@ private:
 
     LastFound& lastFoundIn(const BNode& parent) noexcept;
 
-    std::vector<LastFound> lastFound;
-    std::unordered_map<const BNode*, Table> tables;
-    std::size_t indexed = 0;
+    std::vector<LastFound> lastFound_;
+    std::unordered_map<const BNode*, Table> tables_;
+    std::size_t indexed_ = 0;
 };
 
 }  // namespace tessel

@@ -34,10 +34,10 @@ public:
     // or notFound.
     template <class IsIt>
     std::size_t find(std::uint32_t hash, IsIt isIt) const {
-        if (entries.empty()) return notFound;
-        const std::size_t mask = entries.size() - 1;
+        if (entries_.empty()) return notFound;
+        const std::size_t mask = entries_.size() - 1;
         for (std::size_t at = hash & mask;; at = (at + 1) & mask) {
-            const Entry& entry = entries[at];
+            const Entry& entry = entries_[at];
             if (entry.positionPlusOne == 0) return notFound;
             const std::size_t position = entry.positionPlusOne - 1;
             if (entry.hash == hash && isIt(position)) return position;
@@ -47,18 +47,18 @@ public:
     // Inserts a position that find does not find. If it throws
     // (std::bad_alloc), nothing changes.
     void insert(std::uint32_t hash, std::size_t position) {
-        if (used >= entries.size() / 4 * 3) reserve(used + 1);
+        if (used_ >= entries_.size() / 4 * 3) reserve(used_ + 1);
         place({hash, static_cast<std::uint32_t>(position + 1)});
-        ++used;
+        ++used_;
     }
 
     // Makes room for `count` things in all.
     void reserve(std::size_t count) {
         const std::size_t size =
             std::max(smallest, std::bit_ceil(count * 8 / 5 + 1));
-        if (size <= entries.size()) return;
+        if (size <= entries_.size()) return;
         std::vector<Entry> old(size);
-        old.swap(entries);
+        old.swap(entries_);
         for (const Entry& entry : old)
             if (entry.positionPlusOne != 0) place(entry);
     }
@@ -66,8 +66,8 @@ public:
     // The first position that find would look at, unless another hash has
     // its place.
     std::size_t likely(std::uint32_t hash) const noexcept {
-        if (entries.empty()) return notFound;
-        const Entry& entry = entries[hash & (entries.size() - 1)];
+        if (entries_.empty()) return notFound;
+        const Entry& entry = entries_[hash & (entries_.size() - 1)];
         return entry.positionPlusOne == 0 || entry.hash != hash
                    ? notFound
                    : entry.positionPlusOne - std::size_t{1};
@@ -75,13 +75,13 @@ public:
 
     // Asks the processor for the entry that find will look at first.
     void fetch(std::uint32_t hash) const noexcept {
-        if (!entries.empty())
-            __builtin_prefetch(&entries[hash & (entries.size() - 1)]);
+        if (!entries_.empty())
+            __builtin_prefetch(&entries_[hash & (entries_.size() - 1)]);
     }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
-        return entries.capacity() * sizeof(Entry);
+        return entries_.capacity() * sizeof(Entry);
     }
 
 private:
@@ -93,14 +93,14 @@ private:
     };
 
     void place(Entry entry) noexcept {
-        const std::size_t mask = entries.size() - 1;
+        const std::size_t mask = entries_.size() - 1;
         std::size_t at = entry.hash & mask;
-        while (entries[at].positionPlusOne != 0) at = (at + 1) & mask;
-        entries[at] = entry;
+        while (entries_[at].positionPlusOne != 0) at = (at + 1) & mask;
+        entries_[at] = entry;
     }
 
-    std::vector<Entry> entries;  // a power of two, or nothing yet
-    std::size_t used = 0;
+    std::vector<Entry> entries_;  // a power of two, or nothing yet
+    std::size_t used_ = 0;
 };
 
 }  // namespace tessel

@@ -71,46 +71,46 @@ public:
     // place counts as a node until release().
     char* cut(std::size_t before, std::size_t bytes) noexcept {
         const std::size_t total = roundUp(before + bytes, nodeAlignment);
-        if (total > size - used) return nullptr;
-        char* at = reinterpret_cast<char*>(this) + used + before;
-        used += total;
-        live.fetch_add(1, std::memory_order_relaxed);
+        if (total > size_ - used_) return nullptr;
+        char* at = reinterpret_cast<char*>(this) + used_ + before;
+        used_ += total;
+        live_.fetch_add(1, std::memory_order_relaxed);
         return at;
     }
 
     // Gives back one node, or the pool's own hold.
     void release() noexcept {
-        if (live.fetch_sub(1, std::memory_order_acq_rel) != 1) return;
+        if (live_.fetch_sub(1, std::memory_order_acq_rel) != 1) return;
         this->~NodeSlab();
         std::free(this);
     }
 
     ChildStore lateStore(const BNode* node) noexcept {
-        const std::lock_guard lock(late->access);
-        return late->stores.find(node)->second;
+        const std::lock_guard lock(late_->access);
+        return late_->stores.find(node)->second;
     }
     void setLateStore(const BNode* node, ChildStore kept) {
-        if (late == nullptr) late = std::make_unique<LateStores>();
-        const std::lock_guard lock(late->access);
-        late->stores[node] = kept;
+        if (late_ == nullptr) late_ = std::make_unique<LateStores>();
+        const std::lock_guard lock(late_->access);
+        late_->stores[node] = kept;
     }
     void forgetLateStore(const BNode* node) noexcept {
-        const std::lock_guard lock(late->access);
-        late->stores.erase(node);
+        const std::lock_guard lock(late_->access);
+        late_->stores.erase(node);
     }
 
     // What the allocator gave out for the slab and the stores that it keeps.
     std::size_t bytes() noexcept {
-        return allocatedBytes(this) + (late == nullptr ? 0 : late->bytes());
+        return allocatedBytes(this) + (late_ == nullptr ? 0 : late_->bytes());
     }
 
 private:
-    explicit NodeSlab(std::size_t bytes) noexcept : size(bytes) {}
+    explicit NodeSlab(std::size_t bytes) noexcept : size_(bytes) {}
 
-    std::atomic<std::size_t> live{1};  // nodes, and 1 while a pool fills it
-    std::size_t size;
-    std::size_t used = sizeof(NodeSlab);
-    std::unique_ptr<LateStores> late;
+    std::atomic<std::size_t> live_{1};  // nodes, and 1 while a pool fills it
+    std::size_t size_;
+    std::size_t used_ = sizeof(NodeSlab);
+    std::unique_ptr<LateStores> late_;
 };
 
 ChildStore BNode::lateStore() const noexcept {
@@ -118,11 +118,11 @@ ChildStore BNode::lateStore() const noexcept {
 }
 
 void BNode::setStore(ChildStore kept) {
-    if ((head & ownsStoreFlag) != 0) {
+    if ((head_ & ownsStoreFlag) != 0) {
         std::memcpy(storeSlot(), &kept, sizeof kept);
     } else {
         NodeSlab::of(this)->setLateStore(this, kept);
-        head = static_cast<std::uint8_t>(head | lateStoreFlag);
+        head_ = static_cast<std::uint8_t>(head_ | lateStoreFlag);
     }
 }
 
@@ -165,7 +165,7 @@ void BNode::destroy(BNode* dead) noexcept {
             continue;
         }
         const ChildStore emptied = dead->store();
-        if ((dead->head & lateStoreFlag) != 0)
+        if ((dead->head_ & lateStoreFlag) != 0)
             NodeSlab::of(dead)->forgetLateStore(dead);
         std::free(emptied.block());
         NodeSlab::of(dead)->release();
@@ -176,12 +176,12 @@ void BNode::destroy(BNode* dead) noexcept {
 }
 
 NodePool::~NodePool() {
-    if (current != nullptr) current->release();
+    if (current_ != nullptr) current_->release();
 }
 
 void* NodePool::allocate(std::size_t before, std::size_t bytes) {
-    if (current != nullptr)
-        if (char* at = current->cut(before, bytes)) return at;
+    if (current_ != nullptr)
+        if (char* at = current_->cut(before, bytes)) return at;
     const std::size_t needed =
         roundUp(before + bytes, nodeAlignment) + sizeof(NodeSlab);
     if (needed > largestSlab / 4) {  // a slab of its own
@@ -192,20 +192,20 @@ void* NodePool::allocate(std::size_t before, std::size_t bytes) {
         return at;
     }
     NodeSlab* next = NodeSlab::create(
-        std::clamp(made / 8, std::max(smallestSlab, needed), largestSlab));
-    if (current != nullptr) current->release();
-    current = next;
-    return current->cut(before, bytes);
+        std::clamp(made_ / 8, std::max(smallestSlab, needed), largestSlab));
+    if (current_ != nullptr) current_->release();
+    current_ = next;
+    return current_->cut(before, bytes);
 }
 
 BNode* NodePool::make(ComponentView value, Kind kind) {
     const bool isLong = value.size() >= BNode::longLength;
     const std::size_t before = kind == Kind::folder ? sizeof(ChildStore) : 0;
-    const std::size_t bytes = offsetof(BNode, head) + 1 +
+    const std::size_t bytes = offsetof(BNode, head_) + 1 +
                               (isLong ? sizeof(std::uint64_t) : 0) +
                               value.size();
     auto* node = new (allocate(before, bytes)) BNode;
-    made += before + bytes;
+    made_ += before + bytes;
     unsigned head =
         (isLong ? BNode::longLength : static_cast<unsigned>(value.size()))
         << BNode::lengthShift;
@@ -214,7 +214,7 @@ BNode* NodePool::make(ComponentView value, Kind kind) {
         const ChildStore none;
         std::memcpy(node->storeSlot(), &none, sizeof none);
     }
-    node->head = static_cast<std::uint8_t>(head);
+    node->head_ = static_cast<std::uint8_t>(head);
     std::uint8_t* at = node->afterHead();
     if (isLong) {
         const std::uint64_t length = value.size();
@@ -277,10 +277,10 @@ void NodePool::truncate(BNode& parent, std::size_t size) noexcept {
 }
 
 std::size_t NodeMemory::nodeBytes(const BNode& node) noexcept {
-    const bool isLong = node.head >> BNode::lengthShift == BNode::longLength;
-    const bool ownsStore = (node.head & BNode::ownsStoreFlag) != 0;
+    const bool isLong = node.head_ >> BNode::lengthShift == BNode::longLength;
+    const bool ownsStore = (node.head_ & BNode::ownsStoreFlag) != 0;
     return roundUp(
-        (ownsStore ? sizeof(ChildStore) : 0) + offsetof(BNode, head) + 1 +
+        (ownsStore ? sizeof(ChildStore) : 0) + offsetof(BNode, head_) + 1 +
             (isLong ? sizeof(std::uint64_t) : 0) + node.value().size(),
         nodeAlignment);
 }

@@ -53,8 +53,8 @@ public:
 private:
     void* allocate(std::size_t before, std::size_t bytes);
 
-    NodeSlab* current = nullptr;
-    std::size_t made = 0;  // bytes taken by nodes so far
+    NodeSlab* current_ = nullptr;
+    std::size_t made_ = 0;  // bytes taken by nodes so far
 };
 
 }  // namespace tessel

@@ -16,40 +16,40 @@ namespace tessel {
 // Cost: every operation is O(1).
 class NodeStack {
 public:
-    bool empty() const noexcept { return ranges.empty(); }
+    bool empty() const noexcept { return ranges_.empty(); }
 
     // The number of nodes on the stack. Cost: linear in the ranges.
     std::size_t size() const noexcept {
         std::size_t count = 0;
-        for (const Range& range : ranges) count += range.end - range.next;
+        for (const Range& range : ranges_) count += range.end - range.next;
         return count;
     }
 
     // The node on top; the stack must not be empty.
     BNode& top() const noexcept {
-        const Range& range = ranges.back();
+        const Range& range = ranges_.back();
         return range.isNode ? *range.node : range.node->children()[range.next];
     }
 
-    void push(const BNodePtr& node) { ranges.push_back({node, 0, 1, true}); }
+    void push(const BNodePtr& node) { ranges_.push_back({node, 0, 1, true}); }
 
     // Pushes the node's present children from the last to the first, so that
     // the first is on top. Children appended later are not on the stack.
     void pushChildren(const BNodePtr& node) {
         const std::size_t count = node->children().size();
-        if (count > 0) ranges.push_back({node, 0, count, false});
+        if (count > 0) ranges_.push_back({node, 0, count, false});
     }
 
     // Takes the top off; the stack must not be empty.
     void pop() noexcept {
-        if (++ranges.back().next == ranges.back().end) ranges.pop_back();
+        if (++ranges_.back().next == ranges_.back().end) ranges_.pop_back();
     }
 
-    void clear() noexcept { ranges.clear(); }
+    void clear() noexcept { ranges_.clear(); }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
-        return ranges.capacity() * sizeof(Range);
+        return ranges_.capacity() * sizeof(Range);
     }
 
 private:
@@ -61,7 +61,7 @@ private:
         bool isNode;
     };
 
-    std::vector<Range> ranges;
+    std::vector<Range> ranges_;
 };
 
 }  // namespace tessel

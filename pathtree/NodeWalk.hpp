@@ -16,30 +16,30 @@ namespace tessel {
 // Ownership: borrows the tree, which must not change during the walk.
 class NodeWalk {
 public:
-    explicit NodeWalk(const BNode& root) { open.push_back({&root, 0}); }
+    explicit NodeWalk(const BNode& root) { open_.push_back({&root, 0}); }
 
     // Moves to the next node; false when there is none.
     bool next() {
-        if (current != nullptr && hasChildren) open.push_back({current, 0});
-        while (!open.empty()) {
-            Folder& folder = open.back();
+        if (current_ != nullptr && hasChildren_) open_.push_back({current_, 0});
+        while (!open_.empty()) {
+            Folder& folder = open_.back();
             const ChildList children = folder.node->children();
             if (folder.next < children.size()) {
-                current = &children[folder.next++];
-                last = folder.next == children.size();
-                hasChildren = !current->isLeaf();
+                current_ = &children[folder.next++];
+                last_ = folder.next == children.size();
+                hasChildren_ = !current_->isLeaf();
                 return true;
             }
-            open.pop_back();
+            open_.pop_back();
         }
         return false;
     }
 
     // The node that next() moved to.
-    const BNode& node() const noexcept { return *current; }
-    bool isLeaf() const noexcept { return !hasChildren; }
+    const BNode& node() const noexcept { return *current_; }
+    bool isLeaf() const noexcept { return !hasChildren_; }
     // True when it is its parent's last child.
-    bool isLastChild() const noexcept { return last; }
+    bool isLastChild() const noexcept { return last_; }
 
 private:
     struct Folder {
@@ -47,10 +47,10 @@ private:
         std::size_t next;  // position of the child to visit next
     };
 
-    std::vector<Folder> open;
-    const BNode* current = nullptr;
-    bool hasChildren = false;
-    bool last = false;
+    std::vector<Folder> open_;
+    const BNode* current_ = nullptr;
+    bool hasChildren_ = false;
+    bool last_ = false;
 };
 
 }  // namespace tessel

@@ -32,36 +32,36 @@ public:
         using reference = ComponentView;
 
         explicit Iterator(const std::uint8_t* position) noexcept
-            : at(position) {}
+            : at_(position) {}
         ComponentView operator*() const noexcept {
-            if (*at != longMark) return {at + 1, *at};
+            if (*at_ != longMark) return {at_ + 1, *at_};
             std::uint64_t length = 0;
-            std::memcpy(&length, at + 1, sizeof length);
-            return {at + 1 + sizeof length, static_cast<std::size_t>(length)};
+            std::memcpy(&length, at_ + 1, sizeof length);
+            return {at_ + 1 + sizeof length, static_cast<std::size_t>(length)};
         }
         Iterator& operator++() noexcept {
             const ComponentView here = **this;
-            at = here.data() + here.size();
+            at_ = here.data() + here.size();
             return *this;
         }
         friend bool operator==(Iterator a, Iterator b) noexcept {
-            return a.at == b.at;
+            return a.at_ == b.at_;
         }
 
     private:
-        const std::uint8_t* at;
+        const std::uint8_t* at_;
     };
 
     PackedComponents() noexcept = default;
 
-    std::size_t size() const noexcept { return count; }
-    bool empty() const noexcept { return count == 0; }
-    Iterator begin() const noexcept { return Iterator(first); }
-    Iterator end() const noexcept { return Iterator(first + byteCount); }
+    std::size_t size() const noexcept { return count_; }
+    bool empty() const noexcept { return count_ == 0; }
+    Iterator begin() const noexcept { return Iterator(first_); }
+    Iterator end() const noexcept { return Iterator(first_ + byteCount_); }
 
     // The whole list as it stands in the buffer. Lists of equal components
     // have equal bytes, and no others have.
-    ComponentView bytes() const noexcept { return {first, byteCount}; }
+    ComponentView bytes() const noexcept { return {first_, byteCount_}; }
 
 private:
     friend class ComponentPacker;
@@ -70,11 +70,11 @@ private:
 
     PackedComponents(const std::uint8_t* start, std::size_t length,
                      std::size_t components) noexcept
-        : first(start), byteCount(length), count(components) {}
+        : first_(start), byteCount_(length), count_(components) {}
 
-    const std::uint8_t* first = nullptr;
-    std::size_t byteCount = 0;
-    std::size_t count = 0;
+    const std::uint8_t* first_ = nullptr;
+    std::size_t byteCount_ = 0;
+    std::size_t count_ = 0;
 };
 
 // The memory that lists of components stand in.
@@ -97,17 +97,17 @@ public:
     std::uint8_t* extend(std::size_t length) {
         const bool isLong = length >= PackedComponents::longMark;
         const std::size_t mark = 1 + (isLong ? sizeof(std::uint64_t) : 0);
-        if (mark + length + slack > capacity - used)
+        if (mark + length + slack > capacity_ - used_)
             moveOn(mark + length + slack);
-        std::uint8_t* at = buffers.back().get() + used;
+        std::uint8_t* at = buffers_.back().get() + used_;
         *at = isLong ? PackedComponents::longMark
                      : static_cast<std::uint8_t>(length);
         if (isLong) {
             const std::uint64_t stored = length;
             std::memcpy(at + 1, &stored, sizeof stored);
         }
-        used += mark + length;
-        ++count;
+        used_ += mark + length;
+        ++count_;
         return at + mark;
     }
 
@@ -121,18 +121,18 @@ public:
     // Ends the list at hand, returns it and begins another one.
     PackedComponents finish() noexcept {
         PackedComponents list;
-        if (count > 0)
-            list = {buffers.back().get() + start, used - start, count};
-        start = used;
-        count = 0;
+        if (count_ > 0)
+            list = {buffers_.back().get() + start_, used_ - start_, count_};
+        start_ = used_;
+        count_ = 0;
         return list;
     }
 
     // Hands over all buffers; the lists stay valid. The packer is then as
     // new.
     ComponentBuffers takeBuffers() noexcept {
-        capacity = start = used = count = 0;
-        return std::exchange(buffers, {});
+        capacity_ = start_ = used_ = count_ = 0;
+        return std::exchange(buffers_, {});
     }
 
 private:
@@ -141,27 +141,27 @@ private:
 
     // Takes a new buffer with room for the list at hand and `more` bytes.
     void moveOn(std::size_t more) {
-        const std::size_t begun = used - start;
+        const std::size_t begun = used_ - start_;
         const std::size_t usual =
-            std::clamp(2 * capacity, firstBuffer, usualBuffer);
+            std::clamp(2 * capacity_, firstBuffer, usualBuffer);
         const std::size_t size = std::max(usual, begun + begun / 2 + more);
         auto next = std::make_unique_for_overwrite<std::uint8_t[]>(size);
         if (begun > 0)
-            std::memcpy(next.get(), buffers.back().get() + start, begun);
-        if (begun > 0 && start == 0)  // nothing else stands in the old one
-            buffers.back() = std::move(next);
+            std::memcpy(next.get(), buffers_.back().get() + start_, begun);
+        if (begun > 0 && start_ == 0)  // nothing else stands in the old one
+            buffers_.back() = std::move(next);
         else
-            buffers.push_back(std::move(next));
-        capacity = size;
-        start = 0;
-        used = begun;
+            buffers_.push_back(std::move(next));
+        capacity_ = size;
+        start_ = 0;
+        used_ = begun;
     }
 
-    ComponentBuffers buffers;
-    std::size_t capacity = 0;  // of the last buffer
-    std::size_t start = 0;     // of the list at hand
-    std::size_t used = 0;
-    std::size_t count = 0;  // components of the list at hand
+    ComponentBuffers buffers_;
+    std::size_t capacity_ = 0;  // of the last buffer
+    std::size_t start_ = 0;     // of the list at hand
+    std::size_t used_ = 0;
+    std::size_t count_ = 0;  // components of the list at hand
 };
 
 }  // namespace tessel

@@ -20,8 +20,8 @@ using PathTrack = std::vector<std::uint64_t>;
 // Cost: reading one track skips at most tracksPerStart - 1 others.
 class PathTracks {
 public:
-    std::size_t size() const noexcept { return count; }
-    bool empty() const noexcept { return count == 0; }
+    std::size_t size() const noexcept { return count_; }
+    bool empty() const noexcept { return count_ == 0; }
 
     // A copy of track i, which must be below size().
     PathTrack operator[](std::size_t i) const {
@@ -32,7 +32,7 @@ public:
     // The same into a track whose memory is used again.
     void get(std::size_t i, PathTrack& track) const;
     PathTrack front() const { return (*this)[0]; }
-    PathTrack back() const { return (*this)[count - 1]; }
+    PathTrack back() const { return (*this)[count_ - 1]; }
 
     // Appends a copy of the track. If it throws, nothing is appended.
     void push_back(const PathTrack& track);
@@ -47,7 +47,7 @@ public:
     void forEach(Visit visit) const {
         PathTrack track;
         std::size_t at = 0;
-        for (std::size_t i = 0; i < count; ++i) {
+        for (std::size_t i = 0; i < count_; ++i) {
             at = read(at, track);
             visit(static_cast<const PathTrack&>(track));
         }
@@ -69,9 +69,9 @@ private:
     std::size_t read(std::size_t at, PathTrack& track) const;
     std::uint64_t readInteger(std::size_t& at) const noexcept;
 
-    std::vector<std::uint8_t> bytes;
-    std::vector<std::uint64_t> starts;
-    std::size_t count = 0;
+    std::vector<std::uint8_t> bytes_;
+    std::vector<std::uint64_t> starts_;
+    std::size_t count_ = 0;
 };
 
 }  // namespace tessel

@@ -27,32 +27,32 @@ std::vector<std::uint32_t> countChildren(std::span<const std::uint8_t> codes) {
 
 TreeBuilder::TreeBuilder(BPathTree& target,
                          std::span<const std::uint8_t> nodeCodes)
-    : tree(target), codes(nodeCodes), childCounts(countChildren(nodeCodes)) {
-    tree.finder.clear();
-    tree.root = BNodePtr::adopt(tree.pool.make({}, NodePool::Kind::folder));
-    reserveChildren(*tree.root);
-    open.push_back(tree.root.get());
+    : tree_(target), codes_(nodeCodes), childCounts_(countChildren(nodeCodes)) {
+    tree_.finder_.clear();
+    tree_.root = BNodePtr::adopt(tree_.pool_.make({}, NodePool::Kind::folder));
+    reserveChildren(*tree_.root);
+    open_.push_back(tree_.root.get());
 }
 
 void TreeBuilder::reserveChildren(BNode& folder) {
-    NodePool::reserve(folder, childCounts[nextCount++]);
+    NodePool::reserve(folder, childCounts_[nextCount_++]);
 }
 
 void TreeBuilder::add(ComponentView value) {
-    if (nextCode == codes.size()) throw DamagedFormException();
-    const std::uint8_t code = codes[nextCode++];
+    if (nextCode_ == codes_.size()) throw DamagedFormException();
+    const std::uint8_t code = codes_[nextCode_++];
     const bool known = code <= nodecode::largest;
     const bool isFolder = known && (code & nodecode::hasChildren) != 0;
-    BNode& node =
-        tree.pool.add(*open.back(), value,
-                      isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf);
+    BNode& node = tree_.pool_.add(
+        *open_.back(), value,
+        isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf);
     if (!known) throw UnknownNodeTypeException();
-    if ((code & nodecode::siblingFollows) == 0) open.pop_back();
+    if ((code & nodecode::siblingFollows) == 0) open_.pop_back();
     if (isFolder) {
         reserveChildren(node);
-        open.push_back(&node);
+        open_.push_back(&node);
     } else {
-        ++leafCount;
+        ++leafCount_;
     }
 }
 

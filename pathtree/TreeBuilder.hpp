@@ -36,25 +36,25 @@ public:
     // Codes may be hostile; they are judged as add() comes to them.
     TreeBuilder(BPathTree& target, std::span<const std::uint8_t> nodeCodes);
 
-    bool complete() const noexcept { return open.empty(); }
+    bool complete() const noexcept { return open_.empty(); }
 
     // Attaches a node with a copy of the value. Throws DamagedFormException
     // when no code is left and UnknownNodeTypeException on an unknown code;
     // then the node is attached as a leaf.
     void add(ComponentView value);
 
-    std::size_t leaves() const noexcept { return leafCount; }
+    std::size_t leaves() const noexcept { return leafCount_; }
 
 private:
     void reserveChildren(BNode& folder);
 
-    BPathTree& tree;
-    std::span<const std::uint8_t> codes;
-    std::vector<std::uint32_t> childCounts;  // of the root and each folder
-    std::size_t nextCount = 0;
-    std::size_t nextCode = 0;
-    std::size_t leafCount = 0;
-    std::vector<BNode*> open;  // folders that still await a child
+    BPathTree& tree_;
+    std::span<const std::uint8_t> codes_;
+    std::vector<std::uint32_t> childCounts_;  // of the root and each folder
+    std::size_t nextCount_ = 0;
+    std::size_t nextCode_ = 0;
+    std::size_t leafCount_ = 0;
+    std::vector<BNode*> open_;  // folders that still await a child
 };
 
 }  // namespace tessel

@@ -153,7 +153,7 @@ public:
         Pair pair;
         pair.coder = support::coderWith(characters, frequencies);
         pair.expected.code = model::buildCode(characters, frequencies);
-        pairs.push_back(std::move(pair));
+        pairs_.push_back(std::move(pair));
     }
 
     void step(const Step& step) {
@@ -179,14 +179,14 @@ public:
             case Kind::restore:
                 return restore(step.number % 4);
             case Kind::turn:
-                used = step.number % pairs.size();
+                used_ = step.number % pairs_.size();
                 return;
         }
     }
 
     // Compares every coder with its model, and its form with the model's.
     void compareAll() {
-        for (used = 0; used < pairs.size(); ++used) {
+        for (used_ = 0; used_ < pairs_.size(); ++used_) {
             // A copy may have added to the nodes.
             compare();
             const Bytes form = support::formOf(*now().coder, false);
@@ -199,7 +199,7 @@ public:
     }
 
 private:
-    Pair& now() { return pairs[used]; }
+    Pair& now() { return pairs_[used_]; }
 
     void compare() {
         RC_ASSERT(support::differenceFrom(now().expected, *now().coder) == "");
@@ -322,14 +322,14 @@ private:
     }
 
     void copy() {
-        if (pairs.size() > 3) return;
+        if (pairs_.size() > 3) return;
         Pair pair;
         pair.coder->copyTree(*now().coder);
         pair.expected = now().expected.copied();
         pair.insertions = now().insertions;
         pair.passBegan = now().passBegan;
-        pairs.push_back(std::move(pair));
-        used = pairs.size() - 1;
+        pairs_.push_back(std::move(pair));
+        used_ = pairs_.size() - 1;
         compare();
     }
 
@@ -341,7 +341,7 @@ private:
     // In place of the coder, or beside it.
     void restore(unsigned how) {
         const bool compress = how % 2 == 1;
-        const bool replace = how < 2 || pairs.size() > 3;
+        const bool replace = how < 2 || pairs_.size() > 3;
         const Bytes form = support::formOf(*now().coder, compress);
         Pair pair;
         pair.coder = support::restoredFrom(form, compress, *now().coder);
@@ -351,14 +351,14 @@ private:
         if (replace) {
             now() = std::move(pair);
         } else {
-            pairs.push_back(std::move(pair));
-            used = pairs.size() - 1;
+            pairs_.push_back(std::move(pair));
+            used_ = pairs_.size() - 1;
         }
         compare();
     }
 
-    std::vector<Pair> pairs;
-    std::size_t used = 0;
+    std::vector<Pair> pairs_;
+    std::size_t used_ = 0;
 };
 
 // ---- The properties ----

@@ -208,28 +208,28 @@ void useThoroughly(HuffmanPathTree& coder) {
 // already, which a refusal must not change.
 class Judge {
 public:
-    explicit Judge(bool isCompressed) : compress(isCompressed) {
-        before = stateOf(*held);
+    explicit Judge(bool isCompressed) : compress_(isCompressed) {
+        before_ = stateOf(*held_);
     }
 
     Outcome judge(Bytes form) {
         HuffmanPathTree fresh;
-        const Outcome outcome = load(fresh, form, compress);
+        const Outcome outcome = load(fresh, form, compress_);
         if (outcome == Outcome::loaded) {
             useThoroughly(fresh);
             return outcome;
         }
-        EXPECT_EQ(stateOf(fresh), stateOf(untouched));
-        EXPECT_EQ(load(*held, form, compress), outcome);
-        EXPECT_EQ(stateOf(*held), before);
+        EXPECT_EQ(stateOf(fresh), stateOf(untouched_));
+        EXPECT_EQ(load(*held_, form, compress_), outcome);
+        EXPECT_EQ(stateOf(*held_), before_);
         return outcome;
     }
 
 private:
-    bool compress;
-    HuffmanPathTree untouched;
-    CoderPtr held = everything();
-    State before;
+    bool compress_;
+    HuffmanPathTree untouched_;
+    CoderPtr held_ = everything();
+    State before_;
 };
 
 class HostileForm : public ::testing::TestWithParam<Sample> {

@@ -22,9 +22,9 @@ bool PropertyRecord::isCopied() const noexcept {
 ClassRecord::ClassRecord(const Name* classFullName,
                          const Module* definingModule,
                          std::unique_ptr<HostClassInfo> classInfo)
-    : ownName(classFullName),
-      ownModule(definingModule),
-      descriptor(std::move(classInfo)) {}
+    : ownName_(classFullName),
+      ownModule_(definingModule),
+      descriptor_(std::move(classInfo)) {}
 
 ClassRecord::~ClassRecord() {
     while (!methods.empty()) methods.pop_back();
@@ -38,7 +38,7 @@ HostMethodInfo* ClassRecord::findMethod(std::string_view method) const {
 }
 
 HostMethodInfo* ClassRecord::constructor() const {
-    return findMethod(descriptor->className());
+    return findMethod(descriptor_->className());
 }
 
 const PropertyRecord* ClassRecord::findProperty(
@@ -51,25 +51,25 @@ const PropertyRecord* ClassRecord::findProperty(
 
 std::shared_ptr<Instance> ClassRecord::makeInstance() {
     std::unique_ptr<void, std::function<void(void*)>> native(
-        descriptor->createNativeObject(),
-        [this](void* made) { descriptor->destroyNativeObject(made); });
+        descriptor_->createNativeObject(),
+        [this](void* made) { descriptor_->destroyNativeObject(made); });
     auto instance = std::make_shared<Instance>(*this, native.get());
     static_cast<void>(native.release());
     return instance;
 }
 
 Instance::Instance(ClassRecord& instanceClass, void* nativeObject)
-    : owner(&instanceClass), ownNative(nativeObject) {
-    owner->living.insert(this);
+    : owner_(&instanceClass), ownNative_(nativeObject) {
+    owner_->living_.insert(this);
 }
 
 void Instance::destroy() noexcept {
-    if (owner == nullptr) return;
-    ClassRecord* const formerOwner = std::exchange(owner, nullptr);
-    formerOwner->living.erase(this);
+    if (owner_ == nullptr) return;
+    ClassRecord* const formerOwner = std::exchange(owner_, nullptr);
+    formerOwner->living_.erase(this);
     listeners.clear();
-    formerOwner->descriptor->destroyNativeObject(
-        std::exchange(ownNative, nullptr));
+    formerOwner->descriptor_->destroyNativeObject(
+        std::exchange(ownNative_, nullptr));
 }
 
 }  // namespace tessel::embedded

@@ -71,11 +71,11 @@ public:
     ClassRecord& operator=(const ClassRecord&) = delete;
     ~ClassRecord();
 
-    const std::string& fullName() const noexcept { return ownName->str(); }
-    const Name* name() const noexcept { return ownName; }
+    const std::string& fullName() const noexcept { return ownName_->str(); }
+    const Name* name() const noexcept { return ownName_; }
     // The module whose entry was running at registration, or null.
-    const Module* module() const noexcept { return ownModule; }
-    HostClassInfo& info() const noexcept { return *descriptor; }
+    const Module* module() const noexcept { return ownModule_; }
+    HostClassInfo& info() const noexcept { return *descriptor_; }
 
     // Null if there is none of that name.
     HostMethodInfo* findMethod(std::string_view method) const;
@@ -90,15 +90,15 @@ public:
 
     // Makes an instance with its native object.
     std::shared_ptr<Instance> makeInstance();
-    const std::set<Instance*>& instances() const noexcept { return living; }
+    const std::set<Instance*>& instances() const noexcept { return living_; }
 
 private:
     friend class Instance;
 
-    const Name* ownName;
-    const Module* ownModule;
-    std::unique_ptr<HostClassInfo> descriptor;
-    std::set<Instance*> living;
+    const Name* ownName_;
+    const Module* ownModule_;
+    std::unique_ptr<HostClassInfo> descriptor_;
+    std::set<Instance*> living_;
 };
 
 enum class ListenerKind { Get, Set };
@@ -115,10 +115,10 @@ public:
     Instance& operator=(const Instance&) = delete;
     ~Instance() { destroy(); }
 
-    bool isLiving() const noexcept { return owner != nullptr; }
+    bool isLiving() const noexcept { return owner_ != nullptr; }
     // Null once destroyed.
-    ClassRecord* instanceClass() const noexcept { return owner; }
-    void* native() const noexcept { return ownNative; }
+    ClassRecord* instanceClass() const noexcept { return owner_; }
+    void* native() const noexcept { return ownNative_; }
 
     void destroy() noexcept;
 
@@ -130,8 +130,8 @@ public:
     std::vector<Listener> listeners;
 
 private:
-    ClassRecord* owner;
-    void* ownNative;
+    ClassRecord* owner_;
+    void* ownNative_;
 };
 
 }  // namespace tessel::embedded

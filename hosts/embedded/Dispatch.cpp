@@ -38,40 +38,40 @@ void* nativeFor(const Instance& instance, const PropertyRecord& property) {
 class Dispatch::OutputSlots {
 public:
     OutputSlots(std::size_t count, Value* newInstance)
-        : slots(std::max<std::size_t>(count, 1)), instance(newInstance) {
-        slots[0] = instance;
+        : slots_(std::max<std::size_t>(count, 1)), instance_(newInstance) {
+        slots_[0] = instance_;
     }
     OutputSlots(const OutputSlots&) = delete;
     OutputSlots& operator=(const OutputSlots&) = delete;
     ~OutputSlots() {
-        for (HostArray* const slot : slots) {
-            if (slot != instance) delete static_cast<Value*>(slot);
+        for (HostArray* const slot : slots_) {
+            if (slot != instance_) delete static_cast<Value*>(slot);
         }
     }
 
-    HostArray** data() noexcept { return slots.data(); }
-    bool isFilled(std::size_t index) const { return slots[index] != nullptr; }
+    HostArray** data() noexcept { return slots_.data(); }
+    bool isFilled(std::size_t index) const { return slots_[index] != nullptr; }
     Value take(std::size_t index) {
-        return std::move(*static_cast<Value*>(slots[index]));
+        return std::move(*static_cast<Value*>(slots_[index]));
     }
 
 private:
-    std::vector<HostArray*> slots;
-    Value* instance;
+    std::vector<HostArray*> slots_;
+    Value* instance_;
 };
 
 void Dispatch::checkCounts(const Signature& signature, std::size_t inputCount,
                            std::int32_t requested) const {
     const std::size_t outputCount = asSize(requested);
     const std::size_t mostOutputs = signature.outputs.size();
-    if (outputCount > mostOutputs) errors.own("tooManyOutputs");
+    if (outputCount > mostOutputs) errors_.own("tooManyOutputs");
     if (outputCount != 0 && outputCount < mostOutputs &&
         !signature.fewerOutputs && !signature.optionalTail) {
-        errors.own("tooFewOutputs");
+        errors_.own("tooFewOutputs");
     }
-    if (inputCount > signature.inputs.size()) errors.own("tooManyInputs");
+    if (inputCount > signature.inputs.size()) errors_.own("tooManyInputs");
     if (inputCount < signature.inputs.size() && !signature.optionalTail) {
-        errors.own("tooFewInputs");
+        errors_.own("tooFewInputs");
     }
 }
 
@@ -81,8 +81,8 @@ void Dispatch::checkTypes(const Signature& signature,
         const DeclaredArgument& declared = signature.inputs[i];
         const Value& value = *static_cast<const Value*>(inputs[i]);
         if (!accepts(declared.typeName, value)) {
-            errors.own("wrongType",
-                       {declared.name, declared.typeName, typeNameOf(value)});
+            errors_.own("wrongType",
+                        {declared.name, declared.typeName, typeNameOf(value)});
         }
     }
 }
@@ -92,7 +92,7 @@ void Dispatch::run(HostMethodInfo& method, OutputSlots& outputs,
                    std::int32_t requested) const {
     HostFrame frame{requested, outputs.data(),
                     static_cast<std::int32_t>(inputs.size()), inputs.data()};
-    errors.guarded(method.name(), [&] { method.execute(frame); });
+    errors_.guarded(method.name(), [&] { method.execute(frame); });
 }
 
 std::vector<Value> Dispatch::call(HostMethodInfo& method,
@@ -109,8 +109,8 @@ std::vector<Value> Dispatch::call(HostMethodInfo& method,
         if (outputs.isFilled(i)) {
             results.push_back(outputs.take(i));
         } else if (i < wanted) {
-            errors.own("outputNotAssigned",
-                       {signature.outputs[i].name, method.name()});
+            errors_.own("outputNotAssigned",
+                        {signature.outputs[i].name, method.name()});
         }
     }
     return results;
@@ -129,10 +129,10 @@ void Dispatch::construct(HostMethodInfo& method, Value& instance,
 void Dispatch::checkAccess(const PropertyRecord& property, HostAccess access,
                            Caller caller) const {
     if (access != HostAccess::Public && caller == Caller::User) {
-        errors.own("propertyRestricted", {property.name->str()});
+        errors_.own("propertyRestricted", {property.name->str()});
     }
     if (property.has(attributes::isAbstract)) {
-        errors.own("propertyHasNoValue", {property.name->str()});
+        errors_.own("propertyHasNoValue", {property.name->str()});
     }
 }
 
@@ -141,11 +141,11 @@ Value Dispatch::get(const Instance& instance, const PropertyRecord& property,
     checkAccess(property, property.getAccess, caller);
     notify(instance, property, ListenerKind::Get);
     const std::unique_ptr<HostArray, HostValueDisposer> result(
-        errors.guarded(
+        errors_.guarded(
             property.name->str(),
             [&] { return property.getter(nativeFor(instance, property)); }),
         property.disposer);
-    if (!result) errors.own("outOfMemory");
+    if (!result) errors_.own("outOfMemory");
     return std::move(*static_cast<Value*>(result.get()));
 }
 
@@ -153,14 +153,14 @@ void Dispatch::set(const Instance& instance, const PropertyRecord& property,
                    const Value& value, Caller caller) const {
     checkAccess(property, property.setAccess, caller);
     if (!accepts(property.typeName, value)) {
-        errors.own("wrongType", {property.name->str(), property.typeName,
-                                 typeNameOf(value)});
+        errors_.own("wrongType", {property.name->str(), property.typeName,
+                                  typeNameOf(value)});
     }
     if (property.has(attributes::abortSetWhenUnchanged) &&
         get(instance, property, Caller::Host) == value) {
         return;
     }
-    errors.guarded(property.name->str(), [&] {
+    errors_.guarded(property.name->str(), [&] {
         property.setter(nativeFor(instance, property), &value);
     });
     notify(instance, property, ListenerKind::Set);

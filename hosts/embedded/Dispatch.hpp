@@ -22,7 +22,7 @@ enum class Caller { User, Host };
 // Ownership: refers to the errors, which must outlive it.
 class Dispatch {
 public:
-    explicit Dispatch(const Errors& hostErrors) : errors(hostErrors) {}
+    explicit Dispatch(const Errors& hostErrors) : errors_(hostErrors) {}
 
     // Checks the counts (outputs, too many inputs, too few inputs), then the
     // declared types of the inputs, then runs the method.
@@ -58,7 +58,7 @@ private:
     void checkAccess(const PropertyRecord& property, HostAccess access,
                      Caller caller) const;
 
-    const Errors& errors;
+    const Errors& errors_;
 };
 
 }  // namespace tessel::embedded

@@ -10,7 +10,7 @@ void Errors::raise(std::string_view identifier,
     throw HostException(
         std::string(identifier),
         std::vector<HostMessageArgument>(arguments.begin(), arguments.end()),
-        catalogue.format(identifier, arguments));
+        catalogue_.format(identifier, arguments));
 }
 
 void Errors::own(std::string_view key,

@@ -14,7 +14,7 @@ namespace tessel::embedded {
 // Ownership: refers to the catalogue, which must outlive it.
 class Errors {
 public:
-    explicit Errors(const MessageCatalogue& texts) : catalogue(texts) {}
+    explicit Errors(const MessageCatalogue& texts) : catalogue_(texts) {}
 
     [[noreturn]] void raise(
         std::string_view identifier,
@@ -44,7 +44,7 @@ public:
     }
 
 private:
-    const MessageCatalogue& catalogue;
+    const MessageCatalogue& catalogue_;
 };
 
 }  // namespace tessel::embedded

@@ -121,52 +121,52 @@ Host::Host(const HostOptions& options) {
     if (gate.host != nullptr) {
         throw std::logic_error("This process has a host already.");
     }
-    state = std::make_unique<State>(options);
+    state_ = std::make_unique<State>(options);
     extendClass(filesetClassName, filesetExtension());
-    gate.host = &state->operations;
+    gate.host = &state_->operations;
 }
 
 Host::~Host() {
-    state->registry.removeAllClasses();
-    state->modules.unloadAll();
+    state_->registry.removeAllClasses();
+    state_->modules.unloadAll();
     gate.host = nullptr;
 }
 
 // --- Modules -----------------------------------------------------------------
 
 void Host::loadModule(const std::filesystem::path& file) {
-    state->modules.load(file);
+    state_->modules.load(file);
 }
 
 void Host::removeClasses(const std::filesystem::path& file) {
-    state->modules.removeClasses(file);
+    state_->modules.removeClasses(file);
 }
 
 void Host::unloadModule(const std::filesystem::path& file) {
-    state->modules.unload(file);
+    state_->modules.unload(file);
 }
 
 // --- Classes -----------------------------------------------------------------
 
 void Host::defineClass(std::string_view package,
                        std::unique_ptr<HostClassInfo> info) {
-    state->registry.define(state->registry.packages.add(package),
-                           std::move(info));
+    state_->registry.define(state_->registry.packages.add(package),
+                            std::move(info));
 }
 
 void Host::extendClass(std::string fullName, ClassExtension extension) {
-    state->extensions.insert_or_assign(std::move(fullName),
-                                       std::move(extension));
+    state_->extensions.insert_or_assign(std::move(fullName),
+                                        std::move(extension));
 }
 
 bool Host::hasClass(std::string_view fullName) const {
-    return state->registry.find(state->registry.names.intern(fullName)) !=
+    return state_->registry.find(state_->registry.names.intern(fullName)) !=
            nullptr;
 }
 
 std::vector<std::string> Host::classNames() const {
     std::vector<std::string> names;
-    for (const ClassRecord* const record : state->registry.all()) {
+    for (const ClassRecord* const record : state_->registry.all()) {
         if (!record->info().isHidden()) names.push_back(record->fullName());
     }
     return names;
@@ -174,7 +174,7 @@ std::vector<std::string> Host::classNames() const {
 
 std::vector<std::string> Host::methodNames(std::string_view className) const {
     std::vector<std::string> names;
-    for (const auto& method : state->registry.get(className).methods) {
+    for (const auto& method : state_->registry.get(className).methods) {
         if (method->isVisible()) names.emplace_back(method->name());
     }
     return names;
@@ -182,7 +182,7 @@ std::vector<std::string> Host::methodNames(std::string_view className) const {
 
 std::vector<std::string> Host::propertyNames(std::string_view className) const {
     std::vector<std::string> names;
-    for (const auto& property : state->registry.get(className).properties) {
+    for (const auto& property : state_->registry.get(className).properties) {
         if (property.has(attributes::isVisible)) {
             names.push_back(property.name->str());
         }
@@ -195,14 +195,14 @@ std::vector<std::string> Host::propertyNames(std::string_view className) const {
 Value Host::constructWith(std::string_view className,
                           std::span<const Value* const> inputs,
                           std::int32_t requested) {
-    ClassRecord& record = state->registry.get(className);
-    Value instance = state->newInstance(record);
+    ClassRecord& record = state_->registry.get(className);
+    Value instance = state_->newInstance(record);
     if (HostMethodInfo* const constructor = record.constructor()) {
         const std::vector<const HostArray*> arrays(inputs.begin(),
                                                    inputs.end());
-        state->dispatch.construct(*constructor, instance, arrays, requested);
+        state_->dispatch.construct(*constructor, instance, arrays, requested);
     } else if (!inputs.empty()) {
-        state->errors.own("tooManyInputs");
+        state_->errors.own("tooManyInputs");
     }
     return instance;
 }
@@ -210,131 +210,133 @@ Value Host::constructWith(std::string_view className,
 std::vector<Value> Host::callWith(std::int32_t requested, const Value& instance,
                                   std::string_view method,
                                   std::span<const Value* const> inputs) {
-    const ClassRecord& record = *state->instanceOf(instance).instanceClass();
+    const ClassRecord& record = *state_->instanceOf(instance).instanceClass();
     std::vector<const HostArray*> arrays{&instance};
     arrays.insert(arrays.end(), inputs.begin(), inputs.end());
-    return state->dispatch.call(state->methodOf(record, method, false), arrays,
-                                requested);
+    return state_->dispatch.call(state_->methodOf(record, method, false),
+                                 arrays, requested);
 }
 
 std::vector<Value> Host::callStatic(std::int32_t requested,
                                     std::string_view className,
                                     std::string_view method,
                                     std::span<const Value* const> inputs) {
-    const ClassRecord& record = state->registry.get(className);
+    const ClassRecord& record = state_->registry.get(className);
     const std::vector<const HostArray*> arrays(inputs.begin(), inputs.end());
-    return state->dispatch.call(state->methodOf(record, method, true), arrays,
-                                requested);
+    return state_->dispatch.call(state_->methodOf(record, method, true), arrays,
+                                 requested);
 }
 
 Value Host::get(const Value& instance, std::string_view property) {
-    const Instance& object = state->instanceOf(instance);
-    return state->dispatch.get(object, state->propertyOf(object, property),
-                               Caller::User);
+    const Instance& object = state_->instanceOf(instance);
+    return state_->dispatch.get(object, state_->propertyOf(object, property),
+                                Caller::User);
 }
 
 void Host::set(const Value& instance, std::string_view property,
                const Value& value) {
-    const Instance& object = state->instanceOf(instance);
-    state->dispatch.set(object, state->propertyOf(object, property), value,
-                        Caller::User);
+    const Instance& object = state_->instanceOf(instance);
+    state_->dispatch.set(object, state_->propertyOf(object, property), value,
+                         Caller::User);
 }
 
 void Host::listen(const Value& instance, std::string_view property,
                   ListenerKind kind, std::function<void()> notify) {
-    Instance& object = state->instanceOf(instance);
-    const PropertyRecord& record = state->propertyOf(object, property);
+    Instance& object = state_->instanceOf(instance);
+    const PropertyRecord& record = state_->propertyOf(object, property);
     const std::uint32_t allowed = kind == ListenerKind::Get
                                       ? attributes::getListenersAllowed
                                       : attributes::setListenersAllowed;
     if (!record.has(allowed)) {
-        state->errors.own("listenerRefused", {std::string(property)});
+        state_->errors.own("listenerRefused", {std::string(property)});
     }
     object.listeners.push_back({&record, kind, std::move(notify)});
 }
 
 Value Host::inspect(const Value& instance) {
-    const Instance& object = state->instanceOf(instance);
+    const Instance& object = state_->instanceOf(instance);
     Value shown = Value::structure();
     for (const PropertyRecord& property : object.instanceClass()->properties) {
         if (property.has(attributes::inspectionAllowed)) {
-            shown.setField(property.name->str(),
-                           state->dispatch.get(object, property, Caller::User));
+            shown.setField(
+                property.name->str(),
+                state_->dispatch.get(object, property, Caller::User));
         }
     }
     return shown;
 }
 
 Value Host::copy(const Value& instance) {
-    const Instance& source = state->instanceOf(instance);
+    const Instance& source = state_->instanceOf(instance);
     ClassRecord& record = *source.instanceClass();
     if (!record.info().copiesInstances()) {
-        state->errors.own("notCopyable", {record.fullName()});
+        state_->errors.own("notCopyable", {record.fullName()});
     }
-    const ClassExtension& extension = state->extensionOf(record);
+    const ClassExtension& extension = state_->extensionOf(record);
     Value copied = extension.copy ? extension.copy(*this, instance)
-                                  : state->newInstance(record);
-    const Instance& target = state->instanceOf(copied);
+                                  : state_->newInstance(record);
+    const Instance& target = state_->instanceOf(copied);
     for (const PropertyRecord& property : record.properties) {
-        if (property.isCopied()) state->copyProperty(source, target, property);
+        if (property.isCopied()) state_->copyProperty(source, target, property);
     }
-    state->update(target);
+    state_->update(target);
     return copied;
 }
 
 const std::vector<std::string>& Host::copyWarnings() const noexcept {
-    return state->copyWarnings;
+    return state_->copyWarnings;
 }
 
 Value Host::save(const Value& instance) {
-    const Instance& object = state->instanceOf(instance);
+    const Instance& object = state_->instanceOf(instance);
     const ClassRecord& record = *object.instanceClass();
     if (!record.info().savesInstances()) {
-        state->errors.own("notSavable", {record.fullName()});
+        state_->errors.own("notSavable", {record.fullName()});
     }
     const std::unique_ptr<Value> custom(
-        static_cast<Value*>(state->errors.guarded(record.fullName(), [&] {
+        static_cast<Value*>(state_->errors.guarded(record.fullName(), [&] {
             return record.info().customSave(&instance);
         })));
     if (custom) return std::move(*custom);
     Value saved = Value::structure();
     for (const PropertyRecord& property : record.properties) {
         if (property.isSaved()) {
-            saved.setField(property.name->str(),
-                           state->dispatch.get(object, property, Caller::Host));
+            saved.setField(
+                property.name->str(),
+                state_->dispatch.get(object, property, Caller::Host));
         }
     }
-    const ClassExtension& extension = state->extensionOf(record);
+    const ClassExtension& extension = state_->extensionOf(record);
     if (extension.save) extension.save(*this, instance, saved);
     return saved;
 }
 
 Value Host::load(std::string_view className, const Value& saved) {
-    ClassRecord& record = state->registry.get(className);
+    ClassRecord& record = state_->registry.get(className);
     if (!record.info().savesInstances()) {
-        state->errors.own("notSavable", {record.fullName()});
+        state_->errors.own("notSavable", {record.fullName()});
     }
-    Value loaded = state->newInstance(record);
+    Value loaded = state_->newInstance(record);
     const SavedValue savedForm(saved);
-    state->errors.guarded(record.fullName(), [&] {
+    state_->errors.guarded(record.fullName(), [&] {
         record.info().customLoad(&loaded, &savedForm);
     });
-    const Instance& object = state->instanceOf(loaded);
+    const Instance& object = state_->instanceOf(loaded);
     const bool hasFields =
         saved.valueClass() == ValueClass::Struct && saved.numel() != 0;
     for (const PropertyRecord& property : record.properties) {
         const std::string& name = property.name->str();
         if (hasFields && property.isSaved() && saved.hasField(name)) {
-            state->dispatch.set(object, property, saved.field(name),
-                                Caller::Host);
+            state_->dispatch.set(object, property, saved.field(name),
+                                 Caller::Host);
         }
     }
-    state->update(object);
+    state_->update(object);
     return loaded;
 }
 
 void Host::destroy(const Value& instance) {
-    state->instanceOf(instance).destroy();
+    state_->instanceOf(instance).destroy();
 }
 
 bool Host::isValid(const Value& instance) const {
@@ -342,6 +344,6 @@ bool Host::isValid(const Value& instance) const {
            instance.numel() != 0 && instance.instance(0)->isLiving();
 }
 
-HostInterface& Host::operations() noexcept { return state->operations; }
+HostInterface& Host::operations() noexcept { return state_->operations; }
 
 }  // namespace tessel::embedded

@@ -144,7 +144,7 @@ public:
 
 private:
     class State;
-    std::unique_ptr<State> state;
+    std::unique_ptr<State> state_;
 };
 
 }  // namespace tessel::embedded

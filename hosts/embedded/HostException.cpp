@@ -7,9 +7,9 @@ namespace tessel::embedded {
 HostException::HostException(std::string messageIdentifier,
                              std::vector<HostMessageArgument> messageArguments,
                              std::string messageText)
-    : name(std::move(messageIdentifier)),
-      values(std::move(messageArguments)),
-      text(std::move(messageText)) {}
+    : name_(std::move(messageIdentifier)),
+      values_(std::move(messageArguments)),
+      text_(std::move(messageText)) {}
 
 std::string toText(const HostMessageArgument& argument) {
     if (const auto* number = std::get_if<std::int64_t>(&argument)) {

@@ -20,16 +20,16 @@ public:
                   std::string messageText);
 
     // Component, colon, key.
-    const std::string& identifier() const noexcept { return name; }
+    const std::string& identifier() const noexcept { return name_; }
     const std::vector<HostMessageArgument>& arguments() const noexcept {
-        return values;
+        return values_;
     }
-    const char* what() const noexcept override { return text.c_str(); }
+    const char* what() const noexcept override { return text_.c_str(); }
 
 private:
-    std::string name;
-    std::vector<HostMessageArgument> values;
-    std::string text;
+    std::string name_;
+    std::vector<HostMessageArgument> values_;
+    std::string text_;
 };
 
 // The decimal number or the text.

@@ -94,7 +94,8 @@ void MessageCatalogue::read(const std::filesystem::path& file,
                                      std::to_string(number) +
                                      ": this line is no message.");
         }
-        texts[component + ":" + line.substr(0, colon)] = line.substr(colon + 2);
+        texts_[component + ":" + line.substr(0, colon)] =
+            line.substr(colon + 2);
     }
     if (!in.eof()) {
         throw CatalogueException("'" + file.string() + "' cannot be read.");
@@ -104,9 +105,9 @@ void MessageCatalogue::read(const std::filesystem::path& file,
 std::string MessageCatalogue::format(
     std::string_view identifier,
     std::span<const HostMessageArgument> arguments) const {
-    const auto found = texts.find(identifier);
-    return found == texts.end() ? withoutText(identifier, arguments)
-                                : fillIn(found->second, arguments);
+    const auto found = texts_.find(identifier);
+    return found == texts_.end() ? withoutText(identifier, arguments)
+                                 : fillIn(found->second, arguments);
 }
 
 }  // namespace tessel::embedded

@@ -38,7 +38,7 @@ public:
 private:
     void read(const std::filesystem::path& file, const std::string& component);
 
-    std::map<std::string, std::string, std::less<>> texts;
+    std::map<std::string, std::string, std::less<>> texts_;
 };
 
 }  // namespace tessel::embedded

@@ -28,33 +28,33 @@ void terminate(const Module& module) noexcept {
 
 }  // namespace
 
-Module::~Module() { dlclose(handle); }
+Module::~Module() { dlclose(handle_); }
 
 std::string Module::name() const {
-    const std::string fileName = file.filename().string();
+    const std::string fileName = file_.filename().string();
     return fileName.substr(0, fileName.find(".so"));
 }
 
 HostModuleEntry Module::find(const std::string& function) const {
-    return reinterpret_cast<HostModuleEntry>(dlsym(handle, function.c_str()));
+    return reinterpret_cast<HostModuleEntry>(dlsym(handle_, function.c_str()));
 }
 
 Modules::Loaded::iterator Modules::find(const fs::path& file) {
-    return std::find_if(modules.begin(), modules.end(),
+    return std::find_if(modules_.begin(), modules_.end(),
                         [&](const auto& m) { return m->path() == file; });
 }
 
 std::unique_ptr<Module> Modules::open(const fs::path& file) const {
     if (!fs::is_regular_file(file)) {
-        errors.own("moduleMissing", {file.string()});
+        errors_.own("moduleMissing", {file.string()});
     }
     void* const handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (handle == nullptr) {
         const std::string reason = dlerror();
         const bool lacksSymbol =
             reason.find("undefined symbol") != std::string::npos;
-        errors.own(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
-                   {file.string(), reason});
+        errors_.own(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
+                    {file.string(), reason});
     }
     return std::make_unique<Module>(file, handle);
 }
@@ -65,10 +65,11 @@ void Modules::enter(const Module& module) {
     const std::string name = "VXInitialize_" + module.name();
     const HostModuleEntry entry = module.find(name);
     if (entry == nullptr) {
-        errors.own("entryMissing", {module.path().string(), name});
+        errors_.own("entryMissing", {module.path().string(), name});
     }
     std::optional<std::string> failure;
-    const Module* const outer = std::exchange(registry.enteringModule, &module);
+    const Module* const outer =
+        std::exchange(registry_.enteringModule, &module);
     try {
         entry();
     } catch (const std::exception& exception) {
@@ -76,41 +77,41 @@ void Modules::enter(const Module& module) {
     } catch (...) {
         failure = "an unknown exception";
     }
-    registry.enteringModule = outer;
+    registry_.enteringModule = outer;
     if (failure) {
-        errors.own("entryFailed", {module.path().string(), *failure});
+        errors_.own("entryFailed", {module.path().string(), *failure});
     }
 }
 
 void Modules::load(const fs::path& file) {
     const fs::path path = resolved(file);
     const auto present = find(path);
-    if (present != modules.end()) {
+    if (present != modules_.end()) {
         enter(**present);
         return;
     }
     std::unique_ptr<Module> module = open(path);
-    modules.reserve(modules.size() + 1);
+    modules_.reserve(modules_.size() + 1);
     try {
         enter(*module);
     } catch (...) {
-        registry.removeClasses(*module);
+        registry_.removeClasses(*module);
         throw;
     }
-    modules.push_back(std::move(module));
+    modules_.push_back(std::move(module));
 }
 
 Modules::Loaded::iterator Modules::withoutClasses(const fs::path& file) {
     const auto present = find(resolved(file));
-    if (present == modules.end()) {
-        errors.own("moduleNotLoaded", {file.string()});
+    if (present == modules_.end()) {
+        errors_.own("moduleNotLoaded", {file.string()});
     }
-    const std::size_t instances = registry.instanceCount(**present);
+    const std::size_t instances = registry_.instanceCount(**present);
     if (instances != 0) {
-        errors.own("moduleInUse",
-                   {file.string(), static_cast<std::int64_t>(instances)});
+        errors_.own("moduleInUse",
+                    {file.string(), static_cast<std::int64_t>(instances)});
     }
-    registry.removeClasses(**present);
+    registry_.removeClasses(**present);
     return present;
 }
 
@@ -119,13 +120,13 @@ void Modules::removeClasses(const fs::path& file) { withoutClasses(file); }
 void Modules::unload(const fs::path& file) {
     const auto present = withoutClasses(file);
     terminate(**present);
-    modules.erase(present);
+    modules_.erase(present);
 }
 
 void Modules::unloadAll() noexcept {
-    while (!modules.empty()) {
-        terminate(*modules.back());
-        modules.pop_back();
+    while (!modules_.empty()) {
+        terminate(*modules_.back());
+        modules_.pop_back();
     }
 }
 

@@ -17,12 +17,12 @@ namespace tessel::embedded {
 class Module {
 public:
     Module(std::filesystem::path modulePath, void* loaderHandle)
-        : file(std::move(modulePath)), handle(loaderHandle) {}
+        : file_(std::move(modulePath)), handle_(loaderHandle) {}
     Module(const Module&) = delete;
     Module& operator=(const Module&) = delete;
     ~Module();
 
-    const std::filesystem::path& path() const noexcept { return file; }
+    const std::filesystem::path& path() const noexcept { return file_; }
     // The file name up to ".so".
     std::string name() const;
 
@@ -30,8 +30,8 @@ public:
     HostModuleEntry find(const std::string& function) const;
 
 private:
-    std::filesystem::path file;
-    void* handle;
+    std::filesystem::path file_;
+    void* handle_;
 };
 
 // Modules loads module files and lets them register their classes.
@@ -41,7 +41,7 @@ private:
 class Modules {
 public:
     Modules(Registry& hostRegistry, const Errors& hostErrors)
-        : registry(hostRegistry), errors(hostErrors) {}
+        : registry_(hostRegistry), errors_(hostErrors) {}
 
     // Loads a module file and calls its entry. For a module that is loaded
     // already it only calls the entry. Raises moduleMissing, moduleUnreadable,
@@ -67,9 +67,9 @@ private:
     std::unique_ptr<Module> open(const std::filesystem::path& file) const;
     void enter(const Module& module);
 
-    Registry& registry;
-    const Errors& errors;
-    Loaded modules;
+    Registry& registry_;
+    const Errors& errors_;
+    Loaded modules_;
 };
 
 }  // namespace tessel::embedded

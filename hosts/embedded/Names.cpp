@@ -4,8 +4,8 @@ namespace tessel::embedded {
 
 const Name* NameTable::intern(std::string_view text) {
     if (text.empty()) return nullptr;
-    auto found = names.find(text);
-    if (found == names.end()) found = names.emplace(text).first;
+    auto found = names_.find(text);
+    if (found == names_.end()) found = names_.emplace(text).first;
     return &*found;
 }
 

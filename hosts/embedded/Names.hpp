@@ -11,11 +11,11 @@ namespace tessel::embedded {
 // A text of a NameTable.
 class Name final : public HostOpaque<HostNameTag> {
 public:
-    explicit Name(std::string_view source) : text(source) {}
-    const std::string& str() const noexcept { return text; }
+    explicit Name(std::string_view source) : text_(source) {}
+    const std::string& str() const noexcept { return text_; }
 
 private:
-    std::string text;
+    std::string text_;
 };
 
 // NameTable keeps each text once, so that names can be compared as pointers.
@@ -39,7 +39,7 @@ private:
             return a < b.str();
         }
     };
-    std::set<Name, Order> names;
+    std::set<Name, Order> names_;
 };
 
 }  // namespace tessel::embedded

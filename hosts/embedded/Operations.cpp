@@ -32,14 +32,14 @@ const Value& Operations::checked(const HostArray* array,
                                  ValueClass needed) const {
     const Value& value = valueOf(array);
     if (value.valueClass() != needed) {
-        errors.own("wrongClass", {className(needed), typeNameOf(value)});
+        errors_.own("wrongClass", {className(needed), typeNameOf(value)});
     }
     return value;
 }
 
 void Operations::checkIndex(std::size_t index, std::size_t count) const {
     if (index >= count) {
-        errors.own("indexOutside", {number(index + 1), number(count)});
+        errors_.own("indexOutside", {number(index + 1), number(count)});
     }
 }
 
@@ -48,19 +48,19 @@ Instance& Operations::livingInstance(const HostArray* array,
                                      const char* className) const {
     const Value& value = valueOf(array);
     if (value.valueClass() != ValueClass::Object || value.numel() == 0) {
-        errors.own("notAnInstance", {className});
+        errors_.own("notAnInstance", {className});
     }
     Instance& instance = *value.instance(0);
-    if (!instance.isLiving()) errors.own("invalidInstance");
+    if (!instance.isLiving()) errors_.own("invalidInstance");
     if (instance.instanceClass()->fullName() != className) {
-        errors.own("notAnInstance", {className});
+        errors_.own("notAnInstance", {className});
     }
     return instance;
 }
 
 ClassRecord& Operations::classBeingDefined(HostClass* definedClass) const {
     auto& record = *static_cast<ClassRecord*>(definedClass);
-    if (!record.defining) errors.own("notDefining");
+    if (!record.defining) errors_.own("notDefining");
     return record;
 }
 
@@ -120,10 +120,10 @@ const double* Operations::hostDoubleData(const HostArray* numeric,
                                          std::size_t count) {
     const Value& value = checked(numeric, ValueClass::Double);
     if (value.isComplex()) {
-        errors.own("wrongClass", {"double", "complex double"});
+        errors_.own("wrongClass", {"double", "complex double"});
     }
     if (value.numel() < count) {
-        errors.own("tooFewElements", {number(count), number(value.numel())});
+        errors_.own("tooFewElements", {number(count), number(value.numel())});
     }
     return value.doubleData().data();
 }
@@ -140,7 +140,7 @@ const HostArray* Operations::hostFieldElement(const HostArray* structure,
                                               const char* field,
                                               std::size_t index) {
     const Value& value = checked(structure, ValueClass::Struct);
-    if (!value.hasField(field)) errors.own("fieldMissing", {field});
+    if (!value.hasField(field)) errors_.own("fieldMissing", {field});
     checkIndex(index, value.numel());
     return &value.field(field, index);
 }
@@ -154,7 +154,7 @@ HostArray* Operations::created(Make make) const {
     } catch (const std::bad_alloc&) {     // both are raised below
     } catch (const std::length_error&) {  // more than can be addressed
     }
-    errors.own("outOfMemory");
+    errors_.own("outOfMemory");
 }
 
 HostArray* Operations::hostCreateCharArray(std::u16string_view text) {
@@ -212,7 +212,7 @@ void* Operations::hostNativeObject(const HostArray* instance,
 void Operations::hostSetNativeObject(HostArray* instance, const char* className,
                                      void* native) {
     if (livingInstance(instance, className).native() != native) {
-        errors.own("nativeObjectChanged", {className});
+        errors_.own("nativeObjectChanged", {className});
     }
 }
 
@@ -220,31 +220,31 @@ HostArray* Operations::hostConvert(const HostSavedValue* saved,
                                    const char* typeName) {
     const Value& value = static_cast<const SavedValue*>(saved)->value;
     if (!accepts(typeName, value)) {
-        errors.own("wrongClass", {typeName, typeNameOf(value)});
+        errors_.own("wrongClass", {typeName, typeNameOf(value)});
     }
     return created([&] { return value; });
 }
 
 // --- Errors ------------------------------------------------------------------
 
-void Operations::hostErrorTooManyOutputs() { errors.own("tooManyOutputs"); }
-void Operations::hostErrorTooManyInputs() { errors.own("tooManyInputs"); }
-void Operations::hostErrorTooFewInputs() { errors.own("tooFewInputs"); }
-void Operations::hostErrorOutOfMemory() { errors.own("outOfMemory"); }
+void Operations::hostErrorTooManyOutputs() { errors_.own("tooManyOutputs"); }
+void Operations::hostErrorTooManyInputs() { errors_.own("tooManyInputs"); }
+void Operations::hostErrorTooFewInputs() { errors_.own("tooFewInputs"); }
+void Operations::hostErrorOutOfMemory() { errors_.own("outOfMemory"); }
 
 void Operations::HostError(std::string_view identifier,
                            std::span<const HostMessageArgument> arguments) {
-    errors.raise(identifier, arguments);
+    errors_.raise(identifier, arguments);
 }
 
 // --- Names, packages, classes ------------------------------------------------
 
 HostName Operations::hostInternName(const char* text) {
-    return registry.names.intern(text);
+    return registry_.names.intern(text);
 }
 
 HostPackage* Operations::hostGlobalPackage(const char* name) {
-    return registry.packages.find(name);
+    return registry_.packages.find(name);
 }
 
 HostPackage* Operations::hostSubPackage(HostPackage* package,
@@ -257,12 +257,12 @@ const char* Operations::hostPackageFullName(const HostPackage* package) {
 }
 
 HostClass* Operations::hostFindClass(HostName fullName) {
-    return registry.find(static_cast<const Name*>(fullName));
+    return registry_.find(static_cast<const Name*>(fullName));
 }
 
 void Operations::hostRegisterClass(HostPackage* package,
                                    std::unique_ptr<HostClassInfo> info) {
-    registry.define(*static_cast<Package*>(package), std::move(info));
+    registry_.define(*static_cast<Package*>(package), std::move(info));
 }
 
 void Operations::hostAddMethod(HostClass* definedClass,
@@ -275,7 +275,7 @@ void Operations::hostAddProperty(HostClass* definedClass,
     const char* const description = property.description;
     classBeingDefined(definedClass)
         .properties.push_back(
-            {registry.names.intern(property.name),
+            {registry_.names.intern(property.name),
              description == nullptr ? "" : description, property.typeName,
              property.attributeBits, property.getAccess, property.setAccess,
              property.getter, property.setter, property.disposer});

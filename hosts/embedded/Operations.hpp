@@ -16,9 +16,9 @@ class Operations final : public HostInterface {
 public:
     Operations(Registry& hostRegistry, const Errors& hostErrors,
                bool runsAlternativeMode)
-        : registry(hostRegistry),
-          errors(hostErrors),
-          alternativeMode(runsAlternativeMode) {}
+        : registry_(hostRegistry),
+          errors_(hostErrors),
+          alternativeMode_(runsAlternativeMode) {}
 
     std::size_t hostNumel(const HostArray* array) override;
     std::string hostGetString(const HostArray* text) override;
@@ -74,7 +74,7 @@ public:
                        std::unique_ptr<HostMethodInfo> method) override;
     void hostAddProperty(HostClass* definedClass,
                          const HostPropertyInfo& property) override;
-    bool hostAlternativeMode() override { return alternativeMode; }
+    bool hostAlternativeMode() override { return alternativeMode_; }
 
     HostSignature* hostCreateSignature() override;
     void hostReleaseSignature(HostSignature* signature) noexcept override;
@@ -96,9 +96,9 @@ private:
     template <class Make>
     HostArray* created(Make make) const;
 
-    Registry& registry;
-    const Errors& errors;
-    bool alternativeMode;
+    Registry& registry_;
+    const Errors& errors_;
+    bool alternativeMode_;
 };
 
 // A Value on its way to custom load.

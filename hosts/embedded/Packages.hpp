@@ -14,10 +14,10 @@ namespace tessel::embedded {
 class Package final : public HostPackage {
 public:
     explicit Package(std::string dottedName)
-        : dottedFullName(std::move(dottedName)) {}
+        : dottedFullName_(std::move(dottedName)) {}
 
     // Empty for the one package that holds all others.
-    const std::string& fullName() const noexcept { return dottedFullName; }
+    const std::string& fullName() const noexcept { return dottedFullName_; }
 
     // The package of a simple name inside this one, or null.
     Package* find(std::string_view name);
@@ -26,8 +26,8 @@ public:
     Package& add(std::string_view dottedName);
 
 private:
-    std::string dottedFullName;
-    std::map<std::string, std::unique_ptr<Package>, std::less<>> inner;
+    std::string dottedFullName_;
+    std::map<std::string, std::unique_ptr<Package>, std::less<>> inner_;
 };
 
 }  // namespace tessel::embedded

@@ -17,7 +17,7 @@ namespace tessel::embedded {
 // Ownership: owns all of them; refers to the errors, which must outlive it.
 class Registry {
 public:
-    explicit Registry(const Errors& hostErrors) : errors(hostErrors) {}
+    explicit Registry(const Errors& hostErrors) : errors_(hostErrors) {}
 
     NameTable names;
     Package packages{""};
@@ -44,8 +44,8 @@ public:
 private:
     void remove(ClassRecord& record);
 
-    const Errors& errors;
-    std::vector<std::unique_ptr<ClassRecord>> classes;
+    const Errors& errors_;
+    std::vector<std::unique_ptr<ClassRecord>> classes_;
 };
 
 }  // namespace tessel::embedded

@@ -39,38 +39,38 @@ std::size_t elementCount(const Dimensions& dimensions) {
 }
 
 Value::Value(const Dimensions& dimensions, Elements content, bool isComplex)
-    : elements(std::move(content)), complexParts(isComplex) {
+    : elements_(std::move(content)), complexParts_(isComplex) {
     if (dimensions.size() == 2) {
-        rows = dimensions[0];
-        columns = dimensions[1];
+        rows_ = dimensions[0];
+        columns_ = dimensions[1];
     } else {
-        otherShape = std::make_shared<const Dimensions>(dimensions);
+        otherShape_ = std::make_shared<const Dimensions>(dimensions);
     }
 }
 
 Value::Value(Value&& other) noexcept
-    : elements(std::move(other.elements)),
-      rows(std::exchange(other.rows, 0)),
-      columns(std::exchange(other.columns, 0)),
-      otherShape(std::move(other.otherShape)),
-      complexParts(other.complexParts) {}
+    : elements_(std::move(other.elements_)),
+      rows_(std::exchange(other.rows_, 0)),
+      columns_(std::exchange(other.columns_, 0)),
+      otherShape_(std::move(other.otherShape_)),
+      complexParts_(other.complexParts_) {}
 
 Value& Value::operator=(Value&& other) noexcept {
     Value taken(std::move(other));
-    elements.swap(taken.elements);
-    std::swap(rows, taken.rows);
-    std::swap(columns, taken.columns);
-    otherShape.swap(taken.otherShape);
-    std::swap(complexParts, taken.complexParts);
+    elements_.swap(taken.elements_);
+    std::swap(rows_, taken.rows_);
+    std::swap(columns_, taken.columns_);
+    otherShape_.swap(taken.otherShape_);
+    std::swap(complexParts_, taken.complexParts_);
     return *this;
 }
 
 Dimensions Value::dimensions() const {
-    return otherShape ? *otherShape : Dimensions{rows, columns};
+    return otherShape_ ? *otherShape_ : Dimensions{rows_, columns_};
 }
 
 std::size_t Value::numel() const {
-    return otherShape ? elementCount(*otherShape) : rows * columns;
+    return otherShape_ ? elementCount(*otherShape_) : rows_ * columns_;
 }
 
 Value Value::chars(const Dimensions& dimensions, std::u16string text) {
@@ -168,48 +168,49 @@ Value Value::textLists(const std::vector<std::vector<std::u16string>>& lists) {
 }
 
 ValueClass Value::valueClass() const noexcept {
-    return static_cast<ValueClass>(elements.index());
+    return static_cast<ValueClass>(elements_.index());
 }
 
 const std::u16string& Value::charData() const {
-    return std::get<std::u16string>(elements);
+    return std::get<std::u16string>(elements_);
 }
 
 const std::vector<double>& Value::doubleData() const {
-    return std::get<std::vector<double>>(elements);
+    return std::get<std::vector<double>>(elements_);
 }
 
 std::vector<double>& Value::doubleData() {
-    return std::get<std::vector<double>>(elements);
+    return std::get<std::vector<double>>(elements_);
 }
 
 const std::vector<std::uint8_t>& Value::byteData() const {
-    return std::get<std::vector<std::uint8_t>>(elements);
+    return std::get<std::vector<std::uint8_t>>(elements_);
 }
 
 std::vector<std::uint8_t>& Value::byteData() {
-    return std::get<std::vector<std::uint8_t>>(elements);
+    return std::get<std::vector<std::uint8_t>>(elements_);
 }
 
 bool Value::truth(std::size_t index) const {
-    return std::get<Logicals>(elements).truths.at(index) != 0;
+    return std::get<Logicals>(elements_).truths.at(index) != 0;
 }
 
 const std::shared_ptr<Instance>& Value::instance(std::size_t index) const {
-    return std::get<std::vector<std::shared_ptr<Instance>>>(elements).at(index);
+    return std::get<std::vector<std::shared_ptr<Instance>>>(elements_).at(
+        index);
 }
 
 const Value& Value::element(std::size_t index) const {
-    return std::get<std::vector<Value>>(elements).at(index);
+    return std::get<std::vector<Value>>(elements_).at(index);
 }
 
 void Value::setElement(std::size_t index, Value element) {
-    std::get<std::vector<Value>>(elements).at(index) = std::move(element);
+    std::get<std::vector<Value>>(elements_).at(index) = std::move(element);
 }
 
 const std::vector<Value>* Value::findField(std::string_view name) const {
     for (const auto& [columnName, values] :
-         std::get<Fields>(elements).columns) {
+         std::get<Fields>(elements_).columns) {
         if (columnName == name) return &values;
     }
     return nullptr;
@@ -217,7 +218,7 @@ const std::vector<Value>* Value::findField(std::string_view name) const {
 
 std::vector<std::string> Value::fieldNames() const {
     std::vector<std::string> names;
-    for (const auto& [name, values] : std::get<Fields>(elements).columns) {
+    for (const auto& [name, values] : std::get<Fields>(elements_).columns) {
         names.push_back(name);
     }
     return names;
@@ -234,7 +235,7 @@ const Value& Value::field(std::string_view name, std::size_t index) const {
 }
 
 void Value::setField(std::string_view name, Value value, std::size_t index) {
-    auto& present = std::get<Fields>(elements).columns;
+    auto& present = std::get<Fields>(elements_).columns;
     auto found = std::find_if(present.begin(), present.end(),
                               [&](const auto& c) { return c.first == name; });
     if (found == present.end()) {
@@ -250,7 +251,7 @@ bool Value::Fields::operator==(const Fields& other) const {
 
 bool operator==(const Value& a, const Value& b) {
     return a.dimensions() == b.dimensions() &&
-           a.complexParts == b.complexParts && a.elements == b.elements;
+           a.complexParts_ == b.complexParts_ && a.elements_ == b.elements_;
 }
 
 }  // namespace tessel::embedded

@@ -85,7 +85,7 @@ public:
     ValueClass valueClass() const noexcept;
     Dimensions dimensions() const;
     std::size_t numel() const;
-    bool isComplex() const noexcept { return complexParts; }
+    bool isComplex() const noexcept { return complexParts_; }
 
     const std::u16string& charData() const;
     // Of complex data both parts, interleaved.
@@ -129,13 +129,13 @@ private:
 
     const std::vector<Value>* findField(std::string_view name) const;
 
-    Elements elements;
-    std::size_t rows = 0;
-    std::size_t columns = 0;
+    Elements elements_;
+    std::size_t rows_ = 0;
+    std::size_t columns_ = 0;
     // All dimensions, if there are not two of them; rows and columns are then
     // 0. Values never change it, so copies share it.
-    std::shared_ptr<const Dimensions> otherShape;
-    bool complexParts = false;
+    std::shared_ptr<const Dimensions> otherShape_;
+    bool complexParts_ = false;
 };
 
 }  // namespace tessel::embedded

@@ -91,25 +91,25 @@ std::vector<std::string> argumentsOf(const HostException& error) {
 }
 
 std::vector<Texts> HostTest::iterated(const Value& instance) {
-    host.call(0, instance, "reset");
+    host_.call(0, instance, "reset");
     std::vector<Texts> paths;
-    while (host.call(1, instance, "hasNextPath")[0].truth(0)) {
-        paths.push_back(textsOf(host.call(1, instance, "getNextPath")[0]));
+    while (host_.call(1, instance, "hasNextPath")[0].truth(0)) {
+        paths.push_back(textsOf(host_.call(1, instance, "getNextPath")[0]));
     }
     return paths;
 }
 
 Listing HostTest::fetched(const Value& instance, std::vector<double> numbers) {
     const std::vector<Value> outputs =
-        host.call(2, instance, "getPaths", Value::column(std::move(numbers)));
+        host_.call(2, instance, "getPaths", Value::column(std::move(numbers)));
     return {listsOf(outputs[0]), listsOf(outputs[1])};
 }
 
 Texts HostTest::joined(const Value& instance, std::vector<double> numbers,
                        const std::u16string& separator) {
-    return textsOf(host.call(1, instance, "getPaths",
-                             Value::column(std::move(numbers)),
-                             Value::text(separator))[0]);
+    return textsOf(host_.call(1, instance, "getPaths",
+                              Value::column(std::move(numbers)),
+                              Value::text(separator))[0]);
 }
 
 Listing smallListing() {

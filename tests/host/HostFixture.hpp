@@ -56,11 +56,11 @@ inline const std::string componentName = "VELOX:datastoreio:huffmanpaths:";
 // A host with the plug-in loaded, and steps on its instances.
 class HostTest : public testing::Test {
 protected:
-    HostTest() { host.loadModule(pluginFile()); }
+    HostTest() { host_.loadModule(pluginFile()); }
 
     template <class... Inputs>
     Value make(const Inputs&... inputs) {
-        return host.construct(filesetClassName, inputs...);
+        return host_.construct(filesetClassName, inputs...);
     }
     Value makeFor(const Listing& listing) {
         return make(Value::text(u"files"), foldersAndFiles(listing));
@@ -73,8 +73,8 @@ protected:
     }
 
     void add(const Value& instance, const Listing& listing) {
-        host.call(0, instance, "addPaths", Value::textLists(listing.folders),
-                  Value::textLists(listing.files));
+        host_.call(0, instance, "addPaths", Value::textLists(listing.folders),
+                   Value::textLists(listing.files));
     }
     // All paths from a reset to the end.
     std::vector<Texts> iterated(const Value& instance);
@@ -84,16 +84,16 @@ protected:
                  const std::u16string& separator);
 
     std::u16string treeString(const Value& instance) {
-        return host.call(1, instance, "serialize")[0].charData();
+        return host_.call(1, instance, "serialize")[0].charData();
     }
     std::vector<std::uint8_t> storedForm(const Value& instance) {
-        return host.call(2, instance, "serialize")[1].byteData();
+        return host_.call(2, instance, "serialize")[1].byteData();
     }
     std::vector<double> frequencies(const Value& instance) {
-        return host.get(instance, "Frequencies").doubleData();
+        return host_.get(instance, "Frequencies").doubleData();
     }
 
-    Host host{testOptions()};
+    Host host_{testOptions()};
 };
 
 // Two folders with three and two files.

@@ -244,14 +244,14 @@ void Host::HostError(std::string_view identifier,
 // --- Names, packages, classes ------------------------------------------------
 
 tessel::HostName Host::hostInternName(const char* name) {
-    Name& interned = names[name];
+    Name& interned = names_[name];
     interned.text = name;
     return interned.text.empty() ? nullptr : &interned;
 }
 
 tessel::HostPackage* Host::hostGlobalPackage(const char* name) {
-    packages[name].fullName = name;
-    return &packages[name];
+    packages_[name].fullName = name;
+    return &packages_[name];
 }
 
 tessel::HostPackage* Host::hostSubPackage(tessel::HostPackage* package,

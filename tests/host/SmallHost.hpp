@@ -18,19 +18,19 @@ namespace small {
 // Counts those of a kind that are alive.
 class Counted {
 public:
-    explicit Counted(long& aliveCount) : alive(aliveCount) { ++alive; }
+    explicit Counted(long& aliveCount) : alive_(aliveCount) { ++alive_; }
     Counted(const Counted&) = delete;
     Counted& operator=(const Counted&) = delete;
-    ~Counted() { --alive; }
+    ~Counted() { --alive_; }
 
 private:
-    long& alive;
+    long& alive_;
 };
 
 // An array of any class; which of the parts counts is up to its user.
 class Box final : public tessel::HostArray {
 public:
-    explicit Box(long& aliveCount) : counted(aliveCount) {}
+    explicit Box(long& aliveCount) : counted_(aliveCount) {}
 
     std::vector<std::size_t> dimensions = {0, 0};
     bool isCell = false;
@@ -43,7 +43,7 @@ public:
     void* native = nullptr;
 
 private:
-    Counted counted;
+    Counted counted_;
 };
 
 using Array = std::unique_ptr<Box>;
@@ -56,11 +56,11 @@ public:
 
 class Signature final : public tessel::HostSignature {
 public:
-    explicit Signature(long& aliveCount) : counted(aliveCount) {}
+    explicit Signature(long& aliveCount) : counted_(aliveCount) {}
     std::vector<std::string> calls;
 
 private:
-    Counted counted;
+    Counted counted_;
 };
 
 // What this host throws when it raises an error.
@@ -206,8 +206,8 @@ private:
     void raise(const std::string& error, bool returns);
     Array box(std::size_t rows, std::size_t columns);
 
-    std::map<std::string, Package> packages;
-    std::map<std::string, Name> names;
+    std::map<std::string, Package> packages_;
+    std::map<std::string, Name> names_;
 };
 
 }  // namespace small

@@ -16,20 +16,20 @@ class CatalogueTest : public testing::Test {
 protected:
     CatalogueTest() {
         std::string pattern = testing::TempDir() + "catalogueXXXXXX";
-        folder = mkdtemp(pattern.data());
+        folder_ = mkdtemp(pattern.data());
     }
-    ~CatalogueTest() override { std::filesystem::remove_all(folder); }
+    ~CatalogueTest() override { std::filesystem::remove_all(folder_); }
 
     void write(const std::string& file, const std::string& content) {
-        std::filesystem::create_directories((folder / file).parent_path());
-        std::ofstream(folder / file) << content;
+        std::filesystem::create_directories((folder_ / file).parent_path());
+        std::ofstream(folder_ / file) << content;
     }
     std::string text(const std::string& identifier,
                      const std::vector<HostMessageArgument>& arguments) {
-        return MessageCatalogue(folder).format(identifier, arguments);
+        return MessageCatalogue(folder_).format(identifier, arguments);
     }
 
-    std::filesystem::path folder;
+    std::filesystem::path folder_;
 };
 
 }  // namespace
@@ -74,13 +74,13 @@ TEST_F(CatalogueTest, LineThatIsNoMessageIsRefusedByPlace) {
         text("a:key", {});
         FAIL() << "the line was accepted";
     } catch (const CatalogueException& refusal) {
-        EXPECT_EQ(refusal.what(), (folder / "a.messages").string() +
+        EXPECT_EQ(refusal.what(), (folder_ / "a.messages").string() +
                                       ":3: this line is no message.");
     }
 }
 
 TEST_F(CatalogueTest, MissingFolderIsRefused) {
-    EXPECT_THROW(MessageCatalogue(folder / "none"), CatalogueException);
+    EXPECT_THROW(MessageCatalogue(folder_ / "none"), CatalogueException);
 }
 
 TEST(SuppliedCatalogue, HasTheFourTextsOfThePlugin) {

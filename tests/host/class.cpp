@@ -14,7 +14,7 @@ protected:
     // Loads a saved value and gives what was printed meanwhile.
     std::string printedByLoad(const Value& saved, Value& loaded) {
         testing::internal::CaptureStdout();
-        loaded = host.load(filesetClassName, saved);
+        loaded = host_.load(filesetClassName, saved);
         return testing::internal::GetCapturedStdout();
     }
 
@@ -31,96 +31,96 @@ protected:
 // --- Registration ------------------------------------------------------------
 
 TEST_F(ClassTest, EntryCalledTwiceRegistersTheClassOnce) {
-    host.loadModule(pluginFile());
-    host.loadModule(pluginFile());
-    EXPECT_EQ(host.classNames(), (std::vector<std::string>{filesetClassName}));
+    host_.loadModule(pluginFile());
+    host_.loadModule(pluginFile());
+    EXPECT_EQ(host_.classNames(), (std::vector<std::string>{filesetClassName}));
 }
 
 TEST_F(ClassTest, MembersAreInOrder) {
-    EXPECT_EQ(host.methodNames(filesetClassName),
+    EXPECT_EQ(host_.methodNames(filesetClassName),
               (std::vector<std::string>{"HuffmanPaths", "addPaths", "getPaths",
                                         "getNextPath", "hasNextPath", "reset",
                                         "serialize"}));
-    EXPECT_EQ(host.propertyNames(filesetClassName),
+    EXPECT_EQ(host_.propertyNames(filesetClassName),
               (std::vector<std::string>{"StringTree", "Frequencies"}));
 }
 
 TEST_F(ClassTest, OnceRegisteredClassIsNotRegisteredAgainByTheEntry) {
-    host.removeClasses(pluginFile());
-    host.loadModule(pluginFile());
-    EXPECT_FALSE(host.hasClass(filesetClassName));
+    host_.removeClasses(pluginFile());
+    host_.loadModule(pluginFile());
+    EXPECT_FALSE(host_.hasClass(filesetClassName));
 }
 
 // --- Properties --------------------------------------------------------------
 
 TEST_F(ClassTest, FrequenciesOfFreshInstanceAreZeroByOneDouble) {
-    EXPECT_EQ(host.get(make(), "Frequencies"), Value::doubles({0, 1}, {}));
+    EXPECT_EQ(host_.get(make(), "Frequencies"), Value::doubles({0, 1}, {}));
 }
 
 TEST_F(ClassTest, FrequenciesAreColumnInOrderOfStringTree) {
     const Value instance = make(Value::text(u"frequencies"),
                                 Value::text(u"abc"), Value::column({1, 2, 4}));
-    EXPECT_EQ(host.get(instance, "StringTree"), Value::text(u"abc"));
-    EXPECT_EQ(host.get(instance, "Frequencies"), Value::column({1, 2, 4}));
+    EXPECT_EQ(host_.get(instance, "StringTree"), Value::text(u"abc"));
+    EXPECT_EQ(host_.get(instance, "Frequencies"), Value::column({1, 2, 4}));
 }
 
 TEST_F(ClassTest, StringTreeOfFreshInstanceIsRowWithoutElements) {
-    EXPECT_EQ(host.get(make(), "StringTree"), Value::chars({1, 0}, u""));
+    EXPECT_EQ(host_.get(make(), "StringTree"), Value::chars({1, 0}, u""));
 }
 
 TEST_F(ClassTest, SettersAreRefusedToUsersAndChangeNothing) {
     const Value instance = filled(smallListing());
-    const Value before = host.save(instance);
-    const HostException text =
-        errorOf([&] { host.set(instance, "StringTree", Value::text(u"xyz")); });
+    const Value before = host_.save(instance);
+    const HostException text = errorOf(
+        [&] { host_.set(instance, "StringTree", Value::text(u"xyz")); });
     EXPECT_EQ(text.identifier(), "VELOX:embedded:propertyRestricted");
     EXPECT_EQ(argumentsOf(text), (std::vector<std::string>{"StringTree"}));
     EXPECT_EQ(errorOf([&] {
-                  host.set(instance, "Frequencies", Value::column({1}));
+                  host_.set(instance, "Frequencies", Value::column({1}));
               }).identifier(),
               "VELOX:embedded:propertyRestricted");
-    EXPECT_EQ(host.save(instance), before);
+    EXPECT_EQ(host_.save(instance), before);
 }
 
 TEST_F(ClassTest, PropertiesHaveNoListenersAndAreNotInspected) {
     const Value instance = make();
     for (const ListenerKind kind : {ListenerKind::Get, ListenerKind::Set}) {
         EXPECT_EQ(errorOf([&] {
-                      host.listen(instance, "StringTree", kind, [] {});
+                      host_.listen(instance, "StringTree", kind, [] {});
                   }).identifier(),
                   "VELOX:embedded:listenerRefused");
     }
-    EXPECT_TRUE(host.inspect(instance).fieldNames().empty());
+    EXPECT_TRUE(host_.inspect(instance).fieldNames().empty());
 }
 
 // --- Copying -----------------------------------------------------------------
 
 TEST_F(ClassTest, CopyHasContentOfItsSource) {
     const Value source = filled(smallListing());
-    const Value copy = host.copy(source);
-    EXPECT_EQ(host.save(copy), host.save(source));
+    const Value copy = host_.copy(source);
+    EXPECT_EQ(host_.save(copy), host_.save(source));
     EXPECT_EQ(iterated(copy), pathsOf(smallListing()));
 }
 
 TEST_F(ClassTest, CopyIteratesOnItsOwn) {
     const Value source = filled(smallListing());
-    host.call(0, source, "reset");
-    host.call(1, source, "getNextPath");
-    const Value copy = host.copy(source);
+    host_.call(0, source, "reset");
+    host_.call(1, source, "getNextPath");
+    const Value copy = host_.copy(source);
     EXPECT_EQ(iterated(copy), pathsOf(smallListing()));
-    EXPECT_EQ(textsOf(host.call(1, source, "getNextPath")[0]),
+    EXPECT_EQ(textsOf(host_.call(1, source, "getNextPath")[0]),
               pathsOf(smallListing())[1]);
 }
 
 TEST_F(ClassTest, CopyOutlivesItsSource) {
     Value source = filled(smallListing());
-    const Value copy = host.copy(source);
-    host.destroy(source);
+    const Value copy = host_.copy(source);
+    host_.destroy(source);
     EXPECT_EQ(iterated(copy), pathsOf(smallListing()));
 }
 
 TEST_F(ClassTest, CopyOfFreshInstanceIsUsable) {
-    const Value copy = host.copy(make());
+    const Value copy = host_.copy(make());
     EXPECT_TRUE(iterated(copy).empty());
 }
 
@@ -128,7 +128,7 @@ TEST_F(ClassTest, CopyOfFreshInstanceIsUsable) {
 
 TEST_F(ClassTest, SavedFormHasPropertiesAndStoredForm) {
     const Value source = filled(smallListing());
-    const Value saved = host.save(source);
+    const Value saved = host_.save(source);
     EXPECT_EQ(
         saved.fieldNames(),
         (std::vector<std::string>{"StringTree", "Frequencies", "PathTree"}));
@@ -138,26 +138,26 @@ TEST_F(ClassTest, SavedFormHasPropertiesAndStoredForm) {
 TEST_F(ClassTest, LoadRestoresPathsCodeAndFrequencies) {
     const Value source = filled(smallListing());
     Value loaded;
-    EXPECT_EQ(printedByLoad(host.save(source), loaded), "");
-    EXPECT_EQ(host.save(loaded), host.save(source));
+    EXPECT_EQ(printedByLoad(host_.save(source), loaded), "");
+    EXPECT_EQ(host_.save(loaded), host_.save(source));
     EXPECT_EQ(iterated(loaded), pathsOf(smallListing()));
     add(loaded, {{{u"/", u"usr"}}, {{u"sbin"}}});
     EXPECT_EQ(joined(loaded, {6}, u"/"), (Texts{u"/usr/sbin"}));
 }
 
 TEST_F(ClassTest, CustomLoadRestoresNoFrequencies) {
-    const Value saved = host.save(filled(smallListing()));
+    const Value saved = host_.save(filled(smallListing()));
     Value withoutFrequencies = Value::structure();
     for (const char* const field : {"StringTree", "PathTree"}) {
         withoutFrequencies.setField(field, saved.field(field));
     }
-    const Value loaded = host.load(filesetClassName, withoutFrequencies);
+    const Value loaded = host_.load(filesetClassName, withoutFrequencies);
     EXPECT_TRUE(frequencies(loaded).empty());
     EXPECT_EQ(iterated(loaded), pathsOf(smallListing()));
 }
 
 TEST_F(ClassTest, LoadWithEmptyStringTreeYieldsEmptyCoderAndNoMessage) {
-    Value saved = host.save(filled(smallListing()));
+    Value saved = host_.save(filled(smallListing()));
     saved.setField("StringTree", Value::text(u""));
     expectSilentlyEmpty(saved);
     saved.setField("PathTree", Value::text(u"not even bytes"));
@@ -165,7 +165,7 @@ TEST_F(ClassTest, LoadWithEmptyStringTreeYieldsEmptyCoderAndNoMessage) {
 }
 
 TEST_F(ClassTest, LoadOfFreshInstanceYieldsEmptyCoder) {
-    expectSilentlyEmpty(host.save(make()));
+    expectSilentlyEmpty(host_.save(make()));
 }
 
 TEST_F(ClassTest, LoadOfOtherValuesLeavesInstanceAsCreated) {
@@ -178,7 +178,7 @@ TEST_F(ClassTest, LoadOfOtherValuesLeavesInstanceAsCreated) {
 }
 
 TEST_F(ClassTest, LoadOfDamagedPathTreePrintsOneLineAndDoesNotRaise) {
-    const Value saved = host.save(filled(smallListing()));
+    const Value saved = host_.save(filled(smallListing()));
     const std::vector<std::uint8_t> whole = saved.field("PathTree").byteData();
     for (std::size_t length = 0; length < whole.size(); ++length) {
         Value damaged = saved;
@@ -193,7 +193,7 @@ TEST_F(ClassTest, LoadOfDamagedPathTreePrintsOneLineAndDoesNotRaise) {
 }
 
 TEST_F(ClassTest, LoadOfUnfittingFieldsPrintsOneLineAndDoesNotRaise) {
-    const Value saved = host.save(filled(smallListing()));
+    const Value saved = host_.save(filled(smallListing()));
     Value loaded;
 
     Value shortText = saved;
@@ -210,21 +210,22 @@ TEST_F(ClassTest, LoadOfUnfittingFieldsPrintsOneLineAndDoesNotRaise) {
 }
 
 TEST_F(ClassTest, LoadTakesFirstElementOfStructArray) {
-    const Value first = host.save(filled(smallListing()));
+    const Value first = host_.save(filled(smallListing()));
     Value both = Value::structure({1, 2});
     for (const std::string& field : first.fieldNames()) {
         both.setField(field, first.field(field), 0);
         both.setField(field, Value::text(u"of the second"), 1);
     }
-    const Value loaded = host.load(filesetClassName, both);
+    const Value loaded = host_.load(filesetClassName, both);
     EXPECT_EQ(iterated(loaded), pathsOf(smallListing()));
 }
 
 TEST_F(ClassTest, LoadWithUnfittingFrequenciesIsHostError) {
-    Value saved = host.save(filled(smallListing()));
+    Value saved = host_.save(filled(smallListing()));
     saved.setField("Frequencies", Value::text(u"many"));
-    EXPECT_EQ(errorOf([&] { host.load(filesetClassName, saved); }).identifier(),
-              "VELOX:embedded:wrongClass");
+    EXPECT_EQ(
+        errorOf([&] { host_.load(filesetClassName, saved); }).identifier(),
+        "VELOX:embedded:wrongClass");
 }
 
 // --- Lifetime ----------------------------------------------------------------
@@ -232,17 +233,17 @@ TEST_F(ClassTest, LoadWithUnfittingFrequenciesIsHostError) {
 TEST_F(ClassTest, DestroyedInstanceIsInvalidInEveryUse) {
     const Value instance = filled(smallListing());
     const Value other = instance;
-    host.destroy(instance);
-    EXPECT_FALSE(host.isValid(other));
+    host_.destroy(instance);
+    EXPECT_FALSE(host_.isValid(other));
     const std::vector<std::function<void()>> uses = {
-        [&] { host.call(0, other, "reset"); },
-        [&] { host.get(other, "StringTree"); },
-        [&] { host.set(other, "StringTree", Value::text(u"")); },
-        [&] { host.copy(other); },
-        [&] { host.save(other); },
-        [&] { host.destroy(other); },
+        [&] { host_.call(0, other, "reset"); },
+        [&] { host_.get(other, "StringTree"); },
+        [&] { host_.set(other, "StringTree", Value::text(u"")); },
+        [&] { host_.copy(other); },
+        [&] { host_.save(other); },
+        [&] { host_.destroy(other); },
         [&] { make(Value::text(u"copy"), other); },
-        [&] { host.listen(other, "StringTree", ListenerKind::Get, [] {}); }};
+        [&] { host_.listen(other, "StringTree", ListenerKind::Get, [] {}); }};
     for (const auto& use : uses) {
         EXPECT_EQ(errorOf(use).identifier(), "VELOX:embedded:invalidInstance");
     }
@@ -262,7 +263,7 @@ TEST_F(ClassTest, MethodsUseFirstElementOfInstanceArray) {
         Value::objects({1, 2}, {first.instance(0), second.instance(0)});
     EXPECT_EQ(iterated(both), pathsOf(smallListing()));
     const Value none = Value::objects({0, 1}, {});
-    EXPECT_EQ(errorOf([&] { host.call(0, none, "reset"); }).identifier(),
+    EXPECT_EQ(errorOf([&] { host_.call(0, none, "reset"); }).identifier(),
               "VELOX:embedded:notAnInstance");
 }
 

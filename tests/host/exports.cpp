@@ -16,7 +16,7 @@ class DynamicSymbols {
 public:
     explicit DynamicSymbols(const std::string& file) {
         std::ifstream in(file, std::ios::binary);
-        bytes.assign(std::istreambuf_iterator<char>(in), {});
+        bytes_.assign(std::istreambuf_iterator<char>(in), {});
         const auto header = at<Elf64_Ehdr>(0);
         for (std::size_t i = 0; i < header.e_shnum; ++i) {
             const auto section =
@@ -32,7 +32,7 @@ private:
     template <class Record>
     Record at(std::size_t offset) const {
         Record record;
-        std::memcpy(&record, bytes.data() + offset, sizeof record);
+        std::memcpy(&record, bytes_.data() + offset, sizeof record);
         return record;
     }
 
@@ -43,12 +43,12 @@ private:
              offset += sizeof(Elf64_Sym)) {
             const auto symbol = at<Elf64_Sym>(section.sh_offset + offset);
             const std::string name =
-                bytes.data() + names.sh_offset + symbol.st_name;
+                bytes_.data() + names.sh_offset + symbol.st_name;
             (symbol.st_shndx == SHN_UNDEF ? undefined : defined).insert(name);
         }
     }
 
-    std::vector<char> bytes;
+    std::vector<char> bytes_;
 };
 
 }  // namespace

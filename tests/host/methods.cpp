@@ -32,7 +32,7 @@ protected:
                              const Value& files) {
         const Content before = contentOf(instance);
         const HostException error = errorOf(
-            [&] { host.call(0, instance, "addPaths", folders, files); });
+            [&] { host_.call(0, instance, "addPaths", folders, files); });
         EXPECT_EQ(contentOf(instance), before);
         return error;
     }
@@ -181,9 +181,9 @@ TEST_F(MethodsTest, CopyModeOfAnotherValueIsHostError) {
 
 TEST_F(MethodsTest, TreeModeRebuildsFromSerializeAndFrequencies) {
     const Value source = filled(smallListing());
-    const std::vector<Value> outputs = host.call(2, source, "serialize");
+    const std::vector<Value> outputs = host_.call(2, source, "serialize");
     const Value rebuilt = make(Value::text(u"tree"), outputs[0], outputs[1],
-                               host.get(source, "Frequencies"));
+                               host_.get(source, "Frequencies"));
     EXPECT_EQ(storedForm(rebuilt), storedForm(source));
     EXPECT_EQ(treeString(rebuilt), treeString(source));
     EXPECT_EQ(frequencies(rebuilt), frequencies(source));
@@ -212,7 +212,7 @@ TEST_F(MethodsTest, TreeModeWithDamagedBytesIsHostErrorWithNativeText) {
     bytes.resize(bytes.size() / 2);
     const HostException error = errorOf([&] {
         make(Value::text(u"tree"), Value::text(treeString(source)),
-             Value::byteColumn(bytes), host.get(source, "Frequencies"));
+             Value::byteColumn(bytes), host_.get(source, "Frequencies"));
     });
     EXPECT_EQ(error.identifier(), "VELOX:embedded:nativeError");
     EXPECT_EQ(argumentsOf(error),
@@ -227,7 +227,7 @@ TEST_F(MethodsTest, TreeModeReadsNothingOutsideArraysOfOtherClasses) {
     const Value source = filled(smallListing());
     const Value text = Value::text(treeString(source));
     const Value bytes = Value::byteColumn(storedForm(source));
-    const Value numbers = host.get(source, "Frequencies");
+    const Value numbers = host_.get(source, "Frequencies");
     const auto refusal = [&](const Value& form, const Value& frequencies) {
         return errorOf(
                    [&] { make(Value::text(u"tree"), text, form, frequencies); })
@@ -359,7 +359,8 @@ TEST_F(MethodsTest, AddPathsWithUnknownCharacterIsHostErrorAndInsertsNothing) {
 TEST_F(MethodsTest, AddPathsWithoutFoldersAddsNothing) {
     const Value instance = filled(smallListing());
     const Content before = contentOf(instance);
-    EXPECT_TRUE(host.call(0, instance, "addPaths", Value::cell({0, 0}),
+    EXPECT_TRUE(host_
+                    .call(0, instance, "addPaths", Value::cell({0, 0}),
                           Value::cell({0, 1}))
                     .empty());
     EXPECT_EQ(contentOf(instance), before);
@@ -381,7 +382,7 @@ TEST_F(MethodsTest, TextIsTakenInColumnMajorOrder) {
     EXPECT_EQ(treeString(instance), u"acbd");
     Value file = Value::cell({1, 1});
     file.setElement(0, Value::cellRow({Value::chars({2, 1, 2}, u"dcba")}));
-    host.call(0, instance, "addPaths", Value::textLists({{u"a"}}), file);
+    host_.call(0, instance, "addPaths", Value::textLists({{u"a"}}), file);
     EXPECT_EQ(joined(instance, {1}, u""), (Texts{u"adcba"}));
 }
 
@@ -397,7 +398,7 @@ TEST_F(MethodsTest, GetPathsWithoutSeparatorYieldsFoldersAndFiles) {
 TEST_F(MethodsTest, GetPathsWithoutSeparatorFillsFilesAlsoForOneOutput) {
     const Value instance = filled(smallListing());
     const std::vector<Value> outputs =
-        host.call(1, instance, "getPaths", Value::column({4}));
+        host_.call(1, instance, "getPaths", Value::column({4}));
     ASSERT_EQ(outputs.size(), 1U);
     EXPECT_EQ(listsOf(outputs[0]),
               (std::vector<Texts>{{u"/", u"usr", u"lib", u"gcc"}}));
@@ -414,8 +415,8 @@ TEST_F(MethodsTest, GetPathsWithSeparatorJoins) {
 TEST_F(MethodsTest, GetPathsWithSeparatorAssignsOnlyPaths) {
     const Value instance = filled(smallListing());
     const HostException error = errorOf([&] {
-        host.call(2, instance, "getPaths", Value::column({1}),
-                  Value::text(u"/"));
+        host_.call(2, instance, "getPaths", Value::column({1}),
+                   Value::text(u"/"));
     });
     EXPECT_EQ(error.identifier(), "VELOX:embedded:outputNotAssigned");
     EXPECT_EQ(argumentsOf(error),
@@ -426,11 +427,11 @@ TEST_F(MethodsTest, GetPathsWithoutOutputDoesNothingEvenForInvalidNumbers) {
     const Value instance = filled(smallListing());
     const double nan = std::numeric_limits<double>::quiet_NaN();
     const Value invalid = Value::column({nan, -1, 0});
-    EXPECT_TRUE(host.call(0, instance, "getPaths", invalid).empty());
-    EXPECT_TRUE(
-        host.call(0, instance, "getPaths", invalid, Value::text(u"/")).empty());
+    EXPECT_TRUE(host_.call(0, instance, "getPaths", invalid).empty());
+    EXPECT_TRUE(host_.call(0, instance, "getPaths", invalid, Value::text(u"/"))
+                    .empty());
     EXPECT_EQ(errorOf([&] {
-                  host.call(1, instance, "getPaths", invalid);
+                  host_.call(1, instance, "getPaths", invalid);
               }).identifier(),
               "VELOX:embedded:nativeError");
 }
@@ -456,8 +457,8 @@ TEST_F(MethodsTest, GetPathsWithSeparatorSkipsFolderWithoutComponents) {
              Value::byteColumn(bytes), Value::column(equal));
 
     const Value paths =
-        host.call(1, instance, "getPaths", Value::column({2, 3, 4}),
-                  Value::text(u"/"))[0];
+        host_.call(1, instance, "getPaths", Value::column({2, 3, 4}),
+                   Value::text(u"/"))[0];
     ASSERT_EQ(paths.dimensions(), (Dimensions{3, 1}));
     EXPECT_EQ(paths.element(0), Value::text(u"ab"));
     EXPECT_EQ(paths.element(1), Value::text(u"bc"));
@@ -469,8 +470,8 @@ TEST_F(MethodsTest, GetPathsWithSeparatorSkipsFolderWithoutComponents) {
 TEST_F(MethodsTest, GetPathsLeavesRowsForNumbersBeyondTheEndUnset) {
     const Value instance = filled(smallListing());
     const Value paths =
-        host.call(1, instance, "getPaths", Value::column({5, 6, 700}),
-                  Value::text(u"/"))[0];
+        host_.call(1, instance, "getPaths", Value::column({5, 6, 700}),
+                   Value::text(u"/"))[0];
     ASSERT_EQ(paths.dimensions(), (Dimensions{3, 1}));
     EXPECT_EQ(paths.element(0), Value::text(u"/usr/lib/gcc/crt.o"));
     EXPECT_EQ(paths.element(1), Value());
@@ -480,7 +481,7 @@ TEST_F(MethodsTest, GetPathsLeavesRowsForNumbersBeyondTheEndUnset) {
 TEST_F(MethodsTest, GetPathsOfNothingYieldsColumnsWithoutRows) {
     const Value instance = filled(smallListing());
     const std::vector<Value> outputs =
-        host.call(2, instance, "getPaths", Value::column({}));
+        host_.call(2, instance, "getPaths", Value::column({}));
     EXPECT_EQ(outputs[0].dimensions(), (Dimensions{0, 1}));
     EXPECT_EQ(outputs[1].dimensions(), (Dimensions{0, 1}));
 }
@@ -489,7 +490,7 @@ TEST_F(MethodsTest, GetPathsReadsRealPartsOfComplexNumbers) {
     const Value instance = filled(smallListing());
     const Value numbers = Value::complexDoubles({1, 2}, {2, 40, 4, 50});
     const Value paths =
-        host.call(1, instance, "getPaths", numbers, Value::text(u"/"))[0];
+        host_.call(1, instance, "getPaths", numbers, Value::text(u"/"))[0];
     EXPECT_EQ(textsOf(paths), (Texts{u"/usr/bin/ls", u"/usr/lib/gcc/cc1"}));
 }
 
@@ -501,19 +502,19 @@ TEST_F(MethodsTest, IterationYieldsComponentsAsColumnsOfRows) {
 
 TEST_F(MethodsTest, ResetStartsFromTheFirstPathAgain) {
     const Value instance = filled(smallListing());
-    host.call(0, instance, "reset");
-    host.call(1, instance, "getNextPath");
-    host.call(1, instance, "getNextPath");
+    host_.call(0, instance, "reset");
+    host_.call(1, instance, "getNextPath");
+    host_.call(1, instance, "getNextPath");
     EXPECT_EQ(iterated(instance), pathsOf(smallListing()));
 }
 
 TEST_F(MethodsTest, IterationSurvivesOtherCalls) {
     const Value instance = filled(smallListing());
-    host.call(0, instance, "reset");
-    host.call(1, instance, "getNextPath");
-    host.call(2, instance, "serialize");
+    host_.call(0, instance, "reset");
+    host_.call(1, instance, "getNextPath");
+    host_.call(2, instance, "serialize");
     fetched(instance, {1, 5});
-    EXPECT_EQ(textsOf(host.call(1, instance, "getNextPath")[0]),
+    EXPECT_EQ(textsOf(host_.call(1, instance, "getNextPath")[0]),
               (Texts{u"/", u"usr", u"bin", u"ls"}));
 }
 
@@ -521,7 +522,7 @@ TEST_F(MethodsTest, GetNextPathAfterTheLastIsHostErrorWithNativeText) {
     const Value instance = filled(smallListing());
     iterated(instance);
     const HostException error =
-        errorOf([&] { host.call(1, instance, "getNextPath"); });
+        errorOf([&] { host_.call(1, instance, "getNextPath"); });
     EXPECT_EQ(error.identifier(), "VELOX:embedded:nativeError");
     EXPECT_EQ(
         argumentsOf(error),
@@ -530,21 +531,21 @@ TEST_F(MethodsTest, GetNextPathAfterTheLastIsHostErrorWithNativeText) {
 
 TEST_F(MethodsTest, HasNextPathWithoutOutputRequestedStillReturnsItsValue) {
     const Value instance = filled(smallListing());
-    host.call(0, instance, "reset");
-    const std::vector<Value> outputs = host.call(0, instance, "hasNextPath");
+    host_.call(0, instance, "reset");
+    const std::vector<Value> outputs = host_.call(0, instance, "hasNextPath");
     ASSERT_EQ(outputs.size(), 1U);
     EXPECT_EQ(outputs[0], Value::logical(true));
     iterated(instance);
-    EXPECT_EQ(host.call(0, instance, "hasNextPath")[0], Value::logical(false));
+    EXPECT_EQ(host_.call(0, instance, "hasNextPath")[0], Value::logical(false));
 }
 
 // --- serialize ---------------------------------------------------------------
 
 TEST_F(MethodsTest, SerializeYieldsTreeStringAndBytes) {
     const Value instance = filled(smallListing());
-    const std::vector<Value> outputs = host.call(2, instance, "serialize");
+    const std::vector<Value> outputs = host_.call(2, instance, "serialize");
     ASSERT_EQ(outputs.size(), 2U);
-    EXPECT_EQ(outputs[0], host.get(instance, "StringTree"));
+    EXPECT_EQ(outputs[0], host_.get(instance, "StringTree"));
     EXPECT_EQ(outputs[1].valueClass(), ValueClass::Uint8);
     EXPECT_EQ(outputs[1].dimensions(), (Dimensions{outputs[1].numel(), 1}));
 }
@@ -570,10 +571,10 @@ TEST_F(MethodsTest, SerializeYieldsTheCodersOwnForm) {
 
 TEST_F(MethodsTest, SerializeWithOneOutputYieldsTreeStringAlone) {
     const Value instance = filled(smallListing());
-    EXPECT_EQ(host.call(1, instance, "serialize").size(), 1U);
-    const std::vector<Value> unasked = host.call(0, instance, "serialize");
+    EXPECT_EQ(host_.call(1, instance, "serialize").size(), 1U);
+    const std::vector<Value> unasked = host_.call(0, instance, "serialize");
     ASSERT_EQ(unasked.size(), 1U);  // always filled
-    EXPECT_EQ(unasked[0], host.get(instance, "StringTree"));
+    EXPECT_EQ(unasked[0], host_.get(instance, "StringTree"));
 }
 
 // --- Argument counts ---------------------------------------------------------
@@ -597,7 +598,7 @@ TEST_F(MethodsTest, DispatchChecksOutputsThenInputsThenTypes) {
             const std::vector<const Value*> list(
                 static_cast<std::size_t>(inputs), &x);
             return errorOf([&] {
-                       host.callWith(outputs, instance, limits.method, list);
+                       host_.callWith(outputs, instance, limits.method, list);
                    })
                 .identifier();
         };
@@ -618,8 +619,9 @@ TEST_F(MethodsTest, ConstructorCountsAreCheckedOutputsFirst) {
     const Value x = Value::scalar(1);
     const auto called = [&](std::int32_t outputs, std::size_t inputs) {
         const std::vector<const Value*> list(inputs, &x);
-        return errorOf(
-                   [&] { host.constructWith(filesetClassName, list, outputs); })
+        return errorOf([&] {
+                   host_.constructWith(filesetClassName, list, outputs);
+               })
             .identifier();
     };
     EXPECT_EQ(called(2, 5), "VELOX:embedded:tooManyOutputs");

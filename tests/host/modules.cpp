@@ -15,7 +15,7 @@ protected:
     // The key of the error, and its arguments, the file left out.
     std::pair<std::string, std::vector<std::string>> refusal(
         const std::filesystem::path& file) {
-        const HostException error = errorOf([&] { host.loadModule(file); });
+        const HostException error = errorOf([&] { host_.loadModule(file); });
         std::vector<std::string> arguments = argumentsOf(error);
         EXPECT_EQ(arguments.front(), file.string());
         arguments.erase(arguments.begin());
@@ -33,7 +33,7 @@ protected:
         return handle != nullptr;
     }
 
-    Host host{testOptions()};
+    Host host_{testOptions()};
 };
 
 }  // namespace
@@ -74,51 +74,52 @@ TEST_F(ModulesTest, FailingEntryIsReportedAndLeavesNothing) {
     EXPECT_EQ(key, "VELOX:embedded:entryFailed");
     EXPECT_EQ(arguments,
               (std::vector<std::string>{"This module never starts."}));
-    EXPECT_TRUE(host.classNames().empty());
+    EXPECT_TRUE(host_.classNames().empty());
     EXPECT_FALSE(isMapped(QZTESSEL_FAILING_ENTRY));
 }
 
 TEST_F(ModulesTest, LoadingAfterUnloadingWorksAgainAndAgain) {
     for (int round = 0; round < 3; ++round) {
-        host.loadModule(pluginFile());
-        EXPECT_TRUE(host.hasClass(filesetClassName));
-        Value instance = host.construct(filesetClassName, Value::text(u"files"),
-                                        foldersAndFiles(smallListing()));
+        host_.loadModule(pluginFile());
+        EXPECT_TRUE(host_.hasClass(filesetClassName));
+        Value instance =
+            host_.construct(filesetClassName, Value::text(u"files"),
+                            foldersAndFiles(smallListing()));
         instance = Value();
-        host.unloadModule(pluginFile());
-        EXPECT_FALSE(host.hasClass(filesetClassName));
+        host_.unloadModule(pluginFile());
+        EXPECT_FALSE(host_.hasClass(filesetClassName));
         EXPECT_FALSE(isMapped(pluginFile()));
     }
 }
 
 TEST_F(ModulesTest, UnloadingIsRefusedWhileInstancesLive) {
-    host.loadModule(pluginFile());
-    Value instance = host.construct(filesetClassName);
-    const Value other = host.construct(filesetClassName);
+    host_.loadModule(pluginFile());
+    Value instance = host_.construct(filesetClassName);
+    const Value other = host_.construct(filesetClassName);
     const HostException error =
-        errorOf([&] { host.unloadModule(pluginFile()); });
+        errorOf([&] { host_.unloadModule(pluginFile()); });
     EXPECT_EQ(error.identifier(), "VELOX:embedded:moduleInUse");
     EXPECT_EQ(argumentsOf(error).back(), "2");
-    EXPECT_EQ(errorOf([&] { host.removeClasses(pluginFile()); }).identifier(),
+    EXPECT_EQ(errorOf([&] { host_.removeClasses(pluginFile()); }).identifier(),
               "VELOX:embedded:moduleInUse");
-    host.call(0, instance, "reset");
+    host_.call(0, instance, "reset");
     instance = Value();
-    host.destroy(other);
-    host.unloadModule(pluginFile());
+    host_.destroy(other);
+    host_.unloadModule(pluginFile());
     EXPECT_FALSE(isMapped(pluginFile()));
 }
 
 TEST_F(ModulesTest, UnloadingWhatIsNotLoadedIsReported) {
-    EXPECT_EQ(errorOf([&] { host.unloadModule(pluginFile()); }).identifier(),
+    EXPECT_EQ(errorOf([&] { host_.unloadModule(pluginFile()); }).identifier(),
               "VELOX:embedded:moduleNotLoaded");
 }
 
 TEST_F(ModulesTest, ModuleIsKnownUnderEveryNameOfItsFile) {
     const std::filesystem::path link = uniqueName("plugin-link.so");
     std::filesystem::create_symlink(pluginFile(), link);
-    host.loadModule(link);
-    host.loadModule(pluginFile());
-    host.unloadModule(link);
+    host_.loadModule(link);
+    host_.loadModule(pluginFile());
+    host_.unloadModule(link);
     EXPECT_FALSE(isMapped(pluginFile()));
     std::filesystem::remove(link);
 }

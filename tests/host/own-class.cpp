@@ -38,19 +38,19 @@ public:
     TestMethod(Behaviour& classBehaviour, HostInterface& hostInterface,
                std::string methodName, HostSignature* heldSignature,
                Body methodBody)
-        : behaviour(classBehaviour),
-          host(hostInterface),
-          ownName(std::move(methodName)),
-          held(heldSignature),
-          body(std::move(methodBody)) {}
+        : behaviour_(classBehaviour),
+          host_(hostInterface),
+          ownName_(std::move(methodName)),
+          held_(heldSignature),
+          body_(std::move(methodBody)) {}
     ~TestMethod() override {
-        host.hostReleaseSignature(held);
-        behaviour.released.push_back(ownName);
+        host_.hostReleaseSignature(held_);
+        behaviour_.released.push_back(ownName_);
     }
 
-    const char* name() const noexcept override { return ownName.c_str(); }
-    const HostSignature* signature() const noexcept override { return held; }
-    void execute(HostFrame& frame) override { body(frame); }
+    const char* name() const noexcept override { return ownName_.c_str(); }
+    const HostSignature* signature() const noexcept override { return held_; }
+    void execute(HostFrame& frame) override { body_(frame); }
     HostAccess access() const noexcept override { return ownAccess; }
     bool isStatic() const noexcept override { return callsStatically; }
     bool isAbstract() const noexcept override { return hasNoBody; }
@@ -62,11 +62,11 @@ public:
     bool shown = true;
 
 private:
-    Behaviour& behaviour;
-    HostInterface& host;
-    std::string ownName;
-    HostSignature* held;
-    Body body;
+    Behaviour& behaviour_;
+    HostInterface& host_;
+    std::string ownName_;
+    HostSignature* held_;
+    Body body_;
 };
 
 HostArray* getNumber(void* native) {
@@ -88,36 +88,37 @@ public:
     using Define = std::function<void(TestClass&, HostClass*)>;
     TestClass(Behaviour& classBehaviour, HostInterface& hostInterface,
               Define defineMethods)
-        : behaviour(classBehaviour),
-          host(hostInterface),
-          define(std::move(defineMethods)) {}
-    ~TestClass() override { behaviour.released.emplace_back("the class"); }
+        : behaviour_(classBehaviour),
+          host_(hostInterface),
+          define_(std::move(defineMethods)) {}
+    ~TestClass() override { behaviour_.released.emplace_back("the class"); }
 
     const char* className() const noexcept override { return "Counter"; }
     void defineMembers(HostClass* definedClass) override {
-        define(*this, definedClass);
-        host.hostAddProperty(
-            definedClass, {"Number", "A number", behaviour.typeName.c_str(),
-                           behaviour.bits, HostAccess::Public,
-                           behaviour.setAccess, getNumber, setNumber, dispose});
-        if (behaviour.failsToDefine) throw std::runtime_error("No members.");
+        define_(*this, definedClass);
+        host_.hostAddProperty(
+            definedClass,
+            {"Number", "A number", behaviour_.typeName.c_str(), behaviour_.bits,
+             HostAccess::Public, behaviour_.setAccess, getNumber, setNumber,
+             dispose});
+        if (behaviour_.failsToDefine) throw std::runtime_error("No members.");
     }
     void* createNativeObject() override {
-        ++behaviour.made;
+        ++behaviour_.made;
         return new Counter();
     }
     void destroyNativeObject(void* native) noexcept override {
-        ++behaviour.destroyed;
+        ++behaviour_.destroyed;
         delete static_cast<Counter*>(native);
     }
     void updateInstance(void* native) override {
         ++static_cast<Counter*>(native)->updates;
     }
-    bool copiesInstances() const noexcept override { return behaviour.copies; }
-    bool savesInstances() const noexcept override { return behaviour.saves; }
-    bool isHidden() const noexcept override { return behaviour.hidden; }
+    bool copiesInstances() const noexcept override { return behaviour_.copies; }
+    bool savesInstances() const noexcept override { return behaviour_.saves; }
+    bool isHidden() const noexcept override { return behaviour_.hidden; }
     HostArray* customSave(const HostArray* /*instance*/) override {
-        return behaviour.custom ? new Value(Value::text(u"custom")) : nullptr;
+        return behaviour_.custom ? new Value(Value::text(u"custom")) : nullptr;
     }
 
     struct Types {
@@ -128,26 +129,26 @@ public:
     };
     TestMethod& addMethod(HostClass* definedClass, const char* name,
                           const Types& types, TestMethod::Body body) {
-        HostSignature* const signature = host.hostCreateSignature();
+        HostSignature* const signature = host_.hostCreateSignature();
         for (const char* type : types.inputs) {
-            host.hostSignatureAddInput(signature, type, "input");
+            host_.hostSignatureAddInput(signature, type, "input");
         }
         for (const char* type : types.outputs) {
-            host.hostSignatureAddOutput(signature, type, "output");
+            host_.hostSignatureAddOutput(signature, type, "output");
         }
-        if (types.optionalTail) host.hostSignatureMarkOptionalTail(signature);
-        if (types.fewerOutputs) host.hostSignatureMarkOutputs(signature);
-        auto method = std::make_unique<TestMethod>(behaviour, host, name,
+        if (types.optionalTail) host_.hostSignatureMarkOptionalTail(signature);
+        if (types.fewerOutputs) host_.hostSignatureMarkOutputs(signature);
+        auto method = std::make_unique<TestMethod>(behaviour_, host_, name,
                                                    signature, std::move(body));
         TestMethod& added = *method;
-        host.hostAddMethod(definedClass, std::move(method));
+        host_.hostAddMethod(definedClass, std::move(method));
         return added;
     }
 
 private:
-    Behaviour& behaviour;
-    HostInterface& host;
-    Define define;
+    Behaviour& behaviour_;
+    HostInterface& host_;
+    Define define_;
 };
 
 constexpr const char* counterName = "velox.test.Counter";
@@ -156,15 +157,15 @@ class OwnClassTest : public testing::Test {
 protected:
     void define(const TestClass::Define& methods = [](TestClass&, HostClass*) {
     }) {
-        host.defineClass(
-            "velox.test",
-            std::make_unique<TestClass>(behaviour, host.operations(), methods));
+        host_.defineClass("velox.test",
+                          std::make_unique<TestClass>(
+                              behaviour_, host_.operations(), methods));
     }
     // A class with one method that only notes that it ran.
     void defineWithMethod(const TestClass::Types& types) {
         define([&](TestClass& own, HostClass* definedClass) {
             own.addMethod(definedClass, "run", types, [&](HostFrame& frame) {
-                ++runs;
+                ++runs_;
                 for (std::int32_t i = 0; i < frame.outputCount; ++i) {
                     frame.outputs[i] = new Value(Value::scalar(i));
                 }
@@ -184,17 +185,17 @@ protected:
     }
     std::string keyOfCall(std::int32_t requested, std::size_t inputs,
                           const Value& input = Value::scalar(1)) {
-        const Value instance = host.construct(counterName);
+        const Value instance = host_.construct(counterName);
         const std::vector<const Value*> list(inputs, &input);
-        return key([&] { host.callWith(requested, instance, "run", list); });
+        return key([&] { host_.callWith(requested, instance, "run", list); });
     }
     static double number(const Value& value) {
         return value.doubleData().at(0);
     }
 
-    Behaviour behaviour;
-    int runs = 0;
-    Host host{testOptions()};
+    Behaviour behaviour_;
+    int runs_ = 0;
+    Host host_{testOptions()};
 };
 
 }  // namespace
@@ -204,31 +205,31 @@ protected:
 TEST_F(OwnClassTest, ClassIsRegisteredOnce) {
     define();
     EXPECT_EQ(key([&] { define(); }), "classExists");
-    EXPECT_EQ(host.classNames(), (std::vector<std::string>{counterName}));
+    EXPECT_EQ(host_.classNames(), (std::vector<std::string>{counterName}));
 }
 
 TEST_F(OwnClassTest, ClassThatFailsToDefineIsForgottenAndReleased) {
-    behaviour.failsToDefine = true;
+    behaviour_.failsToDefine = true;
     const auto methods = [](TestClass& own, HostClass* definedClass) {
         for (const char* name : {"first", "second", "third"}) {
             own.addMethod(definedClass, name, {}, [](HostFrame&) {});
         }
     };
     EXPECT_THROW(define(methods), std::runtime_error);
-    EXPECT_FALSE(host.hasClass(counterName));
+    EXPECT_FALSE(host_.hasClass(counterName));
     EXPECT_EQ(
-        behaviour.released,
+        behaviour_.released,
         (std::vector<std::string>{"third", "second", "first", "the class"}));
-    behaviour.failsToDefine = false;
+    behaviour_.failsToDefine = false;
     define(methods);
-    EXPECT_TRUE(host.hasClass(counterName));
+    EXPECT_TRUE(host_.hasClass(counterName));
 }
 
 TEST_F(OwnClassTest, MembersCanOnlyBeAddedDuringDefinition) {
     HostClass* kept = nullptr;
     define([&](TestClass&, HostClass* definedClass) { kept = definedClass; });
     EXPECT_EQ(key([&] {
-                  host.operations().hostAddProperty(
+                  host_.operations().hostAddProperty(
                       kept,
                       {"Late", nullptr, "any", 0, HostAccess::Public,
                        HostAccess::Public, getNumber, setNumber, dispose});
@@ -237,20 +238,21 @@ TEST_F(OwnClassTest, MembersCanOnlyBeAddedDuringDefinition) {
 }
 
 TEST_F(OwnClassTest, HiddenClassIsNotListed) {
-    behaviour.hidden = true;
+    behaviour_.hidden = true;
     define();
-    EXPECT_TRUE(host.classNames().empty());
-    EXPECT_TRUE(host.isValid(host.construct(counterName)));
+    EXPECT_TRUE(host_.classNames().empty());
+    EXPECT_TRUE(host_.isValid(host_.construct(counterName)));
 }
 
 TEST_F(OwnClassTest, UnknownNamesAreReported) {
     define();
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(key([&] { host.construct("velox.test.Nothing"); }),
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(key([&] { host_.construct("velox.test.Nothing"); }),
               "classMissing");
-    EXPECT_EQ(key([&] { host.call(0, instance, "nothing"); }), "methodMissing");
-    EXPECT_EQ(key([&] { host.get(instance, "Nothing"); }), "propertyMissing");
-    EXPECT_EQ(key([&] { host.call(0, Value::scalar(1), "run"); }),
+    EXPECT_EQ(key([&] { host_.call(0, instance, "nothing"); }),
+              "methodMissing");
+    EXPECT_EQ(key([&] { host_.get(instance, "Nothing"); }), "propertyMissing");
+    EXPECT_EQ(key([&] { host_.call(0, Value::scalar(1), "run"); }),
               "notAnInstance");
 }
 
@@ -262,26 +264,26 @@ TEST_F(OwnClassTest, CountsMustBeTheDeclaredOnes) {
     EXPECT_EQ(keyOfCall(1, 2), "tooFewOutputs");
     EXPECT_EQ(keyOfCall(2, 2), "tooManyInputs");
     EXPECT_EQ(keyOfCall(2, 0), "tooFewInputs");
-    EXPECT_EQ(runs, 0);
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(host.call(2, instance, "run", Value()).size(), 2U);
-    EXPECT_EQ(host.call(0, instance, "run", Value()).size(), 0U);
-    EXPECT_EQ(runs, 2);
+    EXPECT_EQ(runs_, 0);
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(host_.call(2, instance, "run", Value()).size(), 2U);
+    EXPECT_EQ(host_.call(0, instance, "run", Value()).size(), 0U);
+    EXPECT_EQ(runs_, 2);
 }
 
 TEST_F(OwnClassTest, OptionalTailLeavesCountsToTheMethod) {
     defineWithMethod({{counterName, "any", "any"}, {"any", "any"}, true});
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(host.call(1, instance, "run").size(), 1U);
-    EXPECT_EQ(host.call(2, instance, "run", Value()).size(), 2U);
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(host_.call(1, instance, "run").size(), 1U);
+    EXPECT_EQ(host_.call(2, instance, "run", Value()).size(), 2U);
     EXPECT_EQ(keyOfCall(3, 0), "tooManyOutputs");
     EXPECT_EQ(keyOfCall(1, 3), "tooManyInputs");
 }
 
 TEST_F(OwnClassTest, OutputsMarkAllowsFewerOutputs) {
     defineWithMethod({{counterName}, {"any", "any"}, false, true});
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(host.call(1, instance, "run").size(), 1U);
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(host_.call(1, instance, "run").size(), 1U);
     EXPECT_EQ(keyOfCall(1, 1), "tooManyInputs");
 }
 
@@ -291,10 +293,10 @@ TEST_F(OwnClassTest, DeclaredTypesAreCheckedBeforeTheMethodRuns) {
             for (const char* type : {"char", "cell", "double", "uint8",
                                      "logical", "struct", counterName, "any"}) {
                 own.addMethod(definedClass, type, {{counterName, type}},
-                              [&](HostFrame&) { ++runs; });
+                              [&](HostFrame&) { ++runs_; });
             }
         });
-        return host.construct(counterName);
+        return host_.construct(counterName);
     }();
     const std::vector<std::pair<std::string, Value>> values = {
         {"char", Value::text(u"x")},
@@ -307,33 +309,34 @@ TEST_F(OwnClassTest, DeclaredTypesAreCheckedBeforeTheMethodRuns) {
     for (const auto& [type, ignored] : values) {
         for (const auto& [given, value] : values) {
             if (type == given) {
-                host.call(0, instance, type, value);
+                host_.call(0, instance, type, value);
                 continue;
             }
             const HostException error = errorOf(
-                [&, &t = type, &v = value] { host.call(0, instance, t, v); });
+                [&, &t = type, &v = value] { host_.call(0, instance, t, v); });
             EXPECT_EQ(error.identifier(), "VELOX:embedded:wrongType");
             EXPECT_EQ(argumentsOf(error),
                       (std::vector<std::string>{"input", type, given}));
         }
-        host.call(0, instance, "any", instance);
+        host_.call(0, instance, "any", instance);
     }
-    EXPECT_EQ(runs, 14);
+    EXPECT_EQ(runs_, 14);
 }
 
 TEST_F(OwnClassTest, ComplexDoubleIsDouble) {
     defineWithMethod({{counterName, "double"}, {}});
-    const Value instance = host.construct(counterName);
-    host.call(0, instance, "run", Value::complexDoubles({1, 1}, {1, 2}));
-    EXPECT_EQ(runs, 1);
+    const Value instance = host_.construct(counterName);
+    host_.call(0, instance, "run", Value::complexDoubles({1, 1}, {1, 2}));
+    EXPECT_EQ(runs_, 1);
 }
 
 TEST_F(OwnClassTest, UnassignedRequestedOutputIsReportedAndTheRestReleased) {
     defineWithBody({"any", "any"}, [](HostFrame& frame) {
         frame.outputs[0] = new Value(Value::scalar(1));
     });
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(key([&] { host.call(2, instance, "run"); }), "outputNotAssigned");
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(key([&] { host_.call(2, instance, "run"); }),
+              "outputNotAssigned");
 }
 
 TEST_F(OwnClassTest, OutputsOfMethodThatThrowsAreReleased) {
@@ -341,8 +344,9 @@ TEST_F(OwnClassTest, OutputsOfMethodThatThrowsAreReleased) {
         frame.outputs[0] = new Value(Value::scalar(1));
         throw std::runtime_error("After all.");
     });
-    const Value instance = host.construct(counterName);
-    const HostException error = errorOf([&] { host.call(1, instance, "run"); });
+    const Value instance = host_.construct(counterName);
+    const HostException error =
+        errorOf([&] { host_.call(1, instance, "run"); });
     EXPECT_EQ(argumentsOf(error),
               (std::vector<std::string>{"run", "After all."}));
 }
@@ -350,13 +354,13 @@ TEST_F(OwnClassTest, OutputsOfMethodThatThrowsAreReleased) {
 TEST_F(OwnClassTest, WhatMethodsThrowBecomesHostErrors) {
     std::function<void()> action;
     defineWithBody({}, [&](HostFrame&) { action(); });
-    const Value instance = host.construct(counterName);
-    const auto call = [&] { host.call(0, instance, "run"); };
+    const Value instance = host_.construct(counterName);
+    const auto call = [&] { host_.call(0, instance, "run"); };
     action = [] { throw std::bad_alloc(); };
     EXPECT_EQ(key(call), "outOfMemory");
     action = [] { throw 42; };
     EXPECT_EQ(key(call), "nativeError");
-    action = [&] { host.operations().hostErrorTooFewInputs(); };
+    action = [&] { host_.operations().hostErrorTooFewInputs(); };
     EXPECT_EQ(key(call), "tooFewInputs");
 }
 
@@ -365,9 +369,9 @@ TEST_F(OwnClassTest, ConstructorThatThrowsLeavesNoInstance) {
         own.addMethod(definedClass, "Counter", {{}, {counterName}},
                       [](HostFrame&) { throw std::runtime_error("No."); });
     });
-    EXPECT_EQ(key([&] { host.construct(counterName); }), "nativeError");
-    EXPECT_EQ(behaviour.made, 1);
-    EXPECT_EQ(behaviour.destroyed, 1);
+    EXPECT_EQ(key([&] { host_.construct(counterName); }), "nativeError");
+    EXPECT_EQ(behaviour_.made, 1);
+    EXPECT_EQ(behaviour_.destroyed, 1);
 }
 
 TEST_F(OwnClassTest, ConstructorFindsItsInstanceInTheFirstOutput) {
@@ -379,17 +383,18 @@ TEST_F(OwnClassTest, ConstructorFindsItsInstanceInTheFirstOutput) {
                 setNumber(made.instance(0)->native(), frame.inputs[0]);
             });
     });
-    EXPECT_EQ(number(host.get(host.construct(counterName, Value::scalar(7)),
-                              "Number")),
+    EXPECT_EQ(number(host_.get(host_.construct(counterName, Value::scalar(7)),
+                               "Number")),
               7);
-    const Value instance = host.construct(counterName, Value::scalar(7));
-    EXPECT_EQ(key([&] { host.call(1, instance, "Counter", Value::scalar(1)); }),
-              "methodMissing");
+    const Value instance = host_.construct(counterName, Value::scalar(7));
+    EXPECT_EQ(
+        key([&] { host_.call(1, instance, "Counter", Value::scalar(1)); }),
+        "methodMissing");
 }
 
 TEST_F(OwnClassTest, ClassWithoutConstructorTakesNoInputs) {
     define();
-    EXPECT_EQ(key([&] { host.construct(counterName, Value()); }),
+    EXPECT_EQ(key([&] { host_.construct(counterName, Value()); }),
               "tooManyInputs");
 }
 
@@ -397,96 +402,96 @@ TEST_F(OwnClassTest, MethodAttributesAreHonoured) {
     define([&](TestClass& own, HostClass* definedClass) {
         const auto add = [&](const char* name) -> TestMethod& {
             return own.addMethod(definedClass, name, {{}, {}, true},
-                                 [&](HostFrame&) { ++runs; });
+                                 [&](HostFrame&) { ++runs_; });
         };
         add("restricted").ownAccess = HostAccess::Restricted;
         add("static").callsStatically = true;
         add("abstract").hasNoBody = true;
         add("invisible").shown = false;
     });
-    EXPECT_EQ(host.methodNames(counterName),
+    EXPECT_EQ(host_.methodNames(counterName),
               (std::vector<std::string>{"restricted", "static", "abstract"}));
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     const auto called = [&](const char* name) {
-        return key([&] { host.call(0, instance, name); });
+        return key([&] { host_.call(0, instance, name); });
     };
     EXPECT_EQ(called("restricted"), "methodRestricted");
     EXPECT_EQ(called("static"), "methodMissing");
     EXPECT_EQ(called("abstract"), "methodMissing");
-    EXPECT_EQ(runs, 0);
-    host.callStatic(0, counterName, "static", {});
-    EXPECT_EQ(runs, 1);
+    EXPECT_EQ(runs_, 0);
+    host_.callStatic(0, counterName, "static", {});
+    EXPECT_EQ(runs_, 1);
 }
 
 // --- Instances ---------------------------------------------------------------
 
 TEST_F(OwnClassTest, NativeObjectGoesWithTheLastValue) {
     define();
-    std::optional<Value> first = host.construct(counterName);
+    std::optional<Value> first = host_.construct(counterName);
     std::optional<Value> second = *first;
     Value cell = Value::cell({1, 1});
     cell.setElement(0, *second);
     first.reset();
     second.reset();
-    EXPECT_EQ(behaviour.destroyed, 0);
+    EXPECT_EQ(behaviour_.destroyed, 0);
     cell = Value();
-    EXPECT_EQ(behaviour.destroyed, 1);
-    EXPECT_EQ(behaviour.made, 1);
+    EXPECT_EQ(behaviour_.destroyed, 1);
+    EXPECT_EQ(behaviour_.made, 1);
 }
 
 TEST_F(OwnClassTest, DestroyedInstanceIsDestroyedOnce) {
     define();
     {
-        const Value instance = host.construct(counterName);
-        host.destroy(instance);
-        EXPECT_EQ(behaviour.destroyed, 1);
+        const Value instance = host_.construct(counterName);
+        host_.destroy(instance);
+        EXPECT_EQ(behaviour_.destroyed, 1);
     }
-    EXPECT_EQ(behaviour.destroyed, 1);
+    EXPECT_EQ(behaviour_.destroyed, 1);
 }
 
 // --- Properties --------------------------------------------------------------
 
 TEST_F(OwnClassTest, PublicPropertyIsReadAndWritten) {
     define();
-    const Value instance = host.construct(counterName);
-    host.set(instance, "Number", Value::scalar(5));
-    EXPECT_EQ(number(host.get(instance, "Number")), 5);
-    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::text(u"5")); }),
+    const Value instance = host_.construct(counterName);
+    host_.set(instance, "Number", Value::scalar(5));
+    EXPECT_EQ(number(host_.get(instance, "Number")), 5);
+    EXPECT_EQ(key([&] { host_.set(instance, "Number", Value::text(u"5")); }),
               "wrongType");
-    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::scalar(-1)); }),
+    EXPECT_EQ(key([&] { host_.set(instance, "Number", Value::scalar(-1)); }),
               "nativeError");
-    EXPECT_EQ(number(host.get(instance, "Number")), 5);
+    EXPECT_EQ(number(host_.get(instance, "Number")), 5);
 }
 
 TEST_F(OwnClassTest, RestrictedSetterIsRefusedToUsersAllowedToLoadAndCopy) {
-    behaviour.setAccess = HostAccess::Restricted;
+    behaviour_.setAccess = HostAccess::Restricted;
     define();
     Value saved = Value::structure();
     saved.setField("Number", Value::scalar(8));
-    const Value loaded = host.load(counterName, saved);
-    EXPECT_EQ(key([&] { host.set(loaded, "Number", Value::scalar(1)); }),
+    const Value loaded = host_.load(counterName, saved);
+    EXPECT_EQ(key([&] { host_.set(loaded, "Number", Value::scalar(1)); }),
               "propertyRestricted");
-    EXPECT_EQ(number(host.get(host.copy(loaded), "Number")), 8);
+    EXPECT_EQ(number(host_.get(host_.copy(loaded), "Number")), 8);
 }
 
 TEST_F(OwnClassTest, OnlyPropertiesCopiedWithTheInstanceAreCopied) {
-    behaviour.bits = attr::isVisible;
+    behaviour_.bits = attr::isVisible;
     define();
-    const Value instance = host.construct(counterName);
-    host.set(instance, "Number", Value::scalar(5));
-    EXPECT_EQ(number(host.get(host.copy(instance), "Number")), 0);
+    const Value instance = host_.construct(counterName);
+    host_.set(instance, "Number", Value::scalar(5));
+    EXPECT_EQ(number(host_.get(host_.copy(instance), "Number")), 0);
 }
 
 class UnsavedProperty : public OwnClassTest,
                         public testing::WithParamInterface<std::uint32_t> {};
 
 TEST_P(UnsavedProperty, IsNeitherSavedNorLoaded) {
-    behaviour.bits = GetParam();
+    behaviour_.bits = GetParam();
     define();
-    EXPECT_TRUE(host.save(host.construct(counterName)).fieldNames().empty());
+    EXPECT_TRUE(host_.save(host_.construct(counterName)).fieldNames().empty());
     Value saved = Value::structure();
     saved.setField("Number", Value::scalar(8));
-    const Value loaded = host.load(counterName, saved);
+    const Value loaded = host_.load(counterName, saved);
     EXPECT_EQ(static_cast<Counter*>(loaded.instance(0)->native())->number, 0);
 }
 
@@ -495,97 +500,98 @@ INSTANTIATE_TEST_SUITE_P(Bits, UnsavedProperty,
                                          attr::isStatic, attr::isAbstract));
 
 TEST_F(OwnClassTest, AbstractPropertyHasNoValue) {
-    behaviour.bits = attr::isAbstract;
+    behaviour_.bits = attr::isAbstract;
     define();
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(key([&] { host.get(instance, "Number"); }), "propertyHasNoValue");
-    EXPECT_EQ(key([&] { host.set(instance, "Number", Value::scalar(1)); }),
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(key([&] { host_.get(instance, "Number"); }),
+              "propertyHasNoValue");
+    EXPECT_EQ(key([&] { host_.set(instance, "Number", Value::scalar(1)); }),
               "propertyHasNoValue");
 }
 
 TEST_F(OwnClassTest, StaticPropertyHasNoNativeObject) {
-    behaviour.bits = attr::isStatic;
+    behaviour_.bits = attr::isStatic;
     define();
-    EXPECT_EQ(number(host.get(host.construct(counterName), "Number")), -1);
+    EXPECT_EQ(number(host_.get(host_.construct(counterName), "Number")), -1);
 }
 
 TEST_F(OwnClassTest, InvisiblePropertyIsNotListed) {
-    behaviour.bits = attr::copiedWithInstance;
+    behaviour_.bits = attr::copiedWithInstance;
     define();
-    EXPECT_TRUE(host.propertyNames(counterName).empty());
+    EXPECT_TRUE(host_.propertyNames(counterName).empty());
 }
 
 TEST_F(OwnClassTest, InspectionShowsPropertiesThatAllowIt) {
-    behaviour.bits = attr::inspectionAllowed;
+    behaviour_.bits = attr::inspectionAllowed;
     define();
-    const Value shown = host.inspect(host.construct(counterName));
+    const Value shown = host_.inspect(host_.construct(counterName));
     EXPECT_EQ(shown.field("Number"), Value::scalar(0));
 }
 
 TEST_F(OwnClassTest, ListenersAreNotifiedWhereAllowed) {
-    behaviour.bits = attr::getListenersAllowed | attr::setListenersAllowed;
+    behaviour_.bits = attr::getListenersAllowed | attr::setListenersAllowed;
     define();
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     int gets = 0;
     int sets = 0;
-    host.listen(instance, "Number", ListenerKind::Get, [&] { ++gets; });
-    host.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
-    host.set(instance, "Number", Value::scalar(1));
-    host.get(instance, "Number");
-    host.get(instance, "Number");
+    host_.listen(instance, "Number", ListenerKind::Get, [&] { ++gets; });
+    host_.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
+    host_.set(instance, "Number", Value::scalar(1));
+    host_.get(instance, "Number");
+    host_.get(instance, "Number");
     EXPECT_EQ(gets, 2);
     EXPECT_EQ(sets, 1);
 }
 
 TEST_F(OwnClassTest, UnchangedValueAbortsTheSetWhereSoMarked) {
-    behaviour.bits = attr::abortSetWhenUnchanged | attr::setListenersAllowed;
+    behaviour_.bits = attr::abortSetWhenUnchanged | attr::setListenersAllowed;
     define();
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     int sets = 0;
-    host.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
-    host.set(instance, "Number", Value::scalar(0));
+    host_.listen(instance, "Number", ListenerKind::Set, [&] { ++sets; });
+    host_.set(instance, "Number", Value::scalar(0));
     EXPECT_EQ(sets, 0);
-    host.set(instance, "Number", Value::scalar(1));
+    host_.set(instance, "Number", Value::scalar(1));
     EXPECT_EQ(sets, 1);
 }
 
 TEST_F(OwnClassTest, CopyErrorOnlyWarnsWhereSoMarked) {
-    behaviour.bits = attr::copiedWithInstance | attr::warnOnCopyError;
+    behaviour_.bits = attr::copiedWithInstance | attr::warnOnCopyError;
     define();
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     static_cast<Counter*>(instance.instance(0)->native())->number = -3;
-    EXPECT_TRUE(host.isValid(host.copy(instance)));
+    EXPECT_TRUE(host_.isValid(host_.copy(instance)));
     EXPECT_EQ(
-        host.copyWarnings(),
+        host_.copyWarnings(),
         (std::vector<std::string>{"Number: 'Number' failed: Too small."}));
 }
 
 TEST_F(OwnClassTest, CopyErrorIsRaisedOtherwiseAndLeavesNoInstance) {
     define();
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     static_cast<Counter*>(instance.instance(0)->native())->number = -3;
-    EXPECT_EQ(key([&] { host.copy(instance); }), "nativeError");
-    EXPECT_EQ(behaviour.made, 2);
-    EXPECT_EQ(behaviour.destroyed, 1);
+    EXPECT_EQ(key([&] { host_.copy(instance); }), "nativeError");
+    EXPECT_EQ(behaviour_.made, 2);
+    EXPECT_EQ(behaviour_.destroyed, 1);
 }
 
 // --- Class attributes --------------------------------------------------------
 
 TEST_F(OwnClassTest, ClassThatDoesNotCopyOrSaveIsNotCopiedOrSaved) {
-    behaviour.copies = false;
-    behaviour.saves = false;
+    behaviour_.copies = false;
+    behaviour_.saves = false;
     define();
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(key([&] { host.copy(instance); }), "notCopyable");
-    EXPECT_EQ(key([&] { host.save(instance); }), "notSavable");
-    EXPECT_EQ(key([&] { host.load(counterName, Value::structure()); }),
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(key([&] { host_.copy(instance); }), "notCopyable");
+    EXPECT_EQ(key([&] { host_.save(instance); }), "notSavable");
+    EXPECT_EQ(key([&] { host_.load(counterName, Value::structure()); }),
               "notSavable");
 }
 
 TEST_F(OwnClassTest, CustomSaveReplacesTheHostsOwn) {
-    behaviour.custom = true;
+    behaviour_.custom = true;
     define();
-    EXPECT_EQ(host.save(host.construct(counterName)), Value::text(u"custom"));
+    EXPECT_EQ(host_.save(host_.construct(counterName)), Value::text(u"custom"));
 }
 
 TEST_F(OwnClassTest, InstanceIsUpdatedAfterLoadAndCopy) {
@@ -593,26 +599,26 @@ TEST_F(OwnClassTest, InstanceIsUpdatedAfterLoadAndCopy) {
     const auto updates = [](const Value& instance) {
         return static_cast<Counter*>(instance.instance(0)->native())->updates;
     };
-    const Value instance = host.construct(counterName);
+    const Value instance = host_.construct(counterName);
     EXPECT_EQ(updates(instance), 0);
-    EXPECT_EQ(updates(host.copy(instance)), 1);
-    EXPECT_EQ(updates(host.load(counterName, host.save(instance))), 1);
+    EXPECT_EQ(updates(host_.copy(instance)), 1);
+    EXPECT_EQ(updates(host_.load(counterName, host_.save(instance))), 1);
 }
 
 TEST_F(OwnClassTest, ExtensionFillsCopiesAndSavedForms) {
     define();
-    host.extendClass(counterName, {[](Host& own, const Value&) {
-                                       Value made = own.construct(counterName);
-                                       own.set(made, "Number",
-                                               Value::scalar(9));
-                                       return made;
-                                   },
-                                   [](Host&, const Value&, Value& saved) {
-                                       saved.setField("More", Value());
-                                   }});
-    const Value instance = host.construct(counterName);
-    EXPECT_EQ(number(host.get(host.copy(instance), "Number")), 0);
-    EXPECT_EQ(host.save(instance).fieldNames(),
+    host_.extendClass(counterName, {[](Host& own, const Value&) {
+                                        Value made = own.construct(counterName);
+                                        own.set(made, "Number",
+                                                Value::scalar(9));
+                                        return made;
+                                    },
+                                    [](Host&, const Value&, Value& saved) {
+                                        saved.setField("More", Value());
+                                    }});
+    const Value instance = host_.construct(counterName);
+    EXPECT_EQ(number(host_.get(host_.copy(instance), "Number")), 0);
+    EXPECT_EQ(host_.save(instance).fieldNames(),
               (std::vector<std::string>{"Number", "More"}));
 }
 

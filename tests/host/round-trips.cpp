@@ -102,19 +102,19 @@ protected:
     }
 
     Value throughTree(const Value& instance) {
-        const std::vector<Value> outputs = host.call(2, instance, "serialize");
+        const std::vector<Value> outputs = host_.call(2, instance, "serialize");
         return make(Value::text(u"tree"), outputs[0], outputs[1],
-                    host.get(instance, "Frequencies"));
+                    host_.get(instance, "Frequencies"));
     }
     Value throughProperties(const Value& instance) {
-        return make(Value::text(u"tree"), host.get(instance, "StringTree"),
-                    host.save(instance).field("PathTree"),
-                    host.get(instance, "Frequencies"));
+        return make(Value::text(u"tree"), host_.get(instance, "StringTree"),
+                    host_.save(instance).field("PathTree"),
+                    host_.get(instance, "Frequencies"));
     }
     Value throughFrequencies(const Value& instance, std::size_t count) {
         const Value made =
-            make(Value::text(u"frequencies"), host.get(instance, "StringTree"),
-                 host.get(instance, "Frequencies"));
+            make(Value::text(u"frequencies"), host_.get(instance, "StringTree"),
+                 host_.get(instance, "Frequencies"));
         add(made, fetched(instance, numbersTo(count)));
         return made;
     }
@@ -132,14 +132,14 @@ protected:
                  return make(Value::text(u"copy"), from);
              }},
             {"copy of the instance", true,
-             [this](const Value& from) { return host.copy(from); }},
+             [this](const Value& from) { return host_.copy(from); }},
             {"constructor, mode tree", true,
              [this](const Value& from) { return throughTree(from); }},
             {"properties", true,
              [this](const Value& from) { return throughProperties(from); }},
             {"save and load", true,
              [this](const Value& from) {
-                 return host.load(filesetClassName, host.save(from));
+                 return host_.load(filesetClassName, host_.save(from));
              }},
             {"constructor, mode frequencies", false,
              [this, count](const Value& from) {
@@ -177,7 +177,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, EveryPairOfRoutesKeepsTheContent, ()) {
     const std::size_t count = pathsOf(listing).size();
     const Value source = filled(listing);
     const Content content = contentOf(source, count);
-    const Value saved = host.save(source);
+    const Value saved = host_.save(source);
     const std::vector<Route> ways = routes(count);
     for (const Route& first : ways) {
         const Route& second = *rc::gen::elementOf(ways);
@@ -185,7 +185,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, EveryPairOfRoutesKeepsTheContent, ()) {
         const Value target = second.go(first.go(source));
         RC_ASSERT(contentOf(target, count) == content);
         if (first.isExact && second.isExact) {
-            RC_ASSERT(host.save(target) == saved);
+            RC_ASSERT(host_.save(target) == saved);
         }
     }
 }
@@ -197,7 +197,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, RestoredInstanceTakesFurtherPaths, ()) {
     if (*rc::gen::arbitrary<bool>()) {
         restored = throughTree(source);
     } else {
-        restored = host.load(filesetClassName, host.save(source));
+        restored = host_.load(filesetClassName, host_.save(source));
     }
     add(restored, listing);
     const std::vector<Texts> paths = pathsOf(listing);
@@ -210,7 +210,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, RestoredInstanceTakesFurtherPaths, ()) {
 RC_GTEST_FIXTURE_PROP(RoundTrips, RefusedAdditionChangesNothing, ()) {
     const Listing listing = randomListing();
     const Value instance = filled(listing);
-    const Value before = host.save(instance);
+    const Value before = host_.save(instance);
     Listing spoiled = randomListing();
     const auto folder = *rc::gen::inRange<std::size_t>(0, spoiled.files.size());
     const bool inFolders = *rc::gen::arbitrary<bool>();
@@ -224,7 +224,7 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, RefusedAdditionChangesNothing, ()) {
     RC_ASSERT(argumentsOf(error) ==
               (std::vector<std::string>{std::to_string(folder + 1) + ", " +
                                         std::to_string(place + 1)}));
-    RC_ASSERT(host.save(instance) == before);
+    RC_ASSERT(host_.save(instance) == before);
 }
 
 }  // namespace tessel::embedded

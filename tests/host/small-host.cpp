@@ -22,20 +22,20 @@ constexpr const char* fullName =
 // The plug-in, loaded while it lives.
 class Plugin {
 public:
-    Plugin() : handle(dlopen(QZTESSEL_PLUGIN, RTLD_NOW | RTLD_LOCAL)) {
-        if (handle == nullptr) ADD_FAILURE() << dlerror();
+    Plugin() : handle_(dlopen(QZTESSEL_PLUGIN, RTLD_NOW | RTLD_LOCAL)) {
+        if (handle_ == nullptr) ADD_FAILURE() << dlerror();
     }
     Plugin(const Plugin&) = delete;
     Plugin& operator=(const Plugin&) = delete;
-    ~Plugin() { dlclose(handle); }
+    ~Plugin() { dlclose(handle_); }
 
     void call(const char* entry) const {
-        reinterpret_cast<tessel::HostModuleEntry>(dlsym(handle, entry))();
+        reinterpret_cast<tessel::HostModuleEntry>(dlsym(handle_, entry))();
     }
     void initialize() const { call("VXInitialize_libqztessel"); }
 
 private:
-    void* handle;
+    void* handle_;
 };
 
 struct Outcome {
@@ -101,42 +101,42 @@ public:
 
 class SmallHostTest : public testing::Test {
 protected:
-    SmallHostTest() { plugin.initialize(); }
+    SmallHostTest() { plugin_.initialize(); }
     ~SmallHostTest() override {
-        instance.reset();
-        host.registered.reset();
-        EXPECT_EQ(host.arrays, 0);
-        EXPECT_EQ(host.signatures, 0);
+        instance_.reset();
+        host_.registered.reset();
+        EXPECT_EQ(host_.arrays, 0);
+        EXPECT_EQ(host_.signatures, 0);
     }
 
     Outcome call(const char* method, std::int32_t requested,
                  std::vector<const Box*> inputs = {}) {
-        inputs.insert(inputs.begin(), instance->box.get());
-        return run(host.method(method), requested, inputs);
+        inputs.insert(inputs.begin(), instance_->box.get());
+        return run(host_.method(method), requested, inputs);
     }
     void construct(const std::vector<const Box*>& inputs,
                    std::int32_t requested = 1) {
-        run(host.method("HuffmanPaths"), requested, inputs,
-            instance->box.get());
+        run(host_.method("HuffmanPaths"), requested, inputs,
+            instance_->box.get());
     }
 
     // Gives the instance a code and paths: 1 to 3 in x/y, 4 in x/z/w.
     void fill() {
-        const Array mode = host.text(u"frequencies");
-        const Array letters = host.text(u"abcdxyzw");
-        const Array numbers = host.column({1, 2, 3, 4, 5, 6, 7, 8});
+        const Array mode = host_.text(u"frequencies");
+        const Array letters = host_.text(u"abcdxyzw");
+        const Array numbers = host_.column({1, 2, 3, 4, 5, 6, 7, 8});
         construct({mode.get(), letters.get(), numbers.get()});
         addPaths();
     }
     void addPaths() {
         std::vector<Array> folders;
-        folders.push_back(host.texts({u"x", u"y"}));
-        folders.push_back(host.texts({u"x", u"z", u"w"}));
+        folders.push_back(host_.texts({u"x", u"y"}));
+        folders.push_back(host_.texts({u"x", u"z", u"w"}));
         std::vector<Array> files;
-        files.push_back(host.texts({u"a", u"b", u"ab"}));
-        files.push_back(host.texts({u"dad"}));
-        const Array folderCell = host.cell(std::move(folders));
-        const Array fileCell = host.cell(std::move(files));
+        files.push_back(host_.texts({u"a", u"b", u"ab"}));
+        files.push_back(host_.texts({u"dad"}));
+        const Array folderCell = host_.cell(std::move(folders));
+        const Array fileCell = host_.cell(std::move(files));
         call("addPaths", 0, {folderCell.get(), fileCell.get()});
     }
     std::vector<std::uint8_t> storedForm() {
@@ -148,23 +148,23 @@ protected:
     // come, and all arrays of the failed action must be gone.
     void sweepRequests(const std::function<void()>& action) {
         for (long n = 1; n < 1000; ++n) {
-            const long arraysBefore = host.arrays;
-            host.requests = 0;
-            host.failingRequest = n;
-            host.errors.clear();
+            const long arraysBefore = host_.arrays;
+            host_.requests = 0;
+            host_.failingRequest = n;
+            host_.errors.clear();
             try {
                 action();
             } catch (const Raised& raised) {
                 EXPECT_EQ(raised.text, "outOfMemory");
             }
-            host.failingRequest = 0;
-            EXPECT_EQ(host.arrays, arraysBefore) << "request " << n;
-            if (host.requests < n) {
-                EXPECT_TRUE(host.errors.empty());
+            host_.failingRequest = 0;
+            EXPECT_EQ(host_.arrays, arraysBefore) << "request " << n;
+            if (host_.requests < n) {
+                EXPECT_TRUE(host_.errors.empty());
                 EXPECT_GT(n, 1) << "the action asks for nothing";
                 return;
             }
-            EXPECT_EQ(host.errors, (std::vector<std::string>{"outOfMemory"}));
+            EXPECT_EQ(host_.errors, (std::vector<std::string>{"outOfMemory"}));
         }
         FAIL() << "no end of requests";
     }
@@ -176,7 +176,7 @@ protected:
         const std::function<void()>& prepare = [] {}) {
         for (long n = 1; n < 100000; ++n) {
             prepare();
-            const long arraysBefore = host.arrays;
+            const long arraysBefore = host_.arrays;
             failingAllocation = n;
             try {
                 action();
@@ -184,7 +184,7 @@ protected:
                 EXPECT_TRUE(allocationFailed);
             }
             failingAllocation = 0;
-            EXPECT_EQ(host.arrays, arraysBefore) << "allocation " << n;
+            EXPECT_EQ(host_.arrays, arraysBefore) << "allocation " << n;
             if (!allocationFailed) {
                 EXPECT_GT(n, 1) << "the action allocates nothing";
                 return;
@@ -193,14 +193,14 @@ protected:
         FAIL() << "no end of allocations";
     }
 
-    Plugin plugin;
-    Host host;
-    std::optional<Instance> instance;
+    Plugin plugin_;
+    Host host_;
+    std::optional<Instance> instance_;
 };
 
 class InstanceTest : public SmallHostTest {
 protected:
-    InstanceTest() { instance.emplace(host, *host.registered); }
+    InstanceTest() { instance_.emplace(host_, *host_.registered); }
 };
 
 }  // namespace
@@ -236,22 +236,22 @@ TEST(Version, PluginRefusesAProcessWhoseHostIsNotThere) {
 }
 
 TEST_F(SmallHostTest, AlternativeModeRegistersOnEveryCallWhatIsMissing) {
-    plugin.initialize();
-    EXPECT_EQ(host.registrations, 1);
-    host.registered.reset();
-    plugin.initialize();
-    EXPECT_EQ(host.registrations, 2);
+    plugin_.initialize();
+    EXPECT_EQ(host_.registrations, 1);
+    host_.registered.reset();
+    plugin_.initialize();
+    EXPECT_EQ(host_.registrations, 2);
 }
 
 TEST_F(SmallHostTest, TerminationDoesNothing) {
-    plugin.call("VXTerminate_libqztessel");
-    EXPECT_NE(host.registered, nullptr);
-    EXPECT_EQ(host.method("reset").name(), std::string("reset"));
+    plugin_.call("VXTerminate_libqztessel");
+    EXPECT_NE(host_.registered, nullptr);
+    EXPECT_EQ(host_.method("reset").name(), std::string("reset"));
 }
 
 TEST_F(SmallHostTest, SignaturesAreBuiltInOrder) {
     const auto calls = [&](const char* method) {
-        return static_cast<const Signature*>(host.method(method).signature())
+        return static_cast<const Signature*>(host_.method(method).signature())
             ->calls;
     };
     const std::string self = std::string("instance ") + fullName;
@@ -276,7 +276,7 @@ TEST_F(SmallHostTest, SignaturesAreBuiltInOrder) {
 }
 
 TEST_F(SmallHostTest, DescriptorsKeepTheHostsDefaults) {
-    for (const auto& method : host.registered->methods) {
+    for (const auto& method : host_.registered->methods) {
         EXPECT_STREQ(method->description(), "");
         EXPECT_EQ(method->access(), tessel::HostAccess::Public);
         EXPECT_FALSE(method->isStatic());
@@ -284,7 +284,7 @@ TEST_F(SmallHostTest, DescriptorsKeepTheHostsDefaults) {
         EXPECT_FALSE(method->isSealed());
         EXPECT_TRUE(method->isVisible());
     }
-    tessel::HostClassInfo& info = *host.registered->info;
+    tessel::HostClassInfo& info = *host_.registered->info;
     EXPECT_STREQ(info.className(), "HuffmanPaths");
     EXPECT_TRUE(info.copiesInstances());
     EXPECT_TRUE(info.savesInstances());
@@ -293,10 +293,10 @@ TEST_F(SmallHostTest, DescriptorsKeepTheHostsDefaults) {
 }
 
 TEST_F(SmallHostTest, PropertiesAreDeclaredAsCopiedAndVisible) {
-    ASSERT_EQ(host.registered->properties.size(), 2U);
-    EXPECT_EQ(host.registered->properties[0].name, "StringTree");
-    EXPECT_EQ(host.registered->properties[1].name, "Frequencies");
-    for (const Class::Property& property : host.registered->properties) {
+    ASSERT_EQ(host_.registered->properties.size(), 2U);
+    EXPECT_EQ(host_.registered->properties[0].name, "StringTree");
+    EXPECT_EQ(host_.registered->properties[1].name, "Frequencies");
+    for (const Class::Property& property : host_.registered->properties) {
         EXPECT_EQ(property.typeName, "any");
         EXPECT_FALSE(property.described);
         EXPECT_EQ(property.info.attributeBits, 2112U);
@@ -306,50 +306,50 @@ TEST_F(SmallHostTest, PropertiesAreDeclaredAsCopiedAndVisible) {
 }
 
 TEST_F(SmallHostTest, NativeObjectOfNothingIsNotDestroyed) {
-    host.registered->info->destroyNativeObject(nullptr);
+    host_.registered->info->destroyNativeObject(nullptr);
 }
 
 TEST_F(SmallHostTest, RegistrationWithoutMemoryRegistersNothing) {
-    host.registered.reset();
+    host_.registered.reset();
     sweepRequests([&] {
-        host.registered.reset();
+        host_.registered.reset();
         try {
-            plugin.initialize();
+            plugin_.initialize();
         } catch (const Raised&) {
-            EXPECT_EQ(host.registered, nullptr);
-            EXPECT_EQ(host.signatures, 0);
+            EXPECT_EQ(host_.registered, nullptr);
+            EXPECT_EQ(host_.signatures, 0);
             throw;
         }
     });
-    EXPECT_NE(host.registered, nullptr);
+    EXPECT_NE(host_.registered, nullptr);
 }
 
 TEST_F(SmallHostTest, RegistrationWithoutNativeMemoryRegistersNothing) {
-    host.registered.reset();
+    host_.registered.reset();
     sweepAllocations([&] {
-        host.registered.reset();
+        host_.registered.reset();
         try {
-            intoPlugin([&] { plugin.initialize(); });
+            intoPlugin([&] { plugin_.initialize(); });
         } catch (const std::exception&) {
-            EXPECT_EQ(host.registered, nullptr);
-            EXPECT_EQ(host.signatures, 0);
+            EXPECT_EQ(host_.registered, nullptr);
+            EXPECT_EQ(host_.signatures, 0);
             throw;
         }
     });
-    EXPECT_NE(host.registered, nullptr);
+    EXPECT_NE(host_.registered, nullptr);
 }
 
 TEST_F(SmallHostTest, NoRoomForTheClassDescriptorIsTheHostsError) {
     bool seen = false;
     for (long n = 1; n < 100; ++n) {
-        host.registered.reset();
-        host.requests = 0;
+        host_.registered.reset();
+        host_.requests = 0;
         try {
             const failing::Allocation allocation(n);
-            plugin.initialize();
+            plugin_.initialize();
         } catch (const Raised& raised) {
             EXPECT_EQ(raised.text, "outOfMemory");
-            seen = seen || host.requests == 0;  // no signature asked for yet
+            seen = seen || host_.requests == 0;  // no signature asked for yet
         } catch (const std::bad_alloc&) {
             continue;  // elsewhere
         }
@@ -364,7 +364,7 @@ TEST_F(InstanceTest, CountsAreCheckedOutputsFirstAndBeforeAnythingElse) {
         const char* method;
         int fewest, most, outputs;
     };
-    const Array anything = host.text(u"x");
+    const Array anything = host_.text(u"x");
     for (const Limits& limits :
          std::initializer_list<Limits>{{"HuffmanPaths", 0, 4, 1},
                                        {"addPaths", 3, 3, 0},
@@ -374,12 +374,13 @@ TEST_F(InstanceTest, CountsAreCheckedOutputsFirstAndBeforeAnythingElse) {
                                        {"reset", 1, 1, 0},
                                        {"serialize", 1, 1, 2}}) {
         const auto errorFor = [&](int outputs, int inputs) {
-            host.errors.clear();
+            host_.errors.clear();
             const std::vector<const Box*> list(static_cast<std::size_t>(inputs),
                                                anything.get());
-            EXPECT_THROW(run(host.method(limits.method), outputs, list), Raised)
+            EXPECT_THROW(run(host_.method(limits.method), outputs, list),
+                         Raised)
                 << limits.method;
-            return host.errors.empty() ? "" : host.errors.front();
+            return host_.errors.empty() ? "" : host_.errors.front();
         };
         EXPECT_EQ(errorFor(limits.outputs + 1, limits.most + 1),
                   "tooManyOutputs");
@@ -390,18 +391,18 @@ TEST_F(InstanceTest, CountsAreCheckedOutputsFirstAndBeforeAnythingElse) {
                   "tooManyOutputs");
         EXPECT_EQ(errorFor(limits.outputs, limits.fewest - 1), "tooFewInputs");
     }
-    EXPECT_EQ(host.nativeAsked, 0);
+    EXPECT_EQ(host_.nativeAsked, 0);
 }
 
 TEST_F(InstanceTest, CountErrorsThatReturnStillEndTheMethod) {
-    host.standardErrorsReturn = true;
+    host_.standardErrorsReturn = true;
     EXPECT_THROW(call("reset", 1), std::exception);
     EXPECT_THROW(call("serialize", 3), std::exception);
     EXPECT_THROW(call("addPaths", 0), std::exception);
-    EXPECT_EQ(host.errors,
+    EXPECT_EQ(host_.errors,
               (std::vector<std::string>{"tooManyOutputs", "tooManyOutputs",
                                         "tooFewInputs"}));
-    EXPECT_EQ(host.nativeAsked, 0);
+    EXPECT_EQ(host_.nativeAsked, 0);
 }
 
 // --- Errors of the binding ---------------------------------------------------
@@ -410,16 +411,16 @@ TEST_F(InstanceTest, RaisedErrorsCarryIdentifierAndPosition) {
     fill();
     const std::vector<std::uint8_t> before = storedForm();
     std::vector<Array> lists;
-    lists.push_back(host.texts({u"a"}));
-    lists.push_back(host.texts({u"a", u"b", u"a", u""}));
-    const Array files = host.cell(std::move(lists));
+    lists.push_back(host_.texts({u"a"}));
+    lists.push_back(host_.texts({u"a", u"b", u"a", u""}));
+    const Array files = host_.cell(std::move(lists));
     std::vector<Array> more;
-    more.push_back(host.texts({u"x"}));
-    more.push_back(host.texts({u"x"}));
-    const Array folders = host.cell(std::move(more));
+    more.push_back(host_.texts({u"x"}));
+    more.push_back(host_.texts({u"x"}));
+    const Array folders = host_.cell(std::move(more));
     EXPECT_THROW(call("addPaths", 0, {folders.get(), files.get()}), Raised);
     EXPECT_THROW(call("addPaths", 0, {files.get(), folders.get()}), Raised);
-    EXPECT_EQ(host.errors,
+    EXPECT_EQ(host_.errors,
               (std::vector<std::string>{
                   "VELOX:datastoreio:huffmanpaths:fileElementEmpty(2, 4)",
                   "VELOX:datastoreio:huffmanpaths:folderElementEmpty(2, 4)"}));
@@ -428,12 +429,12 @@ TEST_F(InstanceTest, RaisedErrorsCarryIdentifierAndPosition) {
 
 TEST_F(InstanceTest, ErrorEntryThatReturnsStillEndsTheMethod) {
     fill();
-    host.errorEntryReturns = true;
+    host_.errorEntryReturns = true;
     const std::vector<std::uint8_t> before = storedForm();
-    const Array one = host.cell({});
+    const Array one = host_.cell({});
     std::vector<Array> lists;
-    lists.push_back(host.texts({}));
-    const Array two = host.cell(std::move(lists));
+    lists.push_back(host_.texts({}));
+    const Array two = host_.cell(std::move(lists));
 
     const auto thrownText = [&](const std::vector<const Box*>& inputs) {
         try {
@@ -448,18 +449,18 @@ TEST_F(InstanceTest, ErrorEntryThatReturnsStillEndsTheMethod) {
               component + "unequalNumFolderFileList");
     EXPECT_EQ(thrownText({two.get(), two.get()}),
               component + "folderElementEmpty");
-    EXPECT_EQ(host.errors,
+    EXPECT_EQ(host_.errors,
               (std::vector<std::string>{component + "unequalNumFolderFileList",
                                         component + "folderElementEmpty(1)"}));
     EXPECT_EQ(storedForm(), before);
 }
 
 TEST_F(InstanceTest, OddFileListIsRefusedAlsoIfTheErrorEntryReturns) {
-    host.errorEntryReturns = true;
-    const Array mode = host.text(u"files");
-    const Array list = host.texts({u"a"});
+    host_.errorEntryReturns = true;
+    const Array mode = host_.text(u"files");
+    const Array list = host_.texts({u"a"});
     EXPECT_THROW(construct({mode.get(), list.get()}), std::exception);
-    EXPECT_EQ(host.errors,
+    EXPECT_EQ(host_.errors,
               (std::vector<std::string>{
                   "VELOX:datastoreio:huffmanpaths:fileListNotEven"}));
     EXPECT_EQ(call("serialize", 1).outputs[0]->text, u"");
@@ -475,7 +476,7 @@ TEST_F(InstanceTest, NativeExceptionsLeaveTheMethodUnchanged) {
     } catch (const std::exception& error) {
         EXPECT_STREQ(error.what(), "No more paths to provide.");
     }
-    EXPECT_TRUE(host.errors.empty());
+    EXPECT_TRUE(host_.errors.empty());
 }
 
 // --- Outputs -----------------------------------------------------------------
@@ -491,7 +492,7 @@ TEST_F(InstanceTest, HasNextPathRaisesTheOutputCountFromZero) {
 
 TEST_F(InstanceTest, GetPathsFillsBothOutputsWithoutSeparator) {
     fill();
-    const Array numbers = host.column({1, 4});
+    const Array numbers = host_.column({1, 4});
     for (const std::int32_t requested : {1, 2}) {
         const Outcome outcome = call("getPaths", requested, {numbers.get()});
         EXPECT_EQ(outcome.outputCount, requested);
@@ -504,8 +505,8 @@ TEST_F(InstanceTest, GetPathsFillsBothOutputsWithoutSeparator) {
 
 TEST_F(InstanceTest, GetPathsFillsOneOutputWithSeparator) {
     fill();
-    const Array numbers = host.column({2, 4});
-    const Array separator = host.text(u"--");
+    const Array numbers = host_.column({2, 4});
+    const Array separator = host_.text(u"--");
     const Outcome outcome =
         call("getPaths", 2, {numbers.get(), separator.get()});
     ASSERT_TRUE(outcome[0]);
@@ -515,17 +516,17 @@ TEST_F(InstanceTest, GetPathsFillsOneOutputWithSeparator) {
 }
 
 TEST_F(InstanceTest, GetPathsWithoutOutputLooksAtNothing) {
-    const Array numbers = host.column({-1});
-    host.nativeAsked = 0;
+    const Array numbers = host_.column({-1});
+    host_.nativeAsked = 0;
     const Outcome outcome = call("getPaths", 0, {numbers.get()});
     EXPECT_FALSE(outcome[0]);
-    EXPECT_EQ(host.nativeAsked, 0);
+    EXPECT_EQ(host_.nativeAsked, 0);
 }
 
 TEST_F(InstanceTest, SerializeWithOneOutputDoesNotRunTheByteSerialization) {
     fill();
     for (int i = 0; i < 200; ++i) addPaths();
-    host.requests = 0;
+    host_.requests = 0;
     const auto asked = [&](std::int32_t requested) {
         const unsigned long before = failing::bytesAsked();
         call("serialize", requested);
@@ -533,7 +534,7 @@ TEST_F(InstanceTest, SerializeWithOneOutputDoesNotRunTheByteSerialization) {
     };
     EXPECT_LT(asked(1), 1000U);
     EXPECT_LT(asked(0), 1000U);
-    EXPECT_EQ(host.requests, 2);  // a tree string each
+    EXPECT_EQ(host_.requests, 2);  // a tree string each
     EXPECT_GT(asked(2), 4000U);
     EXPECT_FALSE(call("serialize", 1)[1]);
 }
@@ -551,8 +552,8 @@ TEST_F(InstanceTest, SerializedBytesAreFreshColumn) {
 
 TEST_F(InstanceTest, GetPathsWithoutMemory) {
     fill();
-    const Array numbers = host.column({1, 2, 3, 4});
-    const Array separator = host.text(u"/");
+    const Array numbers = host_.column({1, 2, 3, 4});
+    const Array separator = host_.text(u"/");
     sweepRequests([&] { call("getPaths", 2, {numbers.get()}); });
     sweepRequests([&] {
         call("getPaths", 1, {numbers.get(), separator.get()});
@@ -586,10 +587,10 @@ TEST_F(InstanceTest, SerializeWithoutMemory) {
 
 TEST_F(InstanceTest, GettersWithoutMemory) {
     fill();
-    for (const Class::Property& property : host.registered->properties) {
+    for (const Class::Property& property : host_.registered->properties) {
         const auto get = [&] {
             HostArray* const value = intoPlugin(
-                [&] { return property.info.getter(instance->box->native); });
+                [&] { return property.info.getter(instance_->box->native); });
             property.info.disposer(value);
         };
         sweepRequests(get);
@@ -599,30 +600,30 @@ TEST_F(InstanceTest, GettersWithoutMemory) {
 
 TEST_F(InstanceTest, OutOfMemoryErrorThatReturnsStillEndsTheMethod) {
     fill();
-    host.standardErrorsReturn = true;
-    host.requests = 0;
-    host.failingRequest = 1;
+    host_.standardErrorsReturn = true;
+    host_.requests = 0;
+    host_.failingRequest = 1;
     EXPECT_THROW(call("serialize", 1), std::bad_alloc);
 }
 
 TEST_F(InstanceTest, ConstructionWithoutNativeMemory) {
-    const Array mode = host.text(u"frequencies");
-    const Array letters = host.text(u"abcd");
-    const Array numbers = host.column({1, 2, 3, 4});
+    const Array mode = host_.text(u"frequencies");
+    const Array letters = host_.text(u"abcd");
+    const Array numbers = host_.column({1, 2, 3, 4});
     sweepAllocations(
         [&] {
             construct({mode.get(), letters.get(), numbers.get()});
         },
         [&] {
-            instance.reset();
-            instance.emplace(host, *host.registered);
+            instance_.reset();
+            instance_.emplace(host_, *host_.registered);
         });
     EXPECT_EQ(call("serialize", 1).outputs[0]->text.size(), 4U);
 }
 
 TEST_F(SmallHostTest, NativeObjectWithoutMemoryIsNotMade) {
     sweepAllocations([&] {
-        tessel::HostClassInfo& info = *host.registered->info;
+        tessel::HostClassInfo& info = *host_.registered->info;
         info.destroyNativeObject(
             intoPlugin([&] { return info.createNativeObject(); }));
     });
@@ -639,21 +640,21 @@ TEST_F(InstanceTest, AddPathsWithoutNativeMemoryLeavesAUsableInstance) {
 // --- Properties --------------------------------------------------------------
 
 TEST_F(InstanceTest, SettersAndGettersWorkOnTheNativeObject) {
-    const auto& properties = host.registered->properties;
-    const Array text = host.text(u"xyz");
-    const Array numbers = host.column({3, 1, 2});
-    properties[0].info.setter(instance->box->native, text.get());
-    properties[1].info.setter(instance->box->native, numbers.get());
+    const auto& properties = host_.registered->properties;
+    const Array text = host_.text(u"xyz");
+    const Array numbers = host_.column({3, 1, 2});
+    properties[0].info.setter(instance_->box->native, text.get());
+    properties[1].info.setter(instance_->box->native, numbers.get());
     const Array gotText(
-        static_cast<Box*>(properties[0].info.getter(instance->box->native)));
+        static_cast<Box*>(properties[0].info.getter(instance_->box->native)));
     const Array gotNumbers(
-        static_cast<Box*>(properties[1].info.getter(instance->box->native)));
+        static_cast<Box*>(properties[1].info.getter(instance_->box->native)));
     EXPECT_EQ(gotText->text, u"xyz");
     EXPECT_EQ(gotText->dimensions, (std::vector<std::size_t>{1, 3}));
     EXPECT_EQ(gotNumbers->numbers, (std::vector<double>{3, 1, 2}));
     EXPECT_EQ(gotNumbers->dimensions, (std::vector<std::size_t>{3, 1}));
     properties[0].info.disposer(nullptr);
-    EXPECT_TRUE(host.errors.empty());
+    EXPECT_TRUE(host_.errors.empty());
 }
 
 // --- Custom load -------------------------------------------------------------
@@ -664,81 +665,83 @@ class CustomLoadTest : public InstanceTest {
 protected:
     CustomLoadTest() {
         fill();
-        form = storedForm();
-        alphabet = call("serialize", 1).outputs[0]->text;
-        instance.reset();
-        instance.emplace(host, *host.registered);
-        host.nativeGiven = 0;
+        form_ = storedForm();
+        alphabet_ = call("serialize", 1).outputs[0]->text;
+        instance_.reset();
+        instance_.emplace(host_, *host_.registered);
+        host_.nativeGiven = 0;
     }
 
     // Loads what `makes` makes and gives what was printed.
     std::string printed(const std::function<Array()>& makes) {
         Saved saved;
         saved.makes = makes;
-        const long before = host.arrays;
+        const long before = host_.arrays;
         testing::internal::CaptureStdout();
-        host.registered->info->customLoad(instance->box.get(), &saved);
-        EXPECT_EQ(host.arrays, before) << "the converted array is not released";
+        host_.registered->info->customLoad(instance_->box.get(), &saved);
+        EXPECT_EQ(host_.arrays, before)
+            << "the converted array is not released";
         return testing::internal::GetCapturedStdout();
     }
     Array structure(const std::u16string& stringTree,
                     const std::vector<std::uint8_t>& pathTree) {
-        Array made = host.structure();
-        made->fields["StringTree"] = host.text(stringTree);
-        made->fields["PathTree"] = host.byteColumn(pathTree);
+        Array made = host_.structure();
+        made->fields["StringTree"] = host_.text(stringTree);
+        made->fields["PathTree"] = host_.byteColumn(pathTree);
         return made;
     }
 
-    const std::string failureLine =
+    const std::string failureLine_ =
         "Error while custom loading CompressedFileSet.\n";
-    std::vector<std::uint8_t> form;
-    std::u16string alphabet;
+    std::vector<std::uint8_t> form_;
+    std::u16string alphabet_;
 };
 
 }  // namespace
 
 TEST_F(CustomLoadTest, RestoresAndHandsTheNativeObjectBackOnce) {
-    EXPECT_EQ(printed([&] { return structure(alphabet, form); }), "");
-    EXPECT_EQ(host.nativeGiven, 1);
-    EXPECT_EQ(storedForm(), form);
+    EXPECT_EQ(printed([&] { return structure(alphabet_, form_); }), "");
+    EXPECT_EQ(host_.nativeGiven, 1);
+    EXPECT_EQ(storedForm(), form_);
 }
 
 TEST_F(CustomLoadTest, EmptyStringTreeDoesNothingMore) {
-    EXPECT_EQ(printed([&] { return structure(u"", form); }), "");
-    EXPECT_EQ(host.nativeGiven, 0);
-    EXPECT_NE(storedForm(), form);
+    EXPECT_EQ(printed([&] { return structure(u"", form_); }), "");
+    EXPECT_EQ(host_.nativeGiven, 0);
+    EXPECT_NE(storedForm(), form_);
 }
 
 TEST_F(CustomLoadTest, OtherValuesDoNothing) {
     const auto noPathTree = [&] {
-        Array made = host.structure();
-        made->fields["StringTree"] = host.text(alphabet);
+        Array made = host_.structure();
+        made->fields["StringTree"] = host_.text(alphabet_);
         return made;
     };
     const auto noStruct = [&] {
-        Array made = structure(alphabet, form);
+        Array made = structure(alphabet_, form_);
         made->isStruct = false;
         return made;
     };
-    host.nativeAsked = 0;
+    host_.nativeAsked = 0;
     EXPECT_EQ(printed(noPathTree), "");
     EXPECT_EQ(printed(noStruct), "");
-    EXPECT_EQ(host.nativeAsked, 0);
+    EXPECT_EQ(host_.nativeAsked, 0);
 }
 
 TEST_F(CustomLoadTest, EveryFailurePrintsTheLineAndReturns) {
-    std::vector<std::uint8_t> damaged = form;
+    std::vector<std::uint8_t> damaged = form_;
     damaged.pop_back();
-    EXPECT_EQ(printed([&] { return structure(alphabet, damaged); }),
-              failureLine);
+    EXPECT_EQ(printed([&] { return structure(alphabet_, damaged); }),
+              failureLine_);
     EXPECT_EQ(printed([&]() -> Array { throw Raised("conversion"); }),
-              failureLine);
-    EXPECT_EQ(printed([&]() -> Array { throw 5; }), failureLine);
-    host.requests = 0;
-    host.failingRequest = 1;
-    EXPECT_EQ(printed([&] { return structure(alphabet, form); }), failureLine);
-    EXPECT_EQ(host.nativeGiven, 0);
-    EXPECT_EQ(printed([&] { return structure(alphabet, form); }), "");
+              failureLine_);
+    EXPECT_EQ(printed([&]() -> Array { throw 5; }), failureLine_);
+    host_.requests = 0;
+    host_.failingRequest = 1;
+    EXPECT_EQ(printed([&] { return structure(alphabet_, form_); }),
+              failureLine_);
+    EXPECT_EQ(host_.nativeGiven, 0);
+    EXPECT_EQ(printed([&] { return structure(alphabet_, form_); }), "");
 }
 
 TEST_F(CustomLoadTest, WithoutNativeMemoryItPrintsTheLineOrRestoresAll) {
@@ -746,22 +749,23 @@ TEST_F(CustomLoadTest, WithoutNativeMemoryItPrintsTheLineOrRestoresAll) {
     sweepAllocations(
         [&] {
             Saved saved;
-            saved.makes = [&] { return structure(alphabet, form); };
+            saved.makes = [&] { return structure(alphabet_, form_); };
             testing::internal::CaptureStdout();
             intoPlugin([&] {
-                host.registered->info->customLoad(instance->box.get(), &saved);
+                host_.registered->info->customLoad(instance_->box.get(),
+                                                   &saved);
             });
             failingAllocation = 0;
             if (testing::internal::GetCapturedStdout().empty()) {
-                EXPECT_EQ(storedForm(), form);
+                EXPECT_EQ(storedForm(), form_);
             } else {
                 EXPECT_TRUE(allocationFailed);
                 ++failures;
             }
         },
         [&] {
-            instance.reset();
-            instance.emplace(host, *host.registered);
+            instance_.reset();
+            instance_.emplace(host_, *host_.registered);
         });
     EXPECT_GT(failures, 10);
 }

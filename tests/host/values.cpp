@@ -92,8 +92,8 @@ protected:
         return errorOf(action).identifier();
     }
 
-    Host host{testOptions()};
-    HostInterface& operations = host.operations();
+    Host host_{testOptions()};
+    HostInterface& operations_ = host_.operations();
 };
 
 }  // namespace
@@ -101,22 +101,22 @@ protected:
 TEST_F(OperationsTest, NumberOfElements) {
     const Value none = Value::cell({});
     const Value cube = Value::cell({2, 3, 4});
-    EXPECT_EQ(operations.hostNumel(&none), 1U);
-    EXPECT_EQ(operations.hostNumel(&cube), 24U);
+    EXPECT_EQ(operations_.hostNumel(&none), 1U);
+    EXPECT_EQ(operations_.hostNumel(&cube), 24U);
 }
 
 TEST_F(OperationsTest, NarrowTextIsUtf8AndKeepsLoneSurrogates) {
     const Value text = Value::text(u"a\u00E9\u20AC\U0001F600\xD800");
-    EXPECT_EQ(operations.hostGetString(&text),
+    EXPECT_EQ(operations_.hostGetString(&text),
               "a\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80\xED\xA0\x80");
 }
 
 TEST_F(OperationsTest, TextOfAnotherClassIsHostError) {
     for (const Value& other : {Value(), Value::cell({1, 1}), Value::scalar(1),
                                Value::bytes({1, 1}, {65})}) {
-        EXPECT_EQ(errorKey([&] { operations.hostGetString(&other); }),
+        EXPECT_EQ(errorKey([&] { operations_.hostGetString(&other); }),
                   "VELOX:embedded:wrongClass");
-        EXPECT_EQ(errorKey([&] { operations.hostGetUString(&other); }),
+        EXPECT_EQ(errorKey([&] { operations_.hostGetUString(&other); }),
                   "VELOX:embedded:wrongClass");
     }
 }
@@ -124,7 +124,7 @@ TEST_F(OperationsTest, TextOfAnotherClassIsHostError) {
 TEST_F(OperationsTest, RealElementsOfComplexDataAreEverySecondValue) {
     const Value complex = Value::complexDoubles({3, 1}, {1, -1, 2, -2, 3, -3});
     std::vector<double> real = {99};
-    operations.hostRealElements(&complex, real);
+    operations_.hostRealElements(&complex, real);
     EXPECT_EQ(real, (std::vector<double>{1, 2, 3}));
 }
 
@@ -134,90 +134,92 @@ TEST_F(OperationsTest, ElementsAreReadAsTheirOwnClassOnly) {
     const Value truths = Value::logicals({2, 1}, {1, 0});
     std::vector<double> asDoubles;
     std::vector<std::uint8_t> asBytes;
-    EXPECT_EQ(errorKey([&] { operations.hostRealElements(&bytes, asDoubles); }),
-              "VELOX:embedded:wrongClass");
-    EXPECT_EQ(errorKey([&] { operations.hostRealElements(&doubles, asBytes); }),
-              "VELOX:embedded:wrongClass");
-    EXPECT_EQ(errorKey([&] { operations.hostRealElements(&truths, asBytes); }),
+    EXPECT_EQ(
+        errorKey([&] { operations_.hostRealElements(&bytes, asDoubles); }),
+        "VELOX:embedded:wrongClass");
+    EXPECT_EQ(
+        errorKey([&] { operations_.hostRealElements(&doubles, asBytes); }),
+        "VELOX:embedded:wrongClass");
+    EXPECT_EQ(errorKey([&] { operations_.hostRealElements(&truths, asBytes); }),
               "VELOX:embedded:wrongClass");
 }
 
 TEST_F(OperationsTest, DoubleDataIsRefusedWhereItWouldBeReadOutside) {
     const Value two = Value::column({1, 2});
-    EXPECT_EQ(operations.hostDoubleData(&two, 2)[1], 2);
-    EXPECT_EQ(errorKey([&] { operations.hostDoubleData(&two, 3); }),
+    EXPECT_EQ(operations_.hostDoubleData(&two, 2)[1], 2);
+    EXPECT_EQ(errorKey([&] { operations_.hostDoubleData(&two, 3); }),
               "VELOX:embedded:tooFewElements");
 }
 
 TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
     const Value cell = Value::cell({2, 1});
-    EXPECT_EQ(operations.hostNumel(operations.hostCellElement(&cell, 1)), 0U);
-    EXPECT_EQ(errorKey([&] { operations.hostCellElement(&cell, 2); }),
+    EXPECT_EQ(operations_.hostNumel(operations_.hostCellElement(&cell, 1)), 0U);
+    EXPECT_EQ(errorKey([&] { operations_.hostCellElement(&cell, 2); }),
               "VELOX:embedded:indexOutside");
     Value structure = Value::structure({0, 1});
     EXPECT_EQ(
-        errorKey([&] { operations.hostFieldElement(&structure, "a", 0); }),
+        errorKey([&] { operations_.hostFieldElement(&structure, "a", 0); }),
         "VELOX:embedded:fieldMissing");
-    HostArray* const made = operations.hostCreateCell(1, 1);
+    HostArray* const made = operations_.hostCreateCell(1, 1);
     EXPECT_EQ(errorKey([&] {
-                  operations.hostSetCell(
-                      made, 1, operations.hostCreateLogicalScalar(true));
+                  operations_.hostSetCell(
+                      made, 1, operations_.hostCreateLogicalScalar(true));
               }),
               "VELOX:embedded:indexOutside");
-    operations.hostReleaseArray(made);
+    operations_.hostReleaseArray(made);
 }
 
 TEST_F(OperationsTest, FieldOfStructWithoutElementsIsHostError) {
     Value one = Value::structure();
     one.setField("a", Value::scalar(1));
-    EXPECT_EQ(errorKey([&] { operations.hostFieldElement(&one, "a", 1); }),
+    EXPECT_EQ(errorKey([&] { operations_.hostFieldElement(&one, "a", 1); }),
               "VELOX:embedded:indexOutside");
 }
 
 TEST_F(OperationsTest, ArraysThatNoMemoryCouldHoldAreOutOfMemory) {
     const std::size_t huge = std::numeric_limits<std::size_t>::max() / 4;
-    EXPECT_EQ(errorKey([&] { operations.hostCreateCell(huge, 5); }),
+    EXPECT_EQ(errorKey([&] { operations_.hostCreateCell(huge, 5); }),
               "VELOX:embedded:outOfMemory");
-    EXPECT_EQ(errorKey([&] { operations.hostCreateCell(huge / 64, 5); }),
+    EXPECT_EQ(errorKey([&] { operations_.hostCreateCell(huge / 64, 5); }),
               "VELOX:embedded:outOfMemory");
     EXPECT_EQ(errorKey([&] {
-                  operations.hostCreateNumeric(huge, 5,
-                                               HostNumericClass::Double);
+                  operations_.hostCreateNumeric(huge, 5,
+                                                HostNumericClass::Double);
               }),
               "VELOX:embedded:outOfMemory");
     EXPECT_EQ(errorKey([&] {
-                  operations.hostCreateNumeric(huge, 1,
-                                               HostNumericClass::Double);
+                  operations_.hostCreateNumeric(huge, 1,
+                                                HostNumericClass::Double);
               }),
               "VELOX:embedded:outOfMemory");
 }
 
 TEST_F(OperationsTest, NamesAreInterned) {
-    EXPECT_EQ(operations.hostInternName("velox"),
-              operations.hostInternName(std::string("velox").c_str()));
-    EXPECT_NE(operations.hostInternName("velox"),
-              operations.hostInternName("Velox"));
-    EXPECT_EQ(operations.hostInternName(""), nullptr);
+    EXPECT_EQ(operations_.hostInternName("velox"),
+              operations_.hostInternName(std::string("velox").c_str()));
+    EXPECT_NE(operations_.hostInternName("velox"),
+              operations_.hostInternName("Velox"));
+    EXPECT_EQ(operations_.hostInternName(""), nullptr);
 }
 
 TEST_F(OperationsTest, PackagesAreFoundStepByStep) {
-    HostPackage* package = operations.hostGlobalPackage("velox");
+    HostPackage* package = operations_.hostGlobalPackage("velox");
     for (const char* name : {"io", "datastore", "internal", "fileset"}) {
-        package = operations.hostSubPackage(package, name);
+        package = operations_.hostSubPackage(package, name);
         ASSERT_NE(package, nullptr);
     }
-    EXPECT_STREQ(operations.hostPackageFullName(package),
+    EXPECT_STREQ(operations_.hostPackageFullName(package),
                  "velox.io.datastore.internal.fileset");
-    EXPECT_EQ(operations.hostSubPackage(package, "velox"), nullptr);
-    EXPECT_EQ(operations.hostGlobalPackage("fileset"), nullptr);
+    EXPECT_EQ(operations_.hostSubPackage(package, "velox"), nullptr);
+    EXPECT_EQ(operations_.hostGlobalPackage("fileset"), nullptr);
 }
 
 TEST_F(OperationsTest, ErrorsCarryIdentifierArgumentsAndFormattedText) {
     const std::vector<HostMessageArgument> arguments = {std::string("2, 4"),
                                                         std::int64_t{-7}};
     const HostException error = errorOf([&] {
-        operations.HostError("VELOX:datastoreio:huffmanpaths:fileElementEmpty",
-                             arguments);
+        operations_.HostError("VELOX:datastoreio:huffmanpaths:fileElementEmpty",
+                              arguments);
     });
     EXPECT_EQ(error.identifier(),
               "VELOX:datastoreio:huffmanpaths:fileElementEmpty");
@@ -229,7 +231,7 @@ TEST_F(OperationsTest, ErrorWithoutTextShowsIdentifierAndArguments) {
     const std::vector<HostMessageArgument> arguments = {std::string("x"),
                                                         std::int64_t{-7}};
     EXPECT_STREQ(
-        errorOf([&] { operations.HostError("A:b", arguments); }).what(),
+        errorOf([&] { operations_.HostError("A:b", arguments); }).what(),
         "A:b: x; -7");
 }
 

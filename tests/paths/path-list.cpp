@@ -52,24 +52,24 @@ protected:
     PathListFiles() {
         std::string name = testing::TempDir() + "paths-XXXXXX";
         EXPECT_NE(::mkdtemp(name.data()), nullptr);
-        top = name;
+        top_ = name;
     }
     ~PathListFiles() override {
         std::error_code ignored;
-        fs::remove_all(top, ignored);
+        fs::remove_all(top_, ignored);
     }
 
     std::string write(const std::string& name, const std::string& text) const {
-        const std::string file = top + "/" + name;
+        const std::string file = top_ + "/" + name;
         std::ofstream(file, std::ios::binary) << text;
         return file;
     }
     void folder(const std::string& name) const {
-        fs::create_directories(top + "/" + name);
+        fs::create_directories(top_ + "/" + name);
     }
 
-    std::string top;
-    WalkReport report;
+    std::string top_;
+    WalkReport report_;
 };
 
 TEST(PathList, NewlinesSeparateAndTheLastMayBeLeftOut) {
@@ -113,33 +113,33 @@ TEST_F(PathListFiles, AFileIsReadWhole) {
 }
 
 TEST_F(PathListFiles, APipeIsReadToItsEnd) {
-    const std::string pipe = top + "/pipe";
+    const std::string pipe = top_ + "/pipe";
     ASSERT_EQ(::mkfifo(pipe.c_str(), 0600), 0);
     const pid_t writer = ::fork();
     if (writer == 0) {
         std::ofstream(pipe) << "a\n" << std::string(200'000, 'b') << "\n";
         ::_exit(0);
     }
-    EXPECT_EQ(stringsOf(readPaths(pipe, report)),
+    EXPECT_EQ(stringsOf(readPaths(pipe, report_)),
               (Strings{"a", std::string(200'000, 'b')}));
 }
 
 TEST_F(PathListFiles, WhatCannotBeReadIsNamed) {
-    EXPECT_EQ(messageOf([&] { readPaths(top + "/no", report); }),
-              "Cannot read " + top + "/no: No such file or directory.");
-    EXPECT_EQ(messageOf([&] { readListFile(top); }),
-              "Cannot read " + top + ": Is a directory.");
-    EXPECT_EQ(messageOf([&] { listFolder(top + "/no", report); }),
-              "Cannot read " + top + "/no: No such file or directory.");
+    EXPECT_EQ(messageOf([&] { readPaths(top_ + "/no", report_); }),
+              "Cannot read " + top_ + "/no: No such file or directory.");
+    EXPECT_EQ(messageOf([&] { readListFile(top_); }),
+              "Cannot read " + top_ + ": Is a directory.");
+    EXPECT_EQ(messageOf([&] { listFolder(top_ + "/no", report_); }),
+              "Cannot read " + top_ + "/no: No such file or directory.");
 }
 
 TEST_F(PathListFiles, AListWithoutPathsIsRefused) {
     const std::string file = write("list", "");
-    EXPECT_EQ(messageOf([&] { readPaths(file, report); }),
+    EXPECT_EQ(messageOf([&] { readPaths(file, report_); }),
               file + " holds no paths.");
     folder("empty");
-    EXPECT_EQ(messageOf([&] { readPaths(top + "/empty", report); }),
-              top + "/empty holds no paths.");
+    EXPECT_EQ(messageOf([&] { readPaths(top_ + "/empty", report_); }),
+              top_ + "/empty holds no paths.");
 }
 
 TEST_F(PathListFiles, AWalkListsFilesFirstAndThenFoldersInOrder) {
@@ -152,27 +152,27 @@ TEST_F(PathListFiles, AWalkListsFilesFirstAndThenFoldersInOrder) {
     write("b/inner/x", "");
     write("a/2", "");
     write("a/10", "");
-    EXPECT_EQ(stringsOf(listFolder(top, report)),
-              (Strings{top + "/B", top + "/z", top + "/a/10", top + "/a/2",
-                       top + "/b/y", top + "/b/inner/x"}));
-    EXPECT_EQ(report.foldersRead, 5U);
-    EXPECT_EQ(report.foldersSkipped, 0U);
-    EXPECT_EQ(stringsOf(listFolder(top + "/a/", report)),
-              (Strings{top + "/a/10", top + "/a/2"}))
+    EXPECT_EQ(stringsOf(listFolder(top_, report_)),
+              (Strings{top_ + "/B", top_ + "/z", top_ + "/a/10", top_ + "/a/2",
+                       top_ + "/b/y", top_ + "/b/inner/x"}));
+    EXPECT_EQ(report_.foldersRead, 5U);
+    EXPECT_EQ(report_.foldersSkipped, 0U);
+    EXPECT_EQ(stringsOf(listFolder(top_ + "/a/", report_)),
+              (Strings{top_ + "/a/10", top_ + "/a/2"}))
         << "the name's own '/' is enough";
 }
 
 TEST_F(PathListFiles, AWalkListsLinksAndDoesNotFollowThem) {
     folder("real");
     write("real/file", "");
-    fs::create_directory_symlink("real", top + "/linked");
-    fs::create_symlink("nowhere", top + "/broken");
-    fs::create_directory_symlink("..", top + "/real/round");
-    EXPECT_EQ(stringsOf(listFolder(top, report)),
-              (Strings{top + "/broken", top + "/linked", top + "/real/file",
-                       top + "/real/round"}));
-    EXPECT_EQ(stringsOf(listFolder(top + "/linked", report)),
-              (Strings{top + "/linked/file", top + "/linked/round"}))
+    fs::create_directory_symlink("real", top_ + "/linked");
+    fs::create_symlink("nowhere", top_ + "/broken");
+    fs::create_directory_symlink("..", top_ + "/real/round");
+    EXPECT_EQ(stringsOf(listFolder(top_, report_)),
+              (Strings{top_ + "/broken", top_ + "/linked", top_ + "/real/file",
+                       top_ + "/real/round"}));
+    EXPECT_EQ(stringsOf(listFolder(top_ + "/linked", report_)),
+              (Strings{top_ + "/linked/file", top_ + "/linked/round"}))
         << "the given name itself may be a link";
 }
 
@@ -181,7 +181,7 @@ TEST_F(PathListFiles, AFolderThatCannotBeReadIsCountedAndLeftOut) {
     const std::string name(200, 'n');
     const int start = ::open(".", O_RDONLY | O_DIRECTORY);
     ASSERT_GE(start, 0);
-    ASSERT_EQ(::chdir(top.c_str()), 0);
+    ASSERT_EQ(::chdir(top_.c_str()), 0);
     constexpr int depth = 25;
     for (int i = 0; i < depth; ++i) {
         std::ofstream("file").put('x');
@@ -191,11 +191,11 @@ TEST_F(PathListFiles, AFolderThatCannotBeReadIsCountedAndLeftOut) {
     ASSERT_EQ(::fchdir(start), 0);
     ::close(start);
 
-    const PathList list = listFolder(top, report);
-    EXPECT_EQ(report.foldersSkipped, 1U);
-    EXPECT_EQ(report.firstReason, "File name too long");
-    EXPECT_GT(report.firstSkipped.size(), 4000U);
-    EXPECT_EQ(list.size(), report.foldersRead) << "one file a folder";
+    const PathList list = listFolder(top_, report_);
+    EXPECT_EQ(report_.foldersSkipped, 1U);
+    EXPECT_EQ(report_.firstReason, "File name too long");
+    EXPECT_GT(report_.firstSkipped.size(), 4000U);
+    EXPECT_EQ(list.size(), report_.foldersRead) << "one file a folder";
     EXPECT_LT(list.size(), static_cast<std::size_t>(depth));
 }
 

@@ -296,7 +296,7 @@ Strings iterated(HuffmanPathTree& coder) {
 class ModelTree {
 public:
     void add(const Strings& folder, std::size_t file) {
-        Node* node = &top;
+        Node* node = &top_;
         for (const std::string& name : folder) {
             auto [found, isNew] =
                 node->byName.emplace(name, node->children.size());
@@ -308,7 +308,7 @@ public:
     }
     std::vector<std::size_t> order() const {
         std::vector<std::size_t> files;
-        collect(top, files);
+        collect(top_, files);
         return files;
     }
 
@@ -323,7 +323,7 @@ private:
         if (node.file != none) files.push_back(node.file);
         for (const auto& child : node.children) collect(*child, files);
     }
-    Node top;
+    Node top_;
 };
 
 // The list in the order in which the coder iterates it.

@@ -14,23 +14,23 @@ namespace model {
 template <class Item>
 class ReferenceHeap {
 public:
-    std::size_t size() const { return items.size(); }
-    const Item& top() const { return items.front(); }
+    std::size_t size() const { return items_.size(); }
+    const Item& top() const { return items_.front(); }
 
     void push(const Item& item) {
-        items.push_back(item);
-        raise(items.size() - 1, item);
+        items_.push_back(item);
+        raise(items_.size() - 1, item);
     }
 
     // Removes the top: the hole that it leaves sinks to the bottom, preferring
     // the right child, and takes in the last element, which rises from there.
     void pop() {
-        const std::size_t length = items.size() - 1;
+        const std::size_t length = items_.size() - 1;
         if (length > 0) {
-            const Item last = items.back();
+            const Item last = items_.back();
             raise(sinkHole(length), last);
         }
-        items.pop_back();
+        items_.pop_back();
     }
 
 private:
@@ -42,11 +42,11 @@ private:
     void raise(std::size_t hole, const Item& item) {
         while (hole > 0) {
             const std::size_t parent = (hole - 1) / 2;
-            if (!above(items[parent], item)) break;
-            items[hole] = items[parent];
+            if (!above(items_[parent], item)) break;
+            items_[hole] = items_[parent];
             hole = parent;
         }
-        items[hole] = item;
+        items_[hole] = item;
     }
 
     // Sinks a hole from position 0 among the first `length` elements and
@@ -56,19 +56,19 @@ private:
         std::size_t child = 0;
         while (child < (length - 1) / 2) {
             child = 2 * (child + 1);
-            if (above(items[child], items[child - 1])) --child;
-            items[hole] = items[child];
+            if (above(items_[child], items_[child - 1])) --child;
+            items_[hole] = items_[child];
             hole = child;
         }
         if (length % 2 == 0 && child == (length - 2) / 2) {
             child = 2 * child + 1;
-            items[hole] = items[child];
+            items_[hole] = items_[child];
             hole = child;
         }
         return hole;
     }
 
-    std::vector<Item> items;
+    std::vector<Item> items_;
 };
 
 }  // namespace model

@@ -55,32 +55,32 @@ std::size_t heapBytes() {
 }  // namespace
 
 HostJob::HostJob(Host& jobHost, const paths::PathList& pathList)
-    : host(jobHost), list(pathList), splitter(pathList) {}
+    : host_(jobHost), list_(pathList), splitter_(pathList) {}
 
 JobResults HostJob::run() {
-    results = {};
-    results.paths = list.size();
-    results.keptApart = splitter.keptApartCount();
-    results.textBytes = list.textBytes();
+    results_ = {};
+    results_.paths = list_.size();
+    results_.keptApart = splitter_.keptApartCount();
+    results_.textBytes = list_.textBytes();
 
     const std::size_t heapBefore = heapBytes();
     const Value instance = makeInstance();
     addPaths(instance);
-    results.instanceBytes = heapBytes() - heapBefore;
+    results_.instanceBytes = heapBytes() - heapBefore;
     readInEveryWay(instance);
 
     const Value rebuilt = rebuild(instance);
     iterate(rebuilt, "iterate the rebuilt one");
     Value copied;
-    step("copy", [&] { copied = host.copy(rebuilt); });
-    host.destroy(rebuilt);
+    step("copy", [&] { copied = host_.copy(rebuilt); });
+    host_.destroy(rebuilt);
     fetchJoined(copied, "fetch from the copy");
     Value saved;
-    step("save", [&] { saved = host.save(copied); });
+    step("save", [&] { saved = host_.save(copied); });
     Value loaded;
-    step("load", [&] { loaded = host.load(filesetClassName, saved); });
+    step("load", [&] { loaded = host_.load(filesetClassName, saved); });
     fetchParts(loaded, "fetch from the loaded one");
-    return results;
+    return results_;
 }
 
 void HostJob::step(const std::string& name,
@@ -89,13 +89,13 @@ void HostJob::step(const std::string& name,
     const Clock::time_point begin = Clock::now();
     action();
     const std::chrono::duration<double> taken = Clock::now() - begin;
-    results.steps.push_back({name, taken.count(), list.size()});
+    results_.steps.push_back({name, taken.count(), list_.size()});
 }
 
 // In mode "files": folders first, then as many cells of file names. A list of
 // one character alone gets a second one to count, so that there is a code.
 Value HostJob::makeInstance() {
-    paths::BatchReader reader(splitter,
+    paths::BatchReader reader(splitter_,
                               std::numeric_limits<std::size_t>::max());
     paths::Batch all;
     reader.next(all);
@@ -111,19 +111,19 @@ Value HostJob::makeInstance() {
     const Value foldersAndFiles = Value::cellColumn(std::move(elements));
     Value instance;
     step("make, mode files", [&] {
-        instance = host.construct(filesetClassName, Value::text(u"files"),
-                                  foldersAndFiles);
+        instance = host_.construct(filesetClassName, Value::text(u"files"),
+                                   foldersAndFiles);
     });
     return instance;
 }
 
 void HostJob::addPaths(const Value& instance) {
     step("add, in batches", [&] {
-        paths::BatchReader reader(splitter, pathsPerBatch);
+        paths::BatchReader reader(splitter_, pathsPerBatch);
         paths::Batch batch;
         while (reader.next(batch)) {
-            host.call(0, instance, "addPaths", Value::textLists(batch.folders),
-                      Value::textLists(batch.files));
+            host_.call(0, instance, "addPaths", Value::textLists(batch.folders),
+                       Value::textLists(batch.files));
         }
     });
 }
@@ -137,15 +137,15 @@ void HostJob::readInEveryWay(const Value& instance) {
 // Through the outputs of serialize and the property Frequencies.
 Value HostJob::rebuild(const Value& instance) {
     std::vector<Value> outputs;
-    step("serialize", [&] { outputs = host.call(2, instance, "serialize"); });
-    const Value frequencies = host.get(instance, "Frequencies");
-    results.storedBytes = outputs[1].numel() +
-                          outputs[0].numel() * sizeof(char16_t) +
-                          frequencies.numel() * sizeof(double);
+    step("serialize", [&] { outputs = host_.call(2, instance, "serialize"); });
+    const Value frequencies = host_.get(instance, "Frequencies");
+    results_.storedBytes = outputs[1].numel() +
+                           outputs[0].numel() * sizeof(char16_t) +
+                           frequencies.numel() * sizeof(double);
     Value rebuilt;
     step("rebuild, mode tree", [&] {
-        rebuilt = host.construct(filesetClassName, Value::text(u"tree"),
-                                 outputs[0], outputs[1], frequencies);
+        rebuilt = host_.construct(filesetClassName, Value::text(u"tree"),
+                                  outputs[0], outputs[1], frequencies);
     });
     return rebuilt;
 }
@@ -155,22 +155,23 @@ void HostJob::iterate(const Value& instance, const std::string& name) {
     std::vector<std::string> iterated;
     step(name, [&] {
         iterated.clear();
-        iterated.reserve(list.size());
-        host.call(0, instance, "reset");
-        while (host.call(1, instance, "hasNextPath")[0].truth(0)) {
-            const Value path = host.call(1, instance, "getNextPath")[0];
+        iterated.reserve(list_.size());
+        host_.call(0, instance, "reset");
+        while (host_.call(1, instance, "hasNextPath")[0].truth(0)) {
+            const Value path = host_.call(1, instance, "getNextPath")[0];
             iterated.push_back(toPath(joinedText(textsOf(path))));
         }
     });
     std::sort(iterated.begin(), iterated.end());
-    std::vector<std::size_t> order(list.size());
+    std::vector<std::size_t> order(list_.size());
     std::iota(order.begin(), order.end(), std::size_t{0});
-    std::sort(order.begin(), order.end(),
-              [&](std::size_t a, std::size_t b) { return list[a] < list[b]; });
+    std::sort(order.begin(), order.end(), [&](std::size_t a, std::size_t b) {
+        return list_[a] < list_[b];
+    });
     requireCount(iterated.size(), order.size(), name);
     for (std::size_t i = 0; i < order.size(); ++i) {
-        if (iterated[i] == list[order[i]]) continue;
-        throw DifferenceException(name + ": " + std::string(list[order[i]]) +
+        if (iterated[i] == list_[order[i]]) continue;
+        throw DifferenceException(name + ": " + std::string(list_[order[i]]) +
                                   "\nis missing before\n" + iterated[i]);
     }
 }
@@ -180,7 +181,7 @@ void HostJob::fetchJoined(const Value& instance, const std::string& name) {
     step(name, [&] {
         forNumbers(name, [&](const Value& numbers, std::size_t first) {
             const Value fetched =
-                host.call(1, instance, "getPaths", numbers, separator)[0];
+                host_.call(1, instance, "getPaths", numbers, separator)[0];
             for (std::size_t i = 0; i < fetched.numel(); ++i) {
                 compareInOrder(first + i, fetched.element(i).charData(), name);
             }
@@ -193,7 +194,7 @@ void HostJob::fetchParts(const Value& instance, const std::string& name) {
     step(name, [&] {
         forNumbers(name, [&](const Value& numbers, std::size_t first) {
             const std::vector<Value> parts =
-                host.call(2, instance, "getPaths", numbers);
+                host_.call(2, instance, "getPaths", numbers);
             std::size_t count = 0;
             for (std::size_t i = 0; i < parts[0].numel(); ++i) {
                 std::u16string folder;
@@ -208,9 +209,9 @@ void HostJob::fetchParts(const Value& instance, const std::string& name) {
 }
 
 void HostJob::forNumbers(const std::string& route, const Visit& visit) const {
-    for (std::size_t first = 1; first <= list.size(); first += numbersAtOnce) {
+    for (std::size_t first = 1; first <= list_.size(); first += numbersAtOnce) {
         std::vector<double> numbers(
-            std::min(numbersAtOnce, list.size() - first + 1));
+            std::min(numbersAtOnce, list_.size() - first + 1));
         std::iota(numbers.begin(), numbers.end(), static_cast<double>(first));
         const std::size_t asked = numbers.size();
         requireCount(visit(Value::column(std::move(numbers)), first), asked,
@@ -222,11 +223,11 @@ void HostJob::forNumbers(const std::string& route, const Visit& visit) const {
 void HostJob::compareInOrder(std::size_t number, std::u16string_view joined,
                              const std::string& route) const {
     const std::string path = toPath(joined);
-    if (number <= list.size() && path == list[number - 1]) return;
+    if (number <= list_.size() && path == list_[number - 1]) return;
     throw DifferenceException(
         route + ": path " + std::to_string(number) + " should be\n" +
-        std::string(number <= list.size() ? list[number - 1]
-                                          : "(behind the last)") +
+        std::string(number <= list_.size() ? list_[number - 1]
+                                           : "(behind the last)") +
         "\nand is\n" + path);
 }
 

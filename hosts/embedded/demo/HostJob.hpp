@@ -6,10 +6,10 @@
 #include <string_view>
 #include <vector>
 
+#include "hosts/embedded/Host.hpp"
 #include "paths/Batches.hpp"
 #include "paths/PathList.hpp"
 #include "paths/PathSplitter.hpp"
-#include "hosts/embedded/Host.hpp"
 
 namespace tessel::embedded {
 
@@ -66,10 +66,10 @@ private:
     // Times a step on all paths.
     void step(const std::string& name, const std::function<void()>& action);
 
-    Host& host;
-    const paths::PathList& list;
-    paths::PathSplitter splitter;
-    JobResults results;
+    Host& host_;
+    const paths::PathList& list_;
+    paths::PathSplitter splitter_;
+    JobResults results_;
 };
 
 }  // namespace tessel::embedded
