@@ -32,5 +32,5 @@ foreach(source IN LISTS coreSources tidySources)
     NAME tidy.${source}
     COMMAND ${QZTESSEL_CLANG_TIDY} --quiet -p ${PROJECT_BINARY_DIR} ${source}
     WORKING_DIRECTORY ${PROJECT_SOURCE_DIR})
-  set_tests_properties(tidy.${source} PROPERTIES LABELS check COST 50)
+  set_tests_properties(tidy.${source} PROPERTIES LABELS "check;tidy" COST 50)
 endforeach()

@@ -31,12 +31,35 @@ enum class PackedSizeT : std::uint8_t {
     Uint64 = 3
 };
 
+// Bytes taken by an integer of this width. Throws
+// InvalidUintConversionException on an unknown width.
+constexpr std::size_t widthBytes(PackedSizeT width) {
+    switch (width) {
+        case PackedSizeT::Uint8:
+            return sizeof(std::uint8_t);
+        case PackedSizeT::Uint16:
+            return sizeof(std::uint16_t);
+        case PackedSizeT::Uint32:
+            return sizeof(std::uint32_t);
+        case PackedSizeT::Uint64:
+            return sizeof(std::uint64_t);
+    }
+    throw InvalidUintConversionException();
+}
+
 // The integer whose bytes these are, least significant first. At most 8.
-std::uint64_t fromLittleEndian(std::span<const std::uint8_t> bytes) noexcept;
+constexpr std::uint64_t fromLittleEndian(
+    std::span<const std::uint8_t> bytes) noexcept {
+    std::uint64_t value = 0;
+    for (std::size_t j = bytes.size(); j-- > 0;)
+        value = (value << 8) | bytes[j];
+    return value;
+}
 
 // The one bounded reader of outside bytes. It borrows the bytes, which must
 // outlive it, and only moves forward. A read that asks for more than is left
 // throws DamagedFormException and leaves the cursor where it was.
+// Inline: reading a stored form is a long row of these calls.
 class ByteCursor {
 public:
     explicit ByteCursor(std::span<const std::uint8_t> bytes) noexcept
@@ -46,27 +69,33 @@ public:
     std::size_t remaining() const noexcept { return rest_.size(); }
 
     // The next n bytes; advances past them.
-    std::span<const std::uint8_t> take(std::uint64_t n);
+    // The only place where an outside length meets the end of the data.
+    std::span<const std::uint8_t> take(std::uint64_t n) {
+        if (n > rest_.size()) throw DamagedFormException();
+        const auto head = rest_.first(static_cast<std::size_t>(n));
+        rest_ = rest_.subspan(static_cast<std::size_t>(n));
+        return head;
+    }
 
     // The next byte; advances past it.
     std::uint8_t takeByte() { return take(1).front(); }
 
     // The next integer of the given width; advances past it. Throws
     // InvalidUintConversionException on an unknown width.
-    std::uint64_t takeUint(PackedSizeT width);
+    std::uint64_t takeUint(PackedSizeT width) {
+        return fromLittleEndian(take(widthBytes(width)));
+    }
 
     // Throws DamagedFormException unless `count` items of at least
     // `bytesEach` (not 0) bytes can still follow. Call it before reserving
     // memory for a count that was read.
-    void requireItems(std::uint64_t count, std::size_t bytesEach) const;
+    void requireItems(std::uint64_t count, std::size_t bytesEach) const {
+        if (count > rest_.size() / bytesEach) throw DamagedFormException();
+    }
 
 private:
     std::span<const std::uint8_t> rest_;
 };
-
-// Bytes taken by an integer of this width. Throws
-// InvalidUintConversionException on an unknown width.
-std::size_t widthBytes(PackedSizeT width);
 
 }  // namespace sixpacks
 
