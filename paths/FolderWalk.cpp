@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <climits>
 #include <system_error>
 #include <utility>
 
@@ -33,10 +34,48 @@ private:
     DIR* folder_;
 };
 
+// Closes a descriptor at the end and leaves errno as it was.
+class Descriptor {
+public:
+    explicit Descriptor(int descriptor) : descriptor_(descriptor) {}
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+    ~Descriptor() { replace(AT_FDCWD); }
+
+    int get() const noexcept { return descriptor_; }
+
+    void replace(int descriptor) noexcept {
+        const int error = errno;
+        if (descriptor_ >= 0) ::close(descriptor_);
+        errno = error;
+        descriptor_ = descriptor;
+    }
+
+private:
+    int descriptor_;
+};
+
+// Opens a folder whose name may be longer than the system takes in one call:
+// the folders on the way are opened one from the other.
+int openFolder(std::string_view name, int flags) {
+    Descriptor parent(AT_FDCWD);
+    while (name.size() >= PATH_MAX) {
+        const std::size_t end = name.rfind('/', PATH_MAX - 2);
+        if (end == std::string_view::npos || end == 0) break;
+        const std::string part(name.substr(0, end));
+        parent.replace(::openat(parent.get(), part.c_str(),
+                                O_PATH | O_DIRECTORY | O_CLOEXEC));
+        if (parent.get() < 0) return -1;
+        name.remove_prefix(
+            std::min(name.find_first_not_of('/', end), name.size() - 1));
+    }
+    return ::openat(parent.get(), std::string(name).c_str(), flags);
+}
+
 DIR* openStream(const std::string& name, bool followLink) {
     const int flags =
         O_RDONLY | O_DIRECTORY | O_CLOEXEC | (followLink ? 0 : O_NOFOLLOW);
-    const int file = ::open(name.c_str(), flags);
+    const int file = openFolder(name, flags);
     if (file < 0) return nullptr;
     DIR* stream = ::fdopendir(file);
     if (stream == nullptr) {
@@ -99,13 +138,15 @@ void noteSkipped(const std::string& folder, int error, WalkReport& report) {
 
 }  // namespace
 
-PathList listFolder(const std::string& folder, WalkReport& report) {
-    PathList list;
+void walkFolder(const std::string& folder, WalkFolders folders,
+                WalkReport& report,
+                const std::function<void(std::string_view)>& visit) {
     std::vector<std::string> waiting = {folder};
     std::string path;
     for (bool top = true; !waiting.empty(); top = false) {
         const std::string name = std::move(waiting.back());
         waiting.pop_back();
+        if (!top && folders == WalkFolders::Show) visit(name);
         Entries entries;
         const int error = readFolder(name, top, entries);
         if (error != 0 && top) {
@@ -119,13 +160,19 @@ PathList listFolder(const std::string& folder, WalkReport& report) {
         }
         const std::string prefix = asPrefix(name);
         for (const std::string& file : entries.files) {
-            list.append(path.assign(prefix).append(file));
+            visit(path.assign(prefix).append(file));
         }
         for (auto sub = entries.folders.rbegin(); sub != entries.folders.rend();
              ++sub) {
             waiting.push_back(prefix + *sub);
         }
     }
+}
+
+PathList listFolder(const std::string& folder, WalkReport& report) {
+    PathList list;
+    walkFolder(folder, WalkFolders::Leave, report,
+               [&](std::string_view path) { list.append(path); });
     return list;
 }
 

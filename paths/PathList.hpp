@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -63,14 +64,24 @@ struct WalkReport {
 // pipe. Throws PathListError.
 PathList readListFile(const std::string& file);
 
-// Lists everything below a folder that is not a folder, as the given name,
-// one '/' and the way down. Symbolic links are listed and not followed, save
-// the given name itself. A folder's own files come first, in the order of
-// their bytes, then each folder in it, in the same order. Folders that cannot
-// be read are left out and counted. Throws PathListError if the given one
-// cannot be read.
+// Whether a walk shows folders, too.
+enum class WalkFolders { Leave, Show };
+
+// Shows everything below a folder to visit(path): the given name, one '/' and
+// the way down. Symbolic links are shown and not followed, save the given name
+// itself. A folder's own files come first, in the order of their bytes, then
+// each folder in it, in the same order, directly followed by what is in it.
+// The given folder itself is not shown. Folders that cannot be read are
+// counted; what is in them is left out. Throws PathListError if the given one
+// cannot be read, and what `visit` throws.
 //
-// Cost: open files and stack do not grow with the depth.
+// Cost: open files and stack do not grow with the depth, and paths may be
+// longer than the system takes in one call.
+void walkFolder(const std::string& folder, WalkFolders folders,
+                WalkReport& report,
+                const std::function<void(std::string_view)>& visit);
+
+// What walkFolder shows without folders, as a list.
 PathList listFolder(const std::string& folder, WalkReport& report);
 
 // Whichever of the two the name calls for. Throws PathListError, also if
