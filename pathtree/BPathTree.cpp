@@ -1,5 +1,6 @@
 #include "pathtree/BPathTree.hpp"
 
+#include <algorithm>
 #include <iterator>
 #include <stdexcept>
 #include <unordered_set>
@@ -21,16 +22,13 @@ void appendCopy(ComponentView value, Components& out) {
 void takeOver(Component& component) { releaseContents(component); }
 void takeOver(const ComponentView&) {}
 
-const BNode& childAt(const BNode& node, std::uint64_t position) {
-    const ChildList children = node.children();
-    if (position >= children.size())
-        throw std::out_of_range("A position leads outside the path tree.");
-    return children[static_cast<std::size_t>(position)];
+void assignCopy(ComponentView value, Component& out) {
+    out.assign(value.begin(), value.end());
 }
 
-template <class T>
-void appendAll(std::vector<T>& out, std::vector<T>& more) {
-    out.reserve(out.size() + more.size());
+// Appends `more` to `out`, or nothing if memory runs out.
+void appendAll(Components& out, Components& more) {
+    reserveGently(out, more.size());
     std::move(more.begin(), more.end(), std::back_inserter(out));
 }
 
@@ -56,6 +54,13 @@ const char* EmptyPathForTraverseException::what() const noexcept {
 
 const char* UnknownNodeTypeException::what() const noexcept {
     return "Cannot determine the node type for the given value.";
+}
+
+const BNode& BatchFiles::childAt(const BNode& node, std::uint64_t position) {
+    const ChildList children = node.children();
+    if (position >= children.size())
+        throw std::out_of_range("A position leads outside the path tree.");
+    return children[static_cast<std::size_t>(position)];
 }
 
 BPathTree::BPathTree() {
@@ -204,39 +209,47 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
 void BPathTree::reset() {
     finder_.clear();
     if (root->isLeaf()) return;
+    // Room first, so that it changes nothing if memory runs out.
+    pendingNodes.reserve(1);
+    parentNodes.reserve(1);
     pendingNodes.clear();
     pushAllChildren(root);
     parentNodes.clear();
     parentNodes.push(root);
     currentPrefix.clear();
+    unchangedFolders_ = 0;
 }
 
 bool BPathTree::hasNextPath() const noexcept {
     return !root->isLeaf() && !pendingNodes.empty();
 }
 
-void BPathTree::getNextPath(Components& out) {
+// Enters folders until a leaf is on top of the pending nodes; returns it.
+// Each folder is entered as a whole or, if memory runs out, not at all.
+const BNode& BPathTree::enterFolders() {
     if (!hasNextPath()) throw NoMorePathException();
-    BNodePtr node(&pendingNodes.top());
-    while (!node->isLeaf()) {
+    while (!pendingNodes.top().isLeaf()) {
+        const BNodePtr folder(&pendingNodes.top());
+        pendingNodes.reserve(1);
+        parentNodes.reserve(1);
+        reserveGently(currentPrefix, 1);
+        appendCopy(folder->value(), currentPrefix);
         pendingNodes.pop();
-        appendCopy(node->value(), currentPrefix);
-        pushAllChildren(node);
-        parentNodes.push(node);
-        node = BNodePtr(&pendingNodes.top());
+        pushAllChildren(folder);
+        parentNodes.push(folder);
     }
-    const bool folderEnds = isNodeAtEndOfParent(node);
-    pendingNodes.pop();
-    // Assigning in place keeps the memory that out already has.
-    out.resize(currentPrefix.size() + 1);
-    for (std::size_t i = 0; i < currentPrefix.size(); ++i)
-        out[i] = currentPrefix[i];
-    const ComponentView name = node->value();
-    out.back().assign(name.begin(), name.end());
-    if (folderEnds) closeFinishedFolders();
+    return pendingNodes.top();
 }
 
-void BPathTree::closeFinishedFolders() {
+// Takes the leaf on top off, and the folders that end with it.
+void BPathTree::leavePath() noexcept {
+    const BNodePtr leaf(&pendingNodes.top());
+    pendingNodes.pop();
+    if (isNodeAtEndOfParent(leaf)) closeFinishedFolders();
+    unchangedFolders_ = currentPrefix.size();
+}
+
+void BPathTree::closeFinishedFolders() noexcept {
     while (!parentNodes.empty()) {
         const BNodePtr folder(&parentNodes.top());
         parentNodes.pop();
@@ -245,44 +258,40 @@ void BPathTree::closeFinishedFolders() {
     }
 }
 
+void BPathTree::getNextPath(Components& out) {
+    visitNextPath([&out](const PathView& path) {
+        // Assigning in place keeps the memory that out already has.
+        out.resize(path.folders.size() + 1);
+        std::copy(path.folders.begin(), path.folders.end(), out.begin());
+        assignCopy(path.name, out.back());
+    });
+}
+
 // ---- Lookup ----
+
+BatchFiles BPathTree::filesOfRoot() const {
+    if (root->isLeaf()) throw std::out_of_range("A track leads nowhere.");
+    return {*root, 0};
+}
 
 void BPathTree::traversePath(const PathTrack& pathTrack,
                              Components& out) const {
-    if (root->isLeaf()) throw NoTreeToTraverseException();
-    if (pathTrack.empty()) throw EmptyPathForTraverseException();
     Components found;
     found.reserve(pathTrack.size());
-    const BNode* node = root.get();
-    for (const std::uint64_t position : pathTrack) {
-        node = &childAt(*node, position);
-        appendCopy(node->value(), found);
-    }
+    visitTrack(pathTrack,
+               [&found](ComponentView value) { appendCopy(value, found); });
     appendAll(out, found);
 }
 
 void BPathTree::getBatch(Components& folder, Components& files,
                          const PathTrack& track,
                          const std::vector<std::uint64_t>& offsets) const {
-    const BNode* parent = root.get();
-    const BNode* end = parent;
     folder.reserve(folder.size() + track.size());
-    for (const std::uint64_t position : track) {
-        parent = end;
-        end = &childAt(*parent, position);
-        appendCopy(end->value(), folder);
-    }
-    std::uint64_t base = 0;
-    if (end->isLeaf()) {
-        if (track.empty()) throw std::out_of_range("A track leads nowhere.");
-        folder.pop_back();
-        base = track.back();
-    } else {
-        parent = end;
-    }
     files.reserve(files.size() + offsets.size());
-    for (const std::uint64_t offset : offsets)
-        appendCopy(childAt(*parent, base - 1 + offset).value(), files);
+    visitBatch(
+        track, offsets,
+        [&folder](ComponentView value) { appendCopy(value, folder); },
+        [&files](ComponentView value) { appendCopy(value, files); });
 }
 
 void BPathTree::getPath(
@@ -290,11 +299,12 @@ void BPathTree::getPath(
     const std::vector<std::uint64_t>& selectedPartitions,
     const std::vector<PathTrack>& partitionTracks,
     const std::vector<std::vector<std::uint64_t>>& fileOffsets) const {
-    if (fileOffsets.size() < selectedPartitions.size())
+    const std::size_t count = selectedPartitions.size();
+    if (fileOffsets.size() < count)
         throw std::out_of_range("A selected partition has no file offsets.");
-    std::vector<Components> folders(selectedPartitions.size());
-    std::vector<Components> files(selectedPartitions.size());
-    for (std::size_t i = 0; i < selectedPartitions.size(); ++i) {
+    std::vector<Components> folders(count);
+    std::vector<Components> files(count);
+    for (std::size_t i = 0; i < count; ++i) {
         const std::uint64_t partition = selectedPartitions[i];
         if (partition >= partitionTracks.size())
             throw std::out_of_range("A partition does not exist.");
@@ -302,8 +312,14 @@ void BPathTree::getPath(
                  partitionTracks[static_cast<std::size_t>(partition)],
                  fileOffsets[i]);
     }
-    appendAll(folderPaths, folders);
-    appendAll(filePaths, files);
+    // Room first, so that nothing is appended if memory runs out.
+    const bool oneList = &folderPaths == &filePaths;
+    reserveGently(folderPaths, oneList ? 2 * count : count);
+    if (!oneList) reserveGently(filePaths, count);
+    for (std::size_t i = 0; i < count; ++i) {
+        folderPaths.push_back(std::move(folders[i]));
+        filePaths.push_back(std::move(files[i]));
+    }
 }
 
 // ---- Memory ----

@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <exception>
+#include <span>
 #include <vector>
 
 #include "pathtree/BNode.hpp"
@@ -42,6 +43,37 @@ public:
 // of file names, or a whole path with the file name last.
 using Component = std::vector<std::uint8_t>;
 using Components = std::vector<Component>;
+
+// The path that a pass is at: views of the tree, valid during the visit.
+struct PathView {
+    std::span<const Component> folders;
+    ComponentView name;
+    // So many leading folders are the same nodes as in the path before, which
+    // this tree visited in the same pass: their text need not be decoded anew.
+    std::size_t unchangedFolders;
+};
+
+// The files of one batch, found by its track. Valid as long as the tree.
+class BatchFiles {
+public:
+    // The name of the file at this offset, 1-based within the batch. Throws
+    // std::out_of_range for a position outside the folder.
+    ComponentView operator[](std::uint64_t offset) const {
+        return childAt(*folder_, first_ - 1 + offset).value();
+    }
+
+private:
+    friend class BPathTree;
+
+    BatchFiles(const BNode& folder, std::uint64_t first) noexcept
+        : folder_(&folder), first_(first) {}
+
+    // Throws std::out_of_range if there is no such child.
+    static const BNode& childAt(const BNode& node, std::uint64_t position);
+
+    const BNode* folder_;
+    std::uint64_t first_;  // position of the batch's first file
+};
 
 // BPathTree keeps paths as a trie whose edges are encoded components,
 // compared by length and bytes, never decoded, ordered or interpreted.
@@ -127,8 +159,20 @@ public:
     // True while the pass has a path left; false before the first reset.
     bool hasNextPath() const noexcept;
 
-    // Replaces `out` by the next path's components, folders first. Throws
+    // Calls visit(const PathView&) with the next path and moves on. Throws
     // NoMorePathException when none is left, with nothing changed.
+    // If memory runs out, or visit throws, the pass stays before this path:
+    // the call may be repeated.
+    // Cost: the folders that are entered and left; no copy of the path.
+    template <class Visit>
+    void visitNextPath(Visit&& visit) {
+        const ComponentView name = enterFolders().value();
+        visit(PathView{currentPrefix, name, unchangedFolders_});
+        leavePath();
+    }
+
+    // Replaces `out` by the next path's components, folders first. Throws
+    // as visitNextPath does.
     // Cost: the depth of the tree and the bytes of the path.
     void getNextPath(Components& out);
 
@@ -144,22 +188,46 @@ public:
     bool isNodeAtEndOfParent(const BNodePtr& node) const noexcept;
 
     // ---- Lookup ----
-    // Positions that lead outside the tree throw std::out_of_range. Whatever
-    // is thrown, the outputs are unchanged.
+    // Positions that lead outside the tree throw std::out_of_range. Views are
+    // valid as long as the tree. When something is thrown, components may
+    // have been visited already; output lists are unchanged.
 
-    // Appends to `out` the components along the track. Throws
+    // Calls visit(ComponentView) with each component along the track. Throws
     // NoTreeToTraverseException on a tree without paths, otherwise
     // EmptyPathForTraverseException on an empty track.
+    template <class Visit>
+    void visitTrack(std::span<const std::uint64_t> track, Visit&& visit) const;
+
+    // Calls visitFolder(ComponentView) with each folder component of the
+    // batch to which the track belongs, then returns its files.
+    //
+    // The track ends at | the folder is   | the first file's position is
+    // ------------------+-----------------+------------------------------
+    // a node with files | that node       | 0: the batch made the folder
+    // a leaf            | the leaf's      | the leaf's: the batch joined an
+    //                   | parent          | existing folder
+    //
+    // So a batch that made its folder and brought no file is answered as if
+    // the folder were a file.
+    template <class VisitFolder>
+    BatchFiles openBatch(std::span<const std::uint64_t> track,
+                         VisitFolder&& visitFolder) const;
+
+    // The same, and then visitFile(ComponentView) with the files at these
+    // offsets (1-based within the batch), in the order given.
+    template <class VisitFolder, class VisitFile>
+    void visitBatch(std::span<const std::uint64_t> track,
+                    std::span<const std::uint64_t> offsets,
+                    VisitFolder&& visitFolder, VisitFile&& visitFile) const;
+
+    // Inspection. Appends to `out` the components along the track. Throws as
+    // visitTrack does.
     void traversePath(const PathTrack& pathTrack, Components& out) const;
 
-    // Fetches files by batch. For each entry i of selectedPartitions (a
-    // position in partitionTracks, 0-based) appends to folderPaths the
-    // batch's folder components and to filePaths the names of the files at
-    // fileOffsets[i] (1-based within the batch), in that order.
-    //
-    // A track that ends at a leaf is that of a batch which joined an
-    // existing folder, and the leaf its first file. So a batch that made its
-    // folder and brought no file is answered as if the folder were a file.
+    // Inspection. For each entry i of selectedPartitions (a position in
+    // partitionTracks, 0-based) appends to folderPaths the batch's folder
+    // components and to filePaths the names of the files at fileOffsets[i],
+    // in that order: see openBatch. One list may be both outputs.
     void getPath(
         std::vector<Components>& folderPaths,
         std::vector<Components>& filePaths,
@@ -219,6 +287,11 @@ public:
 private:
     friend class TreeBuilder;
 
+    BatchFiles filesOfRoot() const;
+    static const BNode& childAt(const BNode& node, std::uint64_t position) {
+        return BatchFiles::childAt(node, position);
+    }
+
     ChildFinder::Found findOrAppend(BNode& parent, ComponentView value,
                                     NodePool::Kind kind, bool& existed) const;
     template <class Folder>
@@ -226,12 +299,52 @@ private:
                            bool& existed);
     template <class Files>
     std::uint64_t appendFiles(BNode& folder, Files& fileNames);
-    void closeFinishedFolders();
+    const BNode& enterFolders();
+    void leavePath() noexcept;
+    void closeFinishedFolders() noexcept;
 
     // Helpers of insertion, which is const for addIfExistsAndFind: the tree
     // is in the nodes, not in them.
     mutable NodePool pool_;
     mutable ChildFinder finder_;
+
+    std::size_t unchangedFolders_ = 0;  // see PathView
 };
+
+template <class Visit>
+void BPathTree::visitTrack(std::span<const std::uint64_t> track,
+                           Visit&& visit) const {
+    if (root->isLeaf()) throw NoTreeToTraverseException();
+    if (track.empty()) throw EmptyPathForTraverseException();
+    const BNode* node = root.get();
+    for (const std::uint64_t position : track) {
+        node = &childAt(*node, position);
+        visit(node->value());
+    }
+}
+
+template <class VisitFolder>
+BatchFiles BPathTree::openBatch(std::span<const std::uint64_t> track,
+                                VisitFolder&& visitFolder) const {
+    if (track.empty()) return filesOfRoot();
+    const BNode* folder = root.get();
+    for (const std::uint64_t position : track.first(track.size() - 1)) {
+        folder = &childAt(*folder, position);
+        visitFolder(folder->value());
+    }
+    const BNode& end = childAt(*folder, track.back());
+    if (end.isLeaf()) return {*folder, track.back()};
+    visitFolder(end.value());
+    return {end, 0};
+}
+
+template <class VisitFolder, class VisitFile>
+void BPathTree::visitBatch(std::span<const std::uint64_t> track,
+                           std::span<const std::uint64_t> offsets,
+                           VisitFolder&& visitFolder,
+                           VisitFile&& visitFile) const {
+    const BatchFiles files = openBatch(track, visitFolder);
+    for (const std::uint64_t offset : offsets) visitFile(files[offset]);
+}
 
 }  // namespace tessel

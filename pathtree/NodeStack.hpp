@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "pathtree/BNode.hpp"
+#include "pathtree/containers.hpp"
 
 namespace tessel {
 
@@ -46,6 +47,9 @@ public:
     }
 
     void clear() noexcept { ranges_.clear(); }
+
+    // Makes sure that the next `more` pushes do not throw.
+    void reserve(std::size_t more) { reserveGently(ranges_, more); }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {

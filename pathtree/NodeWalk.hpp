@@ -38,6 +38,8 @@ public:
     // The node that next() moved to.
     const BNode& node() const noexcept { return *current_; }
     bool isLeaf() const noexcept { return !hasChildren_; }
+    // The folders that it is in, the root not counted.
+    std::size_t depth() const noexcept { return open_.size() - 1; }
     // True when it is its parent's last child.
     bool isLastChild() const noexcept { return last_; }
 

@@ -233,6 +233,61 @@ TEST(MemoryFailures, TraversingLeavesItsOutputAsItWas) {
     });
 }
 
+TEST(MemoryFailures, BatchesLeaveTheOutputsAsTheyWere) {
+    tessel::BPathTree tree;
+    support::addBatch(tree, {"a"}, {"f", "g"});
+    support::addBatch(tree, {"a"}, {"h"});
+    forEachAllocation([&tree](std::size_t n) {
+        std::vector<Components> folders = {{{1}}};
+        std::vector<Components> files = {{{2}}, {{3}}};
+        const std::vector<tessel::PathTrack> tracks = {{0}, {0, 2}};
+        const std::vector<std::vector<std::uint64_t>> offsets = {{1, 2}, {1}};
+        const std::vector<std::uint64_t> selected = {0, 1};
+        const bool found = succeedsWith(n, [&] {
+            tree.getPath(folders, files, selected, tracks, offsets);
+        });
+        EXPECT_EQ(folders.size(), found ? 3U : 1U);
+        EXPECT_EQ(files.size(), found ? 4U : 2U);
+        return found;
+    });
+}
+
+// Each allocation of a pass fails in turn, and each call is repeated.
+TEST(MemoryFailures, APassIsRepeatableAfterEachFailure) {
+    tessel::BPathTree tree;
+    support::addBatch(tree, {"a", "b", "c", "d"}, {"f", "g"});
+    support::addBatch(tree, {"a", "b", "e"}, {"h"});
+    support::addBatch(tree, {"a"}, {"i"});
+    support::addBatch(tree, {"j", "k"}, {"l"});
+    const std::vector<std::vector<std::string>> expected = {
+        {"a", "b", "c", "d", "f"},
+        {"a", "b", "c", "d", "g"},
+        {"a", "b", "e", "h"},
+        {"a", "i"},
+        {"j", "k", "l"}};
+    forEachAllocation([&](std::size_t n) {
+        tessel::BPathTree pass;
+        pass.root = tree.root;
+        if (!succeedsWith(n, [&] { pass.reset(); })) {
+            EXPECT_FALSE(pass.hasNextPath());
+            pass.reset();
+        }
+        std::vector<std::vector<std::string>> seen;
+        bool failed = false;
+        while (pass.hasNextPath()) {
+            Components path;
+            if (!succeedsWith(n, [&] { pass.getNextPath(path); })) {
+                failed = true;
+                path.clear();
+                pass.getNextPath(path);
+            }
+            seen.push_back(support::textsOf(path));
+        }
+        EXPECT_EQ(seen, expected);
+        return !failed;
+    });
+}
+
 TEST(MemoryFailures, DecodingLeavesTheTextAsItWas) {
     const CoderPtr coder = support::fourLetterCoder();
     const Bytes bytes = coder->generateCodeFor(std::u16string(500, u'b'));

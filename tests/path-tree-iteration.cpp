@@ -24,6 +24,52 @@ std::vector<std::string> next(BPathTree& tree) {
     return textsOf(path);
 }
 
+// The next path with the number of its folders that did not change.
+std::string nextView(BPathTree& tree) {
+    std::string seen;
+    tree.visitNextPath([&seen](const tessel::PathView& path) {
+        seen = std::to_string(path.unchangedFolders);
+        for (const auto& folder : path.folders)
+            seen.append(" ").append(support::textOf(folder));
+        seen.append(" ").append(support::textOf(path.name));
+    });
+    return seen;
+}
+
+TEST(PathTreeIteration, AVisitShowsThePathAndWhatDidNotChange) {
+    BPathTree tree;
+    addBatch(tree, {"a", "b"}, {"f", "g"});
+    addBatch(tree, {"a"}, {"h"});
+    addBatch(tree, {"c", "b"}, {"i"});
+    tree.reset();
+    EXPECT_EQ(nextView(tree), "0 a b f");
+    EXPECT_EQ(nextView(tree), "2 a b g");
+    EXPECT_EQ(nextView(tree), "1 a h");
+    EXPECT_EQ(nextView(tree), "0 c b i");
+    EXPECT_THROW(nextView(tree), tessel::NoMorePathException);
+    tree.reset();
+    EXPECT_EQ(nextView(tree), "0 a b f");
+    tree.reset();
+    EXPECT_EQ(nextView(tree), "0 a b f");
+    BPathTree copy(tree);
+    EXPECT_EQ(nextView(copy), "0 a b g");
+    EXPECT_EQ(next(tree), (Paths{"a", "b", "g"}));
+    EXPECT_EQ(nextView(tree), "1 a h");
+}
+
+TEST(PathTreeIteration, AVisitThatThrowsMayBeRepeated) {
+    BPathTree tree;
+    addBatch(tree, {"a", "b"}, {"f", "g"});
+    tree.reset();
+    EXPECT_THROW(tree.visitNextPath([](const tessel::PathView&) { throw 1; }),
+                 int);
+    EXPECT_EQ(nextView(tree), "0 a b f");
+    EXPECT_THROW(tree.visitNextPath([](const tessel::PathView&) { throw 1; }),
+                 int);
+    EXPECT_EQ(nextView(tree), "2 a b g");
+    EXPECT_FALSE(tree.hasNextPath());
+}
+
 TEST(PathTreeIteration, ASinglePathOfOneComponent) {
     BPathTree tree;
     addWhole(tree, {"x"});
