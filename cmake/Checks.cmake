@@ -22,12 +22,24 @@ qztesselAddCheck(
   consumer consumer.sh ${CMAKE_COMMAND} ${CMAKE_CXX_COMPILER}
   ${PROJECT_BINARY_DIR} ${PROJECT_BINARY_DIR}/consumer)
 
-# One test a file, so that ctest -j spreads the slowest check of all.
+qztesselAddCheck(packages packages.sh ${CMAKE_CPACK_COMMAND}
+                 ${PROJECT_BINARY_DIR} ${PROJECT_BINARY_DIR}/packages)
+
+# One test per file, so that ctest -j spreads the slowest check of all.
 file(
   GLOB_RECURSE tidySources CONFIGURE_DEPENDS
   RELATIVE ${PROJECT_SOURCE_DIR}
-  paths/*.cpp archive/*.cpp binding/*.cpp hosts/*.cpp bench/*.cpp fuzz/*.cpp)
-foreach(source IN LISTS coreSources tidySources)
+  archive/*.cpp
+  bench/*.cpp
+  binding/*.cpp
+  coder/*.cpp
+  examples/*.cpp
+  fuzz/*.cpp
+  hosts/*.cpp
+  packing/*.cpp
+  paths/*.cpp
+  pathtree/*.cpp)
+foreach(source IN LISTS tidySources)
   add_test(
     NAME tidy.${source}
     COMMAND ${QZTESSEL_CLANG_TIDY} --quiet -p ${PROJECT_BINARY_DIR} ${source}

@@ -3,8 +3,9 @@
 # What it takes to build and run; what the checks take beyond that.
 buildPackages=(cmake g++ ninja-build zlib1g-dev)
 checkPackages=(
-    clang clang-format clang-tidy libclang-rt-dev libgtest-dev liblzma-dev
-    libmarisa-dev librapidcheck-dev libzstd-dev llvm pkg-config valgrind
+    clang clang-format clang-tidy dpkg-dev file libclang-rt-dev libgtest-dev
+    liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev lintian llvm
+    pkg-config valgrind
 )
 
 # Installs those of the given Debian packages that are missing. Silent when

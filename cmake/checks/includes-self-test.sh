@@ -6,7 +6,8 @@ checker=$PWD/cmake/checks/includes.sh
 tree=$(mktemp -d)
 trap 'rm -rf "$tree"' EXIT
 cd "$tree"
-mkdir -p packing pathtree coder paths archive binding hosts/small
+mkdir -p packing pathtree coder paths archive binding hosts/small \
+    qztessel
 
 # Writes a file that includes each of the given headers.
 including() {
@@ -16,7 +17,7 @@ including() {
 }
 for header in packing/sixpacks pathtree/BPathTree coder/HuffmanPathTree \
     paths/PathStore archive/PathArchive binding/HostInterface binding/Methods \
-    hosts/small/Host; do
+    hosts/small/Host qztessel/Version; do
     echo '#include <vector>' >"$header.hpp"
 done
 
@@ -26,7 +27,8 @@ including binding/good.cpp binding/HostInterface.hpp coder/HuffmanPathTree.hpp
 including paths/good.cpp coder/HuffmanPathTree.hpp packing/sixpacks.hpp
 including archive/good.cpp packing/sixpacks.hpp archive/PathArchive.hpp
 including hosts/small/good.cpp binding/HostInterface.hpp hosts/small/Host.hpp \
-    paths/PathStore.hpp archive/PathArchive.hpp
+    paths/PathStore.hpp archive/PathArchive.hpp qztessel/Version.hpp
+including qztessel/good.hpp paths/PathStore.hpp archive/PathArchive.hpp
 "$checker" . || {
     echo "a tree without a breach is refused"
     exit 1
@@ -43,18 +45,19 @@ echo '#  include <coder/HuffmanPathTree.hpp>' >pathtree/bad8.cpp
 including archive/bad9.cpp pathtree/BPathTree.hpp
 including paths/bad10.cpp archive/PathArchive.hpp
 including binding/bad11.cpp paths/PathStore.hpp
+including qztessel/bad12.cpp coder/HuffmanPathTree.hpp
 if found=$("$checker" .); then
     echo "breaches are not refused"
     exit 1
 fi
-for number in {1..11}; do
+for number in {1..12}; do
     grep -q "/bad$number.cpp:1: " <<<"$found" || {
         echo "bad$number.cpp is not reported"
         exit 1
     }
 done
-(($(wc -l <<<"$found") == 11)) || {
-    echo "more than the eleven breaches are reported:"
+(($(wc -l <<<"$found") == 12)) || {
+    echo "more than the twelve breaches are reported:"
     echo "$found"
     exit 1
 }

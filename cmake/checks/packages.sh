@@ -1,0 +1,93 @@
+#!/bin/bash
+# Usage: packages.sh CPACK BUILD_FOLDER WORK_FOLDER
+#
+# Makes the Debian packages from a finished build and looks at them: lintian
+# has no error, every library that a program needs is of a package that it
+# depends on, the command runs from where the packages put it, and, as root,
+# dpkg installs them into an empty root and purges them without a trace.
+set -euo pipefail
+cpack=$1 build=$2 work=$(realpath -m "$3")
+root=$work/root
+rm -rf "$work"
+mkdir -p "$root"
+
+fail() {
+    echo "packages: $1"
+    exit 1
+}
+
+"$cpack" -G DEB --config "$build/CPackConfig.cmake" -B "$work" \
+    >"$work/cpack.log" 2>&1 || {
+    cat "$work/cpack.log"
+    fail "cpack failed"
+}
+packages=("$work"/*.deb)
+names=$(for package in "${packages[@]}"; do
+    dpkg-deb -f "$package" Package
+    dpkg-deb -x "$package" "$root"
+done | sort | xargs)
+[[ $names == "libqztessel-dev libqztessel1 tessel" ]] ||
+    fail "these were made: $names"
+
+lintian --allow-root --fail-on error --tag-display-limit 0 "${packages[@]}" ||
+    fail "lintian finds errors"
+
+# Each library that an ELF file of a package asks for must come from one of
+# the packages that it names.
+checkDependencies() {
+    local package=$1 folder=$2 named library owner owned
+    named=" $(dpkg-deb -f "$package" Depends | tr -d ',')"
+    while read -r library; do
+        owned=
+        while read -r owner; do
+            [[ "$named " != *" $owner "* ]] || owned=1
+        done < <(dpkg-query -S "*/$library" | sed -n 's/:.*//p' | sort -u)
+        [[ $owned ]] ||
+            fail "${package##*/} needs $library and names only:$named"
+    done < <(find "$folder/usr" -type f \( -path '*/bin/*' -o -name '*.so*' \) \
+        -exec readelf -d {} + | sed -n 's/.*(NEEDED).*\[\(.*\)\]/\1/p' |
+        grep -v '^ld-linux' | sort -u)
+}
+for package in "${packages[@]}"; do
+    folder=$work/one
+    rm -rf "$folder"
+    dpkg-deb -x "$package" "$folder"
+    checkDependencies "$package" "$folder"
+done
+
+# ---- The command, where it was put ----
+
+command=$root/usr/bin/tessel
+if [[ -x $command ]]; then
+    version=$(dpkg-deb -f "${packages[0]}" Version)
+    [[ $("$command" --version) == *"$version"* ]] ||
+        fail "tessel --version does not say $version"
+    find "$root/usr" -not -type d | sort >"$work/list"
+    "$command" pack -q "$work/list" -o "$work/list.tessel" >/dev/null
+    "$command" list "$work/list.tessel" | cmp - "$work/list" ||
+        fail "the list that tessel packed comes out changed"
+fi
+
+# ---- In and out again ----
+
+inRoot() {
+    dpkg --root="$work/installed" --force-depends --force-script-chrootless \
+        "$@" >>"$work/dpkg.log" 2>&1 || {
+        cat "$work/dpkg.log"
+        fail "dpkg $1 failed"
+    }
+}
+if ((EUID == 0)); then
+    mkdir -p "$work/installed/var/lib/dpkg"
+    touch "$work/installed/var/lib/dpkg/status"
+    inRoot --install "${packages[@]}"
+    diff <(cd "$root" && find usr | sort) \
+        <(cd "$work/installed" && find usr | sort) ||
+        fail "what is installed is not what the packages hold"
+    # shellcheck disable=SC2086  # the names are words
+    inRoot --purge $names
+    left=$(find "$work/installed" -path '*/var/lib/dpkg' -prune -o \
+        -not -type d -print)
+    [[ ! $left && ! -e $work/installed/usr ]] ||
+        fail "left after purging: $left"
+fi
