@@ -1,8 +1,5 @@
 #include "paths/Batches.hpp"
 
-#include <cstdint>
-#include <functional>
-
 #include "paths/PathText.hpp"
 
 namespace tessel::paths {
@@ -31,29 +28,6 @@ std::size_t visitPaths(const PathSplitter& splitter, std::size_t first,
     }
     return list.size();
 }
-
-// The counts of all code units.
-class UnitCounter {
-public:
-    void operator()(char16_t unit) noexcept { ++counts_[unit]; }
-    void operator()(std::u16string_view text) noexcept {
-        for (const char16_t unit : text) ++counts_[unit];
-    }
-
-    CharacterCounts result() const {
-        CharacterCounts all;
-        for (std::size_t unit = 0; unit < counts_.size(); ++unit) {
-            if (counts_[unit] == 0) continue;
-            all.characters.push_back(static_cast<char16_t>(unit));
-            all.frequencies.push_back(static_cast<double>(counts_[unit]));
-        }
-        return all;
-    }
-
-private:
-    std::vector<std::uint64_t> counts_ =
-        std::vector<std::uint64_t>(std::size_t{1} << 16U);
-};
 
 }  // namespace
 
@@ -97,32 +71,32 @@ bool sameFolder(std::string_view path, const PathSplit& split,
 }
 
 CharacterCounts countCharacters(const PathSplitter& splitter) {
-    UnitCounter count;
+    CharacterCounter counter;
     visitPaths(
         splitter, 0,
         [&](std::string_view path, const PathSplit& split) {
-            if (split.rootEnd == 0) count(noRoot);
-            forEachUnit(path.substr(0, split.rootEnd), std::ref(count));
+            if (split.rootEnd == 0) counter.add(noRoot);
+            counter.addBytes(path.substr(0, split.rootEnd));
             forEachFolder(path, split, [&](std::string_view folder) {
-                forEachUnit(folder, std::ref(count));
+                counter.addBytes(folder);
             });
         },
         [&](std::string_view path, const PathSplit& split) {
-            forEachUnit(path.substr(split.fileStart), std::ref(count));
+            counter.addBytes(path.substr(split.fileStart));
         },
         [](std::size_t) { return false; });
-    return count.result();
+    return counter.result();
 }
 
 CharacterCounts countCharacters(const FolderTexts& folders,
                                 const FolderTexts& files) {
-    UnitCounter count;
+    CharacterCounter counter;
     for (const FolderTexts* texts : {&folders, &files}) {
         for (const auto& list : *texts) {
-            for (const std::u16string& text : list) count(text);
+            for (const std::u16string& text : list) counter.add(text);
         }
     }
-    return count.result();
+    return counter.result();
 }
 
 void appendFolder(const std::vector<std::u16string>& components,

@@ -5,6 +5,7 @@
 #include <string_view>
 #include <vector>
 
+#include "paths/CharacterCounter.hpp"
 #include "paths/PathList.hpp"
 #include "paths/PathSplitter.hpp"
 
@@ -53,12 +54,8 @@ std::vector<std::u16string> folderTexts(std::string_view path,
 bool sameFolder(std::string_view path, const PathSplit& split,
                 std::string_view other, const PathSplit& otherSplit) noexcept;
 
-// How often each code unit occurs in the components of some batches: what the
-// coder's code is made from. Every folder is counted once a batch that it has.
-struct CharacterCounts {
-    std::u16string characters;        // ascending
-    std::vector<double> frequencies;  // one for each of them
-};
+// Input for the coder's code. A folder is counted once per batch in which it
+// occurs.
 CharacterCounts countCharacters(const PathSplitter& splitter);
 CharacterCounts countCharacters(const FolderTexts& folders,
                                 const FolderTexts& files);

@@ -1,61 +1,20 @@
 #include "paths/PathList.hpp"
 
-#include <fcntl.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <system_error>
 #include <utility>
 
+#include "paths/WholeFile.hpp"
+
 namespace tessel::paths {
 
 namespace {
 
-PathListError cannotRead(const std::string& name, int error) {
-    return PathListError("Cannot read " + name + ": " +
-                         std::generic_category().message(error) + ".");
-}
-
-class FileDescriptor {
-public:
-    explicit FileDescriptor(int descriptor) : number_(descriptor) {}
-    FileDescriptor(const FileDescriptor&) = delete;
-    FileDescriptor& operator=(const FileDescriptor&) = delete;
-    ~FileDescriptor() {
-        if (number_ >= 0) ::close(number_);
-    }
-    int get() const noexcept { return number_; }
-
-private:
-    int number_;
-};
-
-// The size of what is open there, as far as that can be told; at least one
-// block.
-std::size_t expectedBytes(int file) noexcept {
-    constexpr std::size_t block = std::size_t{1} << 16U;
-    struct stat about {};
-    if (::fstat(file, &about) != 0 || about.st_size <= 0) return block;
-    return std::max(block, static_cast<std::size_t>(about.st_size) + 1);
-}
-
-std::string readAll(const std::string& name) {
-    const FileDescriptor file(::open(name.c_str(), O_RDONLY | O_CLOEXEC));
-    if (file.get() < 0) throw cannotRead(name, errno);
-    std::string text(expectedBytes(file.get()), '\0');
-    std::size_t filled = 0;
-    for (;;) {
-        if (filled == text.size()) text.resize(text.size() * 2);
-        const ssize_t got =
-            ::read(file.get(), text.data() + filled, text.size() - filled);
-        if (got < 0 && errno != EINTR) throw cannotRead(name, errno);
-        if (got == 0) break;
-        if (got > 0) filled += static_cast<std::size_t>(got);
-    }
-    text.resize(filled);
-    return text;
+PathListError cannotRead(const std::string& name, const std::error_code& why) {
+    return PathListError("Cannot read " + name + ": " + why.message() + ".");
 }
 
 }  // namespace
@@ -89,13 +48,19 @@ PathList PathList::fromText(std::string text, const std::string& name) {
 }
 
 PathList readListFile(const std::string& file) {
-    return PathList::fromText(readAll(file), file);
+    std::string text;
+    try {
+        text = readWholeFile(file);
+    } catch (const std::system_error& error) {
+        throw cannotRead(file, error.code());
+    }
+    return PathList::fromText(std::move(text), file);
 }
 
 PathList readPaths(const std::string& fileOrFolder, WalkReport& report) {
     struct stat about {};
     if (::stat(fileOrFolder.c_str(), &about) != 0) {
-        throw cannotRead(fileOrFolder, errno);
+        throw cannotRead(fileOrFolder, {errno, std::generic_category()});
     }
     PathList list = S_ISDIR(about.st_mode) ? listFolder(fileOrFolder, report)
                                            : readListFile(fileOrFolder);

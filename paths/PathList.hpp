@@ -39,6 +39,11 @@ public:
 
     // Throws std::invalid_argument if the path is empty.
     void append(std::string_view path);
+    // Forgets all paths and keeps the memory for others.
+    void clear() noexcept {
+        text_.clear();
+        ends_.clear();
+    }
 
     // Takes over a text that holds one path after the other. They are
     // separated by NUL if the text has a NUL, otherwise by newline; a

@@ -1,0 +1,54 @@
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+// How a path's bytes become the components that a store keeps. A path is cut
+// after each run of '/': every folder keeps its own '/', and what is left is
+// the file's name. To join is to concatenate.
+//
+//   path      folders        file
+//   /a/b      "/" "a/"       "b"
+//   a//b      "a//"          "b"
+//   a/        "a/"           noName
+//   name      noName         "name"
+//   /         "/"            noName
+//
+// A folder's segment ends in '/' and a file's does not, so a file is never
+// taken for a folder of the same name, whatever is added later.
+namespace tessel::paths {
+
+// The segment in place of a name that is not there. No bytes have this text.
+inline constexpr char16_t noName = 0xDC00;
+
+// Where the file's name begins: after the last '/'.
+inline std::size_t fileStartOf(std::string_view path) noexcept {
+    return path.rfind('/') + 1;
+}
+
+// Calls visit(std::string_view) with each folder's segment. `folders` is a
+// path's beginning up to fileStartOf.
+template <class Visit>
+void forEachSegment(std::string_view folders, Visit visit) {
+    while (!folders.empty()) {
+        // `folders` ends in '/', so there is one.
+        std::size_t end = folders.find('/') + 1;
+        while (end < folders.size() && folders[end] == '/') ++end;
+        visit(folders.substr(0, end));
+        folders.remove_prefix(end);
+    }
+}
+
+// The texts of the folders' segments, at least one.
+std::vector<std::u16string> folderTexts(std::string_view folders);
+
+// The text of the file's segment.
+std::u16string fileText(std::string_view name);
+
+// Appends the bytes of a segment's text and returns true. Returns false, with
+// `bytes` unchanged, if no segment has this text.
+bool appendSegment(std::u16string_view text, std::string& bytes);
+
+}  // namespace tessel::paths

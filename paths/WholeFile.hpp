@@ -1,0 +1,20 @@
+#pragma once
+
+#include <cstdint>
+#include <span>
+#include <string>
+
+namespace tessel::paths {
+
+// The bytes of a file, or of a pipe up to its end. Throws std::system_error,
+// whose message has the file's name.
+std::string readWholeFile(const std::string& file);
+
+// Writes a file beside the target, waits until it is on disk, and gives it
+// the target's name, so that the target is at any time whole: the old one, the
+// new one, or none if there was none. A symbolic link is followed, and a
+// target keeps its permissions. Throws std::system_error, whose message has
+// the file's name; what was written is removed then.
+void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes);
+
+}  // namespace tessel::paths
