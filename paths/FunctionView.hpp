@@ -19,10 +19,11 @@ template <class Result, class... Arguments>
 class FunctionView<Result(Arguments...)> {
 public:
     template <class Callable>
-        requires(!std::same_as<std::remove_cvref_t<Callable>, FunctionView> &&
-                 std::is_invocable_r_v<Result, Callable&, Arguments...>)
-    // Implicit, so that a lambda can be passed where a view is expected.
-    FunctionView(Callable&& callable) noexcept  // NOLINT(google-explicit-*)
+    requires(!std::same_as<std::remove_cvref_t<Callable>, FunctionView> &&
+             std::is_invocable_r_v<Result, Callable&, Arguments...>)
+        // Implicit, so that a lambda can be passed where a view is expected.
+        FunctionView(Callable&& callable)
+    noexcept  // NOLINT(google-explicit-*)
         : callable_(const_cast<void*>(
               static_cast<const void*>(std::addressof(callable)))),
           call_(&callAs<std::remove_reference_t<Callable>>) {}

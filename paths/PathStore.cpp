@@ -176,8 +176,7 @@ void PathStore::recode(Survey& survey, Source source) {
     read(0, size_, count);
     auto recoded = std::make_unique<Contents>(survey.counts());
     std::size_t added = recoded->add([&](Sink sink) {
-        read(0, size_,
-             [&](std::size_t, std::string_view path) { sink(path); });
+        read(0, size_, [&](std::size_t, std::string_view path) { sink(path); });
     });
     added += recoded->add(source);
     contents_ = std::move(recoded);
@@ -208,8 +207,7 @@ void PathStore::read(std::size_t i, std::string& text) const {
     paths::readPath(contents_->coder(), i, text);
 }
 
-void PathStore::read(std::size_t first, std::size_t last,
-                     Visitor visit) const {
+void PathStore::read(std::size_t first, std::size_t last, Visitor visit) const {
     if (first > last)
         throw std::out_of_range("A range of paths ends before it begins.");
     if (last == first && first <= size_) return;
@@ -228,18 +226,16 @@ PathStore::Iterator PathStore::begin() const { return Iterator(*this); }
 
 void PathStore::forEachInTreeOrder(
     FunctionView<void(std::string_view)> visit) const {
-    withSoundCoder([&](HuffmanPathTree& coder) {
-        paths::readInTreeOrder(coder, visit);
-    });
+    withSoundCoder(
+        [&](HuffmanPathTree& coder) { paths::readInTreeOrder(coder, visit); });
 }
 
 // ---- Saving ----
 
 std::vector<std::uint8_t> PathStore::save() const {
     std::vector<std::uint8_t> bytes;
-    withSoundCoder([&](HuffmanPathTree& coder) {
-        bytes = paths::packStore(coder);
-    });
+    withSoundCoder(
+        [&](HuffmanPathTree& coder) { bytes = paths::packStore(coder); });
     return bytes;
 }
 
@@ -258,8 +254,8 @@ void PathStore::saveFile(const std::string& file) const {
 
 PathStore PathStore::loadFile(const std::string& file) {
     const std::string bytes = paths::readWholeFile(file);
-    return load({reinterpret_cast<const std::uint8_t*>(bytes.data()),
-                 bytes.size()});
+    return load(
+        {reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size()});
 }
 
 // ---- Inspection ----
@@ -284,8 +280,7 @@ const HuffmanPathTree& PathStore::coder() const {
 }
 
 // Calls use with a coder of exactly this store's paths.
-void PathStore::withSoundCoder(
-    FunctionView<void(HuffmanPathTree&)> use) const {
+void PathStore::withSoundCoder(FunctionView<void(HuffmanPathTree&)> use) const {
     if (contents_ != nullptr && contents_->isSound())
         return use(contents_->coder());
     if (contents_ == nullptr) {
@@ -294,8 +289,7 @@ void PathStore::withSoundCoder(
     }
     PathStore copy;
     copy.appendFrom([&](Sink sink) {
-        read(0, size_,
-             [&](std::size_t, std::string_view path) { sink(path); });
+        read(0, size_, [&](std::size_t, std::string_view path) { sink(path); });
     });
     copy.withSoundCoder(use);
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <concepts>
 #include <cstddef>
 #include <cstdint>
 #include <iterator>
@@ -20,8 +21,7 @@ class HuffmanPathTree;
 
 // A range whose elements can be read as std::string_view.
 template <class Range>
-concept PathRange =
-    std::ranges::input_range<Range> &&
+concept PathRange = std::ranges::input_range<Range> &&
     std::convertible_to<std::ranges::range_reference_t<Range>,
                         std::string_view>;
 

@@ -29,8 +29,7 @@ void putUint(std::uint64_t value, PackedSizeT width,
 }
 
 std::uint32_t checksumOf(std::span<const std::uint8_t> bytes) {
-    return static_cast<std::uint32_t>(
-        crc32_z(0, bytes.data(), bytes.size()));
+    return static_cast<std::uint32_t>(crc32_z(0, bytes.data(), bytes.size()));
 }
 
 // Takes the checksum off the end, which must be right.
@@ -52,7 +51,8 @@ void checkVersion(std::span<const std::uint8_t> bytes) {
     if (found > version)
         throw UnsupportedStoreVersionException(
             "The saved store has version " + std::to_string(found) +
-            "; this library reads version " + std::to_string(version) + ".");
+            "; this library reads up to version " + std::to_string(version) +
+            ".");
 }
 
 std::u16string takeTreeString(ByteCursor& cursor) {
@@ -99,10 +99,7 @@ std::vector<std::uint8_t> packStore(const HuffmanPathTree& coder) {
     const std::u16string treeString = coder.getTreeString();
     std::vector<std::uint8_t> form;
     coder.serialize(form, true);
-    std::vector<std::uint8_t> out;
-    out.reserve(magic.size() + 4 + 4 + 2 * treeString.size() + 8 + form.size() +
-                checksumBytes);
-    out.insert(out.end(), magic.begin(), magic.end());
+    std::vector<std::uint8_t> out(magic.begin(), magic.end());
     putUint(version, PackedSizeT::Uint32, out);
     putUint(treeString.size(), PackedSizeT::Uint32, out);
     for (const char16_t unit : treeString)
@@ -119,8 +116,7 @@ std::unique_ptr<HuffmanPathTree> unpackStore(
     ByteCursor cursor(checkedBody(bytes));
     cursor.take(magic.size() + 4);
     const std::u16string treeString = takeTreeString(cursor);
-    const auto formBytes =
-        cursor.take(cursor.takeUint(PackedSizeT::Uint64));
+    const auto formBytes = cursor.take(cursor.takeUint(PackedSizeT::Uint64));
     if (!cursor.empty()) throw DamagedFormException();
 
     auto coder = coderFrom({formBytes.begin(), formBytes.end()}, treeString);

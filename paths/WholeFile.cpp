@@ -92,8 +92,8 @@ public:
         name_.clear();
         // The new file is there; only a power failure could still undo it, so
         // a folder that cannot be flushed is no failure.
-        const FileDescriptor folder(::open(
-            folderOf(target_).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        const FileDescriptor folder(::open(folderOf(target_).c_str(),
+                                           O_RDONLY | O_DIRECTORY | O_CLOEXEC));
         if (folder.get() >= 0) ::fsync(folder.get());
     }
 

@@ -1,7 +1,5 @@
 // The store as its users see it: strings in, the same strings out.
 
-#include "paths/PathStore.hpp"
-
 #include <gtest/gtest.h>
 #include <rapidcheck.h>
 #include <rapidcheck/gtest.h>
@@ -21,6 +19,7 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
+#include "paths/PathStore.hpp"
 
 namespace {
 
@@ -52,7 +51,8 @@ const Strings& awkwardPaths() {
                                   "line\nbreak",
                                   "\xFF\xFE/\xC3",
                                   "\xC3/\xA9",
-                                  "gr\xC3\xBC\xC3\x9F" "e/\xE6\x97\xA5\xE6\x9C\xAC",
+                                  "gr\xC3\xBC\xC3\x9F"
+                                  "e/\xE6\x97\xA5\xE6\x9C\xAC",
                                   "\xF0\x9F\x97\x82",
                                   "\xED\xB2\x80",
                                   "a/b/c/d/e/f/g",
@@ -94,7 +94,8 @@ void expectHolds(const PathStore& store, const Strings& paths) {
     EXPECT_EQ(readAll(store), paths);
     EXPECT_EQ(iterated(store), paths);
     EXPECT_EQ(sorted(inTreeOrder(store)), sorted(paths));
-    for (std::size_t i = 0; i < paths.size(); ++i) EXPECT_EQ(store[i], paths[i]);
+    for (std::size_t i = 0; i < paths.size(); ++i)
+        EXPECT_EQ(store[i], paths[i]);
     EXPECT_THROW(store[paths.size()], std::out_of_range);
     EXPECT_EQ(readAll(PathStore::load(store.save())), paths);
 }
@@ -204,8 +205,7 @@ TEST(PathStore, DeepPathsComeBack) {
 TEST(PathStore, TreeOrderKeepsAFoldersFilesTogether) {
     const PathStore store =
         PathStore::from(Strings{"a/1", "b/1", "a/2", "b/2", "a/1"});
-    EXPECT_EQ(inTreeOrder(store),
-              (Strings{"a/1", "a/2", "a/1", "b/1", "b/2"}));
+    EXPECT_EQ(inTreeOrder(store), (Strings{"a/1", "a/2", "a/1", "b/1", "b/2"}));
 }
 
 // ---- Reading by number ----
@@ -227,8 +227,8 @@ TEST(PathStore, ReadsRangesAndNumbersInAnyOrder) {
     store.read(2, 5, [&](std::size_t, std::string_view path) {
         middle.emplace_back(path);
     });
-    EXPECT_EQ(middle, Strings(awkwardPaths().begin() + 2,
-                              awkwardPaths().begin() + 5));
+    EXPECT_EQ(middle,
+              Strings(awkwardPaths().begin() + 2, awkwardPaths().begin() + 5));
 }
 
 TEST(PathStore, RefusesNumbersBeyondItsPathsBeforeTheFirstVisit) {
@@ -294,8 +294,7 @@ TEST(PathStore, ALoopSeesWhatIsAppendedMeanwhile) {
 TEST(PathStore, SeveralThreadsReadOneStore) {
     Strings paths;
     for (int i = 0; i < 5'000; ++i)
-        paths.push_back("d" + std::to_string(i / 10) + "/f" +
-                        std::to_string(i));
+        paths.push_back(std::to_string(i / 10) + "/f" + std::to_string(i));
     const PathStore store = PathStore::from(paths);
     std::array<bool, 4> same{};
     std::vector<std::thread> threads;
@@ -361,7 +360,7 @@ TEST(PathStore, ARangeThatThrowsLeavesTheStore) {
             std::views::iota(std::size_t{0}, std::size_t{160'000}) |
             std::views::transform([&](std::size_t i) {
                 if (seen++ == failing) throw std::length_error("enough");
-                return "a/" + std::string(1 + i % 9, '0');
+                return std::string("a/").append(1 + i % 9, '0');
             });
         EXPECT_THROW(store.append(paths), std::length_error);
         expectHolds(store, {"a/1", "0/2"});
@@ -428,19 +427,20 @@ TEST(PathStore, FileErrorsNameTheFile) {
         }
         return std::string();
     };
-    EXPECT_NE(messageOf([] { PathStore::loadFile("/no/file"); })
-                  .find("Cannot read /no/file"),
+    EXPECT_NE(messageOf([] {
+                  PathStore::loadFile("/no/file");
+              }).find("Cannot read /no/file"),
               std::string::npos);
-    EXPECT_NE(messageOf([] { PathStore().saveFile("/no/file"); })
-                  .find("Cannot write /no/file"),
+    EXPECT_NE(messageOf([] {
+                  PathStore().saveFile("/no/file");
+              }).find("Cannot write /no/file"),
               std::string::npos);
 }
 
 TEST(PathStore, ADamagedFileIsRefused) {
     const Folder folder;
     std::ofstream(folder.file("bad")) << "no store";
-    EXPECT_THROW(PathStore::loadFile(folder.file("bad")),
-                 DamagedFormException);
+    EXPECT_THROW(PathStore::loadFile(folder.file("bad")), DamagedFormException);
 }
 
 // ---- Inspection ----
@@ -489,13 +489,14 @@ RC_GTEST_PROP(PathStore, AnswersAsAPlainListDoes, ()) {
                 break;
             }
             case 1: {
-                const auto more =
-                    *rc::gen::container<Strings>(anyPath());
+                const auto more = *rc::gen::container<Strings>(anyPath());
                 store.append(more);
                 model.insert(model.end(), more.begin(), more.end());
                 break;
             }
-            case 2: store = PathStore::load(store.save()); break;
+            case 2:
+                store = PathStore::load(store.save());
+                break;
             case 3: {
                 PathStore other = std::move(store);
                 store = std::move(other);
