@@ -62,17 +62,6 @@ private:
 
 }  // namespace
 
-CoderPtr coderFor(tessel::paths::CharacterCounts counts) {
-    for (char16_t unit = 0; counts.characters.size() == 1; ++unit) {
-        if (counts.characters.front() == unit) continue;
-        counts.characters.push_back(unit);
-        counts.frequencies.push_back(0);
-    }
-    auto coder = std::make_unique<HuffmanPathTree>();
-    coder->deflateHuffman(counts.frequencies.data(), counts.characters);
-    return coder;
-}
-
 void joinFolder(const HuffmanPathTree& coder, const Components& components,
                 std::u16string& text) {
     text.clear();

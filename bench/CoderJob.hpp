@@ -14,9 +14,7 @@ namespace bench {
 
 using CoderPtr = std::unique_ptr<tessel::HuffmanPathTree>;
 
-// A coder whose code is made for these characters. If there is only one, a
-// second one that no path has lets there be a code.
-CoderPtr coderFor(tessel::paths::CharacterCounts counts);
+using tessel::paths::coderFor;
 
 // Replaces `text` by the components' joined text, the file's name last.
 void joinPath(const tessel::HuffmanPathTree& coder,
