@@ -8,8 +8,8 @@
 // Built against it with
 //   g++ -std=c++20 embedded-host.cpp $(pkg-config --cflags --libs
 //   qztessel-embedded)
-#include <cstdio>
 #include <exception>
+#include <iostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -41,7 +41,7 @@ void printPaths(Host& host, const Value& instance,
                   Value::text(u"/"))[0];
     for (std::size_t i = 0; i < paths.numel(); ++i) {
         const std::u16string& text = paths.element(i).charData();
-        std::printf("%s\n", std::string(text.begin(), text.end()).c_str());
+        std::cout << std::string(text.begin(), text.end()) << '\n';
     }
 }
 
@@ -67,14 +67,14 @@ void run(const std::string& plugin, const std::string& messages) {
 
 int main(int argumentCount, char** arguments) {
     if (argumentCount != 3) {
-        std::fputs("Usage: embedded-host PLUG-IN MESSAGES\n", stderr);
+        std::cerr << "Usage: embedded-host PLUG-IN MESSAGES\n";
         return 2;
     }
     try {
         run(arguments[1], arguments[2]);
         return 0;
     } catch (const std::exception& failure) {
-        std::fprintf(stderr, "%s\n", failure.what());
+        std::cerr << failure.what() << '\n';
         return 1;
     }
 }

@@ -27,6 +27,8 @@ build() {
 }
 build tests/outside/main.cpp qztessel
 "$work/qztessel"
+build examples/keep-a-list.cpp qztessel-paths
+(cd "$work" && ./qztessel-paths)
 build examples/embedded-host.cpp qztessel-embedded
 "$work/qztessel-embedded" "$(pkg-config --variable=plugin qztessel)" \
     "$(pkg-config --variable=messages qztessel)"

@@ -1,0 +1,117 @@
+#!/usr/bin/env python3
+"""Usage: documents.py [--run FOLDER] PAGE...
+
+Checks what pages of Markdown say against what is there:
+
+  - a relative link leads to a file of ours;
+  - a block marked cpp is, spaces aside, part of a program of examples/;
+  - with --run, each block marked console is run, in one empty folder per page
+    and with FOLDER first in the search path: what follows a line "$ COMMAND"
+    is its output. A line "..." stands for any lines. In a line with a time in
+    seconds, numbers may differ.
+
+Prints every difference and ends with status 1 if there is one.
+"""
+import argparse
+import os
+import pathlib
+import re
+import subprocess
+import sys
+import tempfile
+
+LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
+TIME = re.compile(r"[0-9] m?s\b")
+
+
+def blocks(text, language):
+    """The lines of each fenced block of a language."""
+    fence = re.compile(rf"^```{language}\n(.*?)^```$", re.M | re.S)
+    return [found.group(1).splitlines() for found in fence.finditer(text)]
+
+
+def broken_links(page, text):
+    prose = re.sub(r"^```.*?^```$", "", text, flags=re.M | re.S)
+    for target in LINK.findall(prose):
+        if not (page.parent / target).exists():
+            yield f"no file {target}"
+
+
+def without_spaces(text):
+    return "".join(text.split())
+
+
+def strange_code(text, programs):
+    for block in blocks(text, "cpp"):
+        wanted = without_spaces("".join(block))
+        if not any(wanted in program for program in programs):
+            yield "in no example:\n" + "\n".join(block)
+
+
+def transcript(block):
+    """Pairs of a command and the lines that it is said to write."""
+    commands = []
+    for line in block:
+        if line.startswith("$ "):
+            commands.append((line[2:], []))
+        else:
+            commands[-1][1].append(line)
+    return commands
+
+
+def same(line, written):
+    if TIME.search(line):
+        line, written = (re.sub(r"[0-9][0-9.,]*", "N", x) for x in (line, written))
+    return line == written
+
+
+def matches(lines, written):
+    if not lines:
+        return not written
+    if lines[0] == "...":
+        return any(matches(lines[1:], written[i:]) for i in range(len(written) + 1))
+    return bool(written) and same(lines[0], written[0]) and matches(lines[1:], written[1:])
+
+
+def wrong_output(text, programs_folder):
+    environment = dict(os.environ, LC_ALL="C.UTF-8")
+    environment["PATH"] = f"{programs_folder}:{environment['PATH']}"
+    with tempfile.TemporaryDirectory() as folder:
+        for block in blocks(text, "console"):
+            for command, lines in transcript(block):
+                written = subprocess.run(
+                    ["bash", "-c", command],
+                    cwd=folder,
+                    env=environment,
+                    stdin=subprocess.DEVNULL,
+                    stdout=subprocess.PIPE,
+                    stderr=subprocess.STDOUT,
+                    check=False,
+                ).stdout.decode(errors="replace").splitlines()
+                if not matches(lines, written):
+                    yield f"$ {command}\nwrites\n" + "\n".join(written)
+
+
+def main():
+    parser = argparse.ArgumentParser()
+    parser.add_argument("--run", type=pathlib.Path)
+    parser.add_argument("pages", nargs="+", type=pathlib.Path)
+    arguments = parser.parse_args()
+    programs = [
+        without_spaces(file.read_text())
+        for file in pathlib.Path("examples").glob("*.cpp")
+    ]
+    found = False
+    for page in arguments.pages:
+        text = page.read_text()
+        complaints = [*broken_links(page, text), *strange_code(text, programs)]
+        if arguments.run:
+            complaints += wrong_output(text, arguments.run.resolve())
+        for complaint in complaints:
+            found = True
+            print(f"{page}: {complaint}\n")
+    return found
+
+
+if __name__ == "__main__":
+    sys.exit(main())
