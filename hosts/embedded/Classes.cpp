@@ -5,6 +5,17 @@
 
 namespace tessel::embedded {
 
+namespace {
+
+MethodKind kindOf(const HostMethodInfo& method, const HostClassInfo& owner) {
+    if (std::string_view(method.name()) == owner.className())
+        return MethodKind::Constructor;
+    if (method.isAbstract()) return MethodKind::None;
+    return method.isStatic() ? MethodKind::Static : MethodKind::OfInstances;
+}
+
+}  // namespace
+
 bool PropertyRecord::isSaved() const noexcept {
     constexpr std::uint32_t unsaved =
         attributes::isAbstract | attributes::isTransient |
@@ -19,26 +30,40 @@ bool PropertyRecord::isCopied() const noexcept {
            (attributeBits & uncopied) == 0;
 }
 
-ClassRecord::ClassRecord(const Name* classFullName,
-                         const Module* definingModule,
-                         std::unique_ptr<HostClassInfo> classInfo)
-    : ownName_(classFullName),
-      ownModule_(definingModule),
-      descriptor_(std::move(classInfo)) {}
+ClassRecord::ClassRecord(const Name* name, const Module* module,
+                         std::unique_ptr<HostClassInfo> info)
+    : name_(name), module_(module), info_(std::move(info)) {}
 
 ClassRecord::~ClassRecord() {
-    while (!methods.empty()) methods.pop_back();
+    while (!methods_.empty()) methods_.pop_back();
 }
 
-HostMethodInfo* ClassRecord::findMethod(std::string_view method) const {
-    for (const auto& candidate : methods) {
-        if (candidate->name() == method) return candidate.get();
+void ClassRecord::addMethod(std::unique_ptr<HostMethodInfo> info) {
+    std::string name = info->name();
+    methods_.push_back({std::move(name), std::move(info)});
+}
+
+void ClassRecord::closeDefinition() {
+    defining_ = false;
+    for (MethodRecord& method : methods_) {
+        method.kind = kindOf(*method.info, *info_);
+        method.access = method.info->access();
+        method.signature =
+            static_cast<const Signature*>(method.info->signature());
     }
-    return nullptr;
 }
 
-HostMethodInfo* ClassRecord::constructor() const {
-    return findMethod(descriptor_->className());
+const MethodRecord* ClassRecord::findMethod(
+    std::string_view method) const noexcept {
+    const auto found =
+        std::ranges::find(methods_, method, &MethodRecord::name);
+    return found == methods_.end() ? nullptr : &*found;
+}
+
+const MethodRecord* ClassRecord::constructor() const noexcept {
+    const auto found = std::ranges::find(methods_, MethodKind::Constructor,
+                                         &MethodRecord::kind);
+    return found == methods_.end() ? nullptr : &*found;
 }
 
 const PropertyRecord* ClassRecord::findProperty(
@@ -51,25 +76,24 @@ const PropertyRecord* ClassRecord::findProperty(
 
 std::shared_ptr<Instance> ClassRecord::makeInstance() {
     std::unique_ptr<void, std::function<void(void*)>> native(
-        descriptor_->createNativeObject(),
-        [this](void* made) { descriptor_->destroyNativeObject(made); });
+        info_->createNativeObject(),
+        [this](void* made) { info_->destroyNativeObject(made); });
     auto instance = std::make_shared<Instance>(*this, native.get());
     static_cast<void>(native.release());
     return instance;
 }
 
-Instance::Instance(ClassRecord& instanceClass, void* nativeObject)
-    : owner_(&instanceClass), ownNative_(nativeObject) {
-    owner_->living_.insert(this);
+Instance::Instance(ClassRecord& instanceClass, void* native)
+    : class_(&instanceClass), native_(native) {
+    class_->living_.insert(this);
 }
 
 void Instance::destroy() noexcept {
-    if (owner_ == nullptr) return;
-    ClassRecord* const formerOwner = std::exchange(owner_, nullptr);
-    formerOwner->living_.erase(this);
+    if (class_ == nullptr) return;
+    ClassRecord* const formerClass = std::exchange(class_, nullptr);
+    formerClass->living_.erase(this);
     listeners.clear();
-    formerOwner->descriptor_->destroyNativeObject(
-        std::exchange(ownNative_, nullptr));
+    formerClass->info_->destroyNativeObject(std::exchange(native_, nullptr));
 }
 
 }  // namespace tessel::embedded

@@ -24,17 +24,29 @@ struct DeclaredArgument {
     std::string name;
 };
 
-// What a method declares. Of the counts below the declared ones, no output at
-// all is always allowed (a call whose result nobody takes). Everything else
-// takes a mark: with the optional tail, inputs may be left out from the end,
-// and the method itself checks the number of inputs and outputs that remain;
-// with the outputs mark, fewer outputs may be requested.
+// What a method declares. How many inputs and outputs a call may have:
+//
+//   no mark         all declared inputs; all declared outputs or none
+//   optional tail   at most the declared ones; the method checks the rest
+//   outputs mark    all declared inputs; at most the declared outputs
 class Signature final : public HostSignature {
 public:
     std::vector<DeclaredArgument> inputs;
     std::vector<DeclaredArgument> outputs;
     bool optionalTail = false;
     bool fewerOutputs = false;
+};
+
+// How a method is called. A method without a body cannot be called at all.
+enum class MethodKind : std::uint8_t { Constructor, OfInstances, Static, None };
+
+// A method, with what its descriptor answered when its class was defined.
+struct MethodRecord {
+    std::string name;
+    std::unique_ptr<HostMethodInfo> info;
+    MethodKind kind = MethodKind::None;
+    HostAccess access = HostAccess::Public;
+    const Signature* signature = nullptr;
 };
 
 // A property as add-property was given it.
@@ -60,32 +72,38 @@ struct PropertyRecord {
 
 // ClassRecord is a class: its descriptor, its members and its instances.
 //
-// Ownership: owns the descriptors and deletes them in the reverse order of
-//   their coming, the class's own last. Instances are their holders'.
-// Invariants: there are no living instances when it goes.
+// Invariants: there are no living instances when it is deleted.
+// Ownership: owns the descriptors and deletes them in the reverse order in
+//   which they were added, the class's own last. Values own the instances.
 class ClassRecord final : public HostClass {
 public:
-    ClassRecord(const Name* classFullName, const Module* definingModule,
-                std::unique_ptr<HostClassInfo> classInfo);
+    ClassRecord(const Name* name, const Module* module,
+                std::unique_ptr<HostClassInfo> info);
     ClassRecord(const ClassRecord&) = delete;
     ClassRecord& operator=(const ClassRecord&) = delete;
     ~ClassRecord();
 
-    const std::string& fullName() const noexcept { return ownName_->str(); }
-    const Name* name() const noexcept { return ownName_; }
+    const std::string& fullName() const noexcept { return name_->str(); }
+    const Name* name() const noexcept { return name_; }
     // The module whose entry was running at registration, or null.
-    const Module* module() const noexcept { return ownModule_; }
-    HostClassInfo& info() const noexcept { return *descriptor_; }
+    const Module* module() const noexcept { return module_; }
+    HostClassInfo& info() const noexcept { return *info_; }
 
     // Null if there is none of that name.
-    HostMethodInfo* findMethod(std::string_view method) const;
+    const MethodRecord* findMethod(std::string_view method) const noexcept;
     // The method of the class's own name.
-    HostMethodInfo* constructor() const;
+    const MethodRecord* constructor() const noexcept;
     const PropertyRecord* findProperty(std::string_view property) const;
 
-    // Members, open while the class is being defined.
-    bool defining = true;
-    std::vector<std::unique_ptr<HostMethodInfo>> methods;
+    const std::vector<MethodRecord>& methods() const noexcept {
+        return methods_;
+    }
+
+    // Members may be added while the class is being defined. The class owns a
+    // method, also if adding it throws.
+    bool isDefining() const noexcept { return defining_; }
+    void addMethod(std::unique_ptr<HostMethodInfo> info);
+    void closeDefinition();
     std::vector<PropertyRecord> properties;
 
     // Makes an instance with its native object.
@@ -95,9 +113,11 @@ public:
 private:
     friend class Instance;
 
-    const Name* ownName_;
-    const Module* ownModule_;
-    std::unique_ptr<HostClassInfo> descriptor_;
+    const Name* name_;
+    const Module* module_;
+    std::unique_ptr<HostClassInfo> info_;
+    std::vector<MethodRecord> methods_;
+    bool defining_ = true;
     std::set<Instance*> living_;
 };
 
@@ -105,20 +125,20 @@ enum class ListenerKind { Get, Set };
 
 // Instance is one object of a class, referred to by any number of values.
 //
-// Invariants: living from its making until destroy() or its end, whichever is
-//   first; only a living instance has a class and a native object.
+// Invariants: it lives until destroy() or its destructor, whichever is first;
+//   only a living instance has a class and a native object.
 // Ownership: the class made the native object and destroys it, once.
 class Instance {
 public:
-    Instance(ClassRecord& instanceClass, void* nativeObject);
+    Instance(ClassRecord& instanceClass, void* native);
     Instance(const Instance&) = delete;
     Instance& operator=(const Instance&) = delete;
     ~Instance() { destroy(); }
 
-    bool isLiving() const noexcept { return owner_ != nullptr; }
+    bool isLiving() const noexcept { return class_ != nullptr; }
     // Null once destroyed.
-    ClassRecord* instanceClass() const noexcept { return owner_; }
-    void* native() const noexcept { return ownNative_; }
+    ClassRecord* instanceClass() const noexcept { return class_; }
+    void* native() const noexcept { return native_; }
 
     void destroy() noexcept;
 
@@ -130,8 +150,8 @@ public:
     std::vector<Listener> listeners;
 
 private:
-    ClassRecord* owner_;
-    void* ownNative_;
+    ClassRecord* class_;
+    void* native_;
 };
 
 }  // namespace tessel::embedded

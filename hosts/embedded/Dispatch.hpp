@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cstdint>
-#include <functional>
 #include <span>
 #include <string>
 #include <string_view>
@@ -22,22 +21,22 @@ enum class Caller { User, Host };
 // Ownership: refers to the errors, which must outlive it.
 class Dispatch {
 public:
-    explicit Dispatch(const Errors& hostErrors) : errors_(hostErrors) {}
+    explicit Dispatch(const Errors& errors) : errors_(errors) {}
 
     // Checks the counts (outputs, too many inputs, too few inputs), then the
     // declared types of the inputs, then runs the method.
     //
-    // inputs     with the instance first, unless the method is a constructor.
+    // instance   the first input; null for a static method.
     // requested  how many outputs the caller wants; may be 0.
     // Returns the requested outputs. When none was requested, what the method
     // assigned to its first output, or nothing.
-    std::vector<Value> call(HostMethodInfo& method,
-                            std::span<const HostArray* const> inputs,
+    std::vector<Value> call(const MethodRecord& method, const Value* instance,
+                            std::span<const Value* const> inputs,
                             std::int32_t requested) const;
 
     // The same for the constructor of a new instance, which is its one output.
-    void construct(HostMethodInfo& method, Value& instance,
-                   std::span<const HostArray* const> inputs,
+    void construct(const MethodRecord& method, Value& instance,
+                   std::span<const Value* const> inputs,
                    std::int32_t requested) const;
 
     Value get(const Instance& instance, const PropertyRecord& property,
@@ -46,15 +45,14 @@ public:
              const Value& value, Caller caller) const;
 
 private:
+    class Inputs;
     class OutputSlots;
 
     void checkCounts(const Signature& signature, std::size_t inputCount,
                      std::int32_t requested) const;
-    void checkTypes(const Signature& signature,
-                    std::span<const HostArray* const> inputs) const;
-    void run(HostMethodInfo& method, OutputSlots& outputs,
-             std::span<const HostArray* const> inputs,
-             std::int32_t requested) const;
+    void checkTypes(const Signature& signature, const Inputs& inputs) const;
+    void run(const MethodRecord& method, OutputSlots& outputs,
+             const Inputs& inputs, std::int32_t requested) const;
     void checkAccess(const PropertyRecord& property, HostAccess access,
                      Caller caller) const;
 

@@ -13,8 +13,9 @@ void Errors::raise(std::string_view identifier,
         catalogue_.format(identifier, arguments));
 }
 
-void Errors::own(std::string_view key,
-                 std::initializer_list<HostMessageArgument> arguments) const {
+void Errors::raiseOwn(
+    std::string_view key,
+    std::initializer_list<HostMessageArgument> arguments) const {
     raise("VELOX:embedded:" + std::string(key),
           {arguments.begin(), arguments.size()});
 }

@@ -14,14 +14,15 @@ namespace tessel::embedded {
 // Ownership: refers to the catalogue, which must outlive it.
 class Errors {
 public:
-    explicit Errors(const MessageCatalogue& texts) : catalogue_(texts) {}
+    explicit Errors(const MessageCatalogue& catalogue)
+        : catalogue_(catalogue) {}
 
     [[noreturn]] void raise(
         std::string_view identifier,
         std::span<const HostMessageArgument> arguments) const;
 
     // Raises an error of the host's own, by its key.
-    [[noreturn]] void own(
+    [[noreturn]] void raiseOwn(
         std::string_view key,
         std::initializer_list<HostMessageArgument> arguments = {}) const;
 
@@ -35,11 +36,11 @@ public:
         } catch (const HostException&) {
             throw;
         } catch (const std::bad_alloc&) {
-            own("outOfMemory");
+            raiseOwn("outOfMemory");
         } catch (const std::exception& exception) {
-            own("nativeError", {std::string(what), exception.what()});
+            raiseOwn("nativeError", {std::string(what), exception.what()});
         } catch (...) {
-            own("nativeError", {std::string(what), "an unknown exception"});
+            raiseOwn("nativeError", {std::string(what), "an unknown exception"});
         }
     }
 

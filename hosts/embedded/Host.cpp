@@ -36,18 +36,16 @@ public:
           operations(registry, errors, options.alternativeMode),
           dispatch(errors),
           modules(registry, errors) {
-        for (const std::string& package : options.packages) {
+        for (const std::string& package : options.packages)
             registry.packages.add(package);
-        }
     }
 
     // The instance that a value refers to. Raises an error if it is none.
     Instance& instanceOf(const Value& value) const {
-        if (value.valueClass() != ValueClass::Object || value.numel() == 0) {
-            errors.own("notAnInstance", {"object"});
-        }
+        if (value.valueClass() != ValueClass::Object || value.numel() == 0)
+            errors.raiseOwn("notAnInstance", {"object"});
         Instance& instance = *value.instance(0);
-        if (!instance.isLiving()) errors.own("invalidInstance");
+        if (!instance.isLiving()) errors.raiseOwn("invalidInstance");
         return instance;
     }
 
@@ -55,24 +53,21 @@ public:
                                      std::string_view name) const {
         const ClassRecord& record = *instance.instanceClass();
         const PropertyRecord* const property = record.findProperty(name);
-        if (property == nullptr) {
-            errors.own("propertyMissing",
-                       {record.fullName(), std::string(name)});
-        }
+        if (property == nullptr)
+            errors.raiseOwn("propertyMissing",
+                            {record.fullName(), std::string(name)});
         return *property;
     }
 
-    // A method that users may call, static or not.
-    HostMethodInfo& methodOf(const ClassRecord& record, std::string_view name,
-                             bool isStatic) const {
-        HostMethodInfo* const method = record.findMethod(name);
-        if (method == nullptr || method == record.constructor() ||
-            method->isAbstract() || method->isStatic() != isStatic) {
-            errors.own("methodMissing", {record.fullName(), std::string(name)});
-        }
-        if (method->access() != HostAccess::Public) {
-            errors.own("methodRestricted", {std::string(name)});
-        }
+    // A method that users may call.
+    const MethodRecord& methodOf(const ClassRecord& record,
+                                 std::string_view name, MethodKind kind) const {
+        const MethodRecord* const method = record.findMethod(name);
+        if (method == nullptr || method->kind != kind)
+            errors.raiseOwn("methodMissing",
+                            {record.fullName(), std::string(name)});
+        if (method->access != HostAccess::Public)
+            errors.raiseOwn("methodRestricted", {std::string(name)});
         return *method;
     }
 
@@ -118,9 +113,8 @@ public:
 };
 
 Host::Host(const HostOptions& options) {
-    if (gate.host != nullptr) {
+    if (gate.host != nullptr)
         throw std::logic_error("This process has a host already.");
-    }
     state_ = std::make_unique<State>(options);
     extendClass(filesetClassName, filesetExtension());
     gate.host = &state_->operations;
@@ -132,7 +126,7 @@ Host::~Host() {
     gate.host = nullptr;
 }
 
-// --- Modules -----------------------------------------------------------------
+// ---- Modules ----
 
 void Host::loadModule(const std::filesystem::path& file) {
     state_->modules.load(file);
@@ -146,7 +140,7 @@ void Host::unloadModule(const std::filesystem::path& file) {
     state_->modules.unload(file);
 }
 
-// --- Classes -----------------------------------------------------------------
+// ---- Classes ----
 
 void Host::defineClass(std::string_view package,
                        std::unique_ptr<HostClassInfo> info) {
@@ -166,44 +160,37 @@ bool Host::hasClass(std::string_view fullName) const {
 
 std::vector<std::string> Host::classNames() const {
     std::vector<std::string> names;
-    for (const ClassRecord* const record : state_->registry.all()) {
+    for (const ClassRecord* const record : state_->registry.all())
         if (!record->info().isHidden()) names.push_back(record->fullName());
-    }
     return names;
 }
 
 std::vector<std::string> Host::methodNames(std::string_view className) const {
     std::vector<std::string> names;
-    for (const auto& method : state_->registry.get(className).methods) {
-        if (method->isVisible()) names.emplace_back(method->name());
-    }
+    for (const MethodRecord& method : state_->registry.get(className).methods())
+        if (method.info->isVisible()) names.push_back(method.name);
     return names;
 }
 
 std::vector<std::string> Host::propertyNames(std::string_view className) const {
     std::vector<std::string> names;
-    for (const auto& property : state_->registry.get(className).properties) {
-        if (property.has(attributes::isVisible)) {
+    for (const auto& property : state_->registry.get(className).properties)
+        if (property.has(attributes::isVisible))
             names.push_back(property.name->str());
-        }
-    }
     return names;
 }
 
-// --- Instances ---------------------------------------------------------------
+// ---- Instances ----
 
 Value Host::constructWith(std::string_view className,
                           std::span<const Value* const> inputs,
                           std::int32_t requested) {
     ClassRecord& record = state_->registry.get(className);
     Value instance = state_->newInstance(record);
-    if (HostMethodInfo* const constructor = record.constructor()) {
-        const std::vector<const HostArray*> arrays(inputs.begin(),
-                                                   inputs.end());
-        state_->dispatch.construct(*constructor, instance, arrays, requested);
-    } else if (!inputs.empty()) {
-        state_->errors.own("tooManyInputs");
-    }
+    if (const MethodRecord* const constructor = record.constructor())
+        state_->dispatch.construct(*constructor, instance, inputs, requested);
+    else if (!inputs.empty())
+        state_->errors.raiseOwn("tooManyInputs");
     return instance;
 }
 
@@ -211,10 +198,9 @@ std::vector<Value> Host::callWith(std::int32_t requested, const Value& instance,
                                   std::string_view method,
                                   std::span<const Value* const> inputs) {
     const ClassRecord& record = *state_->instanceOf(instance).instanceClass();
-    std::vector<const HostArray*> arrays{&instance};
-    arrays.insert(arrays.end(), inputs.begin(), inputs.end());
-    return state_->dispatch.call(state_->methodOf(record, method, false),
-                                 arrays, requested);
+    return state_->dispatch.call(
+        state_->methodOf(record, method, MethodKind::OfInstances), &instance,
+        inputs, requested);
 }
 
 std::vector<Value> Host::callStatic(std::int32_t requested,
@@ -222,9 +208,9 @@ std::vector<Value> Host::callStatic(std::int32_t requested,
                                     std::string_view method,
                                     std::span<const Value* const> inputs) {
     const ClassRecord& record = state_->registry.get(className);
-    const std::vector<const HostArray*> arrays(inputs.begin(), inputs.end());
-    return state_->dispatch.call(state_->methodOf(record, method, true), arrays,
-                                 requested);
+    return state_->dispatch.call(
+        state_->methodOf(record, method, MethodKind::Static), nullptr, inputs,
+        requested);
 }
 
 Value Host::get(const Value& instance, std::string_view property) {
@@ -247,9 +233,8 @@ void Host::listen(const Value& instance, std::string_view property,
     const std::uint32_t allowed = kind == ListenerKind::Get
                                       ? attributes::getListenersAllowed
                                       : attributes::setListenersAllowed;
-    if (!record.has(allowed)) {
-        state_->errors.own("listenerRefused", {std::string(property)});
-    }
+    if (!record.has(allowed))
+        state_->errors.raiseOwn("listenerRefused", {std::string(property)});
     object.listeners.push_back({&record, kind, std::move(notify)});
 }
 
@@ -257,11 +242,9 @@ Value Host::inspect(const Value& instance) {
     const Instance& object = state_->instanceOf(instance);
     Value shown = Value::structure();
     for (const PropertyRecord& property : object.instanceClass()->properties) {
-        if (property.has(attributes::inspectionAllowed)) {
-            shown.setField(
-                property.name->str(),
-                state_->dispatch.get(object, property, Caller::User));
-        }
+        if (!property.has(attributes::inspectionAllowed)) continue;
+        shown.setField(property.name->str(),
+                       state_->dispatch.get(object, property, Caller::User));
     }
     return shown;
 }
@@ -269,16 +252,14 @@ Value Host::inspect(const Value& instance) {
 Value Host::copy(const Value& instance) {
     const Instance& source = state_->instanceOf(instance);
     ClassRecord& record = *source.instanceClass();
-    if (!record.info().copiesInstances()) {
-        state_->errors.own("notCopyable", {record.fullName()});
-    }
+    if (!record.info().copiesInstances())
+        state_->errors.raiseOwn("notCopyable", {record.fullName()});
     const ClassExtension& extension = state_->extensionOf(record);
     Value copied = extension.copy ? extension.copy(*this, instance)
                                   : state_->newInstance(record);
     const Instance& target = state_->instanceOf(copied);
-    for (const PropertyRecord& property : record.properties) {
+    for (const PropertyRecord& property : record.properties)
         if (property.isCopied()) state_->copyProperty(source, target, property);
-    }
     state_->update(target);
     return copied;
 }
@@ -290,21 +271,17 @@ const std::vector<std::string>& Host::copyWarnings() const noexcept {
 Value Host::save(const Value& instance) {
     const Instance& object = state_->instanceOf(instance);
     const ClassRecord& record = *object.instanceClass();
-    if (!record.info().savesInstances()) {
-        state_->errors.own("notSavable", {record.fullName()});
-    }
-    const std::unique_ptr<Value> custom(
-        static_cast<Value*>(state_->errors.guarded(record.fullName(), [&] {
-            return record.info().customSave(&instance);
-        })));
-    if (custom) return std::move(*custom);
+    if (!record.info().savesInstances())
+        state_->errors.raiseOwn("notSavable", {record.fullName()});
+    HostArray* const custom = state_->errors.guarded(
+        record.fullName(),
+        [&] { return record.info().customSave(instance.array()); });
+    if (custom != nullptr) return Value::adopt(custom);
     Value saved = Value::structure();
     for (const PropertyRecord& property : record.properties) {
-        if (property.isSaved()) {
-            saved.setField(
-                property.name->str(),
-                state_->dispatch.get(object, property, Caller::Host));
-        }
+        if (!property.isSaved()) continue;
+        saved.setField(property.name->str(),
+                       state_->dispatch.get(object, property, Caller::Host));
     }
     const ClassExtension& extension = state_->extensionOf(record);
     if (extension.save) extension.save(*this, instance, saved);
@@ -313,23 +290,21 @@ Value Host::save(const Value& instance) {
 
 Value Host::load(std::string_view className, const Value& saved) {
     ClassRecord& record = state_->registry.get(className);
-    if (!record.info().savesInstances()) {
-        state_->errors.own("notSavable", {record.fullName()});
-    }
+    if (!record.info().savesInstances())
+        state_->errors.raiseOwn("notSavable", {record.fullName()});
     Value loaded = state_->newInstance(record);
     const SavedValue savedForm(saved);
     state_->errors.guarded(record.fullName(), [&] {
-        record.info().customLoad(&loaded, &savedForm);
+        record.info().customLoad(loaded.ownArray(), &savedForm);
     });
     const Instance& object = state_->instanceOf(loaded);
     const bool hasFields =
         saved.valueClass() == ValueClass::Struct && saved.numel() != 0;
     for (const PropertyRecord& property : record.properties) {
         const std::string& name = property.name->str();
-        if (hasFields && property.isSaved() && saved.hasField(name)) {
+        if (hasFields && property.isSaved() && saved.hasField(name))
             state_->dispatch.set(object, property, saved.field(name),
                                  Caller::Host);
-        }
     }
     state_->update(object);
     return loaded;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <filesystem>
 #include <functional>
@@ -57,7 +58,7 @@ public:
     Host& operator=(const Host&) = delete;
     ~Host();
 
-    // --- Modules ---
+    // ---- Modules ----
 
     // Loads a module file libX.so and calls its entry VXInitialize_libX, or
     // only calls the entry again if the file is loaded already.
@@ -69,7 +70,7 @@ public:
     // The same, and unloads the module.
     void unloadModule(const std::filesystem::path& file);
 
-    // --- Classes ---
+    // ---- Classes ----
 
     // Registers a class of the program itself.
     void defineClass(std::string_view package,
@@ -82,12 +83,12 @@ public:
     std::vector<std::string> methodNames(std::string_view className) const;
     std::vector<std::string> propertyNames(std::string_view className) const;
 
-    // --- Instances ---
+    // ---- Instances ----
 
     // Makes an instance and runs the class's constructor, if it has one.
     template <class... Inputs>
     Value construct(std::string_view className, const Inputs&... inputs) {
-        const std::vector<const Value*> list{&inputs...};
+        const std::array<const Value*, sizeof...(inputs)> list{&inputs...};
         return constructWith(className, list);
     }
     Value constructWith(std::string_view className,
@@ -100,7 +101,7 @@ public:
     template <class... Inputs>
     std::vector<Value> call(std::int32_t requested, const Value& instance,
                             std::string_view method, const Inputs&... inputs) {
-        const std::vector<const Value*> list{&inputs...};
+        const std::array<const Value*, sizeof...(inputs)> list{&inputs...};
         return callWith(requested, instance, method, list);
     }
     std::vector<Value> callWith(std::int32_t requested, const Value& instance,

@@ -4,17 +4,16 @@
 
 namespace tessel::embedded {
 
-HostException::HostException(std::string messageIdentifier,
-                             std::vector<HostMessageArgument> messageArguments,
-                             std::string messageText)
-    : name_(std::move(messageIdentifier)),
-      values_(std::move(messageArguments)),
-      text_(std::move(messageText)) {}
+HostException::HostException(std::string identifier,
+                             std::vector<HostMessageArgument> arguments,
+                             std::string text)
+    : identifier_(std::move(identifier)),
+      arguments_(std::move(arguments)),
+      text_(std::move(text)) {}
 
 std::string toText(const HostMessageArgument& argument) {
-    if (const auto* number = std::get_if<std::int64_t>(&argument)) {
+    if (const auto* number = std::get_if<std::int64_t>(&argument))
         return std::to_string(*number);
-    }
     return std::get<std::string>(argument);
 }
 

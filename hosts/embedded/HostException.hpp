@@ -15,20 +15,19 @@ namespace tessel::embedded {
 // HostError, or the host itself. what() is the message text.
 class HostException : public std::exception {
 public:
-    HostException(std::string messageIdentifier,
-                  std::vector<HostMessageArgument> messageArguments,
-                  std::string messageText);
+    HostException(std::string identifier,
+                  std::vector<HostMessageArgument> arguments, std::string text);
 
     // Component, colon, key.
-    const std::string& identifier() const noexcept { return name_; }
+    const std::string& identifier() const noexcept { return identifier_; }
     const std::vector<HostMessageArgument>& arguments() const noexcept {
-        return values_;
+        return arguments_;
     }
     const char* what() const noexcept override { return text_.c_str(); }
 
 private:
-    std::string name_;
-    std::vector<HostMessageArgument> values_;
+    std::string identifier_;
+    std::vector<HostMessageArgument> arguments_;
     std::string text_;
 };
 

@@ -31,7 +31,7 @@ void terminate(const Module& module) noexcept {
 Module::~Module() { dlclose(handle_); }
 
 std::string Module::name() const {
-    const std::string fileName = file_.filename().string();
+    const std::string fileName = path_.filename().string();
     return fileName.substr(0, fileName.find(".so"));
 }
 
@@ -46,14 +46,14 @@ Modules::Loaded::iterator Modules::find(const fs::path& file) {
 
 std::unique_ptr<Module> Modules::open(const fs::path& file) const {
     if (!fs::is_regular_file(file)) {
-        errors_.own("moduleMissing", {file.string()});
+        errors_.raiseOwn("moduleMissing", {file.string()});
     }
     void* const handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (handle == nullptr) {
         const std::string reason = dlerror();
         const bool lacksSymbol =
             reason.find("undefined symbol") != std::string::npos;
-        errors_.own(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
+        errors_.raiseOwn(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
                     {file.string(), reason});
     }
     return std::make_unique<Module>(file, handle);
@@ -65,7 +65,7 @@ void Modules::enter(const Module& module) {
     const std::string name = "VXInitialize_" + module.name();
     const HostModuleEntry entry = module.find(name);
     if (entry == nullptr) {
-        errors_.own("entryMissing", {module.path().string(), name});
+        errors_.raiseOwn("entryMissing", {module.path().string(), name});
     }
     std::optional<std::string> failure;
     const Module* const outer =
@@ -79,7 +79,7 @@ void Modules::enter(const Module& module) {
     }
     registry_.enteringModule = outer;
     if (failure) {
-        errors_.own("entryFailed", {module.path().string(), *failure});
+        errors_.raiseOwn("entryFailed", {module.path().string(), *failure});
     }
 }
 
@@ -104,11 +104,11 @@ void Modules::load(const fs::path& file) {
 Modules::Loaded::iterator Modules::withoutClasses(const fs::path& file) {
     const auto present = find(resolved(file));
     if (present == modules_.end()) {
-        errors_.own("moduleNotLoaded", {file.string()});
+        errors_.raiseOwn("moduleNotLoaded", {file.string()});
     }
     const std::size_t instances = registry_.instanceCount(**present);
     if (instances != 0) {
-        errors_.own("moduleInUse",
+        errors_.raiseOwn("moduleInUse",
                     {file.string(), static_cast<std::int64_t>(instances)});
     }
     registry_.removeClasses(**present);

@@ -16,13 +16,13 @@ namespace tessel::embedded {
 //   still has code in the module must be gone by then.
 class Module {
 public:
-    Module(std::filesystem::path modulePath, void* loaderHandle)
-        : file_(std::move(modulePath)), handle_(loaderHandle) {}
+    Module(std::filesystem::path path, void* handle)
+        : path_(std::move(path)), handle_(handle) {}
     Module(const Module&) = delete;
     Module& operator=(const Module&) = delete;
     ~Module();
 
-    const std::filesystem::path& path() const noexcept { return file_; }
+    const std::filesystem::path& path() const noexcept { return path_; }
     // The file name up to ".so".
     std::string name() const;
 
@@ -30,7 +30,7 @@ public:
     HostModuleEntry find(const std::string& function) const;
 
 private:
-    std::filesystem::path file_;
+    std::filesystem::path path_;
     void* handle_;
 };
 
@@ -40,8 +40,8 @@ private:
 //   must outlive it.
 class Modules {
 public:
-    Modules(Registry& hostRegistry, const Errors& hostErrors)
-        : registry_(hostRegistry), errors_(hostErrors) {}
+    Modules(Registry& registry, const Errors& errors)
+        : registry_(registry), errors_(errors) {}
 
     // Loads a module file and calls its entry. For a module that is loaded
     // already it only calls the entry. Raises moduleMissing, moduleUnreadable,

@@ -11,7 +11,7 @@ namespace tessel::embedded {
 // A text of a NameTable.
 class Name final : public HostOpaque<HostNameTag> {
 public:
-    explicit Name(std::string_view source) : text_(source) {}
+    explicit Name(std::string_view text) : text_(text) {}
     const std::string& str() const noexcept { return text_; }
 
 private:

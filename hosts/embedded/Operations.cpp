@@ -10,12 +10,6 @@ namespace tessel::embedded {
 
 namespace {
 
-const Value& valueOf(const HostArray* array) {
-    return *static_cast<const Value*>(array);
-}
-
-Value& valueOf(HostArray* array) { return *static_cast<Value*>(array); }
-
 Signature& signatureOf(HostSignature* signature) {
     return *static_cast<Signature*>(signature);
 }
@@ -26,41 +20,43 @@ HostMessageArgument number(std::size_t count) {
 
 }  // namespace
 
-// --- Checks ------------------------------------------------------------------
+// ---- Checks ----
 
-const Value& Operations::checked(const HostArray* array,
-                                 ValueClass needed) const {
-    const Value& value = valueOf(array);
-    if (value.valueClass() != needed) {
-        errors_.own("wrongClass", {className(needed), typeNameOf(value)});
-    }
+BorrowedValue Operations::checked(const HostArray* array,
+                                  ValueClass needed) const {
+    BorrowedValue value(array);
+    if (value->valueClass() != needed)
+        errors_.raiseOwn("wrongClass", {std::string(className(needed)),
+                                        std::string(typeNameOf(*value))});
     return value;
 }
 
 void Operations::checkIndex(std::size_t index, std::size_t count) const {
-    if (index >= count) {
-        errors_.own("indexOutside", {number(index + 1), number(count)});
-    }
+    if (index >= count)
+        errors_.raiseOwn("indexOutside", {number(index + 1), number(count)});
+}
+
+// Changing an array that somebody else holds would change it there, too.
+void Operations::checkUnique(const BorrowedValue& array) const {
+    if (!array.isUnique()) errors_.raiseOwn("arrayShared");
 }
 
 // The first element of an object array, if it lives and is of that class.
 Instance& Operations::livingInstance(const HostArray* array,
                                      const char* className) const {
-    const Value& value = valueOf(array);
-    if (value.valueClass() != ValueClass::Object || value.numel() == 0) {
-        errors_.own("notAnInstance", {className});
-    }
-    Instance& instance = *value.instance(0);
-    if (!instance.isLiving()) errors_.own("invalidInstance");
-    if (instance.instanceClass()->fullName() != className) {
-        errors_.own("notAnInstance", {className});
-    }
+    const BorrowedValue value(array);
+    if (value->valueClass() != ValueClass::Object || value->numel() == 0)
+        errors_.raiseOwn("notAnInstance", {className});
+    Instance& instance = *value->instance(0);
+    if (!instance.isLiving()) errors_.raiseOwn("invalidInstance");
+    if (instance.instanceClass()->fullName() != className)
+        errors_.raiseOwn("notAnInstance", {className});
     return instance;
 }
 
 ClassRecord& Operations::classBeingDefined(HostClass* definedClass) const {
     auto& record = *static_cast<ClassRecord*>(definedClass);
-    if (!record.defining) errors_.own("notDefining");
+    if (!record.isDefining()) errors_.raiseOwn("notDefining");
     return record;
 }
 
@@ -68,7 +64,7 @@ bool accepts(std::string_view typeName, const Value& value) {
     return typeName == "any" || typeName == typeNameOf(value);
 }
 
-std::string typeNameOf(const Value& value) {
+std::string_view typeNameOf(const Value& value) {
     if (value.valueClass() == ValueClass::Object && value.numel() != 0) {
         const ClassRecord* const record = value.instance(0)->instanceClass();
         if (record != nullptr) return record->fullName();
@@ -76,36 +72,36 @@ std::string typeNameOf(const Value& value) {
     return className(value.valueClass());
 }
 
-// --- Reading arrays ----------------------------------------------------------
+// ---- Reading arrays ----
 
 std::size_t Operations::hostNumel(const HostArray* array) {
-    return valueOf(array).numel();
+    return BorrowedValue(array)->numel();
 }
 
 std::string Operations::hostGetString(const HostArray* text) {
-    return toUtf8(checked(text, ValueClass::Char).charData());
+    return toUtf8(checked(text, ValueClass::Char)->charData());
 }
 
 std::u16string Operations::hostGetUString(const HostArray* text) {
-    return checked(text, ValueClass::Char).charData();
+    return std::u16string(checked(text, ValueClass::Char)->charData());
 }
 
 bool Operations::hostIsCell(const HostArray* array) {
-    return valueOf(array).valueClass() == ValueClass::Cell;
+    return BorrowedValue(array)->valueClass() == ValueClass::Cell;
 }
 
 const HostArray* Operations::hostCellElement(const HostArray* cell,
                                              std::size_t index) {
-    const Value& value = checked(cell, ValueClass::Cell);
-    checkIndex(index, value.numel());
-    return &value.element(index);
+    const BorrowedValue value = checked(cell, ValueClass::Cell);
+    checkIndex(index, value->numel());
+    return value->element(index).array();
 }
 
 void Operations::hostRealElements(const HostArray* numeric,
                                   std::vector<double>& out) {
-    const Value& value = checked(numeric, ValueClass::Double);
-    const std::vector<double>& data = value.doubleData();
-    const std::size_t step = value.isComplex() ? 2 : 1;
+    const BorrowedValue value = checked(numeric, ValueClass::Double);
+    const std::vector<double>& data = value->doubleData();
+    const std::size_t step = value->isComplex() ? 2 : 1;
     out.clear();
     out.reserve(data.size() / step);
     for (std::size_t i = 0; i < data.size(); i += step) out.push_back(data[i]);
@@ -113,48 +109,47 @@ void Operations::hostRealElements(const HostArray* numeric,
 
 void Operations::hostRealElements(const HostArray* numeric,
                                   std::vector<std::uint8_t>& out) {
-    out = checked(numeric, ValueClass::Uint8).byteData();
+    out = checked(numeric, ValueClass::Uint8)->byteData();
 }
 
 const double* Operations::hostDoubleData(const HostArray* numeric,
                                          std::size_t count) {
-    const Value& value = checked(numeric, ValueClass::Double);
-    if (value.isComplex()) {
-        errors_.own("wrongClass", {"double", "complex double"});
-    }
-    if (value.numel() < count) {
-        errors_.own("tooFewElements", {number(count), number(value.numel())});
-    }
-    return value.doubleData().data();
+    const BorrowedValue value = checked(numeric, ValueClass::Double);
+    if (value->isComplex())
+        errors_.raiseOwn("wrongClass", {"double", "complex double"});
+    if (value->numel() < count)
+        errors_.raiseOwn("tooFewElements",
+                         {number(count), number(value->numel())});
+    return value->doubleData().data();
 }
 
 bool Operations::hostIsStruct(const HostArray* array) {
-    return valueOf(array).valueClass() == ValueClass::Struct;
+    return BorrowedValue(array)->valueClass() == ValueClass::Struct;
 }
 
 bool Operations::hostHasField(const HostArray* structure, const char* field) {
-    return checked(structure, ValueClass::Struct).hasField(field);
+    return checked(structure, ValueClass::Struct)->hasField(field);
 }
 
 const HostArray* Operations::hostFieldElement(const HostArray* structure,
                                               const char* field,
                                               std::size_t index) {
-    const Value& value = checked(structure, ValueClass::Struct);
-    if (!value.hasField(field)) errors_.own("fieldMissing", {field});
-    checkIndex(index, value.numel());
-    return &value.field(field, index);
+    const BorrowedValue value = checked(structure, ValueClass::Struct);
+    if (!value->hasField(field)) errors_.raiseOwn("fieldMissing", {field});
+    checkIndex(index, value->numel());
+    return value->field(field, index).array();
 }
 
-// --- Creating, filling and releasing arrays ----------------------------------
+// ---- Creating, filling and releasing arrays ----
 
 template <class Make>
 HostArray* Operations::created(Make make) const {
     try {
-        return new Value(make());
+        return make().release();
     } catch (const std::bad_alloc&) {     // both are raised below
     } catch (const std::length_error&) {  // more than can be addressed
     }
-    errors_.own("outOfMemory");
+    errors_.raiseOwn("outOfMemory");
 }
 
 HostArray* Operations::hostCreateCharArray(std::u16string_view text) {
@@ -162,36 +157,31 @@ HostArray* Operations::hostCreateCharArray(std::u16string_view text) {
 }
 
 HostArray* Operations::hostCreateCell(std::size_t rows, std::size_t columns) {
-    return created([&] { return Value::cell({rows, columns}); });
+    return created([&] { return Value::cell(rows, columns); });
 }
 
 void Operations::hostSetCell(HostArray* cell, std::size_t index,
                              HostArray* element) {
-    const std::unique_ptr<Value> taken(static_cast<Value*>(element));
-    checked(cell, ValueClass::Cell);
-    checkIndex(index, valueOf(cell).numel());
-    valueOf(cell).setElement(index, std::move(*taken));
+    Value taken = Value::adopt(element);
+    BorrowedValue value = checked(cell, ValueClass::Cell);
+    checkIndex(index, value->numel());
+    checkUnique(value);
+    value.own().setElement(index, std::move(taken));
 }
 
 HostArray* Operations::hostCreateNumeric(std::size_t rows, std::size_t columns,
                                          HostNumericClass numericClass) {
-    const Dimensions shape{rows, columns};
+    const Dimensions dimensions{rows, columns};
     return created([&] {
-        if (numericClass == HostNumericClass::Double) {
-            return Value::doubles(shape,
-                                  std::vector<double>(elementCount(shape)));
-        }
-        return Value::bytes(shape,
-                            std::vector<std::uint8_t>(elementCount(shape)));
+        const std::size_t count = elementCount(dimensions);
+        if (numericClass == HostNumericClass::Double)
+            return Value::doubles(dimensions, std::vector<double>(count));
+        return Value::bytes(dimensions, std::vector<std::uint8_t>(count));
     });
 }
 
 void* Operations::hostNumericData(HostArray* numeric) noexcept {
-    Value& value = valueOf(numeric);
-    if (value.valueClass() == ValueClass::Uint8) {
-        return value.byteData().data();
-    }
-    return value.doubleData().data();
+    return BorrowedValue(numeric).own().ownNumericData();
 }
 
 HostArray* Operations::hostCreateLogicalScalar(bool value) {
@@ -199,10 +189,10 @@ HostArray* Operations::hostCreateLogicalScalar(bool value) {
 }
 
 void Operations::hostReleaseArray(HostArray* array) noexcept {
-    delete static_cast<Value*>(array);
+    static_cast<void>(Value::adopt(array));
 }
 
-// --- Instances ---------------------------------------------------------------
+// ---- Instances ----
 
 void* Operations::hostNativeObject(const HostArray* instance,
                                    const char* className) {
@@ -211,33 +201,32 @@ void* Operations::hostNativeObject(const HostArray* instance,
 
 void Operations::hostSetNativeObject(HostArray* instance, const char* className,
                                      void* native) {
-    if (livingInstance(instance, className).native() != native) {
-        errors_.own("nativeObjectChanged", {className});
-    }
+    if (livingInstance(instance, className).native() != native)
+        errors_.raiseOwn("nativeObjectChanged", {className});
 }
 
 HostArray* Operations::hostConvert(const HostSavedValue* saved,
                                    const char* typeName) {
     const Value& value = static_cast<const SavedValue*>(saved)->value;
-    if (!accepts(typeName, value)) {
-        errors_.own("wrongClass", {typeName, typeNameOf(value)});
-    }
-    return created([&] { return value; });
+    if (!accepts(typeName, value))
+        errors_.raiseOwn("wrongClass",
+                         {typeName, std::string(typeNameOf(value))});
+    return created([&] { return value.clone(); });
 }
 
-// --- Errors ------------------------------------------------------------------
+// ---- Errors ----
 
-void Operations::hostErrorTooManyOutputs() { errors_.own("tooManyOutputs"); }
-void Operations::hostErrorTooManyInputs() { errors_.own("tooManyInputs"); }
-void Operations::hostErrorTooFewInputs() { errors_.own("tooFewInputs"); }
-void Operations::hostErrorOutOfMemory() { errors_.own("outOfMemory"); }
+void Operations::hostErrorTooManyOutputs() { errors_.raiseOwn("tooManyOutputs"); }
+void Operations::hostErrorTooManyInputs() { errors_.raiseOwn("tooManyInputs"); }
+void Operations::hostErrorTooFewInputs() { errors_.raiseOwn("tooFewInputs"); }
+void Operations::hostErrorOutOfMemory() { errors_.raiseOwn("outOfMemory"); }
 
 void Operations::HostError(std::string_view identifier,
                            std::span<const HostMessageArgument> arguments) {
     errors_.raise(identifier, arguments);
 }
 
-// --- Names, packages, classes ------------------------------------------------
+// ---- Names, packages, classes ----
 
 HostName Operations::hostInternName(const char* text) {
     return registry_.names.intern(text);
@@ -267,7 +256,7 @@ void Operations::hostRegisterClass(HostPackage* package,
 
 void Operations::hostAddMethod(HostClass* definedClass,
                                std::unique_ptr<HostMethodInfo> method) {
-    classBeingDefined(definedClass).methods.push_back(std::move(method));
+    classBeingDefined(definedClass).addMethod(std::move(method));
 }
 
 void Operations::hostAddProperty(HostClass* definedClass,
@@ -281,7 +270,7 @@ void Operations::hostAddProperty(HostClass* definedClass,
              property.getter, property.setter, property.disposer});
 }
 
-// --- Signatures --------------------------------------------------------------
+// ---- Signatures ----
 
 HostSignature* Operations::hostCreateSignature() {
     return new (std::nothrow) Signature();

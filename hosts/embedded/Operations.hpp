@@ -9,16 +9,15 @@ namespace tessel::embedded {
 
 // Operations is the embedded host as a plug-in sees it.
 //
-// Every array that a plug-in passes is a Value. Arrays of another class than
-// an operation needs, and places outside an array, are host errors: nothing is
-// ever read outside a value's elements.
+// Every array that a plug-in passes is an Array. Arrays of another class than
+// an operation needs, and indices outside an array, are host errors: nothing is
+// ever read outside an array's elements.
 class Operations final : public HostInterface {
 public:
-    Operations(Registry& hostRegistry, const Errors& hostErrors,
-               bool runsAlternativeMode)
-        : registry_(hostRegistry),
-          errors_(hostErrors),
-          alternativeMode_(runsAlternativeMode) {}
+    Operations(Registry& registry, const Errors& errors, bool alternativeMode)
+        : registry_(registry),
+          errors_(errors),
+          alternativeMode_(alternativeMode) {}
 
     std::size_t hostNumel(const HostArray* array) override;
     std::string hostGetString(const HostArray* text) override;
@@ -88,7 +87,8 @@ public:
     void hostSignatureMarkOutputs(HostSignature* signature) override;
 
 private:
-    const Value& checked(const HostArray* array, ValueClass needed) const;
+    BorrowedValue checked(const HostArray* array, ValueClass needed) const;
+    void checkUnique(const BorrowedValue& array) const;
     void checkIndex(std::size_t index, std::size_t count) const;
     Instance& livingInstance(const HostArray* array,
                              const char* className) const;
@@ -108,10 +108,11 @@ public:
     const Value& value;
 };
 
-// Whether a value may stand where a signature or property declares a type.
+// Whether a value may be passed where a signature or property declares a type.
 bool accepts(std::string_view typeName, const Value& value);
 
-// The type of a value, as accepts understands it.
-std::string typeNameOf(const Value& value);
+// The type of a value, as accepts understands it. Valid as long as the value
+// and its class.
+std::string_view typeNameOf(const Value& value);
 
 }  // namespace tessel::embedded

@@ -10,8 +10,7 @@ Package* Package::find(std::string_view name) {
 Package& Package::add(std::string_view dottedName) {
     const std::size_t dot = dottedName.find('.');
     const std::string name(dottedName.substr(0, dot));
-    const std::string prefix =
-        dottedFullName_.empty() ? "" : dottedFullName_ + ".";
+    const std::string prefix = fullName_.empty() ? "" : fullName_ + ".";
     std::unique_ptr<Package>& package = inner_[name];
     if (!package) package = std::make_unique<Package>(prefix + name);
     if (dot == std::string_view::npos) return *package;

@@ -13,11 +13,10 @@ namespace tessel::embedded {
 // A package, with the packages inside it. Packages are added, never removed.
 class Package final : public HostPackage {
 public:
-    explicit Package(std::string dottedName)
-        : dottedFullName_(std::move(dottedName)) {}
+    explicit Package(std::string fullName) : fullName_(std::move(fullName)) {}
 
     // Empty for the one package that holds all others.
-    const std::string& fullName() const noexcept { return dottedFullName_; }
+    const std::string& fullName() const noexcept { return fullName_; }
 
     // The package of a simple name inside this one, or null.
     Package* find(std::string_view name);
@@ -26,7 +25,7 @@ public:
     Package& add(std::string_view dottedName);
 
 private:
-    std::string dottedFullName_;
+    std::string fullName_;
     std::map<std::string, std::unique_ptr<Package>, std::less<>> inner_;
 };
 

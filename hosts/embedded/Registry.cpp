@@ -16,7 +16,7 @@ ClassRecord& Registry::get(std::string_view fullName) const {
     for (const auto& record : classes_) {
         if (record->fullName() == fullName) return *record;
     }
-    errors_.own("classMissing", {std::string(fullName)});
+    errors_.raiseOwn("classMissing", {std::string(fullName)});
 }
 
 std::vector<ClassRecord*> Registry::all() const {
@@ -28,11 +28,11 @@ std::vector<ClassRecord*> Registry::all() const {
 void Registry::define(Package& package, std::unique_ptr<HostClassInfo> info) {
     const Name* const name =
         names.intern(package.fullName() + "." + info->className());
-    if (find(name) != nullptr) errors_.own("classExists", {name->str()});
+    if (find(name) != nullptr) errors_.raiseOwn("classExists", {name->str()});
     auto record =
         std::make_unique<ClassRecord>(name, enteringModule, std::move(info));
     record->info().defineMembers(record.get());
-    record->defining = false;
+    record->closeDefinition();
     classes_.push_back(std::move(record));
 }
 
@@ -55,9 +55,8 @@ void Registry::removeAllClasses() {
 }
 
 void Registry::remove(ClassRecord& record) {
-    while (!record.instances().empty()) {
+    while (!record.instances().empty())
         (*record.instances().begin())->destroy();
-    }
     std::erase_if(classes_, [&](const auto& c) { return c.get() == &record; });
 }
 

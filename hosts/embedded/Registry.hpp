@@ -17,7 +17,7 @@ namespace tessel::embedded {
 // Ownership: owns all of them; refers to the errors, which must outlive it.
 class Registry {
 public:
-    explicit Registry(const Errors& hostErrors) : errors_(hostErrors) {}
+    explicit Registry(const Errors& errors) : errors_(errors) {}
 
     NameTable names;
     Package packages{""};

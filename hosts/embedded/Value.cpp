@@ -2,20 +2,25 @@
 
 #include <algorithm>
 #include <array>
-#include <limits>
 #include <stdexcept>
+#include <variant>
 
 namespace tessel::embedded {
 
 namespace {
 
-void requireCount(const Dimensions& dimensions, std::size_t held,
-                  std::size_t heldForEach = 1) {
-    if (held % heldForEach != 0 ||
-        elementCount(dimensions) != held / heldForEach) {
+void requireCount(const Shape& shape, std::size_t held,
+                  std::size_t heldPerElement = 1) {
+    if (held % heldPerElement != 0 || shape.count() != held / heldPerElement)
         throw std::invalid_argument(
             "The number of elements does not fit the dimensions.");
-    }
+}
+
+template <class Elements>
+auto& elementAt(Elements&& elements, std::size_t index) {
+    if (index >= elements.size())
+        throw std::out_of_range("There is no such element.");
+    return elements[index];
 }
 
 }  // namespace
@@ -26,201 +31,172 @@ const char* className(ValueClass valueClass) noexcept {
     return names[static_cast<std::size_t>(valueClass)];
 }
 
-std::size_t elementCount(const Dimensions& dimensions) {
-    std::size_t count = 1;
-    for (const std::size_t extent : dimensions) {
-        if (extent != 0 &&
-            count > std::numeric_limits<std::size_t>::max() / extent) {
-            throw std::length_error("The dimensions are too large.");
-        }
-        count *= extent;
-    }
-    return count;
+// ---- Making values ----
+
+Value Value::chars(const Dimensions& dimensions, std::u16string_view text) {
+    Shape shape(dimensions);
+    requireCount(shape, text.size());
+    return Value(Texts::make(ValueClass::Char, std::move(shape), text));
 }
 
-Value::Value(const Dimensions& dimensions, Elements content, bool isComplex)
-    : elements_(std::move(content)), complexParts_(isComplex) {
-    if (dimensions.size() == 2) {
-        rows_ = dimensions[0];
-        columns_ = dimensions[1];
-    } else {
-        otherShape_ = std::make_shared<const Dimensions>(dimensions);
-    }
-}
-
-Value::Value(Value&& other) noexcept
-    : elements_(std::move(other.elements_)),
-      rows_(std::exchange(other.rows_, 0)),
-      columns_(std::exchange(other.columns_, 0)),
-      otherShape_(std::move(other.otherShape_)),
-      complexParts_(other.complexParts_) {}
-
-Value& Value::operator=(Value&& other) noexcept {
-    Value taken(std::move(other));
-    elements_.swap(taken.elements_);
-    std::swap(rows_, taken.rows_);
-    std::swap(columns_, taken.columns_);
-    otherShape_.swap(taken.otherShape_);
-    std::swap(complexParts_, taken.complexParts_);
-    return *this;
-}
-
-Dimensions Value::dimensions() const {
-    return otherShape_ ? *otherShape_ : Dimensions{rows_, columns_};
-}
-
-std::size_t Value::numel() const {
-    return otherShape_ ? elementCount(*otherShape_) : rows_ * columns_;
-}
-
-Value Value::chars(const Dimensions& dimensions, std::u16string text) {
-    requireCount(dimensions, text.size());
-    return {dimensions, std::move(text)};
+Value Value::complexOrReal(Shape shape, std::vector<double> parts,
+                           bool isComplex) {
+    requireCount(shape, parts.size(), isComplex ? 2 : 1);
+    return Value(new Numbers(ValueClass::Double, std::move(shape),
+                             {std::move(parts), isComplex}));
 }
 
 Value Value::doubles(const Dimensions& dimensions, std::vector<double> values) {
-    requireCount(dimensions, values.size());
-    return {dimensions, std::move(values)};
+    return complexOrReal(Shape(dimensions), std::move(values), false);
 }
 
 Value Value::complexDoubles(const Dimensions& dimensions,
                             std::vector<double> parts) {
-    requireCount(dimensions, parts.size(), 2);
-    return {dimensions, std::move(parts), true};
+    return complexOrReal(Shape(dimensions), std::move(parts), true);
 }
 
 Value Value::bytes(const Dimensions& dimensions,
                    std::vector<std::uint8_t> values) {
-    requireCount(dimensions, values.size());
-    return {dimensions, std::move(values)};
+    Shape shape(dimensions);
+    requireCount(shape, values.size());
+    return Value(
+        new Bytes(ValueClass::Uint8, std::move(shape), std::move(values)));
 }
 
 Value Value::logicals(const Dimensions& dimensions,
-                      std::vector<std::uint8_t> truths) {
-    requireCount(dimensions, truths.size());
-    return {dimensions, Logicals{std::move(truths)}};
+                      const std::vector<std::uint8_t>& truths) {
+    Shape shape(dimensions);
+    requireCount(shape, truths.size());
+    return Value(Truths::make(ValueClass::Logical, std::move(shape), truths));
 }
 
 Value Value::objects(const Dimensions& dimensions,
                      std::vector<std::shared_ptr<Instance>> instances) {
-    requireCount(dimensions, instances.size());
-    if (std::find(instances.begin(), instances.end(), nullptr) !=
-        instances.end()) {
+    Shape shape(dimensions);
+    requireCount(shape, instances.size());
+    if (std::ranges::find(instances, nullptr) != instances.end())
         throw std::invalid_argument("An object needs its instance.");
-    }
-    return {dimensions, std::move(instances)};
+    return Value(
+        new Objects(ValueClass::Object, std::move(shape), std::move(instances)));
 }
 
 Value Value::cell(const Dimensions& dimensions) {
-    std::vector<Value> unset(elementCount(dimensions));
-    return {dimensions, std::move(unset)};
+    return Value(Cells::make(ValueClass::Cell, Shape(dimensions)));
+}
+
+Value Value::cell(std::size_t rows, std::size_t columns) {
+    return Value(Cells::make(ValueClass::Cell, Shape(rows, columns)));
 }
 
 Value Value::structure(const Dimensions& dimensions) {
-    elementCount(dimensions);  // refuses dimensions that are too large
-    return {dimensions, Fields{}};
+    return Value(new Structs(ValueClass::Struct, Shape(dimensions), {}));
 }
 
 Value Value::text(std::u16string_view text) {
-    return {{1, text.size()}, std::u16string(text)};
+    return Value(Texts::make(ValueClass::Char, Shape(1, text.size()), text));
 }
 
-Value Value::scalar(double number) {
-    return {{1, 1}, std::vector<double>{number}};
-}
+Value Value::scalar(double number) { return doubles({1, 1}, {number}); }
 
 Value Value::logical(bool truth) {
-    return logicals({1, 1}, {static_cast<std::uint8_t>(truth)});
+    const auto element = static_cast<std::uint8_t>(truth);
+    return Value(
+        Truths::make(ValueClass::Logical, Shape(1, 1), {&element, 1}));
 }
 
 Value Value::column(std::vector<double> values) {
     const std::size_t count = values.size();
-    return {{count, 1}, std::move(values)};
+    return complexOrReal(Shape(count, 1), std::move(values), false);
 }
 
 Value Value::byteColumn(std::vector<std::uint8_t> values) {
     const std::size_t count = values.size();
-    return {{count, 1}, std::move(values)};
+    return bytes({count, 1}, std::move(values));
 }
 
-Value Value::cellRow(std::vector<Value> elements) {
-    const std::size_t count = elements.size();
-    return {{1, count}, std::move(elements)};
+Value Value::cellRow(const std::vector<Value>& elements) {
+    return Value(
+        Cells::make(ValueClass::Cell, Shape(1, elements.size()), elements));
 }
 
-Value Value::cellColumn(std::vector<Value> elements) {
-    const std::size_t count = elements.size();
-    return {{count, 1}, std::move(elements)};
+Value Value::cellColumn(const std::vector<Value>& elements) {
+    return Value(
+        Cells::make(ValueClass::Cell, Shape(elements.size(), 1), elements));
 }
 
 Value Value::texts(const std::vector<std::u16string>& rows) {
-    std::vector<Value> elements;
-    elements.reserve(rows.size());
-    for (const std::u16string& row : rows) elements.push_back(text(row));
-    return cellColumn(std::move(elements));
+    Value made = cell(rows.size(), 1);
+    auto& cells = static_cast<Cells&>(*made.array_);
+    for (std::size_t i = 0; i < rows.size(); ++i)
+        cells.elements()[i] = text(rows[i]);
+    return made;
 }
 
 Value Value::textLists(const std::vector<std::vector<std::u16string>>& lists) {
-    std::vector<Value> elements;
-    elements.reserve(lists.size());
-    for (const auto& rows : lists) elements.push_back(texts(rows));
-    return cellColumn(std::move(elements));
+    Value made = cell(lists.size(), 1);
+    auto& cells = static_cast<Cells&>(*made.array_);
+    for (std::size_t i = 0; i < lists.size(); ++i)
+        cells.elements()[i] = texts(lists[i]);
+    return made;
 }
 
-ValueClass Value::valueClass() const noexcept {
-    return static_cast<ValueClass>(elements_.index());
+// ---- Looking into values ----
+
+const Array& Value::empty() noexcept {
+    static const Value zeroByZero(
+        new Numbers(ValueClass::Double, Shape(0, 0), {{}, false}));
+    return *zeroByZero.array_;
 }
 
-const std::u16string& Value::charData() const {
-    return std::get<std::u16string>(elements_);
+template <class Kind>
+const Kind& Value::as(ValueClass valueClass) const {
+    const Array& array = shown();
+    if (array.valueClass() != valueClass) throw std::bad_variant_access();
+    return static_cast<const Kind&>(array);
+}
+
+bool Value::isComplex() const noexcept {
+    return valueClass() == ValueClass::Double &&
+           static_cast<const Numbers&>(shown()).content.isComplex;
+}
+
+std::u16string_view Value::charData() const {
+    const auto text = as<Texts>(ValueClass::Char).elements();
+    return {text.data(), text.size()};
 }
 
 const std::vector<double>& Value::doubleData() const {
-    return std::get<std::vector<double>>(elements_);
-}
-
-std::vector<double>& Value::doubleData() {
-    return std::get<std::vector<double>>(elements_);
+    return as<Numbers>(ValueClass::Double).content.parts;
 }
 
 const std::vector<std::uint8_t>& Value::byteData() const {
-    return std::get<std::vector<std::uint8_t>>(elements_);
-}
-
-std::vector<std::uint8_t>& Value::byteData() {
-    return std::get<std::vector<std::uint8_t>>(elements_);
+    return as<Bytes>(ValueClass::Uint8).content;
 }
 
 bool Value::truth(std::size_t index) const {
-    return std::get<Logicals>(elements_).truths.at(index) != 0;
+    return elementAt(as<Truths>(ValueClass::Logical).elements(), index) != 0;
 }
 
 const std::shared_ptr<Instance>& Value::instance(std::size_t index) const {
-    return std::get<std::vector<std::shared_ptr<Instance>>>(elements_).at(
-        index);
+    return elementAt(as<Objects>(ValueClass::Object).content, index);
 }
 
 const Value& Value::element(std::size_t index) const {
-    return std::get<std::vector<Value>>(elements_).at(index);
-}
-
-void Value::setElement(std::size_t index, Value element) {
-    std::get<std::vector<Value>>(elements_).at(index) = std::move(element);
+    return elementAt(as<Cells>(ValueClass::Cell).elements(), index);
 }
 
 const std::vector<Value>* Value::findField(std::string_view name) const {
-    for (const auto& [columnName, values] :
-         std::get<Fields>(elements_).columns) {
-        if (columnName == name) return &values;
-    }
-    return nullptr;
+    const auto& columns = as<Structs>(ValueClass::Struct).content.columns;
+    const auto found = std::ranges::find(
+        columns, name, &std::pair<std::string, std::vector<Value>>::first);
+    return found == columns.end() ? nullptr : &found->second;
 }
 
 std::vector<std::string> Value::fieldNames() const {
     std::vector<std::string> names;
-    for (const auto& [name, values] : std::get<Fields>(elements_).columns) {
+    for (const auto& [name, values] :
+         as<Structs>(ValueClass::Struct).content.columns)
         names.push_back(name);
-    }
     return names;
 }
 
@@ -234,24 +210,67 @@ const Value& Value::field(std::string_view name, std::size_t index) const {
     return values->at(index);
 }
 
-void Value::setField(std::string_view name, Value value, std::size_t index) {
-    auto& present = std::get<Fields>(elements_).columns;
-    auto found = std::find_if(present.begin(), present.end(),
-                              [&](const auto& c) { return c.first == name; });
-    if (found == present.end()) {
-        present.emplace_back(name, std::vector<Value>(numel()));
-        found = std::prev(present.end());
-    }
-    found->second.at(index) = std::move(value);
-}
-
 bool Value::Fields::operator==(const Fields& other) const {
     return columns == other.columns;
 }
 
 bool operator==(const Value& a, const Value& b) {
-    return a.dimensions() == b.dimensions() &&
-           a.complexParts_ == b.complexParts_ && a.elements_ == b.elements_;
+    const Array& first = a.shown();
+    const Array& second = b.shown();
+    return first.valueClass() == second.valueClass() &&
+           first.shape() == second.shape() && first.hasElementsOf(second);
+}
+
+// ---- Changing values ----
+
+// An array that others refer to is left to them.
+Array& Value::changeable() {
+    if (array_ == nullptr || !array_->isUnique())
+        *this = clone();
+    return *array_;
+}
+
+template <class Kind>
+Kind& Value::changeableAs(ValueClass valueClass) {
+    as<Kind>(valueClass);
+    return static_cast<Kind&>(changeable());
+}
+
+void Value::setElement(std::size_t index, Value element) {
+    elementAt(changeableAs<Cells>(ValueClass::Cell).elements(), index) =
+        std::move(element);
+}
+
+void Value::setField(std::string_view name, Value value, std::size_t index) {
+    const bool isNew = !hasField(name);
+    if (index >= numel()) throw std::out_of_range("There is no such element.");
+    auto& columns = changeableAs<Structs>(ValueClass::Struct).content.columns;
+    if (isNew) columns.emplace_back(name, std::vector<Value>(numel()));
+    const auto found = std::ranges::find(
+        columns, name, &std::pair<std::string, std::vector<Value>>::first);
+    found->second.at(index) = std::move(value);
+}
+
+void* Value::ownNumericData() {
+    if (valueClass() == ValueClass::Uint8)
+        return changeableAs<Bytes>(ValueClass::Uint8).content.data();
+    return changeableAs<Numbers>(ValueClass::Double).content.parts.data();
+}
+
+// ---- Values as a plug-in sees them ----
+
+HostArray* Value::release() {
+    if (array_ == nullptr) return clone().release();
+    return std::exchange(array_, nullptr);
+}
+
+Value Value::adopt(HostArray* array) noexcept {
+    return Value(static_cast<Array*>(array));
+}
+
+Value Value::share(const HostArray* array) noexcept {
+    const BorrowedValue borrowed(array);
+    return *borrowed;
 }
 
 }  // namespace tessel::embedded

@@ -2,56 +2,56 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <initializer_list>
 #include <memory>
 #include <string>
 #include <string_view>
 #include <utility>
-#include <variant>
 #include <vector>
 
 #include "binding/HostInterface.hpp"
+#include "hosts/embedded/Array.hpp"
 
 namespace tessel::embedded {
 
 class Instance;
 
-// The classes of values. An object's exact class is its instances' business.
-enum class ValueClass { Double, Char, Uint8, Logical, Cell, Struct, Object };
-
 // "double", "char" and so on; "object" for objects.
 const char* className(ValueClass valueClass) noexcept;
-
-using Dimensions = std::vector<std::size_t>;
-
-// The product of the dimensions, 1 without any. Throws std::length_error if it
-// does not fit.
-std::size_t elementCount(const Dimensions& dimensions);
 
 // Value is one value of the host: an array of any dimensions whose elements, in
 // column-major order, are all of one class.
 //
 // Invariants: there are as many elements as elementCount(dimensions()), except
 //   that complex data holds two numbers for each, real part first.
-// Ownership: a regular value; copying copies all elements. Instances alone are
-//   shared: a copied object refers to the same instances.
+// Ownership: a regular value. Copies share one array until one of them is
+//   changed, which then gets an array of its own. Instances are always shared:
+//   a copied object refers to the same instances.
 // Threads: as any standard container.
+// Cost: a pointer; copying counts a reference. Texts, cells and logicals take
+//   one heap block each.
 // Failures: an accessor for another class than the value's throws
 //   std::bad_variant_access, an index outside throws std::out_of_range.
-class Value final : public HostArray {
+class Value {
 public:
     // 0 x 0 double: what a cell element or field is before it is set.
-    Value() = default;
-    Value(const Value&) = default;
-    Value& operator=(const Value&) = default;
-    // Both leave the other value without elements.
-    Value(Value&& other) noexcept;
-    Value& operator=(Value&& other) noexcept;
-    ~Value() = default;
+    Value() noexcept = default;
+    Value(const Value& other) noexcept : array_(other.array_) {
+        if (array_ != nullptr) array_->addReference();
+    }
+    // Both leave the other value 0 x 0.
+    Value(Value&& other) noexcept
+        : array_(std::exchange(other.array_, nullptr)) {}
+    Value& operator=(Value other) noexcept {
+        std::swap(array_, other.array_);
+        return *this;
+    }
+    ~Value() {
+        if (array_ != nullptr) array_->drop();
+    }
 
     // Each throws std::invalid_argument if the number of elements is not the
     // one that the dimensions ask for, or an instance is null.
-    static Value chars(const Dimensions& dimensions, std::u16string text);
+    static Value chars(const Dimensions& dimensions, std::u16string_view text);
     static Value doubles(const Dimensions& dimensions,
                          std::vector<double> values);
     // Interleaved: real part, imaginary part, real part, and so on.
@@ -60,12 +60,13 @@ public:
     static Value bytes(const Dimensions& dimensions,
                        std::vector<std::uint8_t> values);
     static Value logicals(const Dimensions& dimensions,
-                          std::vector<std::uint8_t> truths);
+                          const std::vector<std::uint8_t>& truths);
     static Value objects(const Dimensions& dimensions,
                          std::vector<std::shared_ptr<Instance>> instances);
 
     // Elements are 0 x 0 doubles, a struct has no fields.
     static Value cell(const Dimensions& dimensions);
+    static Value cell(std::size_t rows, std::size_t columns);
     static Value structure(const Dimensions& dimensions = {1, 1});
 
     // A char row; a double or logical scalar; a double or uint8 column; a cell
@@ -75,24 +76,24 @@ public:
     static Value logical(bool truth);
     static Value column(std::vector<double> values);
     static Value byteColumn(std::vector<std::uint8_t> values);
-    static Value cellRow(std::vector<Value> elements);
-    static Value cellColumn(std::vector<Value> elements);
+    static Value cellRow(const std::vector<Value>& elements);
+    static Value cellColumn(const std::vector<Value>& elements);
     // A cell column of char rows, and one of such cells.
     static Value texts(const std::vector<std::u16string>& rows);
     static Value textLists(
         const std::vector<std::vector<std::u16string>>& lists);
 
-    ValueClass valueClass() const noexcept;
-    Dimensions dimensions() const;
-    std::size_t numel() const;
-    bool isComplex() const noexcept { return complexParts_; }
+    ValueClass valueClass() const noexcept { return shown().valueClass(); }
+    Dimensions dimensions() const { return shown().shape().dimensions(); }
+    std::size_t numel() const noexcept { return shown().numel(); }
+    bool isComplex() const noexcept;
 
-    const std::u16string& charData() const;
+    // Views and references hold as long as the value is neither changed nor
+    // gone.
+    std::u16string_view charData() const;
     // Of complex data both parts, interleaved.
     const std::vector<double>& doubleData() const;
-    std::vector<double>& doubleData();
     const std::vector<std::uint8_t>& byteData() const;
-    std::vector<std::uint8_t>& byteData();
     bool truth(std::size_t index) const;
     const std::shared_ptr<Instance>& instance(std::size_t index) const;
 
@@ -106,36 +107,93 @@ public:
     // Adds the field to all elements if it is new.
     void setField(std::string_view name, Value value, std::size_t index = 0);
 
+    // A value with an array of its own, which is changed as nobody else's.
+    Value clone() const { return Value(shown().clone()); }
+
     // Equal class, dimensions and elements; instances by identity.
     friend bool operator==(const Value& a, const Value& b);
 
+    // ---- Values as a plug-in sees them ----
+
+    // The value's array, borrowed: as long as the value is neither changed nor
+    // gone. The second one first gets an array of its own, which may be
+    // changed.
+    const HostArray* array() const noexcept { return &shown(); }
+    HostArray* ownArray() { return &changeable(); }
+
+    // The numbers of a real double or uint8 array, to be written.
+    void* ownNumericData();
+
+    // Hands the array out, with its reference, and leaves the value 0 x 0.
+    HostArray* release();
+
+    // The value of an array that was handed over: from release() or from a
+    // creating operation. Null gives 0 x 0.
+    static Value adopt(HostArray* array) noexcept;
+
+    // The value of a borrowed array, for longer than it is borrowed.
+    static Value share(const HostArray* array) noexcept;
+
 private:
-    struct Logicals {
-        std::vector<std::uint8_t> truths;
-        friend bool operator==(const Logicals&, const Logicals&) = default;
-    };
+    friend class BorrowedValue;
+
     struct Fields {
         std::vector<std::pair<std::string, std::vector<Value>>> columns;
         bool operator==(const Fields& other) const;
     };
-    // In the order of ValueClass.
-    using Elements =
-        std::variant<std::vector<double>, std::u16string,
-                     std::vector<std::uint8_t>, Logicals, std::vector<Value>,
-                     Fields, std::vector<std::shared_ptr<Instance>>>;
+    struct Doubles {
+        std::vector<double> parts;
+        bool isComplex;
+        bool operator==(const Doubles& other) const = default;
+    };
+    using Texts = InlineArray<char16_t>;
+    using Truths = InlineArray<std::uint8_t>;
+    using Cells = InlineArray<Value>;
+    using Numbers = ContainerArray<Doubles>;
+    using Bytes = ContainerArray<std::vector<std::uint8_t>>;
+    using Structs = ContainerArray<Fields>;
+    using Objects = ContainerArray<std::vector<std::shared_ptr<Instance>>>;
 
-    Value(const Dimensions& dimensions, Elements content,
-          bool isComplex = false);
+    // Takes over the array's one reference.
+    explicit Value(Array* array) noexcept : array_(array) {}
 
+    static Value complexOrReal(Shape shape, std::vector<double> parts,
+                               bool isComplex);
+    // What a null pointer stands for; never changed, never deleted.
+    static const Array& empty() noexcept;
+
+    const Array& shown() const noexcept {
+        return array_ != nullptr ? *array_ : empty();
+    }
+    Array& changeable();
+    template <class Kind>
+    const Kind& as(ValueClass valueClass) const;
+    template <class Kind>
+    Kind& changeableAs(ValueClass valueClass);
     const std::vector<Value>* findField(std::string_view name) const;
 
-    Elements elements_;
-    std::size_t rows_ = 0;
-    std::size_t columns_ = 0;
-    // All dimensions, if there are not two of them; rows and columns are then
-    // 0. Values never change it, so copies share it.
-    std::shared_ptr<const Dimensions> otherShape_;
-    bool complexParts_ = false;
+    Array* array_ = nullptr;
+};
+
+// BorrowedValue is the value of an array that somebody else holds meanwhile. It
+// takes no reference, so that looking into an array counts nothing.
+class BorrowedValue {
+public:
+    explicit BorrowedValue(const HostArray* array) noexcept
+        : value_(static_cast<Array*>(const_cast<HostArray*>(array))) {}
+    BorrowedValue(BorrowedValue&&) noexcept = default;
+    BorrowedValue& operator=(BorrowedValue&&) = delete;
+    ~BorrowedValue() { value_.array_ = nullptr; }
+
+    const Value& operator*() const noexcept { return value_; }
+    const Value* operator->() const noexcept { return &value_; }
+
+    // To change the array, which must have one reference: the caller's.
+    Value& own() noexcept { return value_; }
+    bool isUnique() const noexcept { return value_.array_->isUnique(); }
+
+private:
+    Value value_;
 };
 
 }  // namespace tessel::embedded

@@ -48,9 +48,9 @@ Texts textsOf(const Value& cell) {
     EXPECT_EQ(cell.dimensions(), (Dimensions{cell.numel(), 1}));
     Texts texts;
     for (std::size_t i = 0; i < cell.numel(); ++i) {
-        const std::u16string& text = cell.element(i).charData();
+        const std::u16string_view text = cell.element(i).charData();
         EXPECT_EQ(cell.element(i).dimensions(), (Dimensions{1, text.size()}));
-        texts.push_back(text);
+        texts.emplace_back(text);
     }
     return texts;
 }

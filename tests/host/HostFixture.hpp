@@ -84,7 +84,8 @@ protected:
                  const std::u16string& separator);
 
     std::u16string treeString(const Value& instance) {
-        return host_.call(1, instance, "serialize")[0].charData();
+        return std::u16string(
+            host_.call(1, instance, "serialize")[0].charData());
     }
     std::vector<std::uint8_t> storedForm(const Value& instance) {
         return host_.call(2, instance, "serialize")[1].byteData();

@@ -72,16 +72,16 @@ private:
 HostArray* getNumber(void* native) {
     const double number =
         native == nullptr ? -1 : static_cast<Counter*>(native)->number;
-    return new Value(Value::scalar(number));
+    return Value::scalar(number).release();
 }
 
 void setNumber(void* native, const HostArray* value) {
-    const double number = static_cast<const Value*>(value)->doubleData().at(0);
+    const double number = BorrowedValue(value)->doubleData().at(0);
     if (number < 0) throw std::range_error("Too small.");
     static_cast<Counter*>(native)->number = number;
 }
 
-void dispose(HostArray* value) { delete static_cast<Value*>(value); }
+void dispose(HostArray* value) { static_cast<void>(Value::adopt(value)); }
 
 class TestClass : public HostClassInfo {
 public:
@@ -118,7 +118,7 @@ public:
     bool savesInstances() const noexcept override { return behaviour_.saves; }
     bool isHidden() const noexcept override { return behaviour_.hidden; }
     HostArray* customSave(const HostArray* /*instance*/) override {
-        return behaviour_.custom ? new Value(Value::text(u"custom")) : nullptr;
+        return behaviour_.custom ? Value::text(u"custom").release() : nullptr;
     }
 
     struct Types {
@@ -167,7 +167,7 @@ protected:
             own.addMethod(definedClass, "run", types, [&](HostFrame& frame) {
                 ++runs_;
                 for (std::int32_t i = 0; i < frame.outputCount; ++i) {
-                    frame.outputs[i] = new Value(Value::scalar(i));
+                    frame.outputs[i] = Value::scalar(i).release();
                 }
             });
         });
@@ -332,7 +332,7 @@ TEST_F(OwnClassTest, ComplexDoubleIsDouble) {
 
 TEST_F(OwnClassTest, UnassignedRequestedOutputIsReportedAndTheRestReleased) {
     defineWithBody({"any", "any"}, [](HostFrame& frame) {
-        frame.outputs[0] = new Value(Value::scalar(1));
+        frame.outputs[0] = Value::scalar(1).release();
     });
     const Value instance = host_.construct(counterName);
     EXPECT_EQ(key([&] { host_.call(2, instance, "run"); }),
@@ -341,7 +341,7 @@ TEST_F(OwnClassTest, UnassignedRequestedOutputIsReportedAndTheRestReleased) {
 
 TEST_F(OwnClassTest, OutputsOfMethodThatThrowsAreReleased) {
     defineWithBody({"any"}, [](HostFrame& frame) {
-        frame.outputs[0] = new Value(Value::scalar(1));
+        frame.outputs[0] = Value::scalar(1).release();
         throw std::runtime_error("After all.");
     });
     const Value instance = host_.construct(counterName);
@@ -379,8 +379,8 @@ TEST_F(OwnClassTest, ConstructorFindsItsInstanceInTheFirstOutput) {
         own.addMethod(
             definedClass, "Counter", {{"double"}, {counterName}},
             [](HostFrame& frame) {
-                const auto& made = *static_cast<const Value*>(frame.outputs[0]);
-                setNumber(made.instance(0)->native(), frame.inputs[0]);
+                const BorrowedValue made(frame.outputs[0]);
+                setNumber(made->instance(0)->native(), frame.inputs[0]);
             });
     });
     EXPECT_EQ(number(host_.get(host_.construct(counterName, Value::scalar(7)),

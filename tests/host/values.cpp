@@ -101,22 +101,22 @@ protected:
 TEST_F(OperationsTest, NumberOfElements) {
     const Value none = Value::cell({});
     const Value cube = Value::cell({2, 3, 4});
-    EXPECT_EQ(operations_.hostNumel(&none), 1U);
-    EXPECT_EQ(operations_.hostNumel(&cube), 24U);
+    EXPECT_EQ(operations_.hostNumel(none.array()), 1U);
+    EXPECT_EQ(operations_.hostNumel(cube.array()), 24U);
 }
 
 TEST_F(OperationsTest, NarrowTextIsUtf8AndKeepsLoneSurrogates) {
     const Value text = Value::text(u"a\u00E9\u20AC\U0001F600\xD800");
-    EXPECT_EQ(operations_.hostGetString(&text),
+    EXPECT_EQ(operations_.hostGetString(text.array()),
               "a\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80\xED\xA0\x80");
 }
 
 TEST_F(OperationsTest, TextOfAnotherClassIsHostError) {
     for (const Value& other : {Value(), Value::cell({1, 1}), Value::scalar(1),
                                Value::bytes({1, 1}, {65})}) {
-        EXPECT_EQ(errorKey([&] { operations_.hostGetString(&other); }),
+        EXPECT_EQ(errorKey([&] { operations_.hostGetString(other.array()); }),
                   "VELOX:embedded:wrongClass");
-        EXPECT_EQ(errorKey([&] { operations_.hostGetUString(&other); }),
+        EXPECT_EQ(errorKey([&] { operations_.hostGetUString(other.array()); }),
                   "VELOX:embedded:wrongClass");
     }
 }
@@ -124,7 +124,7 @@ TEST_F(OperationsTest, TextOfAnotherClassIsHostError) {
 TEST_F(OperationsTest, RealElementsOfComplexDataAreEverySecondValue) {
     const Value complex = Value::complexDoubles({3, 1}, {1, -1, 2, -2, 3, -3});
     std::vector<double> real = {99};
-    operations_.hostRealElements(&complex, real);
+    operations_.hostRealElements(complex.array(), real);
     EXPECT_EQ(real, (std::vector<double>{1, 2, 3}));
 }
 
@@ -135,30 +135,30 @@ TEST_F(OperationsTest, ElementsAreReadAsTheirOwnClassOnly) {
     std::vector<double> asDoubles;
     std::vector<std::uint8_t> asBytes;
     EXPECT_EQ(
-        errorKey([&] { operations_.hostRealElements(&bytes, asDoubles); }),
+        errorKey([&] { operations_.hostRealElements(bytes.array(), asDoubles); }),
         "VELOX:embedded:wrongClass");
     EXPECT_EQ(
-        errorKey([&] { operations_.hostRealElements(&doubles, asBytes); }),
+        errorKey([&] { operations_.hostRealElements(doubles.array(), asBytes); }),
         "VELOX:embedded:wrongClass");
-    EXPECT_EQ(errorKey([&] { operations_.hostRealElements(&truths, asBytes); }),
+    EXPECT_EQ(errorKey([&] { operations_.hostRealElements(truths.array(), asBytes); }),
               "VELOX:embedded:wrongClass");
 }
 
 TEST_F(OperationsTest, DoubleDataIsRefusedWhereItWouldBeReadOutside) {
     const Value two = Value::column({1, 2});
-    EXPECT_EQ(operations_.hostDoubleData(&two, 2)[1], 2);
-    EXPECT_EQ(errorKey([&] { operations_.hostDoubleData(&two, 3); }),
+    EXPECT_EQ(operations_.hostDoubleData(two.array(), 2)[1], 2);
+    EXPECT_EQ(errorKey([&] { operations_.hostDoubleData(two.array(), 3); }),
               "VELOX:embedded:tooFewElements");
 }
 
 TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
     const Value cell = Value::cell({2, 1});
-    EXPECT_EQ(operations_.hostNumel(operations_.hostCellElement(&cell, 1)), 0U);
-    EXPECT_EQ(errorKey([&] { operations_.hostCellElement(&cell, 2); }),
+    EXPECT_EQ(operations_.hostNumel(operations_.hostCellElement(cell.array(), 1)), 0U);
+    EXPECT_EQ(errorKey([&] { operations_.hostCellElement(cell.array(), 2); }),
               "VELOX:embedded:indexOutside");
     Value structure = Value::structure({0, 1});
     EXPECT_EQ(
-        errorKey([&] { operations_.hostFieldElement(&structure, "a", 0); }),
+        errorKey([&] { operations_.hostFieldElement(structure.array(), "a", 0); }),
         "VELOX:embedded:fieldMissing");
     HostArray* const made = operations_.hostCreateCell(1, 1);
     EXPECT_EQ(errorKey([&] {
@@ -172,7 +172,7 @@ TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
 TEST_F(OperationsTest, FieldOfStructWithoutElementsIsHostError) {
     Value one = Value::structure();
     one.setField("a", Value::scalar(1));
-    EXPECT_EQ(errorKey([&] { operations_.hostFieldElement(&one, "a", 1); }),
+    EXPECT_EQ(errorKey([&] { operations_.hostFieldElement(one.array(), "a", 1); }),
               "VELOX:embedded:indexOutside");
 }
 

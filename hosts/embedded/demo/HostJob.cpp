@@ -20,7 +20,7 @@ constexpr std::size_t numbersAtOnce = 50'000;
 std::vector<std::u16string> textsOf(const Value& cell) {
     std::vector<std::u16string> texts;
     for (std::size_t i = 0; i < cell.numel(); ++i) {
-        texts.push_back(cell.element(i).charData());
+        texts.emplace_back(cell.element(i).charData());
     }
     return texts;
 }
