@@ -10,7 +10,7 @@
 #include "binding/Conversions.hpp"
 #include "binding/Methods.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
 namespace {
 
@@ -33,9 +33,8 @@ HostPackage* found(HostPackage* package, const char* name) {
 HostPackage* filesetPackage() {
     HostInterface& from = host();
     HostPackage* package = found(from.hostGlobalPackage("velox"), "velox");
-    for (const char* const name : {"io", "datastore", "internal", "fileset"}) {
+    for (const char* const name : {"io", "datastore", "internal", "fileset"})
         package = found(from.hostSubPackage(package, name), name);
-    }
     return package;
 }
 
@@ -247,4 +246,4 @@ HostClass* registerHuffmanPaths() {
     });
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

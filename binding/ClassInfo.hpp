@@ -2,13 +2,13 @@
 
 #include "binding/HostInterface.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
 // HuffmanPathsCOSClassInfo describes the class HuffmanPaths to the host. The
 // native object of an instance is a HuffmanPathTree.
 //
 // Invariants: no data of its own.
-// Ownership: made by registerHuffmanPaths, the host's from there on.
+// Ownership: registerHuffmanPaths makes it and hands it to the host.
 // Threads: the host's calling thread.
 class HuffmanPathsCOSClassInfo final : public HostClassInfo {
 public:
@@ -33,7 +33,8 @@ public:
     void customLoad(HostArray* instance, const HostSavedValue* saved) override;
 };
 
-// Makes HuffmanPaths known to the host, if it is not yet, and answers it.
+// Registers HuffmanPaths with the host unless the host has it, and answers it.
+// Throws MissingPackageException, and whatever the host raises.
 HostClass* registerHuffmanPaths();
 
-}  // namespace tessel
+}  // namespace tessel::binding

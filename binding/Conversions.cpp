@@ -4,9 +4,7 @@
 #include <exception>
 #include <utility>
 
-#include "binding/Errors.hpp"
-
-namespace tessel {
+namespace tessel::binding {
 
 namespace {
 
@@ -18,16 +16,16 @@ public:
     }
 };
 
-std::vector<std::u16string> textList(const HostArray* outerCell, bool inFolders,
-                                     std::size_t outer) {
+std::vector<std::u16string> textList(const HostArray* outerCell,
+                                     Element element, std::size_t outer) {
     HostInterface& from = host();
     const HostArray* const cell = from.hostCellElement(outerCell, outer);
     const std::size_t count = from.hostNumel(cell);
-    checkElement(count, inFolders, outer + 1, 0);
+    checkNotEmpty(count, element, {outer + 1});
     std::vector<std::u16string> texts;
     for (std::size_t i = 0; i < count; ++i) {
         const HostArray* const text = from.hostCellElement(cell, i);
-        checkElement(from.hostNumel(text), inFolders, outer + 1, i + 1);
+        checkNotEmpty(from.hostNumel(text), element, {outer + 1, i + 1});
         texts.push_back(from.hostGetUString(text));
     }
     return texts;
@@ -51,13 +49,12 @@ HuffmanPathTree& coderOf(const HostArray* instance) {
     return *static_cast<HuffmanPathTree*>(native);
 }
 
-TextLists textLists(const HostArray* outerCell, bool inFolders) {
+TextLists textLists(const HostArray* outerCell, Element element) {
     const std::size_t count = host().hostNumel(outerCell);
     TextLists lists;
     lists.reserve(count);
-    for (std::size_t i = 0; i < count; ++i) {
-        lists.push_back(textList(outerCell, inFolders, i));
-    }
+    for (std::size_t i = 0; i < count; ++i)
+        lists.push_back(textList(outerCell, element, i));
     return lists;
 }
 
@@ -81,26 +78,8 @@ OwnedArray column(std::span<const std::uint8_t> values) {
     return columnOf(values, HostNumericClass::Uint8);
 }
 
-OwnedArray decodedColumn(const HuffmanPathTree& coder,
-                         const Components& components) {
-    OwnedArray cell = createCell(components.size(), 1);
-    for (std::size_t i = 0; i < components.size(); ++i) {
-        setCell(cell, i, createText(coder.generatePathFrom(components[i])));
-    }
-    return cell;
-}
-
-OwnedArray decodedColumns(const HuffmanPathTree& coder,
-                          const ComponentLists& lists) {
-    OwnedArray cell = createCell(lists.size(), 1);
-    for (std::size_t i = 0; i < lists.size(); ++i) {
-        setCell(cell, i, decodedColumn(coder, lists[i]));
-    }
-    return cell;
-}
-
 void setCell(const OwnedArray& cell, std::size_t index, OwnedArray element) {
     host().hostSetCell(cell.get(), index, element.release());
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

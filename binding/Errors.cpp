@@ -4,7 +4,7 @@
 
 #include "binding/HostAccess.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
 namespace {
 
@@ -12,8 +12,8 @@ namespace {
 // outlives whatever the raising frame held.
 class MessageIdException {
 public:
-    explicit MessageIdException(const MessageIdError& source)
-        : error_(source.clone()) {}
+    explicit MessageIdException(const MessageIdError& error)
+        : error_(error.clone()) {}
 
     void report() const {
         host().HostError(error_->identifier(), error_->argumentList());
@@ -26,12 +26,11 @@ private:
 
 }  // namespace
 
-MessageIdError::MessageIdError(
-    std::vector<HostMessageArgument> messageArguments,
-    std::string messageComponent, std::string messageKey)
-    : arguments_(std::move(messageArguments)),
-      component_(std::move(messageComponent)),
-      key_(std::move(messageKey)),
+MessageIdError::MessageIdError(std::vector<HostMessageArgument> arguments,
+                               std::string component, std::string key)
+    : arguments_(std::move(arguments)),
+      component_(std::move(component)),
+      key_(std::move(key)),
       fullIdentifier_(component_ + ":" + key_) {}
 
 void raiseHostError(const MessageIdError& error) {
@@ -41,14 +40,15 @@ void raiseHostError(const MessageIdError& error) {
     throw HostReturnedException();  // for the compiler: rethrow has thrown
 }
 
-void checkElement(std::size_t count, bool inFolders, std::size_t outer,
-                  std::size_t inner) {
+void checkNotEmpty(std::size_t count, Element element,
+                   ElementPosition position) {
     namespace errors = VELOX::datastoreio::huffmanpaths;
     if (count != 0) return;
-    std::string position = std::to_string(outer);
-    if (inner != 0) position += ", " + std::to_string(inner);
-    if (inFolders) raiseHostError(errors::folderElementEmpty(position));
-    raiseHostError(errors::fileElementEmpty(position));
+    std::string text = std::to_string(position.outer);
+    if (position.inner != 0) text += ", " + std::to_string(position.inner);
+    if (element == Element::Folder)
+        raiseHostError(errors::folderElementEmpty(text));
+    raiseHostError(errors::fileElementEmpty(text));
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

@@ -8,7 +8,7 @@
 
 #include "binding/HostInterface.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
 // MessageIdError is an error that the host knows by a message identifier: a
 // component, a colon and a key.
@@ -31,8 +31,8 @@ public:
     virtual void rethrow() const = 0;
 
 protected:
-    MessageIdError(std::vector<HostMessageArgument> messageArguments,
-                   std::string messageComponent, std::string messageKey);
+    MessageIdError(std::vector<HostMessageArgument> arguments,
+                   std::string component, std::string key);
 
 private:
     std::vector<HostMessageArgument> arguments_;
@@ -41,17 +41,26 @@ private:
     std::string fullIdentifier_;
 };
 
-// Raises an error of the host. If the host's entry returns, throws the error
-// as its own type instead.
+// Raises an error of the host. If the host's operation returns, throws the
+// error as its own type instead.
 [[noreturn]] void raiseHostError(const MessageIdError& error);
 
-// Does nothing if `count` is not 0. Otherwise raises folderElementEmpty
-// (`inFolders`) or fileElementEmpty at a 1-based position: of an outer entry,
-// or, with `inner` above 0, of a text inside it.
-void checkElement(std::size_t count, bool inFolders, std::size_t outer,
-                  std::size_t inner);
+// Which of the two lists of addPaths an element is in.
+enum class Element { Folder, File };
 
-}  // namespace tessel
+// The position of an element, counted from 1: an entry of the list, or, if
+// `inner` is not 0, a text in that entry.
+struct ElementPosition {
+    std::size_t outer;
+    std::size_t inner = 0;
+};
+
+// Does nothing if `count` is not 0. Otherwise raises folderElementEmpty or
+// fileElementEmpty at that position.
+void checkNotEmpty(std::size_t count, Element element,
+                   ElementPosition position);
+
+}  // namespace tessel::binding
 
 // The errors that the binding itself raises. A type and its namespace spell its
 // identifier, so they keep its letters.
@@ -60,19 +69,17 @@ namespace VELOX::datastoreio::huffmanpaths {
 
 // Gives an error type its copy and its rethrow.
 template <class Self>
-class ErrorOf : public tessel::MessageIdError {
+class ErrorOf : public tessel::binding::MessageIdError {
 public:
-    std::unique_ptr<tessel::MessageIdError> clone() const override {
+    std::unique_ptr<tessel::binding::MessageIdError> clone() const override {
         return std::make_unique<Self>(static_cast<const Self&>(*this));
     }
     void rethrow() const override { throw static_cast<const Self&>(*this); }
 
 protected:
-    ErrorOf(std::vector<tessel::HostMessageArgument> messageArguments,
-            std::string messageKey)
-        : MessageIdError(std::move(messageArguments),
-                         "VELOX:datastoreio:huffmanpaths",
-                         std::move(messageKey)) {}
+    ErrorOf(std::vector<tessel::HostMessageArgument> arguments, std::string key)
+        : MessageIdError(std::move(arguments), "VELOX:datastoreio:huffmanpaths",
+                         std::move(key)) {}
 };
 
 // Mode "files" was given a cell with an odd number of elements.

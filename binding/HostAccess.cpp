@@ -2,7 +2,7 @@
 
 #include <new>
 
-namespace tessel {
+namespace tessel::binding {
 
 namespace {
 
@@ -21,12 +21,10 @@ OwnedArray owned(HostArray* array) {
 
 HostInterface& host() {
     const HostGate* const gate = VXHostInterface(hostInterfaceVersion);
-    if (gate->version != hostInterfaceVersion) {
+    if (gate->version != hostInterfaceVersion)
         throw HostRefusedException(versionRefusal(gate->version));
-    }
-    if (gate->host == nullptr) {
+    if (gate->host == nullptr)
         throw HostRefusedException("This process runs no host at present.");
-    }
     return *gate->host;
 }
 
@@ -55,4 +53,4 @@ void raiseOutOfMemory() {
     throw std::bad_alloc();
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

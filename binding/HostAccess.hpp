@@ -8,21 +8,20 @@
 
 #include "binding/HostInterface.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
-// The host cannot be used: it speaks another version of the host interface, or
+// The host cannot be used: it offers another version of the host interface, or
 // the process runs none. what() says which.
 class HostRefusedException : public std::exception {
 public:
-    explicit HostRefusedException(std::string reason)
-        : text_(std::move(reason)) {}
+    explicit HostRefusedException(std::string text) : text_(std::move(text)) {}
     const char* what() const noexcept override { return text_.c_str(); }
 
 private:
     std::string text_;
 };
 
-// An error operation of the host came back although it must not.
+// An error operation of the host returned, which it must not.
 class HostReturnedException : public std::exception {
 public:
     const char* what() const noexcept override {
@@ -52,7 +51,7 @@ struct ArrayReleaser {
 using OwnedArray = std::unique_ptr<HostArray, ArrayReleaser>;
 
 // Each makes a new array. Throws HostAllocationFailure when the host has no
-// room for it and does not say so itself.
+// room for it and answers null.
 OwnedArray createText(std::u16string_view text);
 OwnedArray createCell(std::size_t rows, std::size_t columns);
 OwnedArray createNumeric(std::size_t rows, HostNumericClass numericClass);
@@ -72,4 +71,4 @@ auto reportingAllocationFailure(Action action) {
     raiseOutOfMemory();
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

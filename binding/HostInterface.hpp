@@ -245,7 +245,7 @@ public:
     HostInterface& operator=(const HostInterface&) = delete;
     virtual ~HostInterface() = default;
 
-    // --- Reading arrays -----------------------------------------------------
+    // ---- Reading arrays ----
 
     // The product of the dimensions; 1 for an array without dimensions.
     virtual std::size_t hostNumel(const HostArray* array) = 0;
@@ -290,7 +290,7 @@ public:
                                               const char* field,
                                               std::size_t index) = 0;
 
-    // --- Creating, filling and releasing arrays -----------------------------
+    // ---- Creating, filling and releasing arrays ----
 
     // A 1 x n char row.
     virtual HostArray* hostCreateCharArray(std::u16string_view text) = 0;
@@ -318,7 +318,7 @@ public:
     // it holds. Never raises.
     virtual void hostReleaseArray(HostArray* array) noexcept = 0;
 
-    // --- Instances ----------------------------------------------------------
+    // ---- Instances ----
 
     // The native object that the host keeps for element 1 of an instance array
     // of the named class (its full name); borrowed. The plug-in asks without
@@ -337,7 +337,7 @@ public:
     virtual HostArray* hostConvert(const HostSavedValue* saved,
                                    const char* typeName) = 0;
 
-    // --- Errors -------------------------------------------------------------
+    // ---- Errors ----
 
     // The host's standard errors. They do not return; should one return all
     // the same, the plug-in throws a native exception in its place.
@@ -353,7 +353,7 @@ public:
     virtual void HostError(std::string_view identifier,
                            std::span<const HostMessageArgument> arguments) = 0;
 
-    // --- Names, packages, classes -------------------------------------------
+    // ---- Names, packages, classes ----
 
     // The interned name of a text; the null name for an empty one.
     virtual HostName hostInternName(const char* text) = 0;
@@ -386,7 +386,7 @@ public:
     // they do it once as long as they are loaded.
     virtual bool hostAlternativeMode() = 0;
 
-    // --- Signatures ---------------------------------------------------------
+    // ---- Signatures ----
 
     // A new signature without inputs and outputs. It belongs to the plug-in,
     // whose method descriptor releases it when the host deletes it.

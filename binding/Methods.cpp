@@ -7,7 +7,7 @@
 #include "binding/Conversions.hpp"
 #include "binding/Errors.hpp"
 
-namespace tessel {
+namespace tessel::binding {
 
 namespace {
 
@@ -16,17 +16,15 @@ namespace errors = VELOX::datastoreio::huffmanpaths;
 using CharacterCounts = std::unordered_map<char16_t, double>;
 
 void countText(CharacterCounts& counts, const HostArray* text) {
-    for (const char16_t character : host().hostGetUString(text)) {
+    for (const char16_t character : host().hostGetUString(text))
         counts[character] += 1.0;
-    }
 }
 
 void countTexts(CharacterCounts& counts, const HostArray* cell) {
     HostInterface& from = host();
     const std::size_t count = from.hostNumel(cell);
-    for (std::size_t i = 0; i < count; ++i) {
+    for (std::size_t i = 0; i < count; ++i)
         countText(counts, from.hostCellElement(cell, i));
-    }
 }
 
 // Counts the characters of `total` / 2 folders, all of them texts or all of
@@ -74,18 +72,18 @@ void fillFromStoredForm(HuffmanPathTree& coder, const HostArray* treeString,
 }
 
 struct CountLimits {
-    std::int32_t fewestInputs;
-    std::int32_t mostInputs;
-    std::int32_t mostOutputs;
+    std::int32_t minInputs;
+    std::int32_t maxInputs;
+    std::int32_t maxOutputs;
 };
 
 void checkCounts(const HostFrame& frame, CountLimits limits) {
     HostInterface& to = host();
-    if (frame.outputCount > limits.mostOutputs) {
+    if (frame.outputCount > limits.maxOutputs) {
         to.hostErrorTooManyOutputs();
-    } else if (frame.inputCount > limits.mostInputs) {
+    } else if (frame.inputCount > limits.maxInputs) {
         to.hostErrorTooManyInputs();
-    } else if (frame.inputCount < limits.fewestInputs) {
+    } else if (frame.inputCount < limits.minInputs) {
         to.hostErrorTooFewInputs();
     } else {
         return;
@@ -93,38 +91,67 @@ void checkCounts(const HostFrame& frame, CountLimits limits) {
     throw HostReturnedException();
 }
 
-// The text in front of a folder's file names: the root, which carries its own
-// separator, then every other folder name with a separator behind it.
-std::u16string folderText(const HuffmanPathTree& coder,
-                          const Components& components,
-                          const std::u16string& separator) {
-    std::u16string text = coder.generatePathFrom(components.front());
-    for (std::size_t i = 1; i < components.size(); ++i) {
-        text += coder.generatePathFrom(components[i]);
-        text += separator;
-    }
-    return text;
-}
+// Writes decoded components into cells through one buffer, so that a name
+// takes no memory besides the host's array.
+class Decoder {
+public:
+    explicit Decoder(const HuffmanPathTree& coder) : coder_(coder) {}
 
-// A cell of `count` rows, filled from its start with the joined paths. A
-// folder without components is left out together with its files.
-OwnedArray joinedPaths(const HuffmanPathTree& coder,
-                       const ComponentLists& folders,
-                       const ComponentLists& files, std::size_t count,
-                       const std::u16string& separator) {
-    OwnedArray cell = createCell(count, 1);
-    std::size_t next = 0;
-    for (std::size_t i = 0; i < folders.size() && i < files.size(); ++i) {
-        if (folders[i].empty()) continue;
-        const std::u16string folder = folderText(coder, folders[i], separator);
-        for (const Component& file : files[i]) {
-            setCell(cell, next,
-                    createText(folder + coder.generatePathFrom(file)));
-            ++next;
+    // An n x 1 cell of the components, each as a char row.
+    OwnedArray column(const Components& components) {
+        OwnedArray cell = createCell(components.size(), 1);
+        for (std::size_t i = 0; i < components.size(); ++i) {
+            text_.clear();
+            coder_.appendPathFrom(components[i], text_);
+            setCell(cell, i, createText(text_));
+        }
+        return cell;
+    }
+
+    // An n x 1 cell with one such column per list.
+    OwnedArray columns(const std::vector<Components>& lists) {
+        OwnedArray cell = createCell(lists.size(), 1);
+        for (std::size_t i = 0; i < lists.size(); ++i)
+            setCell(cell, i, column(lists[i]));
+        return cell;
+    }
+
+    // A cell of `count` rows, filled from its start with the joined paths. A
+    // folder without components is left out together with its files.
+    OwnedArray joined(const std::vector<Components>& folders,
+                      const std::vector<Components>& files, std::size_t count,
+                      std::u16string_view separator) {
+        OwnedArray cell = createCell(count, 1);
+        std::size_t next = 0;
+        for (std::size_t i = 0; i < folders.size() && i < files.size(); ++i) {
+            if (folders[i].empty()) continue;
+            readFolder(folders[i], separator);
+            const std::size_t folderEnd = text_.size();
+            for (const Component& file : files[i]) {
+                text_.resize(folderEnd);
+                coder_.appendPathFrom(file, text_);
+                setCell(cell, next++, createText(text_));
+            }
+        }
+        return cell;
+    }
+
+private:
+    // The text before a folder's file names: the root, which carries its own
+    // separator, then each other folder name followed by a separator.
+    void readFolder(const Components& components,
+                    std::u16string_view separator) {
+        text_.clear();
+        coder_.appendPathFrom(components.front(), text_);
+        for (std::size_t i = 1; i < components.size(); ++i) {
+            coder_.appendPathFrom(components[i], text_);
+            text_ += separator;
         }
     }
-    return cell;
-}
+
+    const HuffmanPathTree& coder_;
+    std::u16string text_;
+};
 
 }  // namespace
 
@@ -132,11 +159,11 @@ void SignatureReleaser::operator()(HostSignature* signature) const noexcept {
     host().hostReleaseSignature(signature);
 }
 
-void HuffmanPathsMethod::execute(HostFrame& frame) {
-    reportingAllocationFailure([&] { run(frame); });
+void runReportingAllocationFailure(MethodBody body, HostFrame& frame) {
+    reportingAllocationFailure([&] { body(frame); });
 }
 
-void HuffmanPaths_Constructor::run(HostFrame& frame) const {
+void construct(HostFrame& frame) {
     checkCounts(frame, {0, 4, 1});
     HuffmanPathTree& coder = coderOf(frame.outputs[0]);
     const HostArray* const* const inputs = frame.inputs;
@@ -153,49 +180,48 @@ void HuffmanPaths_Constructor::run(HostFrame& frame) const {
     }
 }
 
-void HuffmanPaths_AddPaths::run(HostFrame& frame) const {
+void addPaths(HostFrame& frame) {
     checkCounts(frame, {3, 3, 0});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     const HostArray* const folderCell = frame.inputs[1];
     const HostArray* const fileCell = frame.inputs[2];
-    if (host().hostNumel(folderCell) != host().hostNumel(fileCell)) {
+    if (host().hostNumel(folderCell) != host().hostNumel(fileCell))
         raiseHostError(errors::unequalNumFolderFileList());
-    }
-    TextLists folders = textLists(folderCell, true);
-    TextLists files = textLists(fileCell, false);
+    TextLists folders = textLists(folderCell, Element::Folder);
+    TextLists files = textLists(fileCell, Element::File);
     coder.generateCodeAsyncAndAddPaths(folders, files);
 }
 
-void HuffmanPaths_GetPaths::run(HostFrame& frame) const {
+void getPaths(HostFrame& frame) {
     checkCounts(frame, {2, 3, 2});
     if (frame.outputCount == 0) return;
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     const std::vector<double> numbers = doubles(frame.inputs[1]);
-    ComponentLists folders;
-    ComponentLists files;
+    std::vector<Components> folders;
+    std::vector<Components> files;
     coder.getPath(folders, files, numbers);
+    Decoder decoder(coder);
     if (frame.inputCount == 3) {
         const std::u16string separator = host().hostGetUString(frame.inputs[2]);
         frame.outputs[0] =
-            joinedPaths(coder, folders, files, numbers.size(), separator)
-                .release();
+            decoder.joined(folders, files, numbers.size(), separator).release();
         return;
     }
-    OwnedArray folderCell = decodedColumns(coder, folders);
-    OwnedArray fileCell = decodedColumns(coder, files);
+    OwnedArray folderCell = decoder.columns(folders);
+    OwnedArray fileCell = decoder.columns(files);
     frame.outputs[0] = folderCell.release();
     frame.outputs[1] = fileCell.release();
 }
 
-void HuffmanPaths_GetNextPath::run(HostFrame& frame) const {
+void getNextPath(HostFrame& frame) {
     checkCounts(frame, {1, 1, 1});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     Components components;
     coder.getNextPathFromBTree(components);
-    frame.outputs[0] = decodedColumn(coder, components).release();
+    frame.outputs[0] = Decoder(coder).column(components).release();
 }
 
-void HuffmanPaths_HasNextPath::run(HostFrame& frame) const {
+void hasNextPath(HostFrame& frame) {
     checkCounts(frame, {1, 1, 1});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     OwnedArray answer = createLogical(coder.hasNextPathFromBTree());
@@ -203,12 +229,12 @@ void HuffmanPaths_HasNextPath::run(HostFrame& frame) const {
     frame.outputs[0] = answer.release();
 }
 
-void HuffmanPaths_ResetPathTree::run(HostFrame& frame) const {
+void reset(HostFrame& frame) {
     checkCounts(frame, {1, 1, 0});
     coderOf(frame.inputs[0]).resetPathsToBTree();
 }
 
-void HuffmanPaths_Serialize::run(HostFrame& frame) const {
+void serialize(HostFrame& frame) {
     checkCounts(frame, {1, 1, 2});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     OwnedArray treeString = createText(coder.getTreeString());
@@ -220,4 +246,4 @@ void HuffmanPaths_Serialize::run(HostFrame& frame) const {
     frame.outputs[0] = treeString.release();
 }
 
-}  // namespace tessel
+}  // namespace tessel::binding

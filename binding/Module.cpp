@@ -11,15 +11,15 @@
 // version, and whatever the host raises.
 extern "C" __attribute__((visibility("default"))) void
 VXInitialize_libqztessel() {
-    if (tessel::host().hostAlternativeMode()) {
-        tessel::registerHuffmanPaths();
+    if (tessel::binding::host().hostAlternativeMode()) {
+        tessel::binding::registerHuffmanPaths();
         return;
     }
     static const tessel::HostClass* const registered =
-        tessel::registerHuffmanPaths();
+        tessel::binding::registerHuffmanPaths();
     static_cast<void>(registered);
 }
 
-// Nothing to do: what was registered is the host's.
+// Does nothing: the host owns what was registered.
 extern "C" __attribute__((visibility("default"))) void
 VXTerminate_libqztessel() {}

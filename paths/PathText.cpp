@@ -52,27 +52,6 @@ std::size_t readMultibyte(std::string_view bytes, char32_t& value) noexcept {
     return value >= smallestOf(length) && isScalar(value) ? length : 0;
 }
 
-void appendUtf8(char32_t value, std::string& bytes) {
-    const auto tail = [&](unsigned shift) {
-        bytes.push_back(static_cast<char>(0x80U | ((value >> shift) & 0x3FU)));
-    };
-    if (value < 0x80) {
-        bytes.push_back(static_cast<char>(value));
-    } else if (value < 0x800) {
-        bytes.push_back(static_cast<char>(0xC0U | (value >> 6U)));
-        tail(0);
-    } else if (value < 0x10000) {
-        bytes.push_back(static_cast<char>(0xE0U | (value >> 12U)));
-        tail(6);
-        tail(0);
-    } else {
-        bytes.push_back(static_cast<char>(0xF0U | (value >> 18U)));
-        tail(12);
-        tail(6);
-        tail(0);
-    }
-}
-
 // Appends the bytes of the text without asking whether they have this text.
 // Returns false at a surrogate that stands for nothing; escaped tells whether
 // bytes' surrogates were met.
@@ -129,6 +108,27 @@ DecodedCharacter decodeCharacter(std::string_view bytes) noexcept {
         character.units[0] = static_cast<char16_t>(value);
     }
     return character;
+}
+
+void appendUtf8(char32_t value, std::string& bytes) {
+    const auto tail = [&](unsigned shift) {
+        bytes.push_back(static_cast<char>(0x80U | ((value >> shift) & 0x3FU)));
+    };
+    if (value < 0x80) {
+        bytes.push_back(static_cast<char>(value));
+    } else if (value < 0x800) {
+        bytes.push_back(static_cast<char>(0xC0U | (value >> 6U)));
+        tail(0);
+    } else if (value < 0x10000) {
+        bytes.push_back(static_cast<char>(0xE0U | (value >> 12U)));
+        tail(6);
+        tail(0);
+    } else {
+        bytes.push_back(static_cast<char>(0xF0U | (value >> 18U)));
+        tail(12);
+        tail(6);
+        tail(0);
+    }
 }
 
 void appendText(std::string_view bytes, std::u16string& text) {

@@ -46,6 +46,10 @@ void forEachUnit(std::string_view bytes, Visit visit) {
     }
 }
 
+// Appends the UTF-8 of a number up to U+10FFFF. A surrogate's number gives the
+// three bytes that any other number of its size takes: no strict UTF-8.
+void appendUtf8(char32_t value, std::string& bytes);
+
 // Appends the bytes' text.
 void appendText(std::string_view bytes, std::u16string& text);
 std::u16string toText(std::string_view bytes);

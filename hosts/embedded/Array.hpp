@@ -129,8 +129,7 @@ public:
     static InlineArray* make(ValueClass valueClass, Shape shape,
                              std::span<const Element> elements) {
         void* const block = allocate(elements.size());
-        return new (block)
-            InlineArray(valueClass, std::move(shape), elements);
+        return new (block) InlineArray(valueClass, std::move(shape), elements);
     }
     static InlineArray* make(ValueClass valueClass, Shape shape) {
         void* const block = allocate(shape.count());

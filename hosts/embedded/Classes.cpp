@@ -55,8 +55,7 @@ void ClassRecord::closeDefinition() {
 
 const MethodRecord* ClassRecord::findMethod(
     std::string_view method) const noexcept {
-    const auto found =
-        std::ranges::find(methods_, method, &MethodRecord::name);
+    const auto found = std::ranges::find(methods_, method, &MethodRecord::name);
     return found == methods_.end() ? nullptr : &*found;
 }
 

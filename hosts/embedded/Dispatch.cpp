@@ -95,9 +95,8 @@ void Dispatch::checkTypes(const Signature& signature,
     for (std::size_t i = 0; i < inputs.size(); ++i) {
         const DeclaredArgument& declared = signature.inputs[i];
         if (!accepts(declared.typeName, inputs[i]))
-            errors_.raiseOwn("wrongType",
-                             {declared.name, declared.typeName,
-                              std::string(typeNameOf(inputs[i]))});
+            errors_.raiseOwn("wrongType", {declared.name, declared.typeName,
+                                           std::string(typeNameOf(inputs[i]))});
     }
 }
 
@@ -166,9 +165,8 @@ void Dispatch::set(const Instance& instance, const PropertyRecord& property,
                    const Value& value, Caller caller) const {
     checkAccess(property, property.setAccess, caller);
     if (!accepts(property.typeName, value))
-        errors_.raiseOwn("wrongType",
-                         {property.name->str(), property.typeName,
-                          std::string(typeNameOf(value))});
+        errors_.raiseOwn("wrongType", {property.name->str(), property.typeName,
+                                       std::string(typeNameOf(value))});
     if (property.has(attributes::abortSetWhenUnchanged) &&
         get(instance, property, Caller::Host) == value)
         return;

@@ -40,7 +40,8 @@ public:
         } catch (const std::exception& exception) {
             raiseOwn("nativeError", {std::string(what), exception.what()});
         } catch (...) {
-            raiseOwn("nativeError", {std::string(what), "an unknown exception"});
+            raiseOwn("nativeError",
+                     {std::string(what), "an unknown exception"});
         }
     }
 

@@ -273,9 +273,9 @@ Value Host::save(const Value& instance) {
     const ClassRecord& record = *object.instanceClass();
     if (!record.info().savesInstances())
         state_->errors.raiseOwn("notSavable", {record.fullName()});
-    HostArray* const custom = state_->errors.guarded(
-        record.fullName(),
-        [&] { return record.info().customSave(instance.array()); });
+    HostArray* const custom = state_->errors.guarded(record.fullName(), [&] {
+        return record.info().customSave(instance.array());
+    });
     if (custom != nullptr) return Value::adopt(custom);
     Value saved = Value::structure();
     for (const PropertyRecord& property : record.properties) {

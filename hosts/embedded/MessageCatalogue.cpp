@@ -12,9 +12,8 @@ namespace {
 // The component that a file speaks for, from its path inside the catalogue.
 std::string componentOf(const std::filesystem::path& relative) {
     std::string component;
-    for (const std::filesystem::path& part : relative.parent_path()) {
+    for (const std::filesystem::path& part : relative.parent_path())
         component += part.string() + ":";
-    }
     return component + relative.stem().string();
 }
 
@@ -27,9 +26,8 @@ struct Placeholder {
 
 Placeholder placeholderAt(std::string_view text) {
     const std::size_t end = text.find('}');
-    if (text.empty() || text.front() != '{' || end == std::string_view::npos) {
+    if (text.empty() || text.front() != '{' || end == std::string_view::npos)
         return {};
-    }
     Placeholder found;
     const char* const last = text.data() + end;
     const auto [parsed, error] =
@@ -75,9 +73,8 @@ MessageCatalogue::MessageCatalogue(const std::filesystem::path& folder) {
                                  folder.string() + "'.");
     }
     for (const auto& entry : fs::recursive_directory_iterator(folder)) {
-        if (entry.path().extension() == ".messages") {
+        if (entry.path().extension() == ".messages")
             read(entry.path(), componentOf(fs::relative(entry.path(), folder)));
-        }
     }
 }
 
@@ -97,9 +94,8 @@ void MessageCatalogue::read(const std::filesystem::path& file,
         texts_[component + ":" + line.substr(0, colon)] =
             line.substr(colon + 2);
     }
-    if (!in.eof()) {
+    if (!in.eof())
         throw CatalogueException("'" + file.string() + "' cannot be read.");
-    }
 }
 
 std::string MessageCatalogue::format(

@@ -20,10 +20,8 @@ fs::path resolved(const fs::path& file) {
 }
 
 void terminate(const Module& module) noexcept {
-    if (const HostModuleEntry end =
-            module.find("VXTerminate_" + module.name())) {
+    if (const HostModuleEntry end = module.find("VXTerminate_" + module.name()))
         end();
-    }
 }
 
 }  // namespace
@@ -45,16 +43,15 @@ Modules::Loaded::iterator Modules::find(const fs::path& file) {
 }
 
 std::unique_ptr<Module> Modules::open(const fs::path& file) const {
-    if (!fs::is_regular_file(file)) {
+    if (!fs::is_regular_file(file))
         errors_.raiseOwn("moduleMissing", {file.string()});
-    }
     void* const handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (handle == nullptr) {
         const std::string reason = dlerror();
         const bool lacksSymbol =
             reason.find("undefined symbol") != std::string::npos;
         errors_.raiseOwn(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
-                    {file.string(), reason});
+                         {file.string(), reason});
     }
     return std::make_unique<Module>(file, handle);
 }
@@ -64,9 +61,8 @@ std::unique_ptr<Module> Modules::open(const fs::path& file) const {
 void Modules::enter(const Module& module) {
     const std::string name = "VXInitialize_" + module.name();
     const HostModuleEntry entry = module.find(name);
-    if (entry == nullptr) {
+    if (entry == nullptr)
         errors_.raiseOwn("entryMissing", {module.path().string(), name});
-    }
     std::optional<std::string> failure;
     const Module* const outer =
         std::exchange(registry_.enteringModule, &module);
@@ -78,9 +74,8 @@ void Modules::enter(const Module& module) {
         failure = "an unknown exception";
     }
     registry_.enteringModule = outer;
-    if (failure) {
+    if (failure)
         errors_.raiseOwn("entryFailed", {module.path().string(), *failure});
-    }
 }
 
 void Modules::load(const fs::path& file) {
@@ -103,13 +98,12 @@ void Modules::load(const fs::path& file) {
 
 Modules::Loaded::iterator Modules::withoutClasses(const fs::path& file) {
     const auto present = find(resolved(file));
-    if (present == modules_.end()) {
+    if (present == modules_.end())
         errors_.raiseOwn("moduleNotLoaded", {file.string()});
-    }
     const std::size_t instances = registry_.instanceCount(**present);
     if (instances != 0) {
         errors_.raiseOwn("moduleInUse",
-                    {file.string(), static_cast<std::int64_t>(instances)});
+                         {file.string(), static_cast<std::int64_t>(instances)});
     }
     registry_.removeClasses(**present);
     return present;

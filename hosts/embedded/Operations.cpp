@@ -216,7 +216,9 @@ HostArray* Operations::hostConvert(const HostSavedValue* saved,
 
 // ---- Errors ----
 
-void Operations::hostErrorTooManyOutputs() { errors_.raiseOwn("tooManyOutputs"); }
+void Operations::hostErrorTooManyOutputs() {
+    errors_.raiseOwn("tooManyOutputs");
+}
 void Operations::hostErrorTooManyInputs() { errors_.raiseOwn("tooManyInputs"); }
 void Operations::hostErrorTooFewInputs() { errors_.raiseOwn("tooFewInputs"); }
 void Operations::hostErrorOutOfMemory() { errors_.raiseOwn("outOfMemory"); }

@@ -6,16 +6,14 @@
 namespace tessel::embedded {
 
 ClassRecord* Registry::find(const Name* fullName) const {
-    for (const auto& record : classes_) {
+    for (const auto& record : classes_)
         if (record->name() == fullName) return record.get();
-    }
     return nullptr;
 }
 
 ClassRecord& Registry::get(std::string_view fullName) const {
-    for (const auto& record : classes_) {
+    for (const auto& record : classes_)
         if (record->fullName() == fullName) return *record;
-    }
     errors_.raiseOwn("classMissing", {std::string(fullName)});
 }
 
@@ -38,16 +36,14 @@ void Registry::define(Package& package, std::unique_ptr<HostClassInfo> info) {
 
 std::size_t Registry::instanceCount(const Module& module) const {
     std::size_t count = 0;
-    for (const auto& record : classes_) {
+    for (const auto& record : classes_)
         if (record->module() == &module) count += record->instances().size();
-    }
     return count;
 }
 
 void Registry::removeClasses(const Module& module) {
-    for (ClassRecord* const record : all()) {
+    for (ClassRecord* const record : all())
         if (record->module() == &module) remove(*record);
-    }
 }
 
 void Registry::removeAllClasses() {

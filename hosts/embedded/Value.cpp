@@ -76,8 +76,8 @@ Value Value::objects(const Dimensions& dimensions,
     requireCount(shape, instances.size());
     if (std::ranges::find(instances, nullptr) != instances.end())
         throw std::invalid_argument("An object needs its instance.");
-    return Value(
-        new Objects(ValueClass::Object, std::move(shape), std::move(instances)));
+    return Value(new Objects(ValueClass::Object, std::move(shape),
+                             std::move(instances)));
 }
 
 Value Value::cell(const Dimensions& dimensions) {
@@ -100,8 +100,7 @@ Value Value::scalar(double number) { return doubles({1, 1}, {number}); }
 
 Value Value::logical(bool truth) {
     const auto element = static_cast<std::uint8_t>(truth);
-    return Value(
-        Truths::make(ValueClass::Logical, Shape(1, 1), {&element, 1}));
+    return Value(Truths::make(ValueClass::Logical, Shape(1, 1), {&element, 1}));
 }
 
 Value Value::column(std::vector<double> values) {
@@ -225,8 +224,7 @@ bool operator==(const Value& a, const Value& b) {
 
 // An array that others refer to is left to them.
 Array& Value::changeable() {
-    if (array_ == nullptr || !array_->isUnique())
-        *this = clone();
+    if (array_ == nullptr || !array_->isUnique()) *this = clone();
     return *array_;
 }
 

@@ -20,9 +20,8 @@ std::u16string alphabetOf(const Listing& listing) {
     std::u16string alphabet;
     for (const Texts& path : pathsOf(listing)) {
         for (const std::u16string& text : path) {
-            for (const char16_t c : text) {
+            for (const char16_t c : text)
                 if (alphabet.find(c) == std::u16string::npos) alphabet += c;
-            }
         }
     }
     return alphabet;
@@ -30,9 +29,8 @@ std::u16string alphabetOf(const Listing& listing) {
 
 Value foldersAndFiles(const Listing& listing) {
     std::vector<Value> elements;
-    for (const Texts& folder : listing.folders) {
+    for (const Texts& folder : listing.folders)
         elements.push_back(Value::texts(folder));
-    }
     for (const Texts& files : listing.files)
         elements.push_back(Value::texts(files));
     return Value::cellColumn(std::move(elements));
@@ -58,9 +56,8 @@ Texts textsOf(const Value& cell) {
 std::vector<Texts> listsOf(const Value& cells) {
     EXPECT_EQ(cells.dimensions(), (Dimensions{cells.numel(), 1}));
     std::vector<Texts> lists;
-    for (std::size_t i = 0; i < cells.numel(); ++i) {
+    for (std::size_t i = 0; i < cells.numel(); ++i)
         lists.push_back(textsOf(cells.element(i)));
-    }
     return lists;
 }
 
@@ -84,18 +81,16 @@ HostException errorOf(const std::function<void()>& action) {
 
 std::vector<std::string> argumentsOf(const HostException& error) {
     std::vector<std::string> texts;
-    for (const HostMessageArgument& argument : error.arguments()) {
+    for (const HostMessageArgument& argument : error.arguments())
         texts.push_back(toText(argument));
-    }
     return texts;
 }
 
 std::vector<Texts> HostTest::iterated(const Value& instance) {
     host_.call(0, instance, "reset");
     std::vector<Texts> paths;
-    while (host_.call(1, instance, "hasNextPath")[0].truth(0)) {
+    while (host_.call(1, instance, "hasNextPath")[0].truth(0))
         paths.push_back(textsOf(host_.call(1, instance, "getNextPath")[0]));
-    }
     return paths;
 }
 

@@ -37,9 +37,8 @@ Host::~Host() {
 tessel::HostGate& Host::gate() { return processGate; }
 
 tessel::HostMethodInfo& Host::method(const std::string& name) {
-    for (const auto& method : registered->methods) {
+    for (const auto& method : registered->methods)
         if (method->name() == name) return *method;
-    }
     throw std::out_of_range(name);
 }
 
@@ -48,7 +47,7 @@ void Host::raise(const std::string& error, bool returns) {
     if (!returns) throw Raised(error);
 }
 
-// --- Making arrays -----------------------------------------------------------
+// ---- Making arrays ----
 
 Array Host::box(std::size_t rows, std::size_t columns) {
     auto made = std::make_unique<Box>(arrays);
@@ -154,9 +153,8 @@ HostArray* Host::hostCreateCell(std::size_t rows, std::size_t columns) {
     if (refuses()) return nullptr;
     Array made = box(rows, columns);
     made->isCell = true;
-    for (std::size_t i = 0; i < rows * columns; ++i) {
+    for (std::size_t i = 0; i < rows * columns; ++i)
         made->elements.push_back(box(0, 0));
-    }
     return made.release();
 }
 
@@ -170,11 +168,10 @@ HostArray* Host::hostCreateNumeric(std::size_t rows, std::size_t columns,
                                    HostNumericClass numericClass) {
     if (refuses()) return nullptr;
     Array made = box(rows, columns);
-    if (numericClass == HostNumericClass::Double) {
+    if (numericClass == HostNumericClass::Double)
         made->numbers.resize(rows * columns, -1);
-    } else {
+    else
         made->bytes.resize(rows * columns, 0xEE);
-    }
     return made.release();
 }
 
@@ -196,7 +193,7 @@ void Host::hostReleaseArray(HostArray* array) noexcept {
     delete static_cast<Box*>(array);
 }
 
-// --- Instances ---------------------------------------------------------------
+// ---- Instances ----
 
 void* Host::hostNativeObject(const HostArray* instance,
                              const char* /*className*/) {
@@ -217,7 +214,7 @@ HostArray* Host::hostConvert(const tessel::HostSavedValue* saved,
     return static_cast<const Saved*>(saved)->makes().release();
 }
 
-// --- Errors ------------------------------------------------------------------
+// ---- Errors ----
 
 void Host::hostErrorTooManyOutputs() {
     raise("tooManyOutputs", standardErrorsReturn);
@@ -235,13 +232,12 @@ void Host::hostErrorOutOfMemory() {
 void Host::HostError(std::string_view identifier,
                      std::span<const tessel::HostMessageArgument> arguments) {
     std::string error(identifier);
-    for (const auto& argument : arguments) {
+    for (const auto& argument : arguments)
         error += "(" + std::get<std::string>(argument) + ")";
-    }
     raise(error, errorEntryReturns);
 }
 
-// --- Names, packages, classes ------------------------------------------------
+// ---- Names, packages, classes ----
 
 tessel::HostName Host::hostInternName(const char* name) {
     Name& interned = names_[name];
@@ -296,7 +292,7 @@ void Host::hostAddProperty(tessel::HostClass* definedClass,
                                 property.description != nullptr, property});
 }
 
-// --- Signatures --------------------------------------------------------------
+// ---- Signatures ----
 
 tessel::HostSignature* Host::hostCreateSignature() {
     if (refuses()) return nullptr;

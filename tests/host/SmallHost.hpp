@@ -94,12 +94,12 @@ public:
     // What VXHostInterface answers; tests may lie.
     static tessel::HostGate& gate();
 
-    // --- Habits ---
+    // ---- Habits ----
     bool errorEntryReturns = false;     // HostError
     bool standardErrorsReturn = false;  // the other four
     long failingRequest = 0;            // the n-th request fails; 0: none
 
-    // --- Accounts ---
+    // ---- Accounts ----
     long requests = 0;     // for arrays, signatures and conversions
     long arrays = 0;       // alive
     long signatures = 0;   // alive
@@ -112,7 +112,7 @@ public:
     std::unique_ptr<Class> registered;
     tessel::HostMethodInfo& method(const std::string& name);
 
-    // --- Making arrays for tests ---
+    // ---- Making arrays for tests ----
     Array text(const std::u16string& characters);
     Array cell(std::vector<Array> elements);
     Array texts(const std::vector<std::u16string>& rows);
@@ -120,7 +120,7 @@ public:
     Array byteColumn(const std::vector<std::uint8_t>& values);
     Array structure();
 
-    // --- HostInterface ---
+    // ---- HostInterface ----
     std::size_t hostNumel(const tessel::HostArray* array) override;
     std::string hostGetString(const tessel::HostArray* array) override;
     std::u16string hostGetUString(const tessel::HostArray* array) override;

@@ -8,7 +8,8 @@ namespace {
 
 namespace errors = VELOX::datastoreio::huffmanpaths;
 using tessel::HostMessageArgument;
-using tessel::MessageIdError;
+using tessel::binding::Element;
+using tessel::binding::MessageIdError;
 
 using Arguments = std::vector<HostMessageArgument>;
 
@@ -58,8 +59,9 @@ TEST(BindingErrors, RethrowIsOfTheErrorsOwnType) {
 
 TEST(BindingErrors, RaisingHandsIdentifierAndArgumentsToTheHost) {
     small::Host host;
-    EXPECT_THROW(tessel::raiseHostError(errors::folderElementEmpty("3")),
-                 small::Raised);
+    EXPECT_THROW(
+        tessel::binding::raiseHostError(errors::folderElementEmpty("3")),
+        small::Raised);
     EXPECT_EQ(host.errors,
               (std::vector<std::string>{component + "folderElementEmpty(3)"}));
 }
@@ -67,26 +69,31 @@ TEST(BindingErrors, RaisingHandsIdentifierAndArgumentsToTheHost) {
 TEST(BindingErrors, RaisingThrowsTheErrorItselfIfTheHostReturns) {
     small::Host host;
     host.errorEntryReturns = true;
-    EXPECT_THROW(tessel::raiseHostError(errors::folderElementEmpty("3")),
-                 errors::folderElementEmpty);
-    EXPECT_THROW(tessel::raiseHostError(errors::fileListNotEven()),
+    EXPECT_THROW(
+        tessel::binding::raiseHostError(errors::folderElementEmpty("3")),
+        errors::folderElementEmpty);
+    EXPECT_THROW(tessel::binding::raiseHostError(errors::fileListNotEven()),
                  errors::fileListNotEven);
     EXPECT_EQ(host.errors.size(), 2U);
 }
 
 TEST(BindingErrors, ElementCheckPassesWhatHasElements) {
     const small::Host host;
-    tessel::checkElement(1, true, 1, 0);
-    tessel::checkElement(5, false, 9, 9);
+    tessel::binding::checkNotEmpty(1, Element::Folder, {1});
+    tessel::binding::checkNotEmpty(5, Element::File, {9, 9});
     EXPECT_TRUE(host.errors.empty());
 }
 
 TEST(BindingErrors, ElementCheckBuildsPositionAndChoosesError) {
     small::Host host;
-    EXPECT_THROW(tessel::checkElement(0, true, 1, 0), small::Raised);
-    EXPECT_THROW(tessel::checkElement(0, false, 12, 3), small::Raised);
-    EXPECT_THROW(tessel::checkElement(0, true, 2, 4), small::Raised);
-    EXPECT_THROW(tessel::checkElement(0, false, 1234567, 0), small::Raised);
+    EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::Folder, {1}),
+                 small::Raised);
+    EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::File, {12, 3}),
+                 small::Raised);
+    EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::Folder, {2, 4}),
+                 small::Raised);
+    EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::File, {1234567}),
+                 small::Raised);
     EXPECT_EQ(host.errors, (std::vector<std::string>{
                                component + "folderElementEmpty(1)",
                                component + "fileElementEmpty(12, 3)",

@@ -28,7 +28,7 @@ protected:
 
 }  // namespace
 
-// --- Registration ------------------------------------------------------------
+// ---- Registration ----
 
 TEST_F(ClassTest, EntryCalledTwiceRegistersTheClassOnce) {
     host_.loadModule(pluginFile());
@@ -51,7 +51,7 @@ TEST_F(ClassTest, OnceRegisteredClassIsNotRegisteredAgainByTheEntry) {
     EXPECT_FALSE(host_.hasClass(filesetClassName));
 }
 
-// --- Properties --------------------------------------------------------------
+// ---- Properties ----
 
 TEST_F(ClassTest, FrequenciesOfFreshInstanceAreZeroByOneDouble) {
     EXPECT_EQ(host_.get(make(), "Frequencies"), Value::doubles({0, 1}, {}));
@@ -93,7 +93,7 @@ TEST_F(ClassTest, PropertiesHaveNoListenersAndAreNotInspected) {
     EXPECT_TRUE(host_.inspect(instance).fieldNames().empty());
 }
 
-// --- Copying -----------------------------------------------------------------
+// ---- Copying ----
 
 TEST_F(ClassTest, CopyHasContentOfItsSource) {
     const Value source = filled(smallListing());
@@ -124,7 +124,7 @@ TEST_F(ClassTest, CopyOfFreshInstanceIsUsable) {
     EXPECT_TRUE(iterated(copy).empty());
 }
 
-// --- Saving and loading ------------------------------------------------------
+// ---- Saving and loading ----
 
 TEST_F(ClassTest, SavedFormHasPropertiesAndStoredForm) {
     const Value source = filled(smallListing());
@@ -148,9 +148,8 @@ TEST_F(ClassTest, LoadRestoresPathsCodeAndFrequencies) {
 TEST_F(ClassTest, CustomLoadRestoresNoFrequencies) {
     const Value saved = host_.save(filled(smallListing()));
     Value withoutFrequencies = Value::structure();
-    for (const char* const field : {"StringTree", "PathTree"}) {
+    for (const char* const field : {"StringTree", "PathTree"})
         withoutFrequencies.setField(field, saved.field(field));
-    }
     const Value loaded = host_.load(filesetClassName, withoutFrequencies);
     EXPECT_TRUE(frequencies(loaded).empty());
     EXPECT_EQ(iterated(loaded), pathsOf(smallListing()));
@@ -228,7 +227,7 @@ TEST_F(ClassTest, LoadWithUnfittingFrequenciesIsHostError) {
         "VELOX:embedded:wrongClass");
 }
 
-// --- Lifetime ----------------------------------------------------------------
+// ---- Lifetime ----
 
 TEST_F(ClassTest, DestroyedInstanceIsInvalidInEveryUse) {
     const Value instance = filled(smallListing());
@@ -244,9 +243,8 @@ TEST_F(ClassTest, DestroyedInstanceIsInvalidInEveryUse) {
         [&] { host_.destroy(other); },
         [&] { make(Value::text(u"copy"), other); },
         [&] { host_.listen(other, "StringTree", ListenerKind::Get, [] {}); }};
-    for (const auto& use : uses) {
+    for (const auto& use : uses)
         EXPECT_EQ(errorOf(use).identifier(), "VELOX:embedded:invalidInstance");
-    }
 }
 
 TEST_F(ClassTest, ValuesOfOneInstanceShareIt) {

@@ -40,16 +40,15 @@ protected:
 
 }  // namespace
 
-// --- Constructor -------------------------------------------------------------
+// ---- Constructor ----
 
 TEST_F(MethodsTest, ConstructorWithoutInputsYieldsUsableEmptyInstance) {
     expectUsableAndEmpty(make());
 }
 
 TEST_F(MethodsTest, ConstructorWithOneInputYieldsUsableEmptyInstance) {
-    for (const char16_t* mode : {u"copy", u"files", u"frequencies", u"tree"}) {
+    for (const char16_t* mode : {u"copy", u"files", u"frequencies", u"tree"})
         expectUsableAndEmpty(make(Value::text(mode)));
-    }
 }
 
 TEST_F(MethodsTest, ConstructorWithUnknownModeYieldsUsableEmptyInstance) {
@@ -244,7 +243,7 @@ TEST_F(MethodsTest, TreeModeReadsNothingOutsideArraysOfOtherClasses) {
     EXPECT_EQ(refusal(bytes, bytes), wrongClass);
 }
 
-// --- addPaths ----------------------------------------------------------------
+// ---- addPaths ----
 
 TEST_F(MethodsTest, AddPathsWithUnequalCountsRaisesAndInsertsNothing) {
     const Value instance = filled(smallListing());
@@ -386,7 +385,7 @@ TEST_F(MethodsTest, TextIsTakenInColumnMajorOrder) {
     EXPECT_EQ(joined(instance, {1}, u""), (Texts{u"adcba"}));
 }
 
-// --- getPaths ----------------------------------------------------------------
+// ---- getPaths ----
 
 TEST_F(MethodsTest, GetPathsWithoutSeparatorYieldsFoldersAndFiles) {
     const Value instance = filled(smallListing());
@@ -494,7 +493,7 @@ TEST_F(MethodsTest, GetPathsReadsRealPartsOfComplexNumbers) {
     EXPECT_EQ(textsOf(paths), (Texts{u"/usr/bin/ls", u"/usr/lib/gcc/cc1"}));
 }
 
-// --- Iteration ---------------------------------------------------------------
+// ---- Iteration ----
 
 TEST_F(MethodsTest, IterationYieldsComponentsAsColumnsOfRows) {
     EXPECT_EQ(iterated(filled(smallListing())), pathsOf(smallListing()));
@@ -539,7 +538,7 @@ TEST_F(MethodsTest, HasNextPathWithoutOutputRequestedStillReturnsItsValue) {
     EXPECT_EQ(host_.call(0, instance, "hasNextPath")[0], Value::logical(false));
 }
 
-// --- serialize ---------------------------------------------------------------
+// ---- serialize ----
 
 TEST_F(MethodsTest, SerializeYieldsTreeStringAndBytes) {
     const Value instance = filled(smallListing());
@@ -577,7 +576,7 @@ TEST_F(MethodsTest, SerializeWithOneOutputYieldsTreeStringAlone) {
     EXPECT_EQ(unasked[0], host_.get(instance, "StringTree"));
 }
 
-// --- Argument counts ---------------------------------------------------------
+// ---- Argument counts ----
 
 TEST_F(MethodsTest, DispatchChecksOutputsThenInputsThenTypes) {
     const Value instance = filled(smallListing());

@@ -130,12 +130,10 @@ public:
     TestMethod& addMethod(HostClass* definedClass, const char* name,
                           const Types& types, TestMethod::Body body) {
         HostSignature* const signature = host_.hostCreateSignature();
-        for (const char* type : types.inputs) {
+        for (const char* type : types.inputs)
             host_.hostSignatureAddInput(signature, type, "input");
-        }
-        for (const char* type : types.outputs) {
+        for (const char* type : types.outputs)
             host_.hostSignatureAddOutput(signature, type, "output");
-        }
         if (types.optionalTail) host_.hostSignatureMarkOptionalTail(signature);
         if (types.fewerOutputs) host_.hostSignatureMarkOutputs(signature);
         auto method = std::make_unique<TestMethod>(behaviour_, host_, name,
@@ -166,9 +164,8 @@ protected:
         define([&](TestClass& own, HostClass* definedClass) {
             own.addMethod(definedClass, "run", types, [&](HostFrame& frame) {
                 ++runs_;
-                for (std::int32_t i = 0; i < frame.outputCount; ++i) {
+                for (std::int32_t i = 0; i < frame.outputCount; ++i)
                     frame.outputs[i] = Value::scalar(i).release();
-                }
             });
         });
     }
@@ -200,7 +197,7 @@ protected:
 
 }  // namespace
 
-// --- Registration ------------------------------------------------------------
+// ---- Registration ----
 
 TEST_F(OwnClassTest, ClassIsRegisteredOnce) {
     define();
@@ -211,9 +208,8 @@ TEST_F(OwnClassTest, ClassIsRegisteredOnce) {
 TEST_F(OwnClassTest, ClassThatFailsToDefineIsForgottenAndReleased) {
     behaviour_.failsToDefine = true;
     const auto methods = [](TestClass& own, HostClass* definedClass) {
-        for (const char* name : {"first", "second", "third"}) {
+        for (const char* name : {"first", "second", "third"})
             own.addMethod(definedClass, name, {}, [](HostFrame&) {});
-        }
     };
     EXPECT_THROW(define(methods), std::runtime_error);
     EXPECT_FALSE(host_.hasClass(counterName));
@@ -256,7 +252,7 @@ TEST_F(OwnClassTest, UnknownNamesAreReported) {
               "notAnInstance");
 }
 
-// --- Dispatch ----------------------------------------------------------------
+// ---- Dispatch ----
 
 TEST_F(OwnClassTest, CountsMustBeTheDeclaredOnes) {
     defineWithMethod({{counterName, "any"}, {"any", "any"}});
@@ -376,12 +372,12 @@ TEST_F(OwnClassTest, ConstructorThatThrowsLeavesNoInstance) {
 
 TEST_F(OwnClassTest, ConstructorFindsItsInstanceInTheFirstOutput) {
     define([](TestClass& own, HostClass* definedClass) {
-        own.addMethod(
-            definedClass, "Counter", {{"double"}, {counterName}},
-            [](HostFrame& frame) {
-                const BorrowedValue made(frame.outputs[0]);
-                setNumber(made->instance(0)->native(), frame.inputs[0]);
-            });
+        own.addMethod(definedClass, "Counter", {{"double"}, {counterName}},
+                      [](HostFrame& frame) {
+                          const BorrowedValue made(frame.outputs[0]);
+                          setNumber(made->instance(0)->native(),
+                                    frame.inputs[0]);
+                      });
     });
     EXPECT_EQ(number(host_.get(host_.construct(counterName, Value::scalar(7)),
                                "Number")),
@@ -423,7 +419,7 @@ TEST_F(OwnClassTest, MethodAttributesAreHonoured) {
     EXPECT_EQ(runs_, 1);
 }
 
-// --- Instances ---------------------------------------------------------------
+// ---- Instances ----
 
 TEST_F(OwnClassTest, NativeObjectGoesWithTheLastValue) {
     define();
@@ -449,7 +445,7 @@ TEST_F(OwnClassTest, DestroyedInstanceIsDestroyedOnce) {
     EXPECT_EQ(behaviour_.destroyed, 1);
 }
 
-// --- Properties --------------------------------------------------------------
+// ---- Properties ----
 
 TEST_F(OwnClassTest, PublicPropertyIsReadAndWritten) {
     define();
@@ -575,7 +571,7 @@ TEST_F(OwnClassTest, CopyErrorIsRaisedOtherwiseAndLeavesNoInstance) {
     EXPECT_EQ(behaviour_.destroyed, 1);
 }
 
-// --- Class attributes --------------------------------------------------------
+// ---- Class attributes ----
 
 TEST_F(OwnClassTest, ClassThatDoesNotCopyOrSaveIsNotCopiedOrSaved) {
     behaviour_.copies = false;

@@ -26,9 +26,8 @@ rc::Gen<std::u16string> nameStartingWith(char16_t first) {
     return rc::gen::map(rc::gen::container<std::vector<std::uint16_t>>(unit),
                         [first](const std::vector<std::uint16_t>& units) {
                             std::u16string name(1, first);
-                            for (const std::uint16_t each : units) {
+                            for (const std::uint16_t each : units)
                                 name += static_cast<char16_t>(each);
-                            }
                             return name;
                         });
 }
@@ -95,9 +94,8 @@ protected:
             iterated(instance), fetched(instance, numbersTo(count)), {}};
         const std::u16string characters = treeString(instance);
         const std::vector<double> values = frequencies(instance);
-        for (std::size_t i = 0; i < characters.size(); ++i) {
+        for (std::size_t i = 0; i < characters.size(); ++i)
             content.frequencies[characters[i]] = values.at(i);
-        }
         return content;
     }
 
@@ -184,9 +182,8 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, EveryPairOfRoutesKeepsTheContent, ()) {
         RC_LOG(std::string(first.name) + ", then " + second.name + "\n");
         const Value target = second.go(first.go(source));
         RC_ASSERT(contentOf(target, count) == content);
-        if (first.isExact && second.isExact) {
+        if (first.isExact && second.isExact)
             RC_ASSERT(host_.save(target) == saved);
-        }
     }
 }
 
@@ -194,11 +191,10 @@ RC_GTEST_FIXTURE_PROP(RoundTrips, RestoredInstanceTakesFurtherPaths, ()) {
     const Listing listing = randomListing();
     const Value source = filled(listing);
     Value restored;
-    if (*rc::gen::arbitrary<bool>()) {
+    if (*rc::gen::arbitrary<bool>())
         restored = throughTree(source);
-    } else {
+    else
         restored = host_.load(filesetClassName, host_.save(source));
-    }
     add(restored, listing);
     const std::vector<Texts> paths = pathsOf(listing);
     std::vector<Texts> twice = paths;

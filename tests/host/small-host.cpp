@@ -71,9 +71,8 @@ Outcome run(tessel::HostMethodInfo& method, std::int32_t requested,
     try {
         intoPlugin([&] { method.execute(frame); });
     } catch (...) {
-        for (HostArray* const slot : slots) {
+        for (HostArray* const slot : slots)
             EXPECT_TRUE(slot == nullptr || slot == instance);
-        }
         throw;
     }
     Outcome outcome{frame.outputCount, {}};
@@ -205,7 +204,7 @@ protected:
 
 }  // namespace
 
-// --- Entry and registration --------------------------------------------------
+// ---- Entry and registration ----
 
 TEST(Version, PluginRefusesAHostOfAnotherVersionWithoutTouchingIt) {
     const Plugin plugin;
@@ -357,7 +356,7 @@ TEST_F(SmallHostTest, NoRoomForTheClassDescriptorIsTheHostsError) {
     EXPECT_TRUE(seen);
 }
 
-// --- Argument counts ---------------------------------------------------------
+// ---- Argument counts ----
 
 TEST_F(InstanceTest, CountsAreCheckedOutputsFirstAndBeforeAnythingElse) {
     struct Limits {
@@ -405,7 +404,7 @@ TEST_F(InstanceTest, CountErrorsThatReturnStillEndTheMethod) {
     EXPECT_EQ(host_.nativeAsked, 0);
 }
 
-// --- Errors of the binding ---------------------------------------------------
+// ---- Errors of the binding ----
 
 TEST_F(InstanceTest, RaisedErrorsCarryIdentifierAndPosition) {
     fill();
@@ -479,7 +478,7 @@ TEST_F(InstanceTest, NativeExceptionsLeaveTheMethodUnchanged) {
     EXPECT_TRUE(host_.errors.empty());
 }
 
-// --- Outputs -----------------------------------------------------------------
+// ---- Outputs ----
 
 TEST_F(InstanceTest, HasNextPathRaisesTheOutputCountFromZero) {
     fill();
@@ -548,7 +547,7 @@ TEST_F(InstanceTest, SerializedBytesAreFreshColumn) {
     EXPECT_EQ(outcome.outputs[0]->text.size(), 8U);
 }
 
-// --- Without memory ----------------------------------------------------------
+// ---- Without memory ----
 
 TEST_F(InstanceTest, GetPathsWithoutMemory) {
     fill();
@@ -637,7 +636,7 @@ TEST_F(InstanceTest, AddPathsWithoutNativeMemoryLeavesAUsableInstance) {
     storedForm();
 }
 
-// --- Properties --------------------------------------------------------------
+// ---- Properties ----
 
 TEST_F(InstanceTest, SettersAndGettersWorkOnTheNativeObject) {
     const auto& properties = host_.registered->properties;
@@ -657,7 +656,7 @@ TEST_F(InstanceTest, SettersAndGettersWorkOnTheNativeObject) {
     EXPECT_TRUE(host_.errors.empty());
 }
 
-// --- Custom load -------------------------------------------------------------
+// ---- Custom load ----
 
 namespace {
 

@@ -134,13 +134,17 @@ TEST_F(OperationsTest, ElementsAreReadAsTheirOwnClassOnly) {
     const Value truths = Value::logicals({2, 1}, {1, 0});
     std::vector<double> asDoubles;
     std::vector<std::uint8_t> asBytes;
-    EXPECT_EQ(
-        errorKey([&] { operations_.hostRealElements(bytes.array(), asDoubles); }),
-        "VELOX:embedded:wrongClass");
-    EXPECT_EQ(
-        errorKey([&] { operations_.hostRealElements(doubles.array(), asBytes); }),
-        "VELOX:embedded:wrongClass");
-    EXPECT_EQ(errorKey([&] { operations_.hostRealElements(truths.array(), asBytes); }),
+    EXPECT_EQ(errorKey([&] {
+                  operations_.hostRealElements(bytes.array(), asDoubles);
+              }),
+              "VELOX:embedded:wrongClass");
+    EXPECT_EQ(errorKey([&] {
+                  operations_.hostRealElements(doubles.array(), asBytes);
+              }),
+              "VELOX:embedded:wrongClass");
+    EXPECT_EQ(errorKey([&] {
+                  operations_.hostRealElements(truths.array(), asBytes);
+              }),
               "VELOX:embedded:wrongClass");
 }
 
@@ -153,13 +157,16 @@ TEST_F(OperationsTest, DoubleDataIsRefusedWhereItWouldBeReadOutside) {
 
 TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
     const Value cell = Value::cell({2, 1});
-    EXPECT_EQ(operations_.hostNumel(operations_.hostCellElement(cell.array(), 1)), 0U);
+    EXPECT_EQ(
+        operations_.hostNumel(operations_.hostCellElement(cell.array(), 1)),
+        0U);
     EXPECT_EQ(errorKey([&] { operations_.hostCellElement(cell.array(), 2); }),
               "VELOX:embedded:indexOutside");
     Value structure = Value::structure({0, 1});
-    EXPECT_EQ(
-        errorKey([&] { operations_.hostFieldElement(structure.array(), "a", 0); }),
-        "VELOX:embedded:fieldMissing");
+    EXPECT_EQ(errorKey([&] {
+                  operations_.hostFieldElement(structure.array(), "a", 0);
+              }),
+              "VELOX:embedded:fieldMissing");
     HostArray* const made = operations_.hostCreateCell(1, 1);
     EXPECT_EQ(errorKey([&] {
                   operations_.hostSetCell(
@@ -172,8 +179,9 @@ TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
 TEST_F(OperationsTest, FieldOfStructWithoutElementsIsHostError) {
     Value one = Value::structure();
     one.setField("a", Value::scalar(1));
-    EXPECT_EQ(errorKey([&] { operations_.hostFieldElement(one.array(), "a", 1); }),
-              "VELOX:embedded:indexOutside");
+    EXPECT_EQ(
+        errorKey([&] { operations_.hostFieldElement(one.array(), "a", 1); }),
+        "VELOX:embedded:indexOutside");
 }
 
 TEST_F(OperationsTest, ArraysThatNoMemoryCouldHoldAreOutOfMemory) {

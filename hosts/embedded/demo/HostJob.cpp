@@ -19,9 +19,8 @@ constexpr std::size_t numbersAtOnce = 50'000;
 
 std::vector<std::u16string> textsOf(const Value& cell) {
     std::vector<std::u16string> texts;
-    for (std::size_t i = 0; i < cell.numel(); ++i) {
+    for (std::size_t i = 0; i < cell.numel(); ++i)
         texts.emplace_back(cell.element(i).charData());
-    }
     return texts;
 }
 
@@ -99,9 +98,8 @@ Value HostJob::makeInstance() {
                               std::numeric_limits<std::size_t>::max());
     paths::Batch all;
     reader.next(all);
-    if (paths::countCharacters(all.folders, all.files).characters.size() == 1) {
+    if (paths::countCharacters(all.folders, all.files).characters.size() == 1)
         all.files.back().push_back({paths::noRoot});
-    }
     std::vector<Value> elements;
     elements.reserve(2 * all.folders.size());
     for (const auto& folder : all.folders)
@@ -182,9 +180,8 @@ void HostJob::fetchJoined(const Value& instance, const std::string& name) {
         forNumbers(name, [&](const Value& numbers, std::size_t first) {
             const Value fetched =
                 host_.call(1, instance, "getPaths", numbers, separator)[0];
-            for (std::size_t i = 0; i < fetched.numel(); ++i) {
+            for (std::size_t i = 0; i < fetched.numel(); ++i)
                 compareInOrder(first + i, fetched.element(i).charData(), name);
-            }
             return fetched.numel();
         });
     });
@@ -199,9 +196,8 @@ void HostJob::fetchParts(const Value& instance, const std::string& name) {
             for (std::size_t i = 0; i < parts[0].numel(); ++i) {
                 std::u16string folder;
                 paths::appendFolder(textsOf(parts[0].element(i)), folder);
-                for (const auto& file : textsOf(parts[1].element(i))) {
+                for (const auto& file : textsOf(parts[1].element(i)))
                     compareInOrder(first + count++, folder + file, name);
-                }
             }
             return count;
         });
