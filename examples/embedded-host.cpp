@@ -11,6 +11,7 @@
 #include <exception>
 #include <iostream>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -40,7 +41,7 @@ void printPaths(Host& host, const Value& instance,
         host.call(1, instance, "getPaths", Value::column(std::move(numbers)),
                   Value::text(u"/"))[0];
     for (std::size_t i = 0; i < paths.numel(); ++i) {
-        const std::u16string& text = paths.element(i).charData();
+        const std::u16string_view text = paths.element(i).charData();
         std::cout << std::string(text.begin(), text.end()) << '\n';
     }
 }
