@@ -85,7 +85,7 @@ qztesselAddPkgConfig(qztessel "The coder" zlib "-lqztessel_core -pthread")
 qztesselAddPkgConfig(qztessel-paths "Lists that grow, in memory" qztessel
                      -lqztessel_paths)
 qztesselAddPkgConfig(
-  qztessel-embedded "A host for the plug-in" qztessel
+  qztessel-embedded "A host for the plug-in" qztessel-paths
   "-lqztessel_embedded -ldl -Wl,--undefined=VXHostInterface\
  -Wl,--export-dynamic-symbol=VXHostInterface")
 qztesselAddPkgConfig(qztessel-archive "Finished lists, in files" qztessel
