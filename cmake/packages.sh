@@ -1,7 +1,7 @@
 # Sourced by ./demo and ./check, not run.
 
 # What it takes to build and run; what the checks take beyond that.
-buildPackages=(cmake g++ ninja-build zlib1g-dev)
+buildPackages=(cmake g++ libxxhash-dev ninja-build zlib1g-dev)
 checkPackages=(
     clang clang-format clang-tidy dpkg-dev file libclang-rt-dev libgtest-dev
     liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev lintian llvm

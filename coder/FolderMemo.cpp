@@ -14,11 +14,19 @@ const FolderMemo::Folder* FolderMemo::find(const PackedComponents& components,
     return position == HashIndex::notFound ? nullptr : &folders_[position];
 }
 
+void FolderMemo::reserveFor(std::size_t depth) {
+    const std::size_t positions = positions_.size() + depth;
+    if (positions > positions_.capacity()) positions_.reserve(2 * positions);
+    if (folders_.size() == folders_.capacity())
+        folders_.reserve(2 * folders_.size() + 1);
+    index_.reserveOne();
+}
+
 // What a failed step leaves behind is not reached from the index.
 void FolderMemo::add(const PackedComponents& components, std::uint32_t hash,
                      BNode& node, const PathTrack& track) {
     // More folders than the index can tell apart are just not remembered.
-    if (folders_.size() > HashIndex::largestPosition) return;
+    if (folders_.size() > HashIndex::maxPosition) return;
     const std::size_t start = positions_.size();
     positions_.insert(positions_.end(), track.begin(), track.end());
     folders_.push_back({components.bytes(), &node, start, track.size()});
@@ -27,12 +35,12 @@ void FolderMemo::add(const PackedComponents& components, std::uint32_t hash,
 
 const FolderMemo::Folder* FolderMemo::likely(
     std::uint32_t hash) const noexcept {
-    const std::size_t position = index_.likely(hash);
+    const std::size_t position = index_.homeSlot(hash);
     return position == HashIndex::notFound ? nullptr : &folders_[position];
 }
 
 void FolderMemo::fetchEntry(std::uint32_t hash) const noexcept {
-    index_.fetch(hash);
+    index_.prefetch(hash);
 }
 
 void FolderMemo::fetchFolder(std::uint32_t hash) const noexcept {

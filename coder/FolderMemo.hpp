@@ -34,6 +34,9 @@ public:
     const Folder* find(const PackedComponents& components,
                        std::uint32_t hash) const noexcept;
 
+    // Makes sure that adding a folder of so many components does not throw.
+    void reserveFor(std::size_t depth);
+
     // Adds a folder that find did not find. If it throws, nothing changes.
     void add(const PackedComponents& components, std::uint32_t hash,
              BNode& node, const PathTrack& track);

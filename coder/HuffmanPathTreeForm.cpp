@@ -38,17 +38,12 @@ namespace {
 
 using sixpacks::ByteCursor;
 using sixpacks::PackedSizeT;
+using sixpacks::packUint;
 using Bytes = std::vector<std::uint8_t>;
 
 // Stored as bytes; never change them.
 constexpr std::uint8_t partitionMarker = 0x01;
 constexpr std::uint8_t duplicatesMarker = 0x00;
-
-void packUint(std::uint64_t value, PackedSizeT width, Bytes& out) {
-    const std::size_t bytes = sixpacks::widthBytes(width);
-    for (std::size_t j = 0; j < bytes; ++j)
-        out.push_back(static_cast<std::uint8_t>(value >> (8 * j)));
-}
 
 PackedSizeT takeWidth(ByteCursor& cursor) {
     return static_cast<PackedSizeT>(cursor.takeByte());

@@ -422,21 +422,22 @@ void HuffmanPathTree::insertEncoded(std::size_t i, std::uint32_t hash,
     track.clear();
     track.reserve(folderComponents.size() + 1);
     const FolderMemo::Folder* known = memo.find(folderComponents, hash);
-    BNode* folder = nullptr;
-    bool existed = known != nullptr;
-    if (existed) {
-        folder = known->node;
+    if (known != nullptr) {
         const auto positions = memo.trackOf(*known);
         track.assign(positions.begin(), positions.end());
-    } else {
-        folder = &pathTree->addFolder(folderComponents, track, existed);
-        // Without components the root takes the files and never counts as
-        // found.
-        if (!folderComponents.empty())
-            memo.add(folderComponents, hash, *folder, track);
+        const std::uint64_t first = pathTree->addFiles(*known->node, fileNames);
+        notePartition(track, true, first, fileNames.size());
+        return;
     }
-    const std::uint64_t first = pathTree->addFiles(*folder, fileNames);
-    notePartition(track, existed, first, fileNames.size());
+    const std::size_t depth = folderComponents.size();
+    memo.reserveFor(depth);
+    const BPathTree::AddedBatch added =
+        pathTree->addBatch(folderComponents, fileNames, track);
+    notePartition(track, added.existed, added.firstFile, fileNames.size());
+    // Without components the root takes the files and never counts as found.
+    if (depth == 0) return;
+    track.resize(depth);
+    memo.add(folderComponents, hash, added.folder, track);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,

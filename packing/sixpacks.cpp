@@ -16,7 +16,27 @@ constexpr std::uint64_t maxInflationFactor = 1032;
 
 constexpr int compressionLevel = 9;
 
+// The next n bytes, which the caller vouches for; advances `it` past them.
+ByteCursor takeTrusted(ByteIterator& it, std::uint64_t n) {
+    if (n == 0) return ByteCursor({});
+    const std::span<const std::uint8_t> bytes(&*it,
+                                              static_cast<std::size_t>(n));
+    it += static_cast<std::ptrdiff_t>(n);
+    return ByteCursor(bytes);
+}
+
 }  // namespace
+
+void appendLittleEndian(std::uint64_t value, std::size_t byteCount,
+                        std::vector<std::uint8_t>& out) {
+    for (std::size_t j = 0; j < byteCount; ++j)
+        out.push_back(static_cast<std::uint8_t>(value >> (8 * j)));
+}
+
+void packUint(std::uint64_t value, PackedSizeT width,
+              std::vector<std::uint8_t>& out) {
+    appendLittleEndian(value, widthBytes(width), out);
+}
 
 template <class UintT, class ValueT>
 void PackerUnpackerUint<UintT, ValueT>::packValues(
@@ -27,8 +47,7 @@ void PackerUnpackerUint<UintT, ValueT>::packValues(
 template <class UintT, class ValueT>
 void PackerUnpackerUint<UintT, ValueT>::packValue(
     ValueT value, std::vector<std::uint8_t>& out) {
-    for (std::size_t j = 0; j < sizeof(UintT); ++j)
-        out.push_back(static_cast<std::uint8_t>(value >> (8 * j)));
+    appendLittleEndian(value, sizeof(UintT), out);
 }
 
 template <class UintT, class ValueT>
@@ -45,8 +64,8 @@ void PackerUnpackerUint<UintT, ValueT>::unpackValues(std::vector<ValueT>& out,
 template <class UintT, class ValueT>
 void PackerUnpackerUint<UintT, ValueT>::unpackValue(ValueT& value,
                                                     ByteIterator& it) {
-    value = fromLittleEndian({&*it, sizeof(UintT)});
-    it += sizeof(UintT);
+    value =
+        fromLittleEndian(takeTrusted(it, sizeof(UintT)).take(sizeof(UintT)));
 }
 
 template class PackerUnpackerUint<std::uint8_t>;
@@ -85,24 +104,30 @@ PackedSizeT packPackedSizeT(std::size_t n, std::vector<std::uint8_t>& out) {
 void packSizeTVector(const std::vector<std::size_t>& values,
                      std::vector<std::uint8_t>& out, PackedSizeT valueSize,
                      PackedSizeT countSize) {
-    makePackerUnpacker(countSize)->packValue(values.size(), out);
-    makePackerUnpacker(valueSize)->packValues(values, out);
+    packUint(values.size(), countSize, out);
+    const std::size_t bytesEach = widthBytes(valueSize);
+    for (const std::size_t value : values)
+        appendLittleEndian(value, bytesEach, out);
 }
 
 void unpackSizeTVector(std::vector<std::size_t>& out, ByteIterator& it,
                        PackedSizeT valueSize, PackedSizeT countSize) {
-    std::size_t count = 0;
-    makePackerUnpacker(countSize)->unpackValue(count, it);
-    makePackerUnpacker(valueSize)->unpackValues(out, it, count);
+    ByteCursor cursor = takeTrusted(it, widthBytes(countSize));
+    const std::uint64_t count = cursor.takeUint(countSize);
+    const std::size_t bytesEach = widthBytes(valueSize);
+    cursor = takeTrusted(it, count * bytesEach);
+    for (std::uint64_t i = 0; i < count; ++i)
+        out.push_back(fromLittleEndian(cursor.take(bytesEach)));
 }
 
 void unpackSizeTVector(std::vector<std::size_t>& out, ByteCursor& cursor,
                        PackedSizeT valueSize, PackedSizeT countSize) {
     const std::uint64_t count = cursor.takeUint(countSize);
-    cursor.requireItems(count, widthBytes(valueSize));
+    const std::size_t bytesEach = widthBytes(valueSize);
+    cursor.requireItems(count, bytesEach);
     out.reserve(out.size() + static_cast<std::size_t>(count));
     for (std::uint64_t i = 0; i < count; ++i)
-        out.push_back(cursor.takeUint(valueSize));
+        out.push_back(fromLittleEndian(cursor.take(bytesEach)));
 }
 
 void boolVecToBytes(std::vector<std::uint8_t>& out,
@@ -124,8 +149,8 @@ void boolVecToBytes(std::vector<std::uint8_t>& out,
 
 void bytesToBoolVec(const std::vector<std::uint8_t>& bytes,
                     std::vector<bool>& out) {
-    if (bytes.empty() || bytes.back() > 8) throw DamagedFormException();
     if (bytes.size() == 1) return;
+    if (bytes.empty() || bytes.back() > 8) throw DamagedFormException();
     const std::size_t last = bytes.size() - 2;
     for (std::size_t i = 0; i <= last; ++i) {
         const unsigned count = i == last ? bytes.back() : 8;
@@ -136,14 +161,14 @@ void bytesToBoolVec(const std::vector<std::uint8_t>& bytes,
 
 void packVector(std::vector<std::uint8_t>& data, std::vector<std::uint8_t>& out,
                 PackedSizeT lengthSize) {
-    makePackerUnpacker(lengthSize)->packValue(data.size(), out);
+    packUint(data.size(), lengthSize, out);
     out.insert(out.end(), data.begin(), data.end());
 }
 
 void unpackVector(std::vector<std::uint8_t>& out, ByteIterator& it,
                   PackedSizeT lengthSize) {
-    std::size_t length = 0;
-    makePackerUnpacker(lengthSize)->unpackValue(length, it);
+    ByteCursor cursor = takeTrusted(it, widthBytes(lengthSize));
+    const std::uint64_t length = cursor.takeUint(lengthSize);
     const auto end = it + static_cast<std::ptrdiff_t>(length);
     out.insert(out.end(), it, end);
     it = end;

@@ -17,14 +17,32 @@ namespace tessel {
 // function appends to a vector that it never clears; the matching `unpack`
 // function appends what it reads and advances a read position.
 //
-// Each reader exists twice. The one that takes a vector's iterator cannot
-// know where the data ends and is for bytes that this process wrote itself.
-// The one that takes a ByteCursor checks every length against what is left
-// and is the only one for bytes from outside.
+// Each reader exists twice:
+//
+//   reads from          | checks                  | for
+//   --------------------+-------------------------+-------------------------
+//   ByteCursor          | each length against     | bytes from outside
+//                       | what is left            |
+//   a vector's iterator | nothing: it cannot know | bytes that this process
+//                       | where the data ends     | wrote; inspection only
 namespace sixpacks {
 
 using ByteIterator = std::vector<std::uint8_t>::const_iterator;
 
+// ---- Integers ----
+
+// Appends the low `byteCount` bytes of the value, at most 8, least
+// significant first: the counterpart of fromLittleEndian.
+void appendLittleEndian(std::uint64_t value, std::size_t byteCount,
+                        std::vector<std::uint8_t>& out);
+
+// Appends the value at the given width; high bytes that do not fit are lost
+// silently. Throws InvalidUintConversionException on an unknown width, with
+// nothing appended.
+void packUint(std::uint64_t value, PackedSizeT width,
+              std::vector<std::uint8_t>& out);
+
+// Inspection: the stored forms use packUint and ByteCursor.
 // Packs and unpacks integers of one width. ValueT is std::size_t.
 template <class ValueT>
 class PackerUnpackerBase {
@@ -98,19 +116,26 @@ void unpackSizeTVector(std::vector<std::size_t>& out, ByteIterator& it,
 void unpackSizeTVector(std::vector<std::size_t>& out, ByteCursor& cursor,
                        PackedSizeT valueSize, PackedSizeT countSize);
 
+// ---- Bit and byte blocks ----
+
 // Appends a bit block: nothing for no bits; otherwise
 //
 //   | floor(n / 8) bytes | 1 byte            | 1 byte    |
 //   | full bytes         | last n mod 8 bits | n mod 8   |
 //
-// Bit i stands in byte i / 8 at position i mod 8, least significant first.
+// Bit i is in byte i / 8 at position i mod 8, least significant first.
 // Unused bits are 0. The middle byte is there (as 0) when n mod 8 is 0.
 void boolVecToBytes(std::vector<std::uint8_t>& out,
                     const std::vector<bool>& bits);
 
-// Appends the bits of one bit block, which must be the whole of `bytes`. A
-// block of one byte holds no bits. Throws DamagedFormException, with nothing
-// appended, when `bytes` is empty or its last byte is above 8.
+// Appends the bits of one bit block, which must be the whole of `bytes`.
+//
+//   bytes        | appended
+//   -------------+--------------------------------------------------
+//   none         | throws DamagedFormException
+//   one          | nothing, whatever the byte is
+//   two or more  | the bits; throws DamagedFormException, with nothing
+//                | appended, when the last byte is above 8
 void bytesToBoolVec(const std::vector<std::uint8_t>& bytes,
                     std::vector<bool>& out);
 
@@ -133,6 +158,8 @@ void unpackVector(std::vector<std::uint8_t>& out, ByteIterator& it,
 std::span<const std::uint8_t> unpackVector(ByteCursor& cursor,
                                            PackedSizeT lengthSize);
 
+// ---- Compression ----
+
 // A zlib stream (RFC 1950) of data at level 9. `data` is not changed. Neither
 // length is stored. Cost: slow on purpose; the worst case needs as much
 // memory again as the data. Throws std::bad_alloc.
@@ -149,7 +176,8 @@ std::vector<std::uint8_t> decompressUint8(ByteIterator begin,
 // The bytes of a zlib stream from outside, which must be whole, undamaged
 // and of exactly uncompressedSize bytes: DamagedFormException otherwise. A
 // size that no zlib stream of this length can reach is refused before memory
-// is taken for it.
+// is taken for it: a stream of n bytes can demand 1,032 n bytes, no more.
+// Throws std::bad_alloc when memory runs out, zlib's own included.
 std::vector<std::uint8_t> decompressChecked(
     std::span<const std::uint8_t> stream, std::uint64_t uncompressedSize);
 

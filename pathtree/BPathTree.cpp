@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <iterator>
 #include <stdexcept>
+#include <type_traits>
 #include <unordered_set>
 #include <utility>
 
@@ -16,11 +17,6 @@ namespace {
 void appendCopy(ComponentView value, Components& out) {
     out.emplace_back(value.begin(), value.end());
 }
-
-// A component that became a node has been moved from: it is left empty. One
-// in a packed list is only read.
-void takeOver(Component& component) { releaseContents(component); }
-void takeOver(const ComponentView&) {}
 
 void assignCopy(ComponentView value, Component& out) {
     out.assign(value.begin(), value.end());
@@ -95,81 +91,135 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     existed = found != allOnes;
     if (existed) return found;
     pool_.add(nodes.node(), value, NodePool::Kind::leaf);
-    takeOver(value);
+    releaseContents(value);
     return nodes.size() - 1;
 }
 
-ChildFinder::Found BPathTree::findOrAppend(BNode& parent, ComponentView value,
-                                           NodePool::Kind kind,
-                                           bool& existed) const {
-    const ChildFinder::Found found = finder_.find(parent, value);
-    existed = found.child != nullptr;
-    if (existed) return found;
-    BNode& made = pool_.add(parent, value, kind);
-    finder_.noteAppended(parent);
-    return {&made, parent.children().size() - 1};
-}
+// One insertion on its way down from the root. Unless it is committed, it
+// takes the nodes that it made away again, and the track's new positions.
+class BPathTree::Insertion {
+public:
+    Insertion(BPathTree& target, PathTrack& pathTrack) noexcept
+        : tree_(target),
+          track_(pathTrack),
+          trackLength_(pathTrack.size()),
+          node_(target.root.get()) {}
+    Insertion(const Insertion&) = delete;
+    Insertion& operator=(const Insertion&) = delete;
+    ~Insertion() {
+        if (!committed_) takeBack();
+    }
+
+    // Goes to the child of this value; makes it if there is none. Returns
+    // its position.
+    std::uint64_t enter(ComponentView value, NodePool::Kind kind) {
+        const ChildFinder::Found found = tree_.finder_.find(*node_, value);
+        existed_ = found.child != nullptr;
+        if (existed_) {
+            node_ = found.child;
+            return found.position;
+        }
+        if (firstChanged_ == nullptr) {
+            firstChanged_ = node_;
+            childrenBefore_ = node_->children().size();
+        }
+        BNode& made = tree_.pool_.add(*node_, value, kind);
+        tree_.finder_.noteAppended(*node_);
+        const std::size_t position = node_->children().size() - 1;
+        node_ = &made;
+        return position;
+    }
+
+    BNode& node() const noexcept { return *node_; }
+    // Whether the last component entered was there.
+    bool existed() const noexcept { return existed_; }
+    void commit() noexcept { committed_ = true; }
+
+private:
+    // All new nodes are below the first one that was made.
+    void takeBack() noexcept {
+        tree_.finder_.clear();  // it may know nodes that go
+        if (firstChanged_ != nullptr)
+            NodePool::truncate(*firstChanged_, childrenBefore_);
+        track_.resize(trackLength_);
+    }
+
+    BPathTree& tree_;
+    PathTrack& track_;
+    std::size_t trackLength_;
+    BNode* node_;
+    bool existed_ = false;
+    bool committed_ = false;
+    BNode* firstChanged_ = nullptr;  // the parent of the first new node
+    std::size_t childrenBefore_ = 0;
+};
 
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
-    bool existed = false;
-    BNode* node = root.get();
+    Insertion insertion(*this, pathTrack);
+    std::size_t stored = 0;
     for (std::size_t i = 0; i < components.size(); ++i) {
         const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
                                                     : NodePool::Kind::leaf;
-        const auto [child, position] =
-            findOrAppend(*node, components[i], kind, existed);
-        if (existed)
-            pathTrack.push_back(position);
-        else
-            takeOver(components[i]);
-        node = child;
+        const std::uint64_t position = insertion.enter(components[i], kind);
+        if (!insertion.existed()) continue;
+        pathTrack.push_back(position);
+        ++stored;
     }
-    return existed;
+    insertion.commit();
+    for (std::size_t i = stored; i < components.size(); ++i)
+        releaseContents(components[i]);
+    return insertion.existed();
 }
 
-template <class Folder>
-BNode& BPathTree::findOrAddFolder(Folder& components, PathTrack& pathTrack,
-                                  bool& existed) {
-    existed = false;
-    BNode* folder = root.get();
-    for (auto&& component : components) {
-        const auto [child, position] =
-            findOrAppend(*folder, component, NodePool::Kind::folder, existed);
-        if (!existed) takeOver(component);
+template <class Folder, class Files>
+BPathTree::AddedBatch BPathTree::insertBatch(Folder& components,
+                                             Files& fileNames,
+                                             PathTrack& pathTrack) {
+    Insertion insertion(*this, pathTrack);
+    std::size_t stored = 0;
+    for (const ComponentView component : components) {
+        const std::uint64_t position =
+            insertion.enter(component, NodePool::Kind::folder);
         pathTrack.push_back(position);
-        folder = child;
+        if (insertion.existed()) ++stored;
     }
-    return *folder;
+    const std::uint64_t first = appendFiles(insertion.node(), fileNames);
+    insertion.commit();
+    if constexpr (std::is_same_v<Folder, Components>) {
+        for (std::size_t i = stored; i < components.size(); ++i)
+            releaseContents(components[i]);
+        for (Component& name : fileNames) releaseContents(name);
+    }
+    return {insertion.node(), insertion.existed(), first};
 }
 
 template <class Files>
-std::uint64_t BPathTree::appendFiles(BNode& folder, Files& fileNames) {
+std::uint64_t BPathTree::appendFiles(BNode& folder, const Files& fileNames) {
     const std::size_t before = folder.children().size();
     if (fileNames.empty()) return before;
     NodePool::reserve(folder, fileNames.size());
     try {
-        for (auto&& name : fileNames)
+        for (const ComponentView name : fileNames)
             pool_.add(folder, name, NodePool::Kind::leaf);
     } catch (...) {
         NodePool::truncate(folder, before);
         throw;
     }
-    for (auto&& name : fileNames) takeOver(name);
     return before;
 }
 
 bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
                         PathTrack& pathTrack, std::uint64_t& firstFileIndex) {
-    bool existed = false;
-    BNode& folder = findOrAddFolder(folderComponents, pathTrack, existed);
-    const std::uint64_t first = appendFiles(folder, fileNames);
-    firstFileIndex = existed ? first : allOnes;
-    return existed;
+    const AddedBatch added =
+        insertBatch(folderComponents, fileNames, pathTrack);
+    firstFileIndex = added.existed ? added.firstFile : allOnes;
+    return added.existed;
 }
 
-BNode& BPathTree::addFolder(const PackedComponents& folderComponents,
-                            PathTrack& pathTrack, bool& existed) {
-    return findOrAddFolder(folderComponents, pathTrack, existed);
+BPathTree::AddedBatch BPathTree::addBatch(
+    const PackedComponents& folderComponents, const PackedComponents& fileNames,
+    PathTrack& pathTrack) {
+    return insertBatch(folderComponents, fileNames, pathTrack);
 }
 
 std::uint64_t BPathTree::addFiles(BNode& folder,

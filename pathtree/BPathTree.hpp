@@ -105,15 +105,19 @@ public:
 
     // ---- Insertion ----
 
-    // Position of the first of `nodes` that equals value, or allOnes.
-    // Cost: linear; the insertions use a faster route to the same answer.
+    // If an insertion throws (std::bad_alloc, std::length_error), the tree,
+    // its inputs and pathTrack are as they were; firstFileIndex, too.
+
+    // Inspection. Position of the first of `nodes` that equals value, or
+    // allOnes. Cost: linear; the insertions use a faster route to the same
+    // answer.
     std::uint64_t findNode(const Component& value,
                            const ChildList& nodes) const;
 
-    // Position of the first of `nodes` that equals value. If there is none,
-    // `existed` becomes false and a new last child takes over the bytes,
-    // leaving value empty; otherwise `existed` becomes true and value is
-    // untouched. Cost: linear.
+    // Inspection. Position of the first of `nodes` that equals value. If
+    // there is none, `existed` becomes false and a new last child takes over
+    // the bytes, leaving value empty; otherwise `existed` becomes true and
+    // value is untouched. Cost: linear.
     std::uint64_t addIfExistsAndFind(const ChildList& nodes, Component& value,
                                      bool& existed) const;
 
@@ -132,17 +136,25 @@ public:
     //
     // A file whose name later serves as a folder component under the same
     // parent becomes that folder's node and is no path any more.
-    //
-    // If it throws (std::bad_alloc, std::length_error), no file is added; a
-    // new folder may be left without files.
     bool addPath(Components& folderComponents, Components& fileNames,
                  PathTrack& pathTrack, std::uint64_t& firstFileIndex);
 
-    // The two halves of it, from packed lists, which are only read. The
-    // first finds or makes the folder; the second, to be called with a
-    // folder of this tree, returns the position that the first file takes.
-    BNode& addFolder(const PackedComponents& folderComponents,
-                     PathTrack& pathTrack, bool& existed);
+    // A folder that took files: its node, whether it was stored already (the
+    // root, for a folder without components, never counts as stored) and the
+    // position of the first of the files.
+    struct AddedBatch {
+        BNode& folder;
+        bool existed;
+        std::uint64_t firstFile;
+    };
+
+    // The same from packed lists, which are only read.
+    AddedBatch addBatch(const PackedComponents& folderComponents,
+                        const PackedComponents& fileNames,
+                        PathTrack& pathTrack);
+
+    // Appends files to a folder of this tree that was found before; returns
+    // the position of the first.
     std::uint64_t addFiles(BNode& folder, const PackedComponents& fileNames);
 
     // True when the node has no children.
@@ -292,13 +304,13 @@ private:
         return BatchFiles::childAt(node, position);
     }
 
-    ChildFinder::Found findOrAppend(BNode& parent, ComponentView value,
-                                    NodePool::Kind kind, bool& existed) const;
-    template <class Folder>
-    BNode& findOrAddFolder(Folder& components, PathTrack& pathTrack,
-                           bool& existed);
+    class Insertion;
+
+    template <class Folder, class Files>
+    AddedBatch insertBatch(Folder& components, Files& fileNames,
+                           PathTrack& pathTrack);
     template <class Files>
-    std::uint64_t appendFiles(BNode& folder, Files& fileNames);
+    std::uint64_t appendFiles(BNode& folder, const Files& fileNames);
     const BNode& enterFolders();
     void leavePath() noexcept;
     void closeFinishedFolders() noexcept;

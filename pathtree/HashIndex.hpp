@@ -4,8 +4,6 @@
 #include <bit>
 #include <cstddef>
 #include <cstdint>
-#include <functional>
-#include <string_view>
 #include <vector>
 
 #include "pathtree/BNode.hpp"
@@ -13,22 +11,27 @@
 namespace tessel {
 
 // Finds things by the hash of their bytes: a table from hash to the position
-// of a thing in a list that the caller keeps. Open addressing; an entry
-// keeps 32 bits of the hash, so that most misses never touch the thing.
+// of a thing in a list that the caller keeps. Open addressing with linear
+// probing.
 //
-// Threads: none.
-// Cost: constant time on average; 11 to 22 bytes a thing.
+//   entry:  | hash, 32 bits | position + 1, 32 bits; 0: free |
+//
+// Most misses are decided by the 32 bits and never touch the thing.
+//
+// Threads: hashOf may be called on any thread; else one thread at a time.
+// Cost: constant time on average, for names that were made to collide, too:
+//   the hash is keyed with a secret of the process. 11 to 22 bytes per thing.
 class HashIndex {
 public:
     static constexpr std::size_t notFound = ~std::size_t{0};
 
     // Positions above this cannot be inserted.
-    static constexpr std::size_t largestPosition = 0xFFFFFFFE;
+    static constexpr std::size_t maxPosition = 0xFFFFFFFE;
 
-    static std::uint32_t hashOf(ComponentView bytes) noexcept {
-        return static_cast<std::uint32_t>(std::hash<std::string_view>{}(
-            {reinterpret_cast<const char*>(bytes.data()), bytes.size()}));
-    }
+    // The low half of XXH3, keyed with random bits that are drawn once per
+    // process: without them nobody can compute names that collide. So the
+    // hash of a name differs from run to run; store none.
+    static std::uint32_t hashOf(ComponentView bytes) noexcept;
 
     // The position inserted under this hash for which isIt(position) holds,
     // or notFound.
@@ -47,15 +50,20 @@ public:
     // Inserts a position that find does not find. If it throws
     // (std::bad_alloc), nothing changes.
     void insert(std::uint32_t hash, std::size_t position) {
-        if (used_ >= entries_.size() / 4 * 3) reserve(used_ + 1);
+        reserveOne();
         place({hash, static_cast<std::uint32_t>(position + 1)});
         ++used_;
+    }
+
+    // Makes sure that the next insertion does not throw.
+    void reserveOne() {
+        if (used_ >= entries_.size() / 4 * 3) reserve(used_ + 1);
     }
 
     // Makes room for `count` things in all.
     void reserve(std::size_t count) {
         const std::size_t size =
-            std::max(smallest, std::bit_ceil(count * 8 / 5 + 1));
+            std::max(minEntries, std::bit_ceil(count * 8 / 5 + 1));
         if (size <= entries_.size()) return;
         std::vector<Entry> old(size);
         old.swap(entries_);
@@ -63,9 +71,21 @@ public:
             if (entry.positionPlusOne != 0) place(entry);
     }
 
-    // The first position that find would look at, unless another hash has
-    // its place.
-    std::size_t likely(std::uint32_t hash) const noexcept {
+    // Entries that a search for a thing of this hash looks at if it is not
+    // there: 1 in the best case. For tests.
+    std::size_t probes(std::uint32_t hash) const noexcept {
+        if (entries_.empty()) return 0;
+        const std::size_t mask = entries_.size() - 1;
+        std::size_t count = 1;
+        for (std::size_t at = hash & mask; entries_[at].positionPlusOne != 0;
+             at = (at + 1) & mask)
+            ++count;
+        return count;
+    }
+
+    // The position in the slot where a search begins, if its hash is this
+    // one; else notFound.
+    std::size_t homeSlot(std::uint32_t hash) const noexcept {
         if (entries_.empty()) return notFound;
         const Entry& entry = entries_[hash & (entries_.size() - 1)];
         return entry.positionPlusOne == 0 || entry.hash != hash
@@ -74,7 +94,7 @@ public:
     }
 
     // Asks the processor for the entry that find will look at first.
-    void fetch(std::uint32_t hash) const noexcept {
+    void prefetch(std::uint32_t hash) const noexcept {
         if (!entries_.empty())
             __builtin_prefetch(&entries_[hash & (entries_.size() - 1)]);
     }
@@ -85,7 +105,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t smallest = 16;
+    static constexpr std::size_t minEntries = 16;
 
     struct Entry {
         std::uint32_t hash = 0;

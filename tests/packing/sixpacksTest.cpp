@@ -90,6 +90,19 @@ TEST(PackedIntegers, ValuesAreLittleEndian) {
               (Bytes{8, 7, 6, 5, 4, 3, 2, 1}));
 }
 
+TEST(PackedIntegers, OneFunctionPacksAtAnyWidth) {
+    for (const PackedSizeT width : widths)
+        for (const std::uint64_t value : {0x0102030405060708ULL, 0xFFULL}) {
+            Bytes out = {0xEE};
+            packUint(value, width, out);
+            EXPECT_EQ(out, support::join({{0xEE}, packed(value, width)}));
+        }
+    Bytes out;
+    EXPECT_THROW(packUint(1, unknownWidth(4), out),
+                 InvalidUintConversionException);
+    EXPECT_TRUE(out.empty());
+}
+
 TEST(PackedIntegers, AValueThatDoesNotFitLosesItsHighBytes) {
     EXPECT_EQ(packed(300, PackedSizeT::Uint8), Bytes{0x2C});
     EXPECT_EQ(packed(0x12345678, PackedSizeT::Uint16), (Bytes{0x78, 0x56}));
@@ -196,50 +209,7 @@ TEST(PackedIntegers, ABadWidthOfTheValuesIsSeenBehindTheCount) {
     EXPECT_TRUE(values.empty());
 }
 
-// ---- The bounded reader ----
-
-TEST(ByteCursor, TakesFromTheFrontAndStopsAtTheEnd) {
-    const Bytes bytes = {1, 2, 3, 4, 5};
-    ByteCursor cursor(bytes);
-    EXPECT_EQ(cursor.takeByte(), 1);
-    const auto two = cursor.take(2);
-    EXPECT_EQ(Bytes(two.begin(), two.end()), (Bytes{2, 3}));
-    EXPECT_EQ(cursor.remaining(), 2U);
-    EXPECT_THROW(cursor.take(3), DamagedFormException);
-    EXPECT_EQ(cursor.remaining(), 2U);
-    EXPECT_THROW(cursor.takeUint(PackedSizeT::Uint32), DamagedFormException);
-    EXPECT_EQ(cursor.takeUint(PackedSizeT::Uint16), 0x0504U);
-    EXPECT_TRUE(cursor.empty());
-    EXPECT_TRUE(cursor.take(0).empty());
-    EXPECT_THROW(cursor.takeByte(), DamagedFormException);
-}
-
-TEST(ByteCursor, AClaimOfAnySizeIsRefused) {
-    const Bytes bytes(16, 0xFF);
-    ByteCursor cursor(bytes);
-    EXPECT_THROW(cursor.take(~std::uint64_t{0}), DamagedFormException);
-    EXPECT_THROW(cursor.take(17), DamagedFormException);
-    EXPECT_EQ(cursor.take(16).size(), 16U);
-    EXPECT_THROW(ByteCursor({}).takeByte(), DamagedFormException);
-}
-
-TEST(ByteCursor, ItemsMustFitInWhatIsLeft) {
-    const Bytes bytes(16);
-    const ByteCursor cursor(bytes);
-    EXPECT_NO_THROW(cursor.requireItems(0, 8));
-    EXPECT_NO_THROW(cursor.requireItems(16, 1));
-    EXPECT_NO_THROW(cursor.requireItems(2, 8));
-    EXPECT_NO_THROW(cursor.requireItems(5, 3));
-    EXPECT_THROW(cursor.requireItems(17, 1), DamagedFormException);
-    EXPECT_THROW(cursor.requireItems(3, 8), DamagedFormException);
-    EXPECT_THROW(cursor.requireItems(6, 3), DamagedFormException);
-    EXPECT_THROW(cursor.requireItems(std::uint64_t{1} << 61, 8),
-                 DamagedFormException);
-    EXPECT_THROW(cursor.requireItems(~std::uint64_t{0}, 8),
-                 DamagedFormException);
-}
-
-TEST(ByteCursor, ListsOfValuesAreCheckedBeforeAnythingIsAppended) {
+TEST(PackedIntegers, ListsOfValuesAreCheckedBeforeAnythingIsAppended) {
     Sizes values = {1};
     const Bytes cut = {3, 0, 1, 0, 2, 0};  // claims three of two bytes
     ByteCursor cursor(cut);

@@ -66,8 +66,8 @@ TEST(PackedBlocks, ABlockOfEightBitsIsRead) {
 }
 
 TEST(PackedBlocks, ABlockOfOneByteHoldsNoBits) {
-    EXPECT_EQ(bitsOf({0x00}), Bits());
-    EXPECT_EQ(bitsOf({0x05}), Bits());
+    for (unsigned byte = 0; byte < 256; ++byte)
+        EXPECT_EQ(bitsOf({static_cast<std::uint8_t>(byte)}), Bits()) << byte;
 }
 
 TEST(PackedBlocks, UnusedHighBitsAreIgnored) {

@@ -469,23 +469,24 @@ TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
 
 // ---- Packed batches ----
 
-TEST(PathTreeInsertion, APackedBatchIsAddedInTwoHalves) {
+TEST(PathTreeInsertion, APackedBatchIsAddedLikeVectors) {
     tessel::ComponentPacker packer;
     const auto folder = support::packedBy(packer, components({"a", "b"}));
     const auto files = support::packedBy(packer, components({"f", ""}));
     BPathTree tree;
     PathTrack track;
-    bool existed = true;
-    tessel::BNode& made = tree.addFolder(folder, track, existed);
-    EXPECT_FALSE(existed);
+    const BPathTree::AddedBatch made = tree.addBatch(folder, files, track);
+    EXPECT_FALSE(made.existed);
+    EXPECT_EQ(made.firstFile, 0U);
     EXPECT_EQ(track, (PathTrack{0, 0}));
-    EXPECT_EQ(tree.addFiles(made, files), 0U);
-    tessel::BNode& found = tree.addFolder(folder, track, existed);
-    EXPECT_TRUE(existed);
-    EXPECT_EQ(&found, &made);
+    const BPathTree::AddedBatch found = tree.addBatch(folder, files, track);
+    EXPECT_TRUE(found.existed);
+    EXPECT_EQ(found.firstFile, 2U);
+    EXPECT_EQ(&found.folder, &made.folder);
     EXPECT_EQ(track, (PathTrack{0, 0, 0, 0}));
-    EXPECT_EQ(tree.addFiles(found, files), 2U);
-    EXPECT_EQ(allPaths(tree), (Paths{"a/b/f", "a/b/", "a/b/f", "a/b/"}));
+    EXPECT_EQ(tree.addFiles(made.folder, files), 4U);
+    EXPECT_EQ(allPaths(tree),
+              (Paths{"a/b/f", "a/b/", "a/b/f", "a/b/", "a/b/f", "a/b/"}));
 }
 
 TEST(PathTreeInsertion, APackedFolderOfNoComponentsIsTheRoot) {
@@ -493,13 +494,13 @@ TEST(PathTreeInsertion, APackedFolderOfNoComponentsIsTheRoot) {
     const auto files = support::packedBy(packer, components({"f"}));
     BPathTree tree;
     PathTrack track;
-    bool existed = true;
-    tessel::BNode& folder = tree.addFolder({}, track, existed);
-    EXPECT_EQ(&folder, tree.root.get());
-    EXPECT_FALSE(existed);
-    EXPECT_TRUE(track.empty());
-    EXPECT_EQ(tree.addFiles(folder, files), 0U);
-    EXPECT_EQ(tree.addFiles(folder, files), 1U);
+    for (const std::uint64_t first : {0U, 1U}) {
+        const BPathTree::AddedBatch added = tree.addBatch({}, files, track);
+        EXPECT_EQ(&added.folder, tree.root.get());
+        EXPECT_FALSE(added.existed);
+        EXPECT_EQ(added.firstFile, first);
+        EXPECT_TRUE(track.empty());
+    }
     EXPECT_EQ(allPaths(tree), (Paths{"f", "f"}));
 }
 

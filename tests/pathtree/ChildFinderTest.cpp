@@ -1,0 +1,165 @@
+// Finding a child, beside a search from the front.
+
+#include <gtest/gtest.h>
+#include <rapidcheck/gtest.h>
+
+#include "pathtree/BPathTree.hpp"
+#include "pathtree/ChildFinder.hpp"
+#include "tests/support/Bytes.hpp"
+#include "tests/support/Trees.hpp"
+
+namespace {
+
+using tessel::BNode;
+using tessel::BPathTree;
+using tessel::ChildFinder;
+using tessel::Component;
+using tessel::Components;
+using tessel::PathTrack;
+
+// A name out of `kinds`, so that equal ones meet.
+Component nameOf(unsigned number, unsigned kinds) {
+    const unsigned kind = number % kinds;
+    return {static_cast<std::uint8_t>(kind),
+            static_cast<std::uint8_t>(kind >> 8)};
+}
+
+void compareFinder(ChildFinder& finder, const BPathTree& tree, BNode& parent,
+                   const Component& value) {
+    const std::uint64_t expected = tree.findNode(value, parent.children());
+    const ChildFinder::Found found = finder.find(parent, value);
+    RC_ASSERT(found.position == expected);
+    if (expected != BPathTree::allOnes)
+        RC_ASSERT(found.child == &parent.children()[found.position]);
+}
+
+RC_GTEST_PROP(ChildFinder, FindsWhatASearchFromTheFrontFinds, ()) {
+    BPathTree tree;
+    support::addBatch(tree, {}, {"first", "second", "third"});
+    ChildFinder finder;
+    const auto kinds = *rc::gen::inRange(1U, 3000U);
+    const auto rounds =
+        *rc::gen::container<std::vector<std::pair<unsigned, unsigned>>>(
+            rc::gen::pair(rc::gen::inRange(0U, 400U),
+                          rc::gen::arbitrary<unsigned>()));
+    for (const auto& [count, start] : rounds) {
+        BNode& parent = tree.root->children()[start % 3];
+        Components files;
+        for (unsigned i = 0; i < count; ++i)
+            files.push_back(nameOf(start + i * 7, kinds));
+        Components folder = {
+            Component(parent.value().begin(), parent.value().end())};
+        PathTrack track;
+        std::uint64_t first = 0;
+        tree.addPath(folder, files, track, first);
+        for (unsigned i = 0; i < 10; ++i)
+            compareFinder(finder, tree, parent,
+                          nameOf(start / 3 + i * 11, kinds));
+        compareFinder(finder, tree, parent, {});
+    }
+    for (unsigned i = 0; i < kinds; i += 1 + kinds / 50)
+        compareFinder(finder, tree, tree.root->children()[i % 3],
+                      nameOf(i, kinds));
+    finder.clear();
+    RC_ASSERT(finder.memoryBytes() == 0U);
+    compareFinder(finder, tree, tree.root->children()[0], nameOf(1, kinds));
+}
+
+// Insertion by the tree, its copies and whole batches in turn: each must
+// find what a search from the front finds, whoever added it.
+RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
+    BPathTree tree;
+    BPathTree copy(tree);
+    const auto kinds = *rc::gen::inRange(1U, 300U);
+    const auto steps =
+        *rc::gen::scale(4, rc::gen::container<std::vector<unsigned>>(
+                               rc::gen::arbitrary<unsigned>()));
+    for (const unsigned step : steps) {
+        BPathTree& used = step % 3 == 0 ? copy : tree;
+        if (step % 11 == 0) used.releaseFinder();
+        if (step % 13 == 0) used.reset();
+        const Component value = nameOf(step / 16, kinds);
+        if (step % 5 == 0) {  // appended unseen, equal ones too
+            Components files = {value, {}, value};
+            Components none;
+            PathTrack track;
+            std::uint64_t first = 0;
+            used.addPath(none, files, track, first);
+            continue;
+        }
+        const std::size_t before = tree.root->children().size();
+        const std::uint64_t expected =
+            tree.findNode(value, tree.root->children());
+        Components path = {value};
+        PathTrack track;
+        const bool existed = used.addPath(path, track);
+        RC_ASSERT(existed == (expected != BPathTree::allOnes));
+        RC_ASSERT(track == (existed ? PathTrack{expected} : PathTrack{}));
+        RC_ASSERT(tree.root->children().size() == before + (existed ? 0 : 1));
+    }
+}
+
+TEST(ChildFinder, AroundTheWidthWhereTablesBegin) {
+    for (unsigned width = 1; width < 40; ++width) {
+        BPathTree tree;
+        ChildFinder finder;
+        for (unsigned i = 0; i < width; ++i) {
+            support::addBatch(tree, {}, {support::numbered("n", i)});
+            for (unsigned k = 0; k <= i; ++k) {
+                const auto found = finder.find(
+                    *tree.root, support::component(support::numbered("n", k)));
+                EXPECT_EQ(found.position, k);
+            }
+            EXPECT_EQ(finder.find(*tree.root, support::component("x")).child,
+                      nullptr);
+        }
+    }
+}
+
+TEST(ChildFinder, AFolderOfManyThousandsWithEqualNamesBetween) {
+    BPathTree tree;
+    constexpr unsigned count = 30000;
+    constexpr unsigned kinds = 20000;
+    Components files;
+    for (unsigned i = 0; i < count; ++i) files.push_back(nameOf(i, kinds));
+    Components folder = {{1}};
+    PathTrack track;
+    std::uint64_t first = 0;
+    tree.addPath(folder, files, track, first);
+    BNode& parent = tree.root->children()[0];
+    ChildFinder finder;
+    for (unsigned i = 0; i < kinds; ++i)
+        ASSERT_EQ(finder.find(parent, nameOf(i, kinds)).position, i);
+    EXPECT_EQ(finder.find(parent, nameOf(kinds, kinds + 1)).child, nullptr);
+    EXPECT_EQ(finder.indexedChildren(), count);
+    EXPECT_GT(finder.memoryBytes(), 8 * count);
+    finder.clear();
+    EXPECT_EQ(finder.indexedChildren(), 0U);
+}
+
+// So many names that some share all the bits of a hash that are kept.
+TEST(ChildFinder, NamesOfEqualHashAreToldApart) {
+    BPathTree tree;
+    constexpr std::size_t count = 400000;
+    for (std::size_t i = 0; i < count; ++i) {
+        Components path = {support::littleEndian(i, 4)};
+        PathTrack track;
+        ASSERT_FALSE(tree.addPath(path, track)) << i;
+    }
+    EXPECT_EQ(tree.root->children().size(), count);
+}
+
+TEST(ChildFinder, AWideFolderOfFoldersIsBuiltWithoutADuplicate) {
+    BPathTree tree;
+    for (int round = 0; round < 3; ++round) {
+        for (unsigned i = 0; i < 3000; ++i) {
+            const std::string name = support::numbered("folder", i * 7 % 3000);
+            const auto added = support::addBatch(tree, {name}, {"file"});
+            ASSERT_EQ(added.existed, round > 0);
+            ASSERT_EQ(added.track, (PathTrack{i}));
+        }
+    }
+    EXPECT_EQ(tree.root->children().size(), 3000U);
+}
+
+}  // namespace
