@@ -1,0 +1,59 @@
+#include "archive/SegmentList.hpp"
+
+#include <algorithm>
+
+namespace tessel::archive {
+
+// ---- SplitPath ----
+
+SplitPath SplitPath::of(std::string_view path) noexcept {
+    const std::size_t nameAt = path.rfind('/') + 1;  // npos + 1 is 0
+    return {path.substr(0, nameAt), path.substr(nameAt)};
+}
+
+// A folder that goes on where the other path has its name holds a '/' there,
+// which the name does not. So one comparison of the two always decides.
+std::strong_ordering SplitPath::operator<=>(
+    const SplitPath& other) const noexcept {
+    const std::size_t shared = std::min(folder.size(), other.folder.size());
+    const auto start =
+        folder.substr(0, shared) <=> other.folder.substr(0, shared);
+    if (start != 0) return start;
+    if (folder.size() == other.folder.size()) return name <=> other.name;
+    return folder.size() > shared ? folder.substr(shared) <=> other.name
+                                  : name <=> other.folder.substr(shared);
+}
+
+// ---- SegmentList ----
+
+void SegmentList::add(const SplitPath& path) {
+    const std::uint32_t folder = folderOf(path);
+    const auto start = static_cast<std::uint32_t>(text_.size());
+    text_.insert(text_.end(), path.name.begin(), path.name.end());
+    text_.push_back('\0');
+    names_.push_back(
+        {start, static_cast<std::uint32_t>(path.name.size()), folder});
+    textBytes_ += path.folder.size() + path.name.size();
+}
+
+std::uint32_t SegmentList::folderOf(const SplitPath& path) {
+    if (names_.empty()) return folders_.numberOf(path.folder);
+    const NameRef& last = names_.back();
+    const SplitPath lastPath = {folders_[last.folder], name(last)};
+    if (path.folder == lastPath.folder) {
+        if (path.name < lastPath.name) sorted_ = false;
+        return last.folder;
+    }
+    if (sorted_ && path < lastPath) sorted_ = false;
+    return folders_.numberOf(path.folder);
+}
+
+void SegmentList::clear() {
+    text_.clear();
+    names_.clear();
+    folders_.clear();
+    textBytes_ = 0;
+    sorted_ = true;
+}
+
+}  // namespace tessel::archive
