@@ -1,6 +1,7 @@
 #include "archive/FrontCoder.hpp"
 
 #include <algorithm>
+#include <functional>
 #include <string_view>
 #include <utility>
 
@@ -23,6 +24,7 @@ FrontCounts& FrontCounts::operator+=(const FrontCounts& other) {
     };
     add(operations, other.operations);
     add(replaced, other.replaced);
+    pieceBytes += other.pieceBytes;
     return *this;
 }
 
@@ -72,6 +74,7 @@ void FrontCoder::codeNames(std::size_t chunk, FrontCounts& counts) {
                                [jumpSymbol(seen - nameRef(place).folder)];
         if (code.prefix > 0)
             ++counts.replaced[code.replaced][byteAfterPrefix(place)];
+        if (hasPiece(place)) counts.pieceBytes += namePiece(place).length;
         previous = code.operation;
     }
 }
@@ -106,6 +109,7 @@ void FrontCoder::codeFolders(std::size_t chunk, FrontCounts& counts) {
                 sharedBytes(folder(number - 1), folder(number));
         ++counts.operations[folderPrefixCode]
                            [prefixSymbol(folderPrefixes_[number])];
+        counts.pieceBytes += folderPiece(number).length;
     }
 }
 

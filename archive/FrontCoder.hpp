@@ -37,6 +37,7 @@ struct FrontCounts {
     using Row = std::array<std::uint64_t, 256>;
     std::array<Row, operationCodeCount> operations{};
     std::array<Row, replacedContextCount> replaced{};
+    std::uint64_t pieceBytes = 0;
 
     FrontCounts& operator+=(const FrontCounts& other);
 };

@@ -1,0 +1,115 @@
+#include "archive/TokenModel.hpp"
+
+#include <algorithm>
+#include <cmath>
+
+namespace tessel::archive {
+
+namespace {
+
+// No literal is taken to cost more, not even where none was seen.
+constexpr double maxLiteralBits = 18;
+constexpr double maxFirstLiteralBits = 12;
+// No token is taken to cost less: Huffman codes spend whole bits, but a token
+// that is nearly certain may be the only one of its first byte.
+constexpr double minTokenBits = 0.3;
+constexpr double minFirstTokenBits = 0.05;
+// What stands for "not seen, but possible".
+constexpr double unseenUses = 0.7;
+
+std::uint32_t costOf(double bits) {
+    return static_cast<std::uint32_t>(std::lround(bits * TokenModel::costUnit));
+}
+
+std::uint8_t tokenCost(double bits) {
+    return static_cast<std::uint8_t>(
+        std::min<std::uint32_t>(costOf(bits), TokenModel::noCode - 1));
+}
+
+double literalBits(std::uint64_t total, std::uint64_t literals,
+                   double limit) {
+    return std::min(limit, std::log2(static_cast<double>(total) /
+                                     (static_cast<double>(literals) +
+                                      unseenUses)));
+}
+
+}  // namespace
+
+// Which uses keep their code, and the sums that costs are shares of.
+struct TokenModel::Kept {
+    Kept(const std::vector<std::string>& tokens, const TokenUses& uses,
+         double minUses);
+
+    std::uint32_t of(std::size_t token, std::size_t context) const {
+        return counts[token * contextSlots + context];
+    }
+
+    std::vector<std::uint32_t> counts;
+    std::array<std::uint64_t, contextSlots> totals{};
+    std::array<std::uint64_t, contextSlots> literals{};
+    std::array<std::uint64_t, 256> firstTotals{};
+    std::array<std::uint64_t, 256> firstLiterals{};
+};
+
+TokenModel::Kept::Kept(const std::vector<std::string>& tokens,
+                       const TokenUses& uses, double minUses)
+    : counts(tokens.size() * contextSlots) {
+    totals.fill(1);
+    firstTotals.fill(1);
+    for (std::size_t t = 0; t < tokens.size(); ++t) {
+        const bool isByte = tokens[t].size() == 1;
+        const auto first = static_cast<std::uint8_t>(tokens[t].front());
+        for (std::size_t c = 0; c < contextSlots; ++c) {
+            const std::uint32_t count = uses.of(t, c);
+            const bool isFirst = c == firstTokenContext;
+            // After a shared prefix, a byte alone is always the literal.
+            const bool keep = isFirst ? !isByte && count >= minUses
+                              : isByte ? count >= 2
+                                       : count >= minUses;
+            if (count == 0 || (!keep && !isByte)) continue;
+            (isFirst ? firstTotals[first] : totals[c]) += count;
+            if (keep)
+                counts[t * contextSlots + c] = count;
+            else
+                (isFirst ? firstLiterals[first] : literals[c]) += count;
+        }
+    }
+}
+
+TokenModel::TokenModel(const std::vector<std::string>& tokens,
+                       const TokenUses& uses, double minUses) {
+    const Kept kept(tokens, uses, minUses);
+    for (std::size_t c = 0; c < tokenContextCount; ++c)
+        literalCosts_[c] =
+            costOf(literalBits(kept.totals[c], kept.literals[c],
+                               maxLiteralBits) +
+                   8);
+    for (std::size_t b = 0; b < 256; ++b)
+        firstLiteralCosts_[b] =
+            costOf(literalBits(kept.firstTotals[b], kept.firstLiterals[b],
+                               maxFirstLiteralBits));
+    for (std::size_t t = 0; t < tokens.size(); ++t) {
+        std::array<std::uint8_t, contextSlots> row{};
+        row.fill(noCode);
+        for (std::size_t c = 0; c < contextSlots; ++c) {
+            const std::uint32_t count = kept.of(t, c);
+            if (count == 0) continue;
+            const bool isFirst = c == firstTokenContext;
+            const std::uint64_t total =
+                isFirst ? kept.firstTotals[static_cast<std::uint8_t>(
+                              tokens[t].front())]
+                        : kept.totals[c];
+            row[c] = tokenCost(
+                std::max(isFirst ? minFirstTokenBits : minTokenBits,
+                         std::log2(static_cast<double>(total) / count)));
+        }
+        if (std::ranges::all_of(row, [](auto cost) { return cost == noCode; }))
+            continue;
+        tokens_.push_back(tokens[t]);
+        lengths_.push_back(static_cast<std::uint8_t>(tokens[t].size()));
+        costs_.insert(costs_.end(), row.begin(), row.end());
+    }
+    trie_ = TokenTrie(tokens_);
+}
+
+}  // namespace tessel::archive
