@@ -16,22 +16,13 @@ std::uint64_t sumOf(std::span<const std::uint8_t> bytes,
 
 namespace SumTree {
 
-namespace {
-
-std::vector<std::uint64_t> sumsOf(std::span<const std::uint8_t> bytes,
-                                  unsigned pieceShift, std::uint64_t level) {
-    const std::size_t pieceBytes = std::size_t{1} << pieceShift;
-    std::vector<std::uint64_t> sums;
-    sums.reserve(piecesIn(bytes.size(), pieceShift));
-    for (std::size_t at = 0; at < bytes.size(); at += pieceBytes) {
-        const auto piece =
-            bytes.subspan(at, std::min(pieceBytes, bytes.size() - at));
-        sums.push_back(sumOf(piece, seedOf(level, sums.size())));
-    }
-    return sums;
+std::uint64_t pieceSum(std::span<const std::uint8_t> bytes, unsigned pieceShift,
+                       std::uint64_t level, std::uint64_t index) noexcept {
+    const std::size_t begin = index << pieceShift;
+    const std::size_t size =
+        std::min(std::size_t{1} << pieceShift, bytes.size() - begin);
+    return sumOf(bytes.subspan(begin, size), seedOf(level, index));
 }
-
-}  // namespace
 
 std::uint64_t storedBytes(std::uint64_t bodyBytes,
                           unsigned pieceShift) noexcept {
@@ -44,22 +35,17 @@ std::uint64_t storedBytes(std::uint64_t bodyBytes,
     return total;
 }
 
-std::vector<std::uint64_t> pieceSums(std::span<const std::uint8_t> body,
-                                     unsigned pieceShift) {
-    return sumsOf(body, pieceShift, 0);
-}
-
-Levels levelsAbove(const std::vector<std::uint64_t>& pieceSums,
-                   unsigned pieceShift) {
+Levels levelsAbove(std::vector<std::uint64_t> pieceSums, unsigned pieceShift) {
     Levels levels;
-    std::vector<std::uint64_t> sums = pieceSums;
+    std::vector<std::uint64_t>& sums = pieceSums;
     for (std::uint64_t level = 1; sums.size() > 1; ++level) {
         std::vector<std::uint8_t> table;
         table.reserve(8 * sums.size());
         for (const std::uint64_t sum : sums) packUint64(sum, table);
-        sums = sumsOf(table, pieceShift, level);
-        levels.stored.insert(levels.stored.begin(), table.begin(),
-                             table.end());
+        sums.resize(piecesIn(table.size(), pieceShift));
+        for (std::size_t i = 0; i < sums.size(); ++i)
+            sums[i] = pieceSum(table, pieceShift, level, i);
+        levels.stored.insert(levels.stored.begin(), table.begin(), table.end());
     }
     levels.top = sums.front();
     return levels;

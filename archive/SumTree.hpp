@@ -32,6 +32,11 @@ constexpr std::uint64_t piecesIn(std::uint64_t bytes,
            ((bytes & ((std::uint64_t{1} << pieceShift) - 1)) != 0 ? 1 : 0);
 }
 
+// The checksum of the piece with this index, of a body (level 0) or of the
+// table below the given level.
+std::uint64_t pieceSum(std::span<const std::uint8_t> bytes, unsigned pieceShift,
+                       std::uint64_t level, std::uint64_t index) noexcept;
+
 // Bytes of all stored levels of a body of this size.
 std::uint64_t storedBytes(std::uint64_t bodyBytes,
                           unsigned pieceShift) noexcept;
@@ -41,14 +46,9 @@ struct Levels {
     std::uint64_t top = 0;
 };
 
-// The checksums of level 0, computed from the body.
-std::vector<std::uint64_t> pieceSums(std::span<const std::uint8_t> body,
-                                     unsigned pieceShift);
-
 // All levels above the given checksums of level 0, of which there is at least
 // one.
-Levels levelsAbove(const std::vector<std::uint64_t>& pieceSums,
-                   unsigned pieceShift);
+Levels levelsAbove(std::vector<std::uint64_t> pieceSums, unsigned pieceShift);
 
 }  // namespace SumTree
 
