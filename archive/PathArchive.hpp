@@ -2,13 +2,11 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <functional>
 #include <initializer_list>
 #include <iterator>
 #include <memory>
 #include <optional>
 #include <span>
-#include <stop_token>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -16,6 +14,7 @@
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/FunctionRef.hpp"
 #include "archive/PathVisitor.hpp"
+#include "archive/ScanOptions.hpp"
 
 namespace tessel {
 
@@ -28,21 +27,6 @@ struct NumberRange {
     std::uint64_t end = 0;
 
     friend bool operator==(const NumberRange&, const NumberRange&) = default;
-};
-
-// How work over the whole archive is done.
-struct ScanOptions {
-    // Most threads to use, the calling one included; 0 is one per core. No
-    // result depends on it.
-    unsigned threads = 0;
-
-    // A request to stop ends the scan with CancelledException.
-    std::stop_token cancel;
-
-    // Called on the calling thread, some times per second at most, with how
-    // many of how many units of work are done. What it throws ends the scan
-    // and reaches the caller.
-    std::function<void(std::uint64_t done, std::uint64_t total)> progress;
 };
 
 struct FindOptions : ScanOptions {
