@@ -8,25 +8,31 @@
 
 namespace tessel {
 
-// Refers to a callable that is shown paths one by one: it takes the path's
-// number (std::uint64_t) and its bytes (std::string_view). If it returns a
-// bool, false ends the visit; if it returns nothing, all paths are visited.
+class PathVisitor;
+
+// A function object that takes a path's number and its bytes.
+template <class Callable>
+concept VisitsPaths =
+    std::is_class_v<std::remove_cvref_t<Callable>> &&
+    !std::same_as<std::remove_cvref_t<Callable>, PathVisitor> &&
+    std::is_invocable_v<Callable&, std::uint64_t, std::string_view>;
+
+// Refers to a function object, such as a lambda, that is shown paths one by
+// one: it takes a path's number and its bytes. If it returns a bool, false
+// ends the visit; if it returns nothing, all paths are visited.
 //
-// The view is valid until the callable returns. What the callable throws
-// ends the visit and reaches the caller.
+// The view is valid until the call returns. What the call throws ends the
+// visit and reaches the caller.
 //
-// Ownership: borrows the callable, which must outlive the PathVisitor. A
-//   lambda written in the call's argument list does.
+// Ownership: borrows the function object, which must outlive the PathVisitor.
+//   A lambda written in the call's argument list does.
 // Cost: two pointers; a call is one indirect call, never an allocation.
 class PathVisitor {
 public:
-    template <class Callable>
-    requires(!std::same_as<std::remove_cvref_t<Callable>, PathVisitor> &&
-             std::is_invocable_v<Callable&, std::uint64_t, std::string_view>)
-        // Implicit, so that a lambda can be handed over as it is.
-        // NOLINTNEXTLINE(google-explicit-constructor,bugprone-forwarding-reference-overload)
-        PathVisitor(Callable&& callable)
-    noexcept
+    // Implicit, so that a lambda can be handed over as it is.
+    template <VisitsPaths Callable>
+    // NOLINTNEXTLINE(google-explicit-constructor,bugprone-forwarding-reference-overload)
+    PathVisitor(Callable&& callable) noexcept
         : target_(const_cast<void*>(
               static_cast<const void*>(std::addressof(callable)))),
           call_(&callAs<std::remove_reference_t<Callable>>) {}
