@@ -12,10 +12,9 @@ class FunctionRef;
 
 // A function object, other than a Self, that a FunctionRef can refer to.
 template <class Callable, class Self, class Result, class... Arguments>
-concept CallableAs =
-    std::is_class_v<std::remove_cvref_t<Callable>> &&
-    !std::same_as<std::remove_cvref_t<Callable>, Self> &&
-    std::is_invocable_r_v<Result, Callable&, Arguments...>;
+concept CallableAs = std::is_class_v<std::remove_cvref_t<Callable>> &&
+                     !std::same_as<std::remove_cvref_t<Callable>, Self> &&
+                     std::is_invocable_r_v<Result, Callable&, Arguments...>;
 
 // Refers to a function object, such as a lambda, without owning it, as
 // std::string_view refers to text: for parameters that are called only before
