@@ -145,6 +145,11 @@ inline constexpr std::size_t wideGroupBytes = 64;
 inline constexpr std::uint32_t wideFlag = std::uint32_t{1} << 31;
 inline constexpr std::size_t maxNarrowLength = 255;
 
+// ---- Folder heads ----
+
+// | offset in the text | block of the folder's first name |
+inline constexpr std::size_t folderHeadBytes = 8;
+
 // ---- Operations ----
 
 // What a name does with its predecessor, before it is mapped to a symbol:
