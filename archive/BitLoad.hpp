@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <cstring>
 
-namespace tessel {
+namespace tessel::archive {
 
 // Loads of unsigned integers from any address, aligned or not. The stored
 // byte order is fixed, whatever the machine's.
@@ -38,4 +38,4 @@ inline std::uint64_t loadBits(const std::uint8_t* stream,
     return word << (bit & 7);
 }
 
-}  // namespace tessel
+}  // namespace tessel::archive

@@ -9,7 +9,7 @@
 #include <system_error>
 #include <utility>
 
-namespace tessel {
+namespace tessel::archive {
 namespace {
 
 [[noreturn]] void fail(int error, const std::string& file) {
@@ -68,4 +68,4 @@ FileMapping& FileMapping::operator=(FileMapping&& other) noexcept {
     return *this;
 }
 
-}  // namespace tessel
+}  // namespace tessel::archive

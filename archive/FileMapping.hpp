@@ -5,7 +5,7 @@
 #include <span>
 #include <string>
 
-namespace tessel {
+namespace tessel::archive {
 
 // FileMapping maps a whole file for reading.
 //
@@ -36,4 +36,4 @@ private:
     std::size_t size_ = 0;
 };
 
-}  // namespace tessel
+}  // namespace tessel::archive

@@ -171,8 +171,7 @@ SegmentHead SegmentHead::unpack(std::span<const std::uint8_t> segment) {
             head.pieceShift <= 12);
     requireZeros(cursor, 3);
     const auto takeUint32 = [&] {
-        return static_cast<std::uint32_t>(
-            cursor.takeUint(PackedSizeT::Uint32));
+        return static_cast<std::uint32_t>(cursor.takeUint(PackedSizeT::Uint32));
     };
     head.folders = takeUint32();
     head.paths = cursor.takeUint(PackedSizeT::Uint64);

@@ -7,7 +7,7 @@
 
 #include "archive/ArchiveExceptions.hpp"
 
-namespace tessel {
+namespace tessel::archive {
 namespace {
 
 constexpr auto reportInterval = std::chrono::milliseconds(100);
@@ -140,4 +140,4 @@ void OrderedScan::run(FunctionRef<void(std::uint64_t chunk)> produce,
     consumeAll(produce, consume);
 }
 
-}  // namespace tessel
+}  // namespace tessel::archive

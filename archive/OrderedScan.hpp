@@ -11,7 +11,7 @@
 #include "archive/FunctionRef.hpp"
 #include "archive/ScanOptions.hpp"
 
-namespace tessel {
+namespace tessel::archive {
 
 // OrderedScan divides work into chunks, produces them on several threads and
 // consumes them on the calling thread in ascending order, so that the outcome
@@ -68,4 +68,4 @@ private:
     bool stopped_ = false;        // guarded by mutex_
 };
 
-}  // namespace tessel
+}  // namespace tessel::archive

@@ -5,7 +5,7 @@
 
 #include "archive/BitLoad.hpp"
 
-namespace tessel {
+namespace tessel::archive {
 namespace {
 
 // The `count` bits from `bit` on, one by one.
@@ -38,4 +38,4 @@ TEST(BitLoad, FillsUpWithZeros) {
 }
 
 }  // namespace
-}  // namespace tessel
+}  // namespace tessel::archive

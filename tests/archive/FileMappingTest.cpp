@@ -11,7 +11,7 @@
 
 #include "archive/FileMapping.hpp"
 
-namespace tessel {
+namespace tessel::archive {
 namespace {
 
 namespace fs = std::filesystem;
@@ -84,4 +84,4 @@ TEST(FileMapping, SaysWhatCannotBeMapped) {
 }
 
 }  // namespace
-}  // namespace tessel
+}  // namespace tessel::archive

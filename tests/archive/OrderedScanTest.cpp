@@ -12,7 +12,7 @@
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/OrderedScan.hpp"
 
-namespace tessel {
+namespace tessel::archive {
 namespace {
 
 ScanOptions onThreads(unsigned threads) {
@@ -123,4 +123,4 @@ TEST(OrderedScan, ReportsTheEnd) {
 }
 
 }  // namespace
-}  // namespace tessel
+}  // namespace tessel::archive
