@@ -58,7 +58,7 @@ private:
 
 template <unsigned maxBits>
 SymbolTable<maxBits>::SymbolTable(const CodeLengths& code) : SymbolTable() {
-    if (code.lengths.size() == 1) return table_.fill(packed(code.first, 0));
+    if (code.lengths.size() == 1) table_.fill(packed(code.first, 0));
     auto next = table_.begin();
     for (unsigned bits = 1; bits <= maxBits; ++bits)
         for (unsigned i = 0; i < code.lengths.size(); ++i)

@@ -154,13 +154,12 @@ TokenCode<lookupBits>::TokenCode(const CodeCounts& counts,
       tokens_(&tokens),
       contexts_(&contexts) {
     lookup_.fill(Token::tooLong());
-    std::size_t next = 0;
-    for (std::uint32_t place = 0; next < lookup_.size(); ++place) {
-        const auto [found, bits] = counts.decode(
+    for (std::size_t next = 0; next < lookup_.size();) {
+        const auto [place, bits] = counts.decode(
             std::uint64_t{next} << (64 - lookupBits), counts.shortest);
         if (bits > lookupBits) return;
-        const Token token = tokens.token(firstEntry + found, bits, contexts);
-        const std::size_t end = next + (std::size_t{1} << (lookupBits - bits));
+        const auto end = next + (std::size_t{1} << (lookupBits - bits));
+        const Token token = tokens.token(firstEntry + place, bits, contexts);
         while (next < end) lookup_[next++] = token;
     }
 }

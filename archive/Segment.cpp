@@ -1,0 +1,177 @@
+#include "archive/Segment.hpp"
+
+#include "archive/ArchiveExceptions.hpp"
+#include "packing/ByteCursor.hpp"
+
+namespace tessel::archive {
+namespace {
+
+// Sections that every decoding needs.
+constexpr std::size_t tableSections = 6;
+
+constexpr std::uint64_t divideUp(std::uint64_t a, std::uint64_t b) noexcept {
+    return (a + b - 1) / b;
+}
+
+// The sum of the first `count` of 16 bytes, eight at a time.
+std::uint32_t sumOfFirst(const std::uint8_t* bytes, std::uint32_t count) {
+    const auto keep = [](std::uint64_t word, std::uint32_t kept) {
+        return kept >= 8 ? word : word & ((std::uint64_t{1} << (8 * kept)) - 1);
+    };
+    const std::uint64_t low = keep(loadLittle<std::uint64_t>(bytes), count);
+    const std::uint64_t high =
+        keep(loadLittle<std::uint64_t>(bytes + 8), count < 8 ? 0 : count - 8);
+    constexpr std::uint64_t evenBytes = 0x00FF00FF00FF00FF;
+    const std::uint64_t lanes = (low & evenBytes) + (low >> 8U & evenBytes) +
+                                (high & evenBytes) + (high >> 8U & evenBytes);
+    return static_cast<std::uint32_t>(lanes * 0x0001000100010001 >> 48U);
+}
+
+std::span<const std::uint8_t> segmentIn(std::span<const std::uint8_t> archive,
+                                        const SegmentEntry& entry) {
+    if (entry.offset > archive.size() ||
+        entry.bytes > archive.size() - entry.offset)
+        throw DamagedArchiveException(entry.offset,
+                                      "A segment is outside the archive.");
+    return archive.subspan(entry.offset, entry.bytes);
+}
+
+SegmentHead headOf(std::span<const std::uint8_t> segment,
+                   const SegmentEntry& entry) {
+    try {
+        const SegmentHead head = SegmentHead::unpack(segment);
+        if (head.paths == entry.paths && head.segmentBytes() == entry.bytes)
+            return head;
+    } catch (const DamagedFormException&) {
+    }
+    throw DamagedArchiveException(entry.offset, "A segment's head is damaged.");
+}
+
+}  // namespace
+
+Segment::Segment(std::span<const std::uint8_t> archive,
+                 const SegmentEntry& entry)
+    : entry_(entry),
+      head_(headOf(segmentIn(archive, entry), entry)),
+      pieces_(segmentIn(archive, entry), head_, entry.offset),
+      nameBlocks_(static_cast<std::uint32_t>(
+          divideUp(head_.paths, head_.namesPerBlock))),
+      folderBlocks_(static_cast<std::uint32_t>(
+          divideUp(head_.folders, head_.foldersPerBlock))) {
+    for (std::size_t i = 0; i < sectionCount; ++i)
+        sectionOffsets_[i] = head_.offsetOf(static_cast<Section>(i));
+    checkSizes();
+    pieces_.require(0, sectionOffsets_[tableSections]);
+}
+
+Segment::~Segment() = default;
+
+// ---- Checks ----
+
+void Segment::fail(Section section, std::uint64_t offset,
+                   const char* what) const {
+    throw DamagedArchiveException(pieces_.inArchive(offsetOf(section) + offset),
+                                  what);
+}
+
+// The sizes of the sections must be those that the counts ask for.
+void Segment::checkSizes() const {
+    const auto check = [this](Section section, bool holds) {
+        if (!holds) fail(section, 0, "A section has a wrong size.");
+    };
+    const auto bytes = [this](Section section) { return bytesOf(section); };
+    const bool rearranged = head_.order == ListOrder::Rearranged;
+    const std::uint64_t numbers = divideUp(head_.paths * head_.numberBits(), 8);
+    const std::uint64_t heads =
+        head_.order == ListOrder::AsGiven
+            ? 0
+            : divideUp(folderBlocks_, head_.folderBlocksPerHead) + 1;
+
+    check(Section::NameGroups,
+          bytes(Section::NameGroups) ==
+              nameGroupBytes * divideUp(nameBlocks_, blocksPerGroup));
+    check(Section::FolderGroups,
+          bytes(Section::FolderGroups) ==
+              folderGroupBytes * divideUp(folderBlocks_, blocksPerGroup));
+    check(Section::WideGroups,
+          bytes(Section::WideGroups) % wideGroupBytes == 0);
+    check(Section::Names, bytes(Section::Names) < wideFlag);
+    check(Section::Folders, bytes(Section::Folders) < wideFlag);
+    check(Section::FolderHeads,
+          bytes(Section::FolderHeads) >= folderHeadBytes * heads);
+    check(Section::Order, bytes(Section::Order) == (rearranged ? numbers : 0));
+    check(Section::Index, bytes(Section::Index) == 0 ||
+                              (rearranged && bytes(Section::Index) == numbers));
+}
+
+const SegmentTables& Segment::buildTables() const {
+    const std::scoped_lock lock(buildingTables_);
+    if (!ownTables_) {
+        try {
+            ownTables_ = std::make_unique<SegmentTables>(head_, pieces_.body());
+        } catch (const DamagedArchiveException& damage) {
+            throw DamagedArchiveException(pieces_.inArchive(damage.offset()),
+                                          "A table of codes breaks the rules.");
+        }
+        tables_.store(ownTables_.get(), std::memory_order_release);
+    }
+    return *ownTables_;
+}
+
+// ---- Blocks ----
+
+Segment::Block Segment::wideBlockAt(Section section, std::uint32_t start,
+                                    std::uint32_t wideGroup,
+                                    std::uint32_t inGroup) const {
+    const std::uint64_t at = std::uint64_t{wideGroupBytes} * wideGroup;
+    require(Section::WideGroups, at, wideGroupBytes);
+    const std::uint8_t* const lengths = dataOf(Section::WideGroups) + at;
+    std::uint64_t begin = start;
+    for (std::uint32_t i = 0; i < inGroup; ++i)
+        begin += loadLittle<std::uint32_t>(lengths + std::size_t{4} * i);
+    const std::uint64_t end =
+        begin + loadLittle<std::uint32_t>(lengths + std::size_t{4} * inGroup);
+    require(section, begin, end - begin);
+    return {static_cast<std::uint32_t>(begin), static_cast<std::uint32_t>(end)};
+}
+
+// group must be sound.
+Segment::Block Segment::blockAt(Section section, const std::uint8_t* group,
+                                const std::uint8_t* lengths,
+                                std::uint32_t inGroup) const {
+    const auto start = loadLittle<std::uint32_t>(group);
+    if ((start & wideFlag) != 0) [[unlikely]]
+        return wideBlockAt(section, start & ~wideFlag,
+                           loadLittle<std::uint32_t>(lengths), inGroup);
+    const std::uint32_t begin = start + sumOfFirst(lengths, inGroup);
+    const std::uint32_t bytes = lengths[inGroup];
+    require(section, begin, bytes);
+    return {begin, begin + bytes};
+}
+
+Segment::NameBlock Segment::nameBlock(std::uint32_t block) const {
+    const std::uint32_t inGroup = block % blocksPerGroup;
+    const std::uint64_t at =
+        std::uint64_t{nameGroupBytes} * (block / blocksPerGroup);
+    require(Section::NameGroups, at, nameGroupBytes);
+    const std::uint8_t* const group = dataOf(Section::NameGroups) + at;
+    const Block bytes = blockAt(Section::Names, group, group + 24, inGroup);
+    return {bytes, loadLittle<std::uint32_t>(group + 4) +
+                       sumOfFirst(group + 8, inGroup)};
+}
+
+Segment::Block Segment::folderBlock(std::uint32_t block) const {
+    const std::uint64_t at =
+        std::uint64_t{folderGroupBytes} * (block / blocksPerGroup);
+    require(Section::FolderGroups, at, folderGroupBytes);
+    const std::uint8_t* const group = dataOf(Section::FolderGroups) + at;
+    return blockAt(Section::Folders, group, group + 4, block % blocksPerGroup);
+}
+
+std::uint32_t Segment::seenBeforeGroup(std::uint32_t group) const {
+    const std::uint64_t at = std::uint64_t{nameGroupBytes} * group;
+    require(Section::NameGroups, at, nameGroupBytes);
+    return loadLittle<std::uint32_t>(dataOf(Section::NameGroups) + at + 4);
+}
+
+}  // namespace tessel::archive

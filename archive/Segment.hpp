@@ -1,0 +1,126 @@
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <mutex>
+#include <span>
+
+#include "archive/BitLoad.hpp"
+#include "archive/Format.hpp"
+#include "archive/PieceVerifier.hpp"
+#include "archive/SegmentTables.hpp"
+
+namespace tessel::archive {
+
+// Segment gives access to the parts of one segment: it finds blocks and makes
+// sure that their bytes are sound before anyone reads them. It decodes
+// nothing but its tables.
+//
+// Ownership: borrows the segment's bytes.
+// Threads: const members from any number of threads.
+// Cost: one bit per piece; the tables are derived when they are first asked
+//   for.
+class Segment {
+public:
+    // Bytes of a block within its section, all of them sound.
+    struct Block {
+        std::uint32_t begin = 0;
+        std::uint32_t end = 0;
+    };
+    struct NameBlock : Block {
+        std::uint32_t seen = 0;  // folders named before the block
+    };
+
+    // Verifies head, checksums of all levels and the sections that every
+    // decoding needs. Throws DamagedArchiveException, whose offset counts from
+    // the start of the archive.
+    Segment(std::span<const std::uint8_t> archive, const SegmentEntry& entry);
+    ~Segment();
+    Segment(const Segment&) = delete;
+    Segment& operator=(const Segment&) = delete;
+
+    const SegmentHead& head() const noexcept { return head_; }
+    const SegmentEntry& entry() const noexcept { return entry_; }
+    const PieceVerifier& pieces() const noexcept { return pieces_; }
+    std::uint64_t size() const noexcept { return head_.paths; }
+    std::uint32_t nameBlocks() const noexcept { return nameBlocks_; }
+    std::uint32_t folderBlocks() const noexcept { return folderBlocks_; }
+
+    // Throws DamagedArchiveException, every time, if they break the rules.
+    const SegmentTables& tables() const {
+        // Acquire: what the thread that built the tables wrote is seen.
+        const auto* const tables = tables_.load(std::memory_order_acquire);
+        return tables != nullptr ? *tables : buildTables();
+    }
+
+    // ---- Sections ----
+
+    // The bytes of a section, sound or not.
+    const std::uint8_t* dataOf(Section section) const noexcept {
+        return pieces_.body().data() + offsetOf(section);
+    }
+    std::uint64_t bytesOf(Section section) const noexcept {
+        return head_.bytesOf(section);
+    }
+    std::uint64_t offsetOf(Section section) const noexcept {
+        return sectionOffsets_[static_cast<std::size_t>(section)];
+    }
+
+    // Makes sure that a stretch of a section is within it and sound.
+    void require(Section section, std::uint64_t begin,
+                 std::uint64_t bytes) const {
+        if (begin > bytesOf(section) || bytes > bytesOf(section) - begin)
+            [[unlikely]]
+            fail(section, begin, "A place is outside its section.");
+        pieces_.require(offsetOf(section) + begin,
+                        offsetOf(section) + begin + bytes);
+    }
+
+    // Throws DamagedArchiveException for a byte of a section.
+    [[noreturn]] void fail(Section section, std::uint64_t offset,
+                           const char* what) const;
+
+    // ---- Blocks ----
+
+    // Throw DamagedArchiveException. `block` must be below nameBlocks() or
+    // folderBlocks().
+    NameBlock nameBlock(std::uint32_t block) const;
+    Block folderBlock(std::uint32_t block) const;
+
+    // Folders named before the first block of a group of name blocks.
+    std::uint32_t seenBeforeGroup(std::uint32_t group) const;
+
+    // Ask the processor for what nameBlock and folderBlock will read.
+    void prefetchNameGroup(std::uint32_t block) const noexcept {
+        __builtin_prefetch(dataOf(Section::NameGroups) +
+                           nameGroupBytes * (block / blocksPerGroup));
+    }
+    void prefetchFolderGroup(std::uint32_t block) const noexcept {
+        __builtin_prefetch(dataOf(Section::FolderGroups) +
+                           folderGroupBytes * (block / blocksPerGroup));
+    }
+
+private:
+    Block blockAt(Section section, const std::uint8_t* group,
+                  const std::uint8_t* lengths, std::uint32_t inGroup) const;
+    Block wideBlockAt(Section section, std::uint32_t start,
+                      std::uint32_t wideGroup, std::uint32_t inGroup) const;
+    const SegmentTables& buildTables() const;
+    void checkSizes() const;
+
+    SegmentEntry entry_;
+    SegmentHead head_;
+    PieceVerifier pieces_;
+    std::array<std::uint64_t, sectionCount> sectionOffsets_{};
+    std::uint32_t nameBlocks_ = 0;
+    std::uint32_t folderBlocks_ = 0;
+
+    mutable std::mutex buildingTables_;
+    mutable std::unique_ptr<const SegmentTables> ownTables_;  // guarded by it
+    mutable std::atomic<const SegmentTables*> tables_ = nullptr;
+};
+
+}  // namespace tessel::archive

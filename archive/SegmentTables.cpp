@@ -1,0 +1,124 @@
+#include "archive/SegmentTables.hpp"
+
+#include <bit>
+#include <string>
+
+#include "archive/ArchiveExceptions.hpp"
+#include "packing/ByteCursor.hpp"
+
+namespace tessel::archive {
+namespace {
+
+using sixpacks::ByteCursor;
+
+void require(bool holds) {
+    if (!holds) throw DamagedFormException();
+}
+
+// Reads a count table whose symbols are the next entries of the token list.
+CodeCounts takeCounts(ByteCursor& cursor, std::uint32_t& entries,
+                      const TokenList& tokens) {
+    const CodeCounts counts = CodeCounts::unpack(cursor);
+    require(counts.size <= tokens.size() - entries);
+    entries += counts.size;
+    return counts;
+}
+
+template <class Table>
+Table takeTable(ByteCursor& cursor, unsigned symbols, unsigned maxBits) {
+    return Table(CodeLengths::unpack(cursor, symbols, maxBits));
+}
+
+std::span<const std::uint8_t> bytesOf(Section section, const SegmentHead& head,
+                                      std::span<const std::uint8_t> body) {
+    return body.subspan(head.offsetOf(section), head.bytesOf(section));
+}
+
+// Calls unpack; damage is told as damage of this section.
+template <class Unpack>
+void inSection(Section section, const SegmentHead& head,
+               std::span<const std::uint8_t> body, Unpack unpack) {
+    try {
+        unpack(bytesOf(section, head, body));
+    } catch (const DamagedFormException&) {
+        throw DamagedArchiveException(head.offsetOf(section),
+                                      "A table of codes breaks the rules.");
+    }
+}
+
+}  // namespace
+
+SegmentTables::SegmentTables(const SegmentHead& head,
+                             std::span<const std::uint8_t> body)
+    : tokens_{bytesOf(Section::TokenEntries, head, body),
+              bytesOf(Section::TokenText, head, body)} {
+    using Bytes = std::span<const std::uint8_t>;
+    const auto in = [&](Section section, auto unpack) {
+        inSection(section, head, body, unpack);
+    };
+    std::uint32_t entries = 0;
+    in(Section::TokenEntries, [&](Bytes) { tokens_.validate(); });
+    in(Section::TokenCodes,
+       [&](Bytes bytes) { unpackTokenCodes(bytes, entries); });
+    in(Section::FirstTokenCodes,
+       [&](Bytes bytes) { unpackFirstTokenCodes(bytes, entries); });
+    in(Section::TokenEntries,
+       [&](Bytes) { require(entries == tokens_.size()); });
+    in(Section::ReplacedCodes,
+       [&](Bytes bytes) { unpackReplacedCodes(bytes); });
+    in(Section::OperationCodes,
+       [&](Bytes bytes) { unpackOperationCodes(bytes); });
+}
+
+void SegmentTables::unpackTokenCodes(std::span<const std::uint8_t> section,
+                                     std::uint32_t& entries) {
+    ByteCursor cursor(section);
+    tokenCodes_.reserve(tokenContextCount);
+    for (unsigned context = 0; context < tokenContextCount; ++context) {
+        const std::uint32_t first = entries;
+        const CodeCounts counts = takeCounts(cursor, entries, tokens_);
+        const auto& contexts =
+            context < FolderStart ? nameContexts : folderContexts;
+        tokenCodes_.emplace_back(counts, first, tokens_, contexts);
+    }
+    require(cursor.empty());
+}
+
+void SegmentTables::unpackFirstTokenCodes(std::span<const std::uint8_t> section,
+                                          std::uint32_t& entries) {
+    ByteCursor cursor(section);
+    const auto present = cursor.take(32);
+    std::size_t count = 0;
+    for (const std::uint8_t bits : present)
+        count += static_cast<unsigned>(std::popcount(bits));
+    firstTokens_.reserve(count);  // pointers to its elements are kept
+    for (unsigned c = 0; c < 256; ++c) {
+        if ((present[c / 8] >> (c % 8) & 1U) == 0) continue;
+        const std::uint32_t first = entries;
+        const CodeCounts counts = takeCounts(cursor, entries, tokens_);
+        firstTokens_.push_back(
+            {static_cast<std::uint8_t>(c),
+             TokenCode<firstLookupBits>(counts, first, tokens_, nameContexts)});
+        firstTokenOf_[c] = &firstTokens_.back();
+    }
+    require(cursor.empty());
+}
+
+void SegmentTables::unpackReplacedCodes(std::span<const std::uint8_t> section) {
+    ByteCursor cursor(section);
+    for (ReplacedTable& code : replacedCodes_)
+        code = takeTable<ReplacedTable>(cursor, 256, maxReplacedCodeBits);
+    require(cursor.empty());
+}
+
+void SegmentTables::unpackOperationCodes(
+    std::span<const std::uint8_t> section) {
+    ByteCursor cursor(section);
+    for (unsigned context = 0; context < operationCodeCount; ++context)
+        operationCodes_[context] = takeTable<OperationTable>(
+            cursor, context == jumpCode ? jumpSymbols : operationCount,
+            maxOperationCodeBits);
+    require(cursor.empty());
+}
+
+}  // namespace tessel::archive
