@@ -39,7 +39,7 @@ void FolderDecoder::decodeNext() {
     const unsigned prefix = takePrefix();
     char* const out = folder_ + prefix;
     const unsigned context =
-        prefix == 0 ? FolderStart
+        prefix == 0 ? unsigned{FolderStart}
                     : folderContexts[static_cast<std::uint8_t>(out[-1])];
     const char* const end = takeTokens(context, folderContexts, out, limit_);
     length_ = static_cast<std::size_t>(end - folder_);

@@ -86,7 +86,7 @@ inline char* NameDecoder::takeShortened(unsigned prefix) {
         prefix == length_
             ? replacedEnd
             : replacedContexts[static_cast<std::uint8_t>(name_[prefix])];
-    std::uint64_t bits = word();
+    const std::uint64_t bits = word();
     const auto [byte, byteBits] = tables_->replacedCode(context).decode(bits);
     bit_ += byteBits;
     char* out = name_ + prefix;
@@ -102,10 +102,10 @@ inline char* NameDecoder::takeShortened(unsigned prefix) {
         next = nameContexts[first->byte];
     } else {
         out = append(token, out);
-        if (token.ends()) return out;
     }
     if (out > limit_) [[unlikely]]
         fail("A name is longer than the longest.");
+    if (token.ends()) return out;
     return takeTokens(next, nameContexts, out, limit_);
 }
 
@@ -114,8 +114,6 @@ inline void NameDecoder::next() {
     const char* const end =
         prefix == 0 ? takeTokens(NameStart, nameContexts, name_, limit_)
                     : takeShortened(prefix);
-    if (end > limit_) [[unlikely]]
-        fail("A name is longer than the longest.");
     length_ = static_cast<std::size_t>(end - name_);
 }
 

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "archive/ArchiveExceptions.hpp"
+#include "archive/CodeTables.hpp"
 #include "packing/ByteCursor.hpp"
 
 namespace tessel::archive {
@@ -16,17 +17,17 @@ void require(bool holds) {
 }
 
 // Reads a count table whose symbols are the next entries of the token list.
-CodeCounts takeCounts(ByteCursor& cursor, std::uint32_t& entries,
-                      const TokenList& tokens) {
-    const CodeCounts counts = CodeCounts::unpack(cursor);
-    require(counts.size <= tokens.size() - entries);
-    entries += counts.size;
-    return counts;
+CodePlaces takeCode(ByteCursor& cursor, std::uint32_t& entries,
+                    const TokenList& tokens) {
+    const auto counts = CountTable::unpack(cursor);
+    require(counts.symbols() <= tokens.size() - entries);
+    entries += static_cast<std::uint32_t>(counts.symbols());
+    return CodePlaces(counts);
 }
 
 template <class Table>
 Table takeTable(ByteCursor& cursor, unsigned symbols, unsigned maxBits) {
-    return Table(CodeLengths::unpack(cursor, symbols, maxBits));
+    return Table(LengthTable::unpack(cursor, symbols, maxBits));
 }
 
 std::span<const std::uint8_t> bytesOf(Section section, const SegmentHead& head,
@@ -76,10 +77,10 @@ void SegmentTables::unpackTokenCodes(std::span<const std::uint8_t> section,
     tokenCodes_.reserve(tokenContextCount);
     for (unsigned context = 0; context < tokenContextCount; ++context) {
         const std::uint32_t first = entries;
-        const CodeCounts counts = takeCounts(cursor, entries, tokens_);
+        const CodePlaces places = takeCode(cursor, entries, tokens_);
         const auto& contexts =
             context < FolderStart ? nameContexts : folderContexts;
-        tokenCodes_.emplace_back(counts, first, tokens_, contexts);
+        tokenCodes_.emplace_back(places, first, tokens_, contexts);
     }
     require(cursor.empty());
 }
@@ -95,10 +96,10 @@ void SegmentTables::unpackFirstTokenCodes(std::span<const std::uint8_t> section,
     for (unsigned c = 0; c < 256; ++c) {
         if ((present[c / 8] >> (c % 8) & 1U) == 0) continue;
         const std::uint32_t first = entries;
-        const CodeCounts counts = takeCounts(cursor, entries, tokens_);
+        const CodePlaces places = takeCode(cursor, entries, tokens_);
         firstTokens_.push_back(
             {static_cast<std::uint8_t>(c),
-             TokenCode<firstLookupBits>(counts, first, tokens_, nameContexts)});
+             TokenCode<firstLookupBits>(places, first, tokens_, nameContexts)});
         firstTokenOf_[c] = &firstTokens_.back();
     }
     require(cursor.empty());

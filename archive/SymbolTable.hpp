@@ -4,23 +4,10 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <vector>
 
-#include "packing/ByteCursor.hpp"
+#include "archive/CodeTables.hpp"
 
 namespace tessel::archive {
-
-// Code lengths of a fixed alphabet, as a length table stores them.
-struct CodeLengths {
-    unsigned first = 1;                 // the lowest symbol with a code
-    std::vector<std::uint8_t> lengths;  // from `first` on; 0: no code
-
-    // Reads one length table and advances past it. Throws DamagedFormException
-    // unless the lengths are those of a complete code, of a single symbol or
-    // of none, all at most maxBits and for symbols below symbolCount.
-    static CodeLengths unpack(sixpacks::ByteCursor& cursor,
-                              unsigned symbolCount, unsigned maxBits);
-};
 
 // A canonical Huffman code of at most maxBits per symbol, decoded by one
 // lookup.
@@ -39,12 +26,14 @@ public:
     };
 
     SymbolTable() noexcept { table_.fill(packed(noSymbol, 0)); }
-    explicit SymbolTable(const CodeLengths& code);
+    // The code must be complete, of a single symbol, or empty, with lengths of
+    // at most maxBits.
+    explicit SymbolTable(const LengthTable& code);
 
     // The symbol whose code is at the top of the word.
     Decoded decode(std::uint64_t word) const noexcept {
         const std::uint16_t entry = table_[word >> (64 - maxBits)];
-        return {entry >> 4U, entry & 15U};
+        return {std::uint32_t{entry} >> 4U, entry & 15U};
     }
 
 private:
@@ -57,14 +46,15 @@ private:
 };
 
 template <unsigned maxBits>
-SymbolTable<maxBits>::SymbolTable(const CodeLengths& code) : SymbolTable() {
-    if (code.lengths.size() == 1) table_.fill(packed(code.first, 0));
+SymbolTable<maxBits>::SymbolTable(const LengthTable& code) : SymbolTable() {
+    if (code.single()) table_.fill(packed(code.first, 0));
+    if (code.first >= code.last) return;
     auto next = table_.begin();
     for (unsigned bits = 1; bits <= maxBits; ++bits)
-        for (unsigned i = 0; i < code.lengths.size(); ++i)
-            if (code.lengths[i] == bits)
+        for (unsigned symbol = code.first; symbol <= code.last; ++symbol)
+            if (code.lengths[symbol] == bits)
                 next = std::fill_n(next, std::size_t{1} << (maxBits - bits),
-                                   packed(code.first + i, bits));
+                                   packed(symbol, bits));
 }
 
 }  // namespace tessel::archive

@@ -1,5 +1,9 @@
 #include "archive/TokenCode.hpp"
 
+#include <algorithm>
+
+#include "packing/ByteCursor.hpp"
+
 namespace tessel::archive {
 namespace {
 
@@ -9,58 +13,35 @@ void require(bool holds) {
     if (!holds) throw DamagedFormException();
 }
 
-std::uint32_t takeVarint(sixpacks::ByteCursor& cursor) {
-    std::uint64_t value = 0;
-    for (unsigned shift = 0; shift < 35; shift += 7) {
-        const std::uint8_t byte = cursor.takeByte();
-        value |= std::uint64_t{byte & 0x7FU} << shift;
-        if (byte < 0x80) {
-            require(value >> 32U == 0);
-            return static_cast<std::uint32_t>(value);
-        }
-    }
-    throw DamagedFormException();
-}
-
 }  // namespace
 
 void TokenList::validate() const {
     require(entries.size() % tokenEntryBytes == 0 &&
             entries.size() / tokenEntryBytes < maxEntries &&
-            text.size() <= maxTokenTextBytes);
+            text.size() <= maxTokenTextBytes &&
+            std::ranges::find(text, 0) == text.end());
     for (std::uint32_t i = 0; i < size(); ++i) {
         const TokenEntry checked = entry(i);
         require(checked.offset + checked.length <= text.size());
     }
 }
 
-// Codes count up through the lengths; each length doubles the code first.
-CodeCounts CodeCounts::unpack(sixpacks::ByteCursor& cursor) {
-    CodeCounts counts;
-    counts.longest = cursor.takeByte();
-    require(counts.longest <= maxTokenCodeBits);
-    if (counts.longest == 0) {
-        counts.size = 1;
-        counts.lastCode[0] = ~std::uint32_t{0};
-        return counts;
-    }
+// Codes count up within a length; each further length doubles them first.
+CodePlaces::CodePlaces(const CountTable& counts) noexcept {
+    if (counts.maxLength == 0) lastCode_[0] = ~std::uint32_t{0};
     std::uint64_t code = 0;
-    for (unsigned bits = 1; bits <= counts.longest; ++bits) {
-        const std::uint32_t count = takeVarint(cursor);
+    std::uint32_t place = 0;
+    for (unsigned bits = 1; bits <= counts.maxLength; ++bits) {
+        const std::uint32_t count = counts.counts[bits];
         code <<= 1U;
-        counts.placeOffset[bits] =
-            counts.size - static_cast<std::uint32_t>(code);
+        placeOffset_[bits] = place - static_cast<std::uint32_t>(code);
         code += count;
-        require(code <= std::uint64_t{1} << bits);
-        if (count > 0 && counts.shortest == 0) counts.shortest = bits;
-        if (counts.shortest > 0)
-            counts.lastCode[bits] =
+        place += count;
+        if (shortest_ == 0 && count > 0) shortest_ = bits;
+        if (shortest_ > 0)
+            lastCode_[bits] =
                 static_cast<std::uint32_t>((code << (32 - bits)) - 1);
-        counts.size += count;
-        require(bits < counts.longest || count > 0);
     }
-    require(code == std::uint64_t{1} << counts.longest);
-    return counts;
 }
 
 }  // namespace tessel::archive

@@ -6,9 +6,9 @@
 #include <span>
 
 #include "archive/BitLoad.hpp"
+#include "archive/CodeTables.hpp"
 #include "archive/Contexts.hpp"
 #include "archive/Format.hpp"
-#include "packing/ByteCursor.hpp"
 
 namespace tessel::archive {
 
@@ -46,7 +46,7 @@ struct TokenList {
     std::span<const std::uint8_t> text;
 
     // Throws DamagedFormException unless the entries are whole, fewer than
-    // 2^24, and within the text.
+    // 2^24 and within the text, and the text is without the byte 0.
     void validate() const;
 
     std::uint32_t size() const noexcept {
@@ -72,37 +72,37 @@ struct TokenList {
     }
 };
 
-// The numbers of codes per length of a canonical Huffman code, and from them
-// the place of a code's symbol in the order of codes.
+// Finds the place of a canonical code in the order of codes, from the numbers
+// of codes per length.
 //
-// Each code is complete: whatever bits come, they start with some code.
-struct CodeCounts {
-    std::uint32_t size = 0;  // symbols
-    unsigned shortest = 0;   // bits; 0 of a single symbol
-    unsigned longest = 0;
-    // By length: the last code, ones below it, and the place of the first
-    // symbol less its code (which may wrap).
-    std::array<std::uint32_t, maxTokenCodeBits + 1> lastCode{};
-    std::array<std::uint32_t, maxTokenCodeBits + 1> placeOffset{};
-
-    // Reads a count table and advances past it. Throws DamagedFormException
-    // if there is no such code.
-    static CodeCounts unpack(sixpacks::ByteCursor& cursor);
+// The code is complete: whatever bits come, they start with some code.
+class CodePlaces {
+public:
+    explicit CodePlaces(const CountTable& counts) noexcept;
 
     struct Decoded {
         std::uint32_t place;
         unsigned bits;
     };
 
-    // The symbol whose code, of at least `bits` and `shortest` bits, is at the
-    // top of the word.
-    Decoded decode(std::uint64_t word, unsigned bits) const noexcept {
+    // Bits of the shortest code; 0 of a single symbol.
+    unsigned shortest() const noexcept { return shortest_; }
+
+    // The code, of at least `bits` and shortest() bits, at the top of the word.
+    Decoded find(std::uint64_t word, unsigned bits) const noexcept {
         const auto top = static_cast<std::uint32_t>(word >> 32U);
-        while (top > lastCode[bits]) ++bits;
+        while (top > lastCode_[bits]) ++bits;
         const std::uint32_t code =
             bits == 0 ? 0 : static_cast<std::uint32_t>(word >> (64 - bits));
-        return {placeOffset[bits] + code, bits};
+        return {placeOffset_[bits] + code, bits};
     }
+
+private:
+    // By length: the last code, as the top of a word with ones after it; and
+    // the place of the first code less the code itself, which may wrap.
+    std::array<std::uint32_t, maxTokenCodeBits + 1> lastCode_{};
+    std::array<std::uint32_t, maxTokenCodeBits + 1> placeOffset_{};
+    unsigned shortest_ = 0;
 };
 
 // One code of tokens. Codes of at most lookupBits bits are decoded by one
@@ -115,9 +115,9 @@ struct CodeCounts {
 template <unsigned lookupBits>
 class TokenCode {
 public:
-    // The list must be valid and hold counts.size entries from `firstEntry`
+    // The list must be valid and hold all entries of the code from `firstEntry`
     // on. `contexts` must outlive this object.
-    TokenCode(const CodeCounts& counts, std::uint32_t firstEntry,
+    TokenCode(const CodePlaces& places, std::uint32_t firstEntry,
               const TokenList& tokens, const ContextTable& contexts);
 
     // The token whose code is at the top of the word.
@@ -130,12 +130,12 @@ public:
 
 private:
     Token decodeLong(std::uint64_t word) const noexcept {
-        const auto [place, bits] = counts_.decode(word, longFrom_);
+        const auto [place, bits] = places_.find(word, longFrom_);
         return tokens_->token(firstEntry_ + place, bits, *contexts_);
     }
 
     std::array<Token, std::size_t{1} << lookupBits> lookup_;
-    CodeCounts counts_;
+    CodePlaces places_;
     unsigned longFrom_;  // bits of the shortest code that is too long
     std::uint32_t firstEntry_;
     const TokenList* tokens_;
@@ -143,20 +143,20 @@ private:
 };
 
 template <unsigned lookupBits>
-TokenCode<lookupBits>::TokenCode(const CodeCounts& counts,
+TokenCode<lookupBits>::TokenCode(const CodePlaces& places,
                                  std::uint32_t firstEntry,
                                  const TokenList& tokens,
                                  const ContextTable& contexts)
-    : counts_(counts),
-      longFrom_(counts.shortest > lookupBits ? counts.shortest
-                                             : lookupBits + 1),
+    : places_(places),
+      longFrom_(places.shortest() > lookupBits ? places.shortest()
+                                               : lookupBits + 1),
       firstEntry_(firstEntry),
       tokens_(&tokens),
       contexts_(&contexts) {
     lookup_.fill(Token::tooLong());
     for (std::size_t next = 0; next < lookup_.size();) {
-        const auto [place, bits] = counts.decode(
-            std::uint64_t{next} << (64 - lookupBits), counts.shortest);
+        const auto [place, bits] = places.find(
+            std::uint64_t{next} << (64 - lookupBits), places.shortest());
         if (bits > lookupBits) return;
         const auto end = next + (std::size_t{1} << (lookupBits - bits));
         const Token token = tokens.token(firstEntry + place, bits, contexts);

@@ -4,11 +4,7 @@
 #include <system_error>
 #include <utility>
 
-namespace tessel {
-
-const char* CancelledException::what() const noexcept { return "cancelled"; }
-
-namespace archive {
+namespace tessel::archive {
 
 Workers::Workers(unsigned threads, std::stop_token cancel)
     : cancel_(std::move(cancel)) {
@@ -83,5 +79,4 @@ void Workers::doSteps(unsigned worker) noexcept {
     }
 }
 
-}  // namespace archive
-}  // namespace tessel
+}  // namespace tessel::archive

@@ -10,15 +10,9 @@
 #include <thread>
 #include <vector>
 
-namespace tessel {
+#include "archive/ArchiveExceptions.hpp"
 
-// The work was cancelled through its stop token. Nothing was changed.
-class CancelledException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-namespace archive {
+namespace tessel::archive {
 
 // A few threads that share out the steps of one loop at a time.
 //
@@ -71,5 +65,4 @@ private:
     std::vector<std::thread> threads_;
 };
 
-}  // namespace archive
-}  // namespace tessel
+}  // namespace tessel::archive
