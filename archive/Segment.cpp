@@ -168,6 +168,17 @@ Segment::Block Segment::folderBlock(std::uint32_t block) const {
     return blockAt(Section::Folders, group, group + 4, block % blocksPerGroup);
 }
 
+void Segment::prefetchFolder(std::uint32_t folder) const noexcept {
+    if (folder >= head_.folders) return;
+    const std::uint32_t block = folder / head_.foldersPerBlock;
+    const std::uint8_t* const group =
+        dataOf(Section::FolderGroups) +
+        std::size_t{folderGroupBytes} * (block / blocksPerGroup);
+    prefetchTwoLines(Section::Folders,
+                     std::uint64_t{loadLittle<std::uint32_t>(group)} +
+                         sumOfFirst(group + 4, block % blocksPerGroup));
+}
+
 std::uint32_t Segment::seenBeforeGroup(std::uint32_t group) const {
     const std::uint64_t at = std::uint64_t{nameGroupBytes} * group;
     require(Section::NameGroups, at, nameGroupBytes);

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cstddef>
@@ -93,21 +94,31 @@ public:
     // Folders named before the first block of a group of name blocks.
     std::uint32_t seenBeforeGroup(std::uint32_t group) const;
 
-    // Ask the processor for what nameBlock and folderBlock will read.
+    // ---- Hints ----
+
+    // Ask the processor for what will be read soon. They check nothing, change
+    // nothing and may be left out.
     void prefetchNameGroup(std::uint32_t block) const noexcept {
         __builtin_prefetch(dataOf(Section::NameGroups) +
                            nameGroupBytes * (block / blocksPerGroup));
     }
-    void prefetchFolderGroup(std::uint32_t block) const noexcept {
-        __builtin_prefetch(dataOf(Section::FolderGroups) +
-                           folderGroupBytes * (block / blocksPerGroup));
+    void prefetchNames(const Block& block) const noexcept {
+        prefetchTwoLines(Section::Names, block.begin);
     }
+    void prefetchFolder(std::uint32_t folder) const noexcept;
 
 private:
     Block blockAt(Section section, const std::uint8_t* group,
                   const std::uint8_t* lengths, std::uint32_t inGroup) const;
     Block wideBlockAt(Section section, std::uint32_t start,
                       std::uint32_t wideGroup, std::uint32_t inGroup) const;
+    void prefetchTwoLines(Section section,
+                          std::uint64_t offset) const noexcept {
+        const std::uint8_t* const line =
+            dataOf(section) + std::min(offset, bytesOf(section));
+        __builtin_prefetch(line);
+        __builtin_prefetch(line + 64);
+    }
     const SegmentTables& buildTables() const;
     void checkSizes() const;
 
