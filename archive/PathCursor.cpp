@@ -32,10 +32,7 @@ void PathCursor::startBlockOf(std::uint64_t place) {
     const auto block = static_cast<std::uint32_t>(place / perBlock_);
     const std::uint64_t start = std::uint64_t{block} * perBlock_;
     const Segment::NameBlock found = segment_.nameBlock(block);
-    if (start != blockEnd_) {  // not simply the next one
-        segment_.prefetchNames(found);
-        segment_.prefetchFolder(found.seen - 1);
-    }
+    if (start != blockEnd_) segment_.prefetchBlock(found);  // not the next one
     next_ = start;
     blockEnd_ = std::min<std::uint64_t>(start + perBlock_, segment_.size());
     names_.start(found);

@@ -1,5 +1,7 @@
 #include "archive/Segment.hpp"
 
+#include <algorithm>
+
 #include "archive/ArchiveExceptions.hpp"
 #include "packing/ByteCursor.hpp"
 
@@ -151,38 +153,65 @@ Segment::Block Segment::blockAt(Section section, const std::uint8_t* group,
 
 Segment::NameBlock Segment::nameBlock(std::uint32_t block) const {
     const std::uint32_t inGroup = block % blocksPerGroup;
-    const std::uint64_t at =
-        std::uint64_t{nameGroupBytes} * (block / blocksPerGroup);
-    require(Section::NameGroups, at, nameGroupBytes);
-    const std::uint8_t* const group = dataOf(Section::NameGroups) + at;
+    const std::uint8_t* const group = nameGroup(block);
+    requireGroup(Section::NameGroups, block, nameGroupBytes);
     const Block bytes = blockAt(Section::Names, group, group + 24, inGroup);
     return {bytes, loadLittle<std::uint32_t>(group + 4) +
                        sumOfFirst(group + 8, inGroup)};
 }
 
 Segment::Block Segment::folderBlock(std::uint32_t block) const {
-    const std::uint64_t at =
-        std::uint64_t{folderGroupBytes} * (block / blocksPerGroup);
-    require(Section::FolderGroups, at, folderGroupBytes);
-    const std::uint8_t* const group = dataOf(Section::FolderGroups) + at;
+    const std::uint8_t* const group = folderGroup(block);
+    requireGroup(Section::FolderGroups, block, folderGroupBytes);
     return blockAt(Section::Folders, group, group + 4, block % blocksPerGroup);
 }
 
-void Segment::prefetchFolder(std::uint32_t folder) const noexcept {
+std::uint32_t Segment::seenBefore(std::uint32_t block) const {
+    requireGroup(Section::NameGroups, block, nameGroupBytes);
+    const std::uint8_t* const group = nameGroup(block);
+    return loadLittle<std::uint32_t>(group + 4) +
+           sumOfFirst(group + 8, block % blocksPerGroup);
+}
+
+// ---- Hints ----
+
+void Segment::prefetchTwoLines(Section section,
+                               std::uint64_t offset) const noexcept {
+    const std::uint8_t* const line =
+        dataOf(section) + std::min(offset, bytesOf(section));
+    __builtin_prefetch(line);
+    __builtin_prefetch(line + 64);
+}
+
+void Segment::prefetchFolderLines(std::uint32_t folder) const noexcept {
     if (folder >= head_.folders) return;
     const std::uint32_t block = folder / head_.foldersPerBlock;
-    const std::uint8_t* const group =
-        dataOf(Section::FolderGroups) +
-        std::size_t{folderGroupBytes} * (block / blocksPerGroup);
+    const std::uint8_t* const group = folderGroup(block);
     prefetchTwoLines(Section::Folders,
                      std::uint64_t{loadLittle<std::uint32_t>(group)} +
                          sumOfFirst(group + 4, block % blocksPerGroup));
 }
 
-std::uint32_t Segment::seenBeforeGroup(std::uint32_t group) const {
-    const std::uint64_t at = std::uint64_t{nameGroupBytes} * group;
-    require(Section::NameGroups, at, nameGroupBytes);
-    return loadLittle<std::uint32_t>(dataOf(Section::NameGroups) + at + 4);
+// The folder that the block starts in is the most likely one.
+void Segment::prefetchNames(std::uint32_t block) const noexcept {
+    const std::uint8_t* const group = nameGroup(block);
+    prefetchTwoLines(Section::Names,
+                     std::uint64_t{loadLittle<std::uint32_t>(group)} +
+                         sumOfFirst(group + 24, block % blocksPerGroup));
+    const auto seen = loadLittle<std::uint32_t>(group + 4);
+    if (seen < head_.folders)
+        __builtin_prefetch(folderGroup(seen / head_.foldersPerBlock));
+}
+
+void Segment::prefetchFolder(std::uint32_t nameBlock) const noexcept {
+    const std::uint8_t* const group = nameGroup(nameBlock);
+    prefetchFolderLines(loadLittle<std::uint32_t>(group + 4) +
+                        sumOfFirst(group + 8, nameBlock % blocksPerGroup) - 1);
+}
+
+void Segment::prefetchBlock(const NameBlock& block) const noexcept {
+    prefetchTwoLines(Section::Names, block.begin);
+    prefetchFolderLines(block.seen - 1);
 }
 
 }  // namespace tessel::archive

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cstddef>
@@ -91,34 +90,44 @@ public:
     NameBlock nameBlock(std::uint32_t block) const;
     Block folderBlock(std::uint32_t block) const;
 
-    // Folders named before the first block of a group of name blocks.
-    std::uint32_t seenBeforeGroup(std::uint32_t group) const;
+    // Folders named before a name block, without a look at the block.
+    std::uint32_t seenBefore(std::uint32_t block) const;
 
     // ---- Hints ----
 
-    // Ask the processor for what will be read soon. They check nothing, change
-    // nothing and may be left out.
+    // Ask the processor for what will be read soon, in this order, some paths
+    // apart: each reads what the one before has fetched. They check nothing,
+    // change nothing and may be left out.
     void prefetchNameGroup(std::uint32_t block) const noexcept {
-        __builtin_prefetch(dataOf(Section::NameGroups) +
-                           nameGroupBytes * (block / blocksPerGroup));
+        __builtin_prefetch(nameGroup(block));
     }
-    void prefetchNames(const Block& block) const noexcept {
-        prefetchTwoLines(Section::Names, block.begin);
-    }
-    void prefetchFolder(std::uint32_t folder) const noexcept;
+    void prefetchNames(std::uint32_t block) const noexcept;
+    void prefetchFolder(std::uint32_t nameBlock) const noexcept;
+
+    // The same for a block that is already found.
+    void prefetchBlock(const NameBlock& block) const noexcept;
 
 private:
+    // The group of a block, sound or not.
+    const std::uint8_t* nameGroup(std::uint32_t block) const noexcept {
+        return dataOf(Section::NameGroups) +
+               std::size_t{nameGroupBytes} * (block / blocksPerGroup);
+    }
+    const std::uint8_t* folderGroup(std::uint32_t block) const noexcept {
+        return dataOf(Section::FolderGroups) +
+               std::size_t{folderGroupBytes} * (block / blocksPerGroup);
+    }
+    void requireGroup(Section section, std::uint32_t block,
+                      std::size_t groupBytes) const {
+        require(section, groupBytes * (block / blocksPerGroup), groupBytes);
+    }
+
     Block blockAt(Section section, const std::uint8_t* group,
                   const std::uint8_t* lengths, std::uint32_t inGroup) const;
     Block wideBlockAt(Section section, std::uint32_t start,
                       std::uint32_t wideGroup, std::uint32_t inGroup) const;
-    void prefetchTwoLines(Section section,
-                          std::uint64_t offset) const noexcept {
-        const std::uint8_t* const line =
-            dataOf(section) + std::min(offset, bytesOf(section));
-        __builtin_prefetch(line);
-        __builtin_prefetch(line + 64);
-    }
+    void prefetchTwoLines(Section section, std::uint64_t offset) const noexcept;
+    void prefetchFolderLines(std::uint32_t folder) const noexcept;
     const SegmentTables& buildTables() const;
     void checkSizes() const;
 
