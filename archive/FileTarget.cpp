@@ -1,0 +1,164 @@
+#include "archive/FileTarget.hpp"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <filesystem>
+#include <random>
+#include <system_error>
+
+namespace tessel::archive {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::string_view suffix = ".tmp";
+constexpr std::size_t randomLetters = 6;
+// Leaves room for the rest of the name below the usual limit of 255.
+constexpr std::size_t maxNameInPrefix = 200;
+
+[[noreturn]] void fail(const std::string& file) {
+    throw std::system_error(errno, std::generic_category(), file);
+}
+
+// The file that is to be replaced: the target, or what it links to.
+std::string replacedFile(const std::string& file) {
+    if (!fs::is_symlink(fs::symlink_status(file))) return file;
+    return fs::weakly_canonical(file).string();
+}
+
+std::string randomName() {
+    constexpr std::string_view letters =
+        "abcdefghijklmnopqrstuvwxyz0123456789";
+    std::random_device source;
+    std::uniform_int_distribution<std::size_t> choose(0, letters.size() - 1);
+    std::string name(randomLetters, ' ');
+    for (char& letter : name) letter = letters[choose(source)];
+    return name;
+}
+
+bool isHiddenName(std::string_view name, std::string_view prefix) {
+    return name.size() == prefix.size() + randomLetters + suffix.size() &&
+           name.starts_with(prefix) && name.ends_with(suffix);
+}
+
+// Removes a hidden file unless its writer still holds its lock.
+void removeIfLeft(const fs::path& path) {
+    const int descriptor =
+        ::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW);
+    if (descriptor < 0) return;
+    if (::flock(descriptor, LOCK_EX | LOCK_NB) == 0) ::unlink(path.c_str());
+    ::close(descriptor);
+}
+
+// What killed writers of the same target left behind. Nothing here is worth
+// an error: the next writer tries again.
+void removeLeftovers(const std::string& folder, std::string_view prefix) {
+    std::error_code ignored;
+    for (const fs::directory_entry& entry :
+         fs::directory_iterator(folder, ignored))
+        if (isHiddenName(entry.path().filename().string(), prefix))
+            removeIfLeft(entry.path());
+}
+
+}  // namespace
+
+FileTarget::FileTarget(const std::string& file) : file_(replacedFile(file)) {
+    struct stat status {};
+    if (::stat(file_.c_str(), &status) == 0 && !S_ISREG(status.st_mode)) {
+        errno = S_ISDIR(status.st_mode) ? EISDIR : EINVAL;
+        fail(file_);
+    }
+    const std::size_t nameAt = file_.rfind('/') + 1;
+    folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
+    prefix_ = "." + file_.substr(nameAt, maxNameInPrefix) + ".tessel-";
+    removeLeftovers(folder_, prefix_);
+    createTemporary();
+}
+
+FileTarget::~FileTarget() {
+    if (descriptor_ < 0) return;
+    if (!temporary_.empty()) ::unlink(temporary_.c_str());
+    ::close(descriptor_);
+}
+
+void FileTarget::createTemporary() {
+    while (!tryCreate()) {
+    }
+    try {
+        takePermissions();
+    } catch (...) {
+        ::unlink(temporary_.c_str());
+        ::close(descriptor_);
+        throw;
+    }
+}
+
+// False if somebody else has the name, or took the file for a leftover before
+// it was locked.
+bool FileTarget::tryCreate() {
+    temporary_ = folder_ + prefix_ + randomName();
+    temporary_ += suffix;
+    descriptor_ = ::open(temporary_.c_str(),
+                         O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+    if (descriptor_ < 0) {
+        if (errno == EEXIST) return false;
+        fail(temporary_);
+    }
+    struct stat status {};
+    if (::flock(descriptor_, LOCK_EX | LOCK_NB) == 0 &&
+        ::fstat(descriptor_, &status) == 0 && status.st_nlink > 0)
+        return true;
+    ::close(descriptor_);
+    descriptor_ = -1;
+    return false;
+}
+
+void FileTarget::takePermissions() const {
+    struct stat old {};
+    if (::stat(file_.c_str(), &old) != 0) return;
+    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0) fail(temporary_);
+}
+
+void FileTarget::append(Bytes bytes) {
+    write(bytes, size_);
+    size_ += bytes.size();
+}
+
+void FileTarget::rewriteStart(Bytes bytes) { write(bytes, 0); }
+
+void FileTarget::write(Bytes bytes, std::uint64_t offset) const {
+    while (!bytes.empty()) {
+        const ssize_t written =
+            ::pwrite(descriptor_, bytes.data(), bytes.size(),
+                     static_cast<off_t>(offset));
+        if (written < 0) {
+            if (errno == EINTR) continue;
+            fail(temporary_);
+        }
+        bytes = bytes.subspan(static_cast<std::size_t>(written));
+        offset += static_cast<std::uint64_t>(written);
+    }
+}
+
+void FileTarget::commit() {
+    if (::fsync(descriptor_) != 0) fail(temporary_);
+    if (::rename(temporary_.c_str(), file_.c_str()) != 0) fail(file_);
+    temporary_.clear();
+    flushFolder();
+}
+
+// Some file systems cannot flush a folder; the rename is done all the same.
+void FileTarget::flushFolder() const {
+    const int folder =
+        ::open(folder_.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (folder < 0) return;
+    ::fsync(folder);
+    ::close(folder);
+}
+
+}  // namespace tessel::archive
