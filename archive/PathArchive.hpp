@@ -13,21 +13,16 @@
 
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/FunctionRef.hpp"
+#include "archive/NumberRange.hpp"
 #include "archive/PathVisitor.hpp"
 #include "archive/ScanOptions.hpp"
 
 namespace tessel {
 
+namespace archive {
 class ArchiveReader;
 class SequentialReader;
-
-// Numbers from begin up to, but without, end.
-struct NumberRange {
-    std::uint64_t begin = 0;
-    std::uint64_t end = 0;
-
-    friend bool operator==(const NumberRange&, const NumberRange&) = default;
-};
+}  // namespace archive
 
 struct FindOptions : ScanOptions {
     // If set, only paths below this folder are looked at, as
@@ -236,9 +231,10 @@ public:
     ArchiveInfo info() const;
 
 private:
-    explicit PathArchive(std::shared_ptr<const ArchiveReader> reader) noexcept;
+    explicit PathArchive(
+        std::shared_ptr<const archive::ArchiveReader> reader) noexcept;
 
-    std::shared_ptr<const ArchiveReader> reader_;
+    std::shared_ptr<const archive::ArchiveReader> reader_;
 };
 
 // Reads an archive's paths one by one; made by PathArchive::begin. It keeps
@@ -272,9 +268,9 @@ public:
 
 private:
     friend class PathArchive;
-    explicit Iterator(std::shared_ptr<const ArchiveReader> reader);
+    explicit Iterator(std::shared_ptr<const archive::ArchiveReader> reader);
 
-    std::unique_ptr<SequentialReader> paths_;
+    std::unique_ptr<archive::SequentialReader> paths_;
     std::string_view path_;
     std::uint64_t number_ = 0;
     std::uint64_t size_ = 0;

@@ -53,7 +53,12 @@ public:
     }
 
     std::string_view name() const noexcept { return names_.name(); }
-    std::uint32_t folderNumber() const noexcept { return names_.folder(); }
+    // Below the number of folders. Throws DamagedArchiveException.
+    std::uint32_t folderNumber() const {
+        if (names_.folder() >= segment_.head().folders) [[unlikely]]
+            segment_.fail(Section::Names, 0, "A name has no folder.");
+        return names_.folder();
+    }
     std::uint32_t foldersSeen() const noexcept { return names_.seen(); }
 
     // The folder of the name, with its final '/', if any.

@@ -156,8 +156,13 @@ Segment::NameBlock Segment::nameBlock(std::uint32_t block) const {
     const std::uint8_t* const group = nameGroup(block);
     requireGroup(Section::NameGroups, block, nameGroupBytes);
     const Block bytes = blockAt(Section::Names, group, group + 24, inGroup);
-    return {bytes, loadLittle<std::uint32_t>(group + 4) +
-                       sumOfFirst(group + 8, inGroup)};
+    const std::uint32_t seen =
+        loadLittle<std::uint32_t>(group + 4) + sumOfFirst(group + 8, inGroup);
+    if (seen > head_.folders)
+        fail(Section::NameGroups,
+             std::uint64_t{nameGroupBytes} * (block / blocksPerGroup),
+             "A group has seen more folders than there are.");
+    return {bytes, seen};
 }
 
 Segment::Block Segment::folderBlock(std::uint32_t block) const {

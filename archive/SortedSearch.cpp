@@ -1,7 +1,6 @@
 #include "archive/SortedSearch.hpp"
 
 #include <algorithm>
-#include <cstring>
 
 namespace tessel::archive {
 namespace {
@@ -61,7 +60,8 @@ bool SortedSearch::startsBefore(const Target& target,
                                 const Candidate& candidate) {
     const std::string_view folder = candidate.folder;
     const std::size_t shared = std::min(folder.size(), target.path.size());
-    const int order = std::memcmp(folder.data(), target.path.data(), shared);
+    const int order =
+        folder.substr(0, shared).compare(target.path.substr(0, shared));
     if (order != 0) return order < 0;
     if (folder.size() >= target.path.size()) return false;
     const std::string_view rest = target.path.substr(folder.size());

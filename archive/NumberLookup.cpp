@@ -1,0 +1,115 @@
+#include "archive/NumberLookup.hpp"
+
+#include <algorithm>
+#include <string>
+
+#include "archive/GivenOrderSearch.hpp"
+#include "archive/PackedNumbers.hpp"
+#include "archive/SortedSearch.hpp"
+
+namespace tessel::archive {
+namespace {
+
+bool hasIndex(const Segment& segment) noexcept {
+    return segment.bytesOf(Section::Index) > 0;
+}
+
+// Calls visit with each number whose place is within the range, in ascending
+// order, until it returns false.
+template <class Visit>
+void scanOrder(const Segment& segment, NumberRange places, Visit visit) {
+    const PackedNumbers order(segment, Section::Order);
+    for (std::uint64_t number = 0; number < segment.size(); ++number)
+        if (order.at(number) - places.begin < places.end - places.begin &&
+            !visit(number))
+            return;
+}
+
+// ---- One segment; numbers count from its first ----
+
+std::uint64_t placeOfFirst(const Segment& segment, std::string_view path) {
+    return segment.head().order == ListOrder::AsGiven
+               ? GivenOrderSearch(segment).find(path)
+               : SortedSearch(segment).find(path);
+}
+
+std::uint64_t numberAt(const Segment& segment, std::uint64_t place) {
+    if (isInPlace(segment)) return place;
+    if (hasIndex(segment))
+        return PackedNumbers(segment, Section::Index).at(place);
+    std::uint64_t found = 0;
+    scanOrder(segment, {place, place + 1}, [&](std::uint64_t number) {
+        found = number;
+        return false;
+    });
+    return found;
+}
+
+// The places of all paths that start with the prefix, "" or ending with '/'.
+std::vector<NumberRange> placesBelow(const Segment& segment,
+                                     std::string_view prefix) {
+    if (prefix.empty()) return {{0, segment.size()}};
+    if (segment.head().order == ListOrder::AsGiven)
+        return GivenOrderSearch(segment).startingWith(prefix);
+    SortedSearch search(segment);
+    std::string after(prefix);
+    ++after.back();  // the least string above all that start with the prefix
+    return {{search.lowerBound(prefix), search.lowerBound(after)}};
+}
+
+std::vector<std::uint64_t> indexedNumbers(const Segment& segment,
+                                          NumberRange places) {
+    const PackedNumbers index(segment, Section::Index);
+    std::vector<std::uint64_t> numbers;
+    numbers.reserve(places.end - places.begin);
+    for (std::uint64_t place = places.begin; place < places.end; ++place)
+        numbers.push_back(index.at(place));
+    std::ranges::sort(numbers);
+    return numbers;
+}
+
+// A scan of the whole order costs as much as sorting a part of it.
+constexpr std::uint64_t worthSorting = 16;
+
+void appendNumbers(const Segment& segment, NumberRange places,
+                   std::vector<NumberRange>& out) {
+    const std::uint64_t first = segment.entry().firstNumber;
+    const auto append = [&](std::uint64_t number) {
+        appendRange(out, {first + number, first + number + 1});
+        return true;
+    };
+    if (places.begin >= places.end) return;
+    if (isInPlace(segment))
+        appendRange(out, {first + places.begin, first + places.end});
+    else if (hasIndex(segment) &&
+             (places.end - places.begin) * worthSorting < segment.size())
+        std::ranges::for_each(indexedNumbers(segment, places), append);
+    else
+        scanOrder(segment, places, append);
+}
+
+}  // namespace
+
+std::optional<std::uint64_t> numberOf(const ArchiveReader& archive,
+                                      std::string_view path) {
+    for (std::size_t i = 0; i < archive.segmentCount(); ++i) {
+        const Segment& segment = archive.segment(i);
+        const std::uint64_t place = placeOfFirst(segment, path);
+        if (place < segment.size())
+            return segment.entry().firstNumber + numberAt(segment, place);
+    }
+    return std::nullopt;
+}
+
+std::vector<NumberRange> numbersBelow(const ArchiveReader& archive,
+                                      std::string_view folder) {
+    std::string prefix(folder);
+    if (!prefix.empty() && prefix.back() != '/') prefix += '/';
+    std::vector<NumberRange> found;
+    for (std::size_t i = 0; i < archive.segmentCount(); ++i)
+        for (const NumberRange places : placesBelow(archive.segment(i), prefix))
+            appendNumbers(archive.segment(i), places, found);
+    return found;
+}
+
+}  // namespace tessel::archive
