@@ -6,11 +6,12 @@
 #include <stdexcept>
 #include <utility>
 
+#include "archive/ArchiveBytes.hpp"
+#include "archive/ArchiveReader.hpp"
 #include "archive/ArchiveTarget.hpp"
 #include "archive/FileMapping.hpp"
 #include "archive/FileTarget.hpp"
 #include "archive/Format.hpp"
-#include "archive/PathArchive.hpp"
 #include "archive/SegmentDirectory.hpp"
 #include "archive/SegmentList.hpp"
 #include "archive/SegmentWriter.hpp"
@@ -181,20 +182,25 @@ ArchiveWriter ArchiveWriter::append(std::vector<std::uint8_t>& archive,
     return ArchiveWriter(std::move(impl));
 }
 
-// The old file is only replaced at the end, so it can be read meanwhile.
+// The old archive is replaced at the end only, so it can be read meanwhile.
 void ArchiveWriter::repack(const std::string& file, ArchiveOptions options) {
-    const PathArchive old = PathArchive::open(file);
+    const ArchiveReader old{ArchiveBytes(FileMapping(file))};
     ArchiveWriter writer(file, std::move(options));
-    old.forEach([&](std::uint64_t, std::string_view path) { writer.add(path); });
+    writer.addAllOf(old);
     writer.finish();
 }
 
 void ArchiveWriter::repack(std::vector<std::uint8_t>& archive,
                            ArchiveOptions options) {
-    const PathArchive old = PathArchive::over(archive);
+    const ArchiveReader old{ArchiveBytes(std::span(std::as_const(archive)))};
     ArchiveWriter writer(archive, std::move(options));
-    old.forEach([&](std::uint64_t, std::string_view path) { writer.add(path); });
+    writer.addAllOf(old);
     writer.finish();
+}
+
+void ArchiveWriter::addAllOf(const ArchiveReader& old) {
+    old.read(0, old.size(),
+             [this](std::uint64_t, std::string_view path) { add(path); });
 }
 
 void ArchiveWriter::add(std::string_view path) { impl_->add(path); }

@@ -12,6 +12,10 @@
 
 namespace tessel {
 
+namespace archive {
+class ArchiveReader;
+}
+
 // Writes a list of paths as an archive, to a file or to memory.
 //
 //     tessel::ArchiveWriter writer("paths.tessel");
@@ -89,6 +93,7 @@ public:
 private:
     class Impl;
     explicit ArchiveWriter(std::unique_ptr<Impl> impl) noexcept;
+    void addAllOf(const archive::ArchiveReader& old);
 
     std::unique_ptr<Impl> impl_;
 };
