@@ -107,24 +107,17 @@ TokenTrie::Base TokenTrie::Builder::place(Node node) {
 
 TokenTrie::Base TokenTrie::Builder::findBase(
     std::span<const std::uint8_t> labels) {
-    // Few children go into gaps, many to the end, where gaps are wide. A
-    // search that takes long moves its start, and leaves some gaps behind.
-    const bool few = labels.size() <= 3;
+    // Few children go into gaps, many to the end, where gaps are wide. Gaps
+    // that a long search found no use for are left behind.
     constexpr std::size_t longSearch = 64;
+    const bool few = labels.size() <= 3;
     std::size_t& start = few ? firstFree_ : roomyFrom_;
-    std::size_t tries = 0;
     for (std::size_t slot = start;; ++slot) {
-        if (slot >= trie_.slots_.size()) grow();
-        if (!isFree(slot)) {
-            if (slot == start) ++start;
-            continue;
-        }
+        if (slot == trie_.slots_.size()) grow();
         const Base base = static_cast<Base>(slot) ^ labels.front();
-        if (!baseUsed_[base] && fits(base, labels)) {
-            if (!few) start = std::max(start, slot - std::min(slot, longSearch));
-            return base;
-        }
-        if (few && ++tries > longSearch) start = slot;
+        if (!isFree(slot) || baseUsed_[base] || !fits(base, labels)) continue;
+        if (slot > start + longSearch) start = few ? slot : slot - longSearch;
+        return base;
     }
 }
 
