@@ -35,13 +35,22 @@ public:
     void parse(const Piece& piece, std::vector<TokenRef>& out);
 
 private:
-    // The cheapest known way to a place.
-    struct Place {
-        std::uint32_t cost;
-        std::uint8_t length;  // of the last step
-        bool literal;         // what the last step is
-        std::uint32_t token;
-    };
+    // The cheapest known way to a place, as one number, so that the cheaper of
+    // two is the lesser: | cost (32 bits) | its last step (32 bits) |. A step
+    // is | length (5 bits) | literal (1 bit) | token or byte (26 bits) |.
+    using Way = std::uint64_t;
+    static constexpr unsigned costShift = 32;
+    static constexpr unsigned lengthShift = 27;
+    static constexpr std::uint32_t literalFlag = std::uint32_t{1} << 26;
+    static constexpr Way unreached = Way{1} << 62;
+
+    static std::uint32_t costOf(Way way) {
+        return static_cast<std::uint32_t>(way >> costShift);
+    }
+    static Way wayOf(std::uint32_t cost, std::uint32_t length,
+                     std::uint32_t step) {
+        return Way{cost} << costShift | (length << lengthShift | step);
+    }
 
     void parseGreedily(const Piece& piece, std::vector<TokenRef>& out) const;
     void reset(std::uint32_t length);
@@ -52,7 +61,7 @@ private:
 
     const TokenModel& model_;
     ParseEffort effort_;
-    std::vector<Place> places_;
+    std::vector<Way> ways_;  // [place], and some beyond the end
 };
 
 }  // namespace tessel::archive

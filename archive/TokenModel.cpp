@@ -23,7 +23,7 @@ std::uint32_t costOf(double bits) {
 
 std::uint8_t tokenCost(double bits) {
     return static_cast<std::uint8_t>(
-        std::min<std::uint32_t>(costOf(bits), TokenModel::noCode - 1));
+        std::min<std::uint32_t>(costOf(bits), TokenModel::unexpected - 1));
 }
 
 double literalBits(std::uint64_t total, std::uint64_t literals,
@@ -43,6 +43,9 @@ struct TokenModel::Kept {
     std::uint32_t of(std::size_t token, std::size_t context) const {
         return counts[token * contextSlots + context];
     }
+
+    // Tokens that some context keeps.
+    std::vector<std::uint32_t> mostUsedFirst() const;
 
     std::vector<std::uint32_t> counts;
     std::array<std::uint64_t, contextSlots> totals{};
@@ -76,6 +79,19 @@ TokenModel::Kept::Kept(const std::vector<std::string>& tokens,
     }
 }
 
+std::vector<std::uint32_t> TokenModel::Kept::mostUsedFirst() const {
+    std::vector<std::uint64_t> uses(counts.size() / contextSlots);
+    for (std::size_t i = 0; i < counts.size(); ++i)
+        uses[i / contextSlots] += counts[i];
+    std::vector<std::uint32_t> order;
+    for (std::uint32_t t = 0; t < uses.size(); ++t)
+        if (uses[t] > 0) order.push_back(t);
+    std::ranges::stable_sort(order, [&](std::uint32_t a, std::uint32_t b) {
+        return uses[a] > uses[b];
+    });
+    return order;
+}
+
 TokenModel::TokenModel(const std::vector<std::string>& tokens,
                        const TokenUses& uses, double minUses) {
     const Kept kept(tokens, uses, minUses);
@@ -88,28 +104,28 @@ TokenModel::TokenModel(const std::vector<std::string>& tokens,
         firstLiteralCosts_[b] =
             costOf(literalBits(kept.firstTotals[b], kept.firstLiterals[b],
                                maxFirstLiteralBits));
-    for (std::size_t t = 0; t < tokens.size(); ++t) {
-        std::array<std::uint8_t, contextSlots> row{};
-        row.fill(noCode);
-        for (std::size_t c = 0; c < contextSlots; ++c) {
-            const std::uint32_t count = kept.of(t, c);
-            if (count == 0) continue;
-            const bool isFirst = c == firstTokenContext;
-            const std::uint64_t total =
-                isFirst ? kept.firstTotals[static_cast<std::uint8_t>(
-                              tokens[t].front())]
-                        : kept.totals[c];
-            row[c] = tokenCost(
-                std::max(isFirst ? minFirstTokenBits : minTokenBits,
-                         std::log2(static_cast<double>(total) / count)));
-        }
-        if (std::ranges::all_of(row, [](auto cost) { return cost == noCode; }))
-            continue;
+    for (const std::uint32_t t : kept.mostUsedFirst()) {
         tokens_.push_back(tokens[t]);
-        lengths_.push_back(static_cast<std::uint8_t>(tokens[t].size()));
-        costs_.insert(costs_.end(), row.begin(), row.end());
+        addCosts(kept, t, static_cast<std::uint8_t>(tokens[t].front()));
     }
     trie_ = TokenTrie(tokens_);
+}
+
+// The costs of a kept token.
+void TokenModel::addCosts(const Kept& kept, std::uint32_t token,
+                          std::uint8_t first) {
+    for (std::size_t c = 0; c < contextSlots; ++c) {
+        const std::uint32_t count = kept.of(token, c);
+        const bool isFirst = c == firstTokenContext;
+        const std::uint64_t total =
+            isFirst ? kept.firstTotals[first] : kept.totals[c];
+        costs_.push_back(
+            count == 0
+                ? unexpected
+                : tokenCost(std::max(
+                      isFirst ? minFirstTokenBits : minTokenBits,
+                      std::log2(static_cast<double>(total) / count))));
+    }
 }
 
 }  // namespace tessel::archive

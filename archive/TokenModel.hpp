@@ -18,21 +18,20 @@ namespace tessel::archive {
 class TokenModel {
 public:
     static constexpr std::uint32_t costUnit = 8;  // per bit
-    // The token has no code in this context.
-    static constexpr std::uint8_t noCode = 255;
+    // A token that was not seen in a context, and is not expected there. It may
+    // be used all the same where everything else costs more.
+    static constexpr std::uint8_t unexpected = 255;
 
     // Keeps, per context, the tokens that were used at least `minUses` times;
     // single bytes need two uses, or may be literals. Tokens that no context
-    // keeps are dropped; the others are renumbered.
+    // keeps are dropped; the others are numbered by their uses, the most
+    // frequent first, so that their costs share a few cache lines.
     TokenModel(const std::vector<std::string>& tokens, const TokenUses& uses,
                double minUses);
 
     const std::vector<std::string>& tokens() const noexcept { return tokens_; }
     const TokenTrie& trie() const noexcept { return trie_; }
 
-    std::uint32_t lengthOf(std::uint32_t token) const noexcept {
-        return lengths_[token];
-    }
     // The costs of a token are one row of contextSlots numbers.
     const std::uint8_t* costs() const noexcept { return costs_.data(); }
 
@@ -45,8 +44,9 @@ public:
 private:
     struct Kept;
 
+    void addCosts(const Kept& kept, std::uint32_t token, std::uint8_t first);
+
     std::vector<std::string> tokens_;
-    std::vector<std::uint8_t> lengths_;
     std::vector<std::uint8_t> costs_;
     std::array<std::uint32_t, contextSlots> literalCosts_{};
     std::array<std::uint32_t, 256> firstLiteralCosts_{};
