@@ -71,8 +71,7 @@ CountTable CountTable::unpack(ByteCursor& cursor) {
     std::uint64_t kraft = 0;  // in units of 2^-maxTokenCodeBits
     for (unsigned bits = 1; bits <= table.maxLength; ++bits) {
         table.counts[bits] = unpackVarint(cursor);
-        kraft += std::uint64_t{table.counts[bits]}
-                 << (maxTokenCodeBits - bits);
+        kraft += std::uint64_t{table.counts[bits]} << (maxTokenCodeBits - bits);
     }
     require(table.counts[table.maxLength] > 0 &&
             kraft == std::uint64_t{1} << maxTokenCodeBits);

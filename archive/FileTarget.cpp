@@ -32,8 +32,7 @@ std::string replacedFile(const std::string& file) {
 }
 
 std::string randomName() {
-    constexpr std::string_view letters =
-        "abcdefghijklmnopqrstuvwxyz0123456789";
+    constexpr std::string_view letters = "abcdefghijklmnopqrstuvwxyz0123456789";
     std::random_device source;
     std::uniform_int_distribution<std::size_t> choose(0, letters.size() - 1);
     std::string name(randomLetters, ' ');

@@ -66,8 +66,8 @@ void FrontCoder::codeNames(std::size_t chunk, FrontCounts& counts) {
         const NameCode code = codes_[place] = codeOf(place, seen);
         const std::uint8_t context =
             first ? firstInBlock : operationContexts[previous];
-        ++counts.operations[context]
-                           [symbolOfOperation(code.operation, previous)];
+        ++counts
+              .operations[context][symbolOfOperation(code.operation, previous)];
         if (code.operation == operationNextFolder) ++seen;
         if (code.operation == operationJump)
             ++counts.operations[jumpCode]
@@ -83,8 +83,7 @@ NameCode FrontCoder::codeOf(std::size_t place, std::uint32_t seen) const {
     const std::uint32_t folder = nameRef(place).folder;
     if (folder == seen) return {0, operationNextFolder, 0};
     const bool first = place % namesPerBlock == 0;
-    const std::uint32_t current =
-        first ? seen - 1 : nameRef(place - 1).folder;
+    const std::uint32_t current = first ? seen - 1 : nameRef(place - 1).folder;
     if (folder != current) return {0, operationJump, 0};
     if (first) return {0, 0, 0};
     return sharedPrefix(place);
@@ -132,9 +131,8 @@ Piece FrontCoder::folderPiece(std::size_t number) const noexcept {
     const std::string_view text = folder(number);
     const std::uint32_t prefix = folderPrefixes_[number];
     const std::uint8_t context =
-        prefix > 0
-            ? folderContexts[static_cast<std::uint8_t>(text[prefix - 1])]
-            : std::uint8_t{FolderStart};
+        prefix > 0 ? folderContexts[static_cast<std::uint8_t>(text[prefix - 1])]
+                   : std::uint8_t{FolderStart};
     return {text.data() + prefix,
             static_cast<std::uint32_t>(text.size()) - prefix + 1, context,
             true};

@@ -24,8 +24,8 @@ std::vector<unsigned> depthsOf(const std::vector<Leaf>& leaves) {
     std::size_t inner = n;
     for (std::size_t node = n; node < 2 * n - 1; ++node) {
         for (int child = 0; child < 2; ++child) {
-            const bool takeLeaf = leaf < n && (inner == node ||
-                                               weight[leaf] <= weight[inner]);
+            const bool takeLeaf =
+                leaf < n && (inner == node || weight[leaf] <= weight[inner]);
             const std::size_t taken = takeLeaf ? leaf++ : inner++;
             weight[node] += weight[taken];
             parent[taken] = node;
@@ -55,8 +55,7 @@ std::vector<std::uint8_t> huffmanLengths(std::span<const std::uint64_t> counts,
         std::max<std::uint64_t>(1, total >> (maxBits + 2));
     while (true) {
         std::ranges::sort(leaves, [](const Leaf& a, const Leaf& b) {
-            return a.count != b.count ? a.count < b.count
-                                      : a.symbol < b.symbol;
+            return a.count != b.count ? a.count < b.count : a.symbol < b.symbol;
         });
         const std::vector<unsigned> depths = depthsOf(leaves);
         if (std::ranges::max(depths) <= maxBits) {

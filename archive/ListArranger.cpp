@@ -73,9 +73,9 @@ private:
 
     const SegmentList& list_;
     Workers& workers_;
-    std::vector<std::uint32_t> byRank_;  // folders in order of their bytes
-    std::vector<std::uint32_t> starts_;  // [rank]: its first place in keys_
-    std::vector<NameKey> keys_;          // by folder, then by name
+    std::vector<std::uint32_t> byRank_;      // folders in order of their bytes
+    std::vector<std::uint32_t> starts_;      // [rank]: its first place in keys_
+    std::vector<NameKey> keys_;              // by folder, then by name
     std::vector<std::uint32_t> newNumbers_;  // [rank], or UINT32_MAX
     Arrangement result_;
 };

@@ -112,9 +112,8 @@ void ChunkParser::parse(const Piece& piece, std::size_t chunk) {
 ParsedList parseList(const FrontCoder& list, const TokenModel& model,
                      ParseEffort effort, Workers& workers) {
     const std::size_t nameChunks = FrontCoder::chunksOf(list.names());
-    ParsedList result{
-        Chunks(nameChunks + FrontCoder::chunksOf(list.folders())),
-        TokenUses(model.tokens().size())};
+    ParsedList result{Chunks(nameChunks + FrontCoder::chunksOf(list.folders())),
+                      TokenUses(model.tokens().size())};
     std::vector<ChunkParser> parsers(
         workers.count(), ChunkParser(list, model, effort, result.chunks));
     workers.run(result.chunks.size(), [&](std::size_t chunk, unsigned worker) {
@@ -136,8 +135,8 @@ TokenUses parseSample(const std::vector<Piece>& sample, const TokenModel& model,
                 [&](std::size_t step, unsigned worker) {
                     PieceParser parser(model, effort);
                     std::vector<TokenRef> steps;
-                    const std::size_t end = std::min(
-                        sample.size(), (step + 1) * piecesPerStep);
+                    const std::size_t end =
+                        std::min(sample.size(), (step + 1) * piecesPerStep);
                     for (std::size_t i = step * piecesPerStep; i < end; ++i) {
                         steps.clear();
                         parser.parse(sample[i], steps);

@@ -51,8 +51,8 @@ PathArchive PathArchive::over(std::span<const std::byte> bytes) {
 }
 
 PathArchive PathArchive::own(std::vector<std::uint8_t> bytes) {
-    return PathArchive(std::make_shared<const ArchiveReader>(
-        ArchiveBytes(std::move(bytes))));
+    return PathArchive(
+        std::make_shared<const ArchiveReader>(ArchiveBytes(std::move(bytes))));
 }
 
 // ---- Paths by number ----

@@ -57,8 +57,7 @@ void PieceParser::tryLiteral(std::uint32_t at, std::uint8_t context,
                              std::uint8_t byte) {
     const std::uint32_t cost =
         costOf(ways_[at]) + model_.literalCost(context, byte);
-    ways_[at + 1] =
-        std::min(ways_[at + 1], wayOf(cost, 1, literalFlag | byte));
+    ways_[at + 1] = std::min(ways_[at + 1], wayOf(cost, 1, literalFlag | byte));
 }
 
 void PieceParser::tryTokens(const Piece& piece, std::uint32_t at,
@@ -85,10 +84,10 @@ void PieceParser::collect(const Piece& piece,
         end -= step >> lengthShift;
         const std::uint8_t context = contextAt(piece, end);
         const std::uint32_t value = step & (literalFlag - 1);
-        out.push_back((step & literalFlag) != 0
-                          ? TokenRef::literal(static_cast<std::uint8_t>(value),
-                                              context)
-                          : TokenRef::token(value, context));
+        out.push_back(
+            (step & literalFlag) != 0
+                ? TokenRef::literal(static_cast<std::uint8_t>(value), context)
+                : TokenRef::token(value, context));
     }
     std::reverse(out.begin() + static_cast<std::ptrdiff_t>(start), out.end());
 }

@@ -15,8 +15,7 @@ namespace {
 std::vector<std::uint64_t> sumPieces(std::span<const std::uint8_t> body,
                                      unsigned pieceShift, Workers& workers) {
     constexpr std::size_t piecesPerStep = 256;
-    std::vector<std::uint64_t> sums(
-        SumTree::piecesIn(body.size(), pieceShift));
+    std::vector<std::uint64_t> sums(SumTree::piecesIn(body.size(), pieceShift));
     workers.run((sums.size() + piecesPerStep - 1) / piecesPerStep,
                 [&](std::size_t step, unsigned) {
                     const std::size_t end =
@@ -35,8 +34,7 @@ void SegmentBody::add(Section section, Bytes part) {
 
 SegmentBody::Bytes SegmentBody::finish(SegmentHead& head, Workers& workers) {
     for (std::size_t s = 0; s < sectionCount; ++s)
-        for (const Bytes& part : parts_[s])
-            head.sectionBytes[s] += part.size();
+        for (const Bytes& part : parts_[s]) head.sectionBytes[s] += part.size();
     Bytes segment = joined(head, workers);
     const std::size_t bodyAt = segmentHeadBytes + head.sumTreeBytes();
     const auto levels = SumTree::levelsAbove(
@@ -69,9 +67,9 @@ SegmentBody::Bytes SegmentBody::joined(const SegmentHead& head,
     }
     workers.run(copies.size(), [&](std::size_t i, unsigned) {
         Bytes part = std::exchange(*copies[i].part, {});
-        std::copy(part.begin(), part.end(),
-                  segment.begin() +
-                      static_cast<std::ptrdiff_t>(copies[i].offset));
+        std::copy(
+            part.begin(), part.end(),
+            segment.begin() + static_cast<std::ptrdiff_t>(copies[i].offset));
     });
     return segment;
 }

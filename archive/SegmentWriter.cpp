@@ -84,9 +84,9 @@ Bytes SegmentBuilder::build() {
     head_.maxFolderBytes = coder.maxFolderBytes();
     report(0.1);
     {
-        const TrainedParse trained = trainAndParse(
-            coder, options_.level, workers_,
-            [this](double share) { report(0.1 + 0.75 * share); });
+        const TrainedParse trained =
+            trainAndParse(coder, options_.level, workers_,
+                          [this](double share) { report(0.1 + 0.75 * share); });
         const TokenCoder tokens(trained.model, trained.parsed.uses);
         const FrontCodes codes(coder.counts());
         body_.add(Section::TokenCodes, tokens.tokenCodes());
@@ -115,8 +115,8 @@ void SegmentBuilder::writeBlocks(const FrontCoder& coder,
         if (chunk < names.size())
             names[chunk] = writer.writeNames(chunk, parsed.chunks[chunk]);
         else
-            folders[chunk - names.size()] = writer.writeFolders(
-                chunk - names.size(), parsed.chunks[chunk]);
+            folders[chunk - names.size()] =
+                writer.writeFolders(chunk - names.size(), parsed.chunks[chunk]);
     });
     GroupTables groups = packGroups(names, folders);
     if (head_.order != ListOrder::AsGiven)
@@ -124,7 +124,8 @@ void SegmentBuilder::writeBlocks(const FrontCoder& coder,
     body_.add(Section::NameGroups, std::move(groups.names));
     body_.add(Section::FolderGroups, std::move(groups.folders));
     body_.add(Section::WideGroups, std::move(groups.wide));
-    for (Blocks& blocks : names) body_.add(Section::Names, std::move(blocks.bytes));
+    for (Blocks& blocks : names)
+        body_.add(Section::Names, std::move(blocks.bytes));
     for (Blocks& blocks : folders)
         body_.add(Section::Folders, std::move(blocks.bytes));
 }

@@ -32,12 +32,12 @@ std::uint64_t keyAt(std::string_view text, std::size_t depth) {
 }
 
 void sortFew(const Range& range) {
-    std::ranges::sort(range.items, [&](const StringItem& a,
-                                       const StringItem& b) {
-        const int order =
-            a.text.substr(range.depth).compare(b.text.substr(range.depth));
-        return order != 0 ? order < 0 : a.number < b.number;
-    });
+    std::ranges::sort(
+        range.items, [&](const StringItem& a, const StringItem& b) {
+            const int order =
+                a.text.substr(range.depth).compare(b.text.substr(range.depth));
+            return order != 0 ? order < 0 : a.number < b.number;
+        });
 }
 
 std::uint64_t medianKey(std::span<const StringItem> items) {
@@ -53,10 +53,9 @@ void partition(const Range& range, std::vector<Range>& left) {
     const auto lowerEnd = std::partition(
         range.items.begin(), range.items.end(),
         [&](const StringItem& item) { return item.key < pivot; });
-    const auto equalEnd =
-        std::partition(lowerEnd, range.items.end(), [&](const StringItem& item) {
-            return item.key == pivot;
-        });
+    const auto equalEnd = std::partition(
+        lowerEnd, range.items.end(),
+        [&](const StringItem& item) { return item.key == pivot; });
     left.push_back({{range.items.begin(), lowerEnd}, range.depth});
     left.push_back({{equalEnd, range.items.end()}, range.depth});
     const std::span<StringItem> equal(lowerEnd, equalEnd);

@@ -37,8 +37,7 @@ public:
 
     void build() {
         coder_.codes_.resize(model_.tokens().size() * contextSlots);
-        for (std::uint8_t c = 0; c < tokenContextCount; ++c)
-            addContextCode(c);
+        for (std::uint8_t c = 0; c < tokenContextCount; ++c) addContextCode(c);
         addFirstTokenCodes();
         coder_.text_ = text_.text();
     }
@@ -51,8 +50,7 @@ private:
                 symbols.push_back({t, uses_.of(t, context)});
         // A code needs a symbol, even if no token is ever used there.
         if (uses_.literals(context) > 0 || symbols.empty())
-            symbols.push_back(
-                {escape, std::max(1U, uses_.literals(context))});
+            symbols.push_back({escape, std::max(1U, uses_.literals(context))});
         addCode(symbols, context, coder_.literalCodes_[context],
                 coder_.tokenCodes_);
     }
@@ -71,8 +69,8 @@ private:
                 byFirst[b].push_back({escape, uses_.firstLiterals(byte)});
             if (byFirst[b].empty()) continue;
             present[b / 8] |= static_cast<std::uint8_t>(1U << b % 8);
-            addCode(byFirst[b], firstTokenContext,
-                    coder_.firstLiteralCodes_[b], tables);
+            addCode(byFirst[b], firstTokenContext, coder_.firstLiteralCodes_[b],
+                    tables);
         }
         coder_.firstTokenCodes_.assign(present.begin(), present.end());
         coder_.firstTokenCodes_.insert(coder_.firstTokenCodes_.end(),
@@ -96,9 +94,8 @@ private:
         CountTable::of(lengths).pack(tables);
         std::vector<std::size_t> order(symbols.size());
         std::iota(order.begin(), order.end(), std::size_t{0});
-        std::ranges::stable_sort(order, {}, [&](std::size_t i) {
-            return lengths[i];
-        });
+        std::ranges::stable_sort(order, {},
+                                 [&](std::size_t i) { return lengths[i]; });
         for (const std::size_t i : order) addEntry(symbols[i].token);
     }
 

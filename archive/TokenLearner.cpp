@@ -245,20 +245,20 @@ const PairTable::Entry* Learner::tokenAt(const Sequence& sequence,
 // run of equal tokens, there is no better next pair.
 void Learner::replacePairs(Sequence& sequence) const {
     std::size_t end = 0;
-    for (std::size_t i = 0; i < sequence.size(); ++i) {
-        const std::uint16_t left = sequence[i];
-        if (const auto* entry = tokenAt(sequence, i)) {
-            const auto* next = tokenAt(sequence, i + 1);
-            const bool nextIsBetter = next != nullptr &&
-                                      sequence[i + 2] != left &&
-                                      next->count > entry->count;
-            if (!nextIsBetter) {
-                sequence[end++] = static_cast<std::uint16_t>(entry->token);
-                ++i;
-                continue;
-            }
+    const PairTable::Entry* entry = tokenAt(sequence, 0);
+    for (std::size_t i = 0; i < sequence.size();) {
+        const PairTable::Entry* next = tokenAt(sequence, i + 1);
+        const bool nextIsBetter = entry != nullptr && next != nullptr &&
+                                  sequence[i + 2] != sequence[i] &&
+                                  next->count > entry->count;
+        if (entry == nullptr || nextIsBetter) {
+            sequence[end++] = sequence[i++];
+            entry = next;
+        } else {
+            sequence[end++] = static_cast<std::uint16_t>(entry->token);
+            i += 2;
+            entry = tokenAt(sequence, i);
         }
-        sequence[end++] = left;
     }
     sequence.resize(end);
 }
@@ -275,8 +275,8 @@ TokenUses Learner::countUses() const {
             std::uint8_t context = piece.context;
             for (; *token != separator; ++token) {
                 uses.add(TokenRef::token(*token, context));
-                context = after[static_cast<std::uint8_t>(
-                    tokens_[*token].back())];
+                context =
+                    after[static_cast<std::uint8_t>(tokens_[*token].back())];
             }
             ++token;
         }

@@ -26,11 +26,10 @@ std::uint8_t tokenCost(double bits) {
         std::min<std::uint32_t>(costOf(bits), TokenModel::unexpected - 1));
 }
 
-double literalBits(std::uint64_t total, std::uint64_t literals,
-                   double limit) {
-    return std::min(limit, std::log2(static_cast<double>(total) /
-                                     (static_cast<double>(literals) +
-                                      unseenUses)));
+double literalBits(std::uint64_t total, std::uint64_t literals, double limit) {
+    return std::min(limit,
+                    std::log2(static_cast<double>(total) /
+                              (static_cast<double>(literals) + unseenUses)));
 }
 
 }  // namespace
@@ -66,7 +65,7 @@ TokenModel::Kept::Kept(const std::vector<std::string>& tokens,
             const std::uint32_t count = uses.of(t, c);
             const bool isFirst = c == firstTokenContext;
             // After a shared prefix, a byte alone is always the literal.
-            const bool keep = isFirst ? !isByte && count >= minUses
+            const bool keep = isFirst  ? !isByte && count >= minUses
                               : isByte ? count >= 2
                                        : count >= minUses;
             if (count == 0 || (!keep && !isByte)) continue;
@@ -96,14 +95,11 @@ TokenModel::TokenModel(const std::vector<std::string>& tokens,
                        const TokenUses& uses, double minUses) {
     const Kept kept(tokens, uses, minUses);
     for (std::size_t c = 0; c < tokenContextCount; ++c)
-        literalCosts_[c] =
-            costOf(literalBits(kept.totals[c], kept.literals[c],
-                               maxLiteralBits) +
-                   8);
+        literalCosts_[c] = costOf(
+            literalBits(kept.totals[c], kept.literals[c], maxLiteralBits) + 8);
     for (std::size_t b = 0; b < 256; ++b)
-        firstLiteralCosts_[b] =
-            costOf(literalBits(kept.firstTotals[b], kept.firstLiterals[b],
-                               maxFirstLiteralBits));
+        firstLiteralCosts_[b] = costOf(literalBits(
+            kept.firstTotals[b], kept.firstLiterals[b], maxFirstLiteralBits));
     for (const std::uint32_t t : kept.mostUsedFirst()) {
         tokens_.push_back(tokens[t]);
         addCosts(kept, t, static_cast<std::uint8_t>(tokens[t].front()));
@@ -120,11 +116,10 @@ void TokenModel::addCosts(const Kept& kept, std::uint32_t token,
         const std::uint64_t total =
             isFirst ? kept.firstTotals[first] : kept.totals[c];
         costs_.push_back(
-            count == 0
-                ? unexpected
-                : tokenCost(std::max(
-                      isFirst ? minFirstTokenBits : minTokenBits,
-                      std::log2(static_cast<double>(total) / count))));
+            count == 0 ? unexpected
+                       : tokenCost(std::max(
+                             isFirst ? minFirstTokenBits : minTokenBits,
+                             std::log2(static_cast<double>(total) / count))));
     }
 }
 

@@ -123,9 +123,8 @@ TokenTrie::Base TokenTrie::Builder::findBase(
 
 bool TokenTrie::Builder::fits(Base base,
                               std::span<const std::uint8_t> labels) const {
-    return std::ranges::all_of(labels, [&](std::uint8_t label) {
-        return isFree(base ^ label);
-    });
+    return std::ranges::all_of(
+        labels, [&](std::uint8_t label) { return isFree(base ^ label); });
 }
 
 TokenTrie::TokenTrie(const std::vector<std::string>& tokens) {

@@ -76,8 +76,8 @@ public:
     }
 
     bool isUsed(std::size_t token) const {
-        const auto row = counts_.begin() +
-                         static_cast<std::ptrdiff_t>(token * contextSlots);
+        const auto row =
+            counts_.begin() + static_cast<std::ptrdiff_t>(token * contextSlots);
         return std::any_of(row, row + contextSlots,
                            [](std::uint32_t count) { return count > 0; });
     }

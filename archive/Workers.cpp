@@ -8,7 +8,8 @@ namespace tessel::archive {
 
 Workers::Workers(unsigned threads, std::stop_token cancel)
     : cancel_(std::move(cancel)) {
-    if (threads == 0) threads = std::max(1U, std::thread::hardware_concurrency());
+    if (threads == 0)
+        threads = std::max(1U, std::thread::hardware_concurrency());
     threads_.reserve(threads - 1);
     try {
         for (unsigned worker = 1; worker < threads; ++worker)
