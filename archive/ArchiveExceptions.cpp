@@ -2,11 +2,19 @@
 
 namespace tessel {
 
-DamagedArchiveException::DamagedArchiveException(std::uint64_t where,
-                                                 const std::string& what)
-    : std::runtime_error("The archive is damaged at byte " +
-                         std::to_string(where) + ": " + what),
-      offset_(where) {}
+namespace {
+
+std::string placeText(std::uint64_t offset) {
+    return "The archive is damaged at byte " + std::to_string(offset) + ": ";
+}
+
+}  // namespace
+
+DamagedArchiveException::DamagedArchiveException(std::uint64_t offset,
+                                                 const std::string& cause)
+    : std::runtime_error(placeText(offset) + cause),
+      offset_(offset),
+      causeStart_(placeText(offset).size()) {}
 
 UnsupportedArchiveVersionException::UnsupportedArchiveVersionException(
     std::uint32_t version)

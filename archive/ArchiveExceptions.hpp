@@ -1,6 +1,8 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <exception>
 #include <stdexcept>
 #include <string>
 
@@ -10,15 +12,19 @@ namespace tessel {
 // the file was cut or lengthened, or a form breaks the format's rules.
 class DamagedArchiveException : public std::runtime_error {
 public:
-    // where  byte offset in the archive of the piece or field that is wrong
-    // what   what is wrong with it, as a sentence without the offset
-    DamagedArchiveException(std::uint64_t where, const std::string& what);
+    // offset  in the archive, of the piece or field that is wrong
+    // cause   what is wrong with it, as a sentence
+    DamagedArchiveException(std::uint64_t offset, const std::string& cause);
 
     // Byte offset in the archive of what is wrong.
     std::uint64_t offset() const noexcept { return offset_; }
 
+    // What is wrong, without the offset. what() tells both.
+    const char* cause() const noexcept { return what() + causeStart_; }
+
 private:
     std::uint64_t offset_;
+    std::size_t causeStart_;
 };
 
 // An archive of a version of the format that this library does not know.

@@ -41,8 +41,8 @@ ArchiveReader::ArchiveReader(ArchiveBytes bytes) : bytes_(std::move(bytes)) {
     const auto entries = readDirectory();
     segments_.reserve(entries.size());
     for (const SegmentEntry& entry : entries)
-        segments_.push_back(
-            std::make_unique<const Segment>(bytes_.bytes(), entry));
+        segments_.push_back(std::make_unique<const Segment>(
+            bytes_.bytes().subspan(entry.offset, entry.bytes), entry));
 }
 
 // The entries must follow each other without gaps, in bytes and in numbers.

@@ -35,4 +35,10 @@ std::uint32_t FolderHeads::nameBlock(std::uint32_t i) const {
     return std::min(field(i, 4), segment_->nameBlocks() - 1);
 }
 
+bool FolderHeads::fillsSection() const {
+    return field(0, 0) == 0 && field(size_, 4) == segment_->nameBlocks() &&
+           textStart_ + field(size_, 0) ==
+               segment_->bytesOf(Section::FolderHeads);
+}
+
 }  // namespace tessel::archive

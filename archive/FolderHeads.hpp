@@ -33,6 +33,10 @@ public:
     // of all. At least 0 and below the number of name blocks.
     std::uint32_t nameBlock(std::uint32_t i) const;
 
+    // Whether offsets start at 0 and end with the text, and blocks with the
+    // number of blocks.
+    bool fillsSection() const;
+
 private:
     std::uint32_t field(std::uint32_t i, std::uint32_t offset) const;
 

@@ -45,18 +45,6 @@ std::uint64_t numberAt(const Segment& segment, std::uint64_t place) {
     return found;
 }
 
-// The places of all paths that start with the prefix, "" or ending with '/'.
-std::vector<NumberRange> placesBelow(const Segment& segment,
-                                     std::string_view prefix) {
-    if (prefix.empty()) return {{0, segment.size()}};
-    if (segment.head().order == ListOrder::AsGiven)
-        return GivenOrderSearch(segment).startingWith(prefix);
-    SortedSearch search(segment);
-    std::string after(prefix);
-    ++after.back();  // the least string above all that start with the prefix
-    return {{search.lowerBound(prefix), search.lowerBound(after)}};
-}
-
 std::vector<std::uint64_t> indexedNumbers(const Segment& segment,
                                           NumberRange places) {
     const PackedNumbers index(segment, Section::Index);
@@ -101,10 +89,33 @@ std::optional<std::uint64_t> numberOf(const ArchiveReader& archive,
     return std::nullopt;
 }
 
-std::vector<NumberRange> numbersBelow(const ArchiveReader& archive,
-                                      std::string_view folder) {
+bool contains(const ArchiveReader& archive, std::string_view path) {
+    for (std::size_t i = 0; i < archive.segmentCount(); ++i)
+        if (placeOfFirst(archive.segment(i), path) < archive.segment(i).size())
+            return true;
+    return false;
+}
+
+std::string prefixOf(std::string_view folder) {
     std::string prefix(folder);
     if (!prefix.empty() && prefix.back() != '/') prefix += '/';
+    return prefix;
+}
+
+std::vector<NumberRange> placesBelow(const Segment& segment,
+                                     std::string_view prefix) {
+    if (prefix.empty()) return {{0, segment.size()}};
+    if (segment.head().order == ListOrder::AsGiven)
+        return GivenOrderSearch(segment).startingWith(prefix);
+    SortedSearch search(segment);
+    std::string after(prefix);
+    ++after.back();  // the least string above all that start with the prefix
+    return {{search.lowerBound(prefix), search.lowerBound(after)}};
+}
+
+std::vector<NumberRange> numbersBelow(const ArchiveReader& archive,
+                                      std::string_view folder) {
+    const std::string prefix = prefixOf(folder);
     std::vector<NumberRange> found;
     for (std::size_t i = 0; i < archive.segmentCount(); ++i)
         for (const NumberRange places : placesBelow(archive.segment(i), prefix))

@@ -2,11 +2,13 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 #include <string_view>
 #include <vector>
 
 #include "archive/ArchiveReader.hpp"
 #include "archive/NumberRange.hpp"
+#include "archive/Segment.hpp"
 
 namespace tessel::archive {
 
@@ -17,9 +19,22 @@ namespace tessel::archive {
 std::optional<std::uint64_t> numberOf(const ArchiveReader& archive,
                                       std::string_view path);
 
+// Whether the path is in the list: faster than numberOf where that scans an
+// order.
+bool contains(const ArchiveReader& archive, std::string_view path);
+
 // The numbers of all paths that start with the path and a '/', which may be
 // the path's last byte; of all paths if it is empty.
 std::vector<NumberRange> numbersBelow(const ArchiveReader& archive,
                                       std::string_view folder);
+
+// The start of all paths below a folder: the folder with '/' at its end, or
+// nothing for the whole list.
+std::string prefixOf(std::string_view folder);
+
+// The places of one segment's paths that start with such a prefix, counted
+// from its first; ascending.
+std::vector<NumberRange> placesBelow(const Segment& segment,
+                                     std::string_view prefix);
 
 }  // namespace tessel::archive

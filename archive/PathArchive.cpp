@@ -4,6 +4,7 @@
 #include <stdexcept>
 #include <utility>
 
+#include "archive/ArchiveInformation.hpp"
 #include "archive/ArchiveReader.hpp"
 #include "archive/NumberLookup.hpp"
 #include "archive/PathSearch.hpp"

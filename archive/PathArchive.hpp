@@ -12,7 +12,9 @@
 #include <vector>
 
 #include "archive/ArchiveExceptions.hpp"
-#include "archive/FunctionRef.hpp"
+#include "archive/ArchiveReports.hpp"
+#include "archive/ArchiveWriter.hpp"
+#include "archive/FindOptions.hpp"
 #include "archive/NumberRange.hpp"
 #include "archive/PathVisitor.hpp"
 #include "archive/ScanOptions.hpp"
@@ -23,55 +25,6 @@ namespace archive {
 class ArchiveReader;
 class SequentialReader;
 }  // namespace archive
-
-struct FindOptions : ScanOptions {
-    // If set, only paths below this folder are looked at, as
-    // PathArchive::folder understands it.
-    std::optional<std::string> folder;
-};
-
-// One stretch of an archive's bytes that is not what was written.
-struct ArchiveDamage {
-    std::uint64_t offset = 0;  // in the archive
-    std::uint64_t size = 0;    // bytes
-    std::string what;          // a sentence
-
-    friend bool operator==(const ArchiveDamage&,
-                           const ArchiveDamage&) = default;
-};
-
-// What PathArchive::salvage could not read.
-struct SalvageReport {
-    std::uint64_t kept = 0;         // paths shown to the visitor
-    std::vector<NumberRange> lost;  // ascending, disjoint
-    std::vector<ArchiveDamage> damages;
-
-    // Whether the archive's size is known. If it is not, paths after the last
-    // number seen may be lost as well.
-    bool complete = true;
-};
-
-// Facts about an archive. Bytes of all sections add up to fileBytes.
-struct ArchiveInfo {
-    struct Section {
-        std::string name;  // one word or two, such as "name blocks"
-        std::uint64_t bytes = 0;
-    };
-
-    std::uint32_t formatVersion = 0;
-    std::uint64_t paths = 0;
-    std::uint64_t folders = 0;  // different ones per segment, added up
-    std::uint64_t segments = 0;
-    std::uint64_t textBytes = 0;  // of all paths, with one separator each
-    std::uint64_t fileBytes = 0;
-    std::uint64_t longestName = 0;    // bytes after the last '/'
-    std::uint64_t longestFolder = 0;  // bytes up to and with the last '/'
-    std::vector<Section> sections;    // summed over the segments
-};
-
-// Whether a path is to be found. It may be called on several threads at a
-// time, with views that are valid until it returns.
-using PathPredicate = FunctionRef<bool(std::string_view path)>;
 
 // PathArchive reads a list of paths from an archive that ArchiveWriter wrote:
 //
@@ -270,7 +223,8 @@ private:
     friend class PathArchive;
     explicit Iterator(std::shared_ptr<const archive::ArchiveReader> reader);
 
-    std::unique_ptr<archive::SequentialReader> paths_;
+    std::shared_ptr<const archive::ArchiveReader> reader_;
+    std::unique_ptr<archive::SequentialReader> paths_;  // borrows reader_
     std::string_view path_;
     std::uint64_t number_ = 0;
     std::uint64_t size_ = 0;

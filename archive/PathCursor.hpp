@@ -61,6 +61,11 @@ public:
     }
     std::uint32_t foldersSeen() const noexcept { return names_.seen(); }
 
+    // Whether the last name ends its block, but for padding.
+    bool isAtBlockEnd() const noexcept {
+        return next_ == blockEnd_ && names_.isAtEnd();
+    }
+
     // The folder of the name, with its final '/', if any.
     std::string_view folder() {
         if (folder_ != names_.folder()) [[unlikely]]

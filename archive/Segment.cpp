@@ -29,15 +29,6 @@ std::uint32_t sumOfFirst(const std::uint8_t* bytes, std::uint32_t count) {
     return static_cast<std::uint32_t>(lanes * 0x0001000100010001 >> 48U);
 }
 
-std::span<const std::uint8_t> segmentIn(std::span<const std::uint8_t> archive,
-                                        const SegmentEntry& entry) {
-    if (entry.offset > archive.size() ||
-        entry.bytes > archive.size() - entry.offset)
-        throw DamagedArchiveException(entry.offset,
-                                      "A segment is outside the archive.");
-    return archive.subspan(entry.offset, entry.bytes);
-}
-
 SegmentHead headOf(std::span<const std::uint8_t> segment,
                    const SegmentEntry& entry) {
     try {
@@ -51,11 +42,10 @@ SegmentHead headOf(std::span<const std::uint8_t> segment,
 
 }  // namespace
 
-Segment::Segment(std::span<const std::uint8_t> archive,
-                 const SegmentEntry& entry)
+Segment::Segment(std::span<const std::uint8_t> bytes, const SegmentEntry& entry)
     : entry_(entry),
-      head_(headOf(segmentIn(archive, entry), entry)),
-      pieces_(segmentIn(archive, entry), head_, entry.offset),
+      head_(headOf(bytes, entry)),
+      pieces_(bytes, head_, entry.offset),
       nameBlocks_(static_cast<std::uint32_t>(
           divideUp(head_.paths, head_.namesPerBlock))),
       folderBlocks_(static_cast<std::uint32_t>(

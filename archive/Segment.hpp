@@ -35,9 +35,13 @@ public:
     };
 
     // Verifies head, checksums of all levels and the sections that every
-    // decoding needs. Throws DamagedArchiveException, whose offset counts from
-    // the start of the archive.
-    Segment(std::span<const std::uint8_t> archive, const SegmentEntry& entry);
+    // decoding needs.
+    //
+    // bytes  of the segment, as many as the entry says
+    //
+    // Throws DamagedArchiveException, whose offset counts from the start of
+    // the archive.
+    Segment(std::span<const std::uint8_t> bytes, const SegmentEntry& entry);
     ~Segment();
     Segment(const Segment&) = delete;
     Segment& operator=(const Segment&) = delete;

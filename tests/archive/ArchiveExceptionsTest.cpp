@@ -8,6 +8,7 @@ namespace {
 TEST(ArchiveExceptions, DamageSaysWhereAndWhat) {
     const DamagedArchiveException damage(4096, "The checksum does not fit.");
     EXPECT_EQ(damage.offset(), 4096U);
+    EXPECT_STREQ(damage.cause(), "The checksum does not fit.");
     EXPECT_STREQ(damage.what(),
                  "The archive is damaged at byte 4096: The checksum does not "
                  "fit.");
