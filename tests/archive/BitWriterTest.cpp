@@ -1,6 +1,6 @@
-#include "archive/BitWriter.hpp"
-
 #include <gtest/gtest.h>
+
+#include "archive/BitWriter.hpp"
 
 namespace tessel::archive {
 namespace {
@@ -40,11 +40,12 @@ TEST(BitWriterTest, WritesWhatAPlainListOfBitsHolds) {
         state = state * 6364136223846793005U + 1442695040888963407U;
         const auto width = static_cast<unsigned>(state >> 33U) % 33;
         const auto value =
-            width == 0 ? 0U
-                       : static_cast<std::uint32_t>(state >> 31U) >>
-                             (32 - width);
+            width == 0
+                ? 0U
+                : static_cast<std::uint32_t>(state >> 31U) >> (32 - width);
         out.put(value, width);
-        for (unsigned b = width; b-- > 0;) bits.push_back((value >> b & 1U) != 0);
+        for (unsigned b = width; b-- > 0;)
+            bits.push_back((value >> b & 1U) != 0);
         if (i % 7 == 0) {
             out.align();
             while (bits.size() % 8 != 0) bits.push_back(false);

@@ -1,6 +1,6 @@
-#include "archive/CodeTables.hpp"
-
 #include <gtest/gtest.h>
+
+#include "archive/CodeTables.hpp"
 
 namespace tessel::archive {
 namespace {
@@ -56,15 +56,15 @@ TEST(CodeTablesTest, OneSymbolAndNoneTakeTwoBytes) {
 
 TEST(CodeTablesTest, BadLengthsAreDamaged) {
     for (const Bytes& bytes : {
-             Bytes{},             // nothing
-             Bytes{3},            // no last symbol
-             Bytes{3, 6, 0x01},   // too few lengths
-             Bytes{3, 200, 0x11}, // a symbol outside the alphabet
-             Bytes{200, 200},     // the same
-             Bytes{3, 4, 0x01},   // half a code
-             Bytes{3, 5, 0x11, 1},// three codes of one bit
-             Bytes{3, 4, 0xBB},   // longer than allowed
-             Bytes{3, 4, 0x00},   // no code at all
+             Bytes{},               // nothing
+             Bytes{3},              // no last symbol
+             Bytes{3, 6, 0x01},     // too few lengths
+             Bytes{3, 200, 0x11},   // a symbol outside the alphabet
+             Bytes{200, 200},       // the same
+             Bytes{3, 4, 0x01},     // half a code
+             Bytes{3, 5, 0x11, 1},  // three codes of one bit
+             Bytes{3, 4, 0xBB},     // longer than allowed
+             Bytes{3, 4, 0x00},     // no code at all
          })
         EXPECT_THROW(unpackedLengths(bytes), DamagedFormException);
 }
@@ -89,12 +89,12 @@ TEST(CodeTablesTest, OneSymbolHasNoLength) {
 
 TEST(CodeTablesTest, BadCountsAreDamaged) {
     for (const Bytes& bytes : {
-             Bytes{},               // nothing
-             Bytes{25},             // longer than allowed
-             Bytes{2, 1},           // too few counts
-             Bytes{1, 1},           // half a code
-             Bytes{1, 3},           // three codes of one bit
-             Bytes{2, 2, 0},        // the last length is not used
+             Bytes{},         // nothing
+             Bytes{25},       // longer than allowed
+             Bytes{2, 1},     // too few counts
+             Bytes{1, 1},     // half a code
+             Bytes{1, 3},     // three codes of one bit
+             Bytes{2, 2, 0},  // the last length is not used
              Bytes{1, 0x82, 0x80, 0x80, 0x80, 0x80, 0x00},  // six bytes
              Bytes{1, 0xFF, 0xFF, 0xFF, 0xFF, 0x7F},        // above 32 bits
          })

@@ -1,8 +1,8 @@
-#include "archive/Contexts.hpp"
-
 #include <gtest/gtest.h>
 
 #include <set>
+
+#include "archive/Contexts.hpp"
 
 namespace tessel::archive {
 namespace {

@@ -1,7 +1,6 @@
-#include "archive/Format.hpp"
-
 #include <gtest/gtest.h>
 
+#include "archive/Format.hpp"
 #include "archive/SumTree.hpp"
 #include "packing/ByteCursor.hpp"
 
@@ -136,24 +135,24 @@ TEST(FormatTest, ImpossibleHeadsAreDamaged) {
         std::uint8_t value;
     };
     for (const Change change : {
-             Change{0, 'X'},   // the tag
-             Change{4, 3},     // no such order
-             Change{5, 0},     // no names in a block
-             Change{6, 0},     // no folders in a block
-             Change{7, 0},     // no blocks per head
-             Change{8, 8},     // pieces too small
-             Change{8, 13},    // pieces too large
-             Change{9, 1},     // not zero
-             Change{12, 0},    // no folders
-             Change{12, 6},    // more folders than paths
-             Change{16, 0},    // no paths
-             Change{23, 1},    // far too many paths
-             Change{35, 1},    // a name of 16 MiB
-             Change{39, 1},    // a folder of 16 MiB
-             Change{40, 0},    // another size than the sections have
-             Change{55, 1},    // a section beyond all bounds
-             Change{160, 1},   // a section that does not exist
-             Change{180, 1},   // not zero
+             Change{0, 'X'},  // the tag
+             Change{4, 3},    // no such order
+             Change{5, 0},    // no names in a block
+             Change{6, 0},    // no folders in a block
+             Change{7, 0},    // no blocks per head
+             Change{8, 8},    // pieces too small
+             Change{8, 13},   // pieces too large
+             Change{9, 1},    // not zero
+             Change{12, 0},   // no folders
+             Change{12, 6},   // more folders than paths
+             Change{16, 0},   // no paths
+             Change{23, 1},   // far too many paths
+             Change{35, 1},   // a name of 16 MiB
+             Change{39, 1},   // a folder of 16 MiB
+             Change{40, 0},   // another size than the sections have
+             Change{55, 1},   // a section beyond all bounds
+             Change{160, 1},  // a section that does not exist
+             Change{180, 1},  // not zero
          })
         EXPECT_THROW(
             SegmentHead::unpack(mended(bytes, change.at, change.value)),
@@ -163,9 +162,12 @@ TEST(FormatTest, ImpossibleHeadsAreDamaged) {
 
 TEST(FormatTest, NumbersTakeAsManyBitsAsTheLargest) {
     SegmentHead head;
-    for (const auto& [paths, bits] :
-         {std::pair{1U, 1U}, {2U, 1U}, {3U, 2U}, {4U, 2U}, {5U, 3U},
-          {1'000'000U, 20U}}) {
+    for (const auto& [paths, bits] : {std::pair{1U, 1U},
+                                      {2U, 1U},
+                                      {3U, 2U},
+                                      {4U, 2U},
+                                      {5U, 3U},
+                                      {1'000'000U, 20U}}) {
         head.paths = paths;
         EXPECT_EQ(head.numberBits(), bits) << paths;
     }

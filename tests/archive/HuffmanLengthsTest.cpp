@@ -1,8 +1,8 @@
-#include "archive/HuffmanLengths.hpp"
-
 #include <gtest/gtest.h>
 
 #include <numeric>
+
+#include "archive/HuffmanLengths.hpp"
 
 namespace tessel::archive {
 namespace {

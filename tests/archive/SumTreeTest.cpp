@@ -1,10 +1,9 @@
-#include "archive/SumTree.hpp"
-
 #include <gtest/gtest.h>
 
 #include <numeric>
 
 #include "archive/Format.hpp"
+#include "archive/SumTree.hpp"
 
 namespace tessel::archive {
 namespace {

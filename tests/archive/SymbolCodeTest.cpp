@@ -1,6 +1,6 @@
-#include "archive/SymbolCode.hpp"
-
 #include <gtest/gtest.h>
+
+#include "archive/SymbolCode.hpp"
 
 namespace tessel::archive {
 namespace {
