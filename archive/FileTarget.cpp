@@ -74,7 +74,7 @@ FileTarget::FileTarget(const std::string& file) : file_(replacedFile(file)) {
     }
     const std::size_t nameAt = file_.rfind('/') + 1;
     folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
-    prefix_ = ".";
+    prefix_ += '.';
     prefix_ += file_.substr(nameAt, maxNameInPrefix);
     prefix_ += ".tessel-";
     removeLeftovers(folder_, prefix_);

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "archive/GivenOrderSearch.hpp"
+#include "archive/IndexedSearch.hpp"
 #include "archive/PackedNumbers.hpp"
 #include "archive/SortedSearch.hpp"
 
@@ -28,9 +29,10 @@ void scanOrder(const Segment& segment, NumberRange places, Visit visit) {
 // ---- One segment; numbers count from its first ----
 
 std::uint64_t placeOfFirst(const Segment& segment, std::string_view path) {
-    return segment.head().order == ListOrder::AsGiven
-               ? GivenOrderSearch(segment).find(path)
-               : SortedSearch(segment).find(path);
+    if (segment.head().order != ListOrder::AsGiven)
+        return SortedSearch(segment).find(path);
+    if (hasIndex(segment)) return IndexedSearch(segment).find(path);
+    return GivenOrderSearch(segment).find(path);
 }
 
 std::uint64_t numberAt(const Segment& segment, std::uint64_t place) {
@@ -45,35 +47,27 @@ std::uint64_t numberAt(const Segment& segment, std::uint64_t place) {
     return found;
 }
 
-std::vector<std::uint64_t> indexedNumbers(const Segment& segment,
-                                          NumberRange places) {
-    const PackedNumbers index(segment, Section::Index);
-    std::vector<std::uint64_t> numbers;
-    numbers.reserve(places.end - places.begin);
-    for (std::uint64_t place = places.begin; place < places.end; ++place)
-        numbers.push_back(index.at(place));
-    std::ranges::sort(numbers);
-    return numbers;
-}
-
 // A scan of the whole order costs as much as sorting a part of it.
 constexpr std::uint64_t worthSorting = 16;
 
 void appendNumbers(const Segment& segment, NumberRange places,
                    std::vector<NumberRange>& out) {
     const std::uint64_t first = segment.entry().firstNumber;
-    const auto append = [&](std::uint64_t number) {
-        appendRange(out, {first + number, first + number + 1});
-        return true;
+    const auto append = [&](NumberRange numbers) {
+        appendRange(out, {first + numbers.begin, first + numbers.end});
     };
     if (places.begin >= places.end) return;
-    if (isInPlace(segment))
-        appendRange(out, {first + places.begin, first + places.end});
-    else if (hasIndex(segment) &&
-             (places.end - places.begin) * worthSorting < segment.size())
-        std::ranges::for_each(indexedNumbers(segment, places), append);
-    else
-        scanOrder(segment, places, append);
+    if (isInPlace(segment)) return append(places);
+    if (hasIndex(segment) &&
+        (places.end - places.begin) * worthSorting < segment.size()) {
+        const PackedNumbers index(segment, Section::Index);
+        std::ranges::for_each(sortedNumbers(index, places), append);
+        return;
+    }
+    scanOrder(segment, places, [&](std::uint64_t number) {
+        append({number, number + 1});
+        return true;
+    });
 }
 
 }  // namespace
@@ -106,7 +100,9 @@ std::vector<NumberRange> placesBelow(const Segment& segment,
                                      std::string_view prefix) {
     if (prefix.empty()) return {{0, segment.size()}};
     if (segment.head().order == ListOrder::AsGiven)
-        return GivenOrderSearch(segment).startingWith(prefix);
+        return hasIndex(segment)
+                   ? IndexedSearch(segment).startingWith(prefix)
+                   : GivenOrderSearch(segment).startingWith(prefix);
     SortedSearch search(segment);
     std::string after(prefix);
     ++after.back();  // the least string above all that start with the prefix

@@ -1,14 +1,17 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
+#include <vector>
 
 #include "archive/BitLoad.hpp"
+#include "archive/NumberRange.hpp"
 #include "archive/Segment.hpp"
 
 namespace tessel::archive {
 
-// The numbers of section Order or Index: of each path's number its place, or
-// the other way round.
+// The numbers of section Order or Index: of each path's number its place, or of
+// each place in the order of the paths' bytes the number.
 //
 // Ownership: borrows the segment.
 // Threads: const members from any number of threads.
@@ -42,5 +45,19 @@ private:
     unsigned bits_;
     Section section_;
 };
+
+// The numbers at these places of a section, as ranges. Throws
+// DamagedArchiveException.
+inline std::vector<NumberRange> sortedNumbers(const PackedNumbers& numbers,
+                                              NumberRange places) {
+    std::vector<std::uint32_t> sorted;
+    for (auto place = places.begin; place < places.end; ++place)
+        sorted.push_back(numbers.at(place));
+    std::ranges::sort(sorted);
+    std::vector<NumberRange> ranges;
+    for (const std::uint64_t number : sorted)
+        appendRange(ranges, {number, number + 1});
+    return ranges;
+}
 
 }  // namespace tessel::archive

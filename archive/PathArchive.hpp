@@ -114,10 +114,14 @@ public:
     // ---- Numbers by path ----
 
     // The lowest number of this path, or nothing if it is not in the list.
-    // Costs a few dozen decoded names per segment if the segment is sorted or
-    // was stored shuffled; of another order, all blocks of the path's folder
-    // are decoded. A shuffled segment without index costs a scan of its order
-    // besides, one number per path.
+    // What it costs per segment depends on how the list was ordered:
+    //
+    //   | order                     | with index       | without             |
+    //   |---------------------------|------------------|---------------------|
+    //   | sorted                    |                  | some 50 names       |
+    //   | folders scattered         | some 50 names    | and 2 ns per path   |
+    //   | folders together, but not | some 20 paths    | all folders, and    |
+    //   | sorted                    |                  | names up to the one |
     std::optional<std::uint64_t> numberOf(std::string_view path) const;
 
     bool contains(std::string_view path) const;

@@ -92,8 +92,9 @@ void Segment::checkSizes() const {
     check(Section::FolderHeads,
           bytes(Section::FolderHeads) >= folderHeadBytes * heads);
     check(Section::Order, bytes(Section::Order) == (rearranged ? numbers : 0));
-    check(Section::Index, bytes(Section::Index) == 0 ||
-                              (rearranged && bytes(Section::Index) == numbers));
+    check(Section::Index,
+          bytes(Section::Index) == 0 || (head_.order != ListOrder::Sorted &&
+                                         bytes(Section::Index) == numbers));
 }
 
 const SegmentTables& Segment::buildTables() const {

@@ -130,7 +130,13 @@ void SegmentRules::checkFolderHeads() const {
 // ---- Order and padding ----
 
 void SegmentRules::checkOrder() const {
-    if (segment_.head().order != ListOrder::Rearranged) return;
+    if (segment_.head().order == ListOrder::Rearranged)
+        checkRearranged();
+    else if (segment_.bytesOf(Section::Index) > 0)
+        checkIndexed();
+}
+
+void SegmentRules::checkRearranged() const {
     const PackedNumbers order(segment_, Section::Order);
     const PackedNumbers index(segment_, Section::Index);
     const bool hasIndex = segment_.bytesOf(Section::Index) > 0;
@@ -142,6 +148,23 @@ void SegmentRules::checkOrder() const {
         require(Section::Index, 0, !hasIndex || index.at(place) == i,
                 "The index is not the inverse of the order.");
         found[place] = true;
+    }
+}
+
+// Equal paths must come in the order of their numbers.
+void SegmentRules::checkIndexed() const {
+    const PackedNumbers index(segment_, Section::Index);
+    PathCursor paths(segment_);
+    std::string last;
+    std::uint64_t lastNumber = 0;
+    for (std::uint64_t i = 0; i < segment_.size(); ++i) {
+        const std::uint64_t number = index.at(i);
+        const std::string_view path = paths.at(number);
+        require(Section::Index, 0,
+                i == 0 || last < path || (last == path && lastNumber < number),
+                "The index is not in the order of the paths.");
+        last = path;
+        lastNumber = number;
     }
 }
 

@@ -32,7 +32,9 @@ public:
     // The folder heads are the folders, and the blocks, that they should be.
     void checkFolderHeads() const;
 
-    // Section Order holds each number once, and Index is its inverse.
+    // Section Order holds each number once, and Index is its inverse; or, of a
+    // list that is stored as given, Index brings the paths into the order of
+    // their bytes.
     void checkOrder() const;
 
     // Padding is zeros.
@@ -46,6 +48,8 @@ private:
     void checkNamesEnd(std::uint32_t block, const PathCursor& paths) const;
     void checkPath(std::string_view path, std::string_view name,
                    std::uint64_t offset) const;
+    void checkRearranged() const;
+    void checkIndexed() const;
     bool namesFirst(std::uint32_t nameBlock, std::uint32_t folder) const;
 
     const Segment& segment_;
