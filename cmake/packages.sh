@@ -5,7 +5,7 @@ buildPackages=(cmake g++ libxxhash-dev ninja-build zlib1g-dev)
 checkPackages=(
     clang clang-format clang-tidy dpkg-dev file libclang-rt-dev libgtest-dev
     liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev lintian llvm
-    pkg-config valgrind
+    pkg-config python3-xxhash valgrind
 )
 
 # Installs those of the given Debian packages that are missing. Silent when
