@@ -443,16 +443,16 @@ class Segment:
         if self.order != AS_GIVEN:
             require(all(a <= b for a, b in zip(paths, paths[1:])),
                     "the stored list is not sorted")
-        if self.order != REARRANGED:
-            require(self.sizes[ORDER] == 0 and self.sizes[INDEX] == 0,
-                    "an order that is not needed")
-            return paths
-        order = self.numbers(ORDER)
+        if self.order == REARRANGED:
+            paths = [paths[k] for k in self.numbers(ORDER)]
+        else:
+            require(self.sizes[ORDER] == 0, "an order that is not needed")
         if self.sizes[INDEX]:
-            index = self.numbers(INDEX)
-            require(all(index[k] == i for i, k in enumerate(order)),
-                    "the index is not the inverse of the order")
-        return [paths[k] for k in order]
+            require(self.order != SORTED, "an index that is not needed")
+            require(self.numbers(INDEX) == sorted(range(self.count),
+                                                  key=lambda i: paths[i]),
+                    "the index is not the sorted list")
+        return paths
 
 
 class NameBlock:
