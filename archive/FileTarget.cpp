@@ -74,8 +74,9 @@ FileTarget::FileTarget(const std::string& file) : file_(replacedFile(file)) {
     }
     const std::size_t nameAt = file_.rfind('/') + 1;
     folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
-    prefix_.assign(1, '.');
-    prefix_.append(file_, nameAt, maxNameInPrefix).append(".tessel-");
+    prefix_ = '.';
+    prefix_ += file_.substr(nameAt, maxNameInPrefix);
+    prefix_ += ".tessel-";
     removeLeftovers(folder_, prefix_);
     createTemporary();
 }

@@ -42,7 +42,9 @@ Levels levelsAbove(std::vector<std::uint64_t> pieceSums, unsigned pieceShift) {
         std::vector<std::uint8_t> table;
         table.reserve(8 * sums.size());
         for (const std::uint64_t sum : sums) packUint64(sum, table);
-        sums = sumsOf(table, pieceShift, level);
+        sums.resize(piecesIn(table.size(), pieceShift));
+        for (std::size_t i = 0; i < sums.size(); ++i)
+            sums[i] = pieceSum(table, pieceShift, level, i);
         levels.stored.insert(levels.stored.begin(), table.begin(), table.end());
     }
     levels.top = sums.front();
