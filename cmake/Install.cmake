@@ -24,12 +24,8 @@ install(
 
 # ---- Libraries and headers, for programs ----
 
-set(libraries qztessel_core qztessel_paths qztessel_embedded)
-if(TARGET qztessel_archive)
-  list(APPEND libraries qztessel_archive)
-endif()
 install(
-  TARGETS ${libraries}
+  TARGETS qztessel_core qztessel_paths qztessel_archive qztessel_embedded
   EXPORT qztessel-targets
   ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT development
   FILE_SET HEADERS

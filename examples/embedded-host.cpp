@@ -31,7 +31,7 @@ Value newInstance(Host& host, const Value& folders, const Value& files) {
         for (std::size_t i = 0; i < cell->numel(); ++i)
             lists.push_back(cell->element(i));
     return host.construct(filesetClassName, Value::text(u"files"),
-                          Value::cellColumn(std::move(lists)));
+                          Value::cellColumn(lists));
 }
 
 // Numbers are counted from 1 and ascend.

@@ -20,15 +20,19 @@ diff <(cd "$work/prefix" && find . | sort) \
 
 pcFile=$(find "$work/prefix" -name qztessel.pc)
 export PKG_CONFIG_PATH=${pcFile%/*}
-# Builds a program on a pkg-config package.
-build() {
-    # shellcheck disable=SC2046  # the flags are words
-    "$cxx" -std=c++20 "$1" -o "$work/$2" $(pkg-config --cflags --libs "$2")
+# Builds a program on pkg-config packages and runs it.
+tryProgram() {
+    local source=$1 packages=$2
+    shift 2
+    # shellcheck disable=SC2046,SC2086  # the flags and names are words
+    "$cxx" -std=c++20 "$source" -o "$work/program" \
+        $(pkg-config --cflags --libs $packages)
+    (cd "$work" && ./program "$@")
 }
-build tests/outside/main.cpp qztessel
-"$work/qztessel"
-build examples/keep-a-list.cpp qztessel-paths
-(cd "$work" && ./qztessel-paths)
-build examples/embedded-host.cpp qztessel-embedded
-"$work/qztessel-embedded" "$(pkg-config --variable=plugin qztessel)" \
+tryProgram tests/outside/main.cpp qztessel
+tryProgram examples/keep-a-list.cpp qztessel-paths
+tryProgram examples/pack-and-fetch.cpp qztessel-archive
+tryProgram examples/first-steps.cpp "qztessel-paths qztessel-archive"
+tryProgram examples/embedded-host.cpp qztessel-embedded \
+    "$(pkg-config --variable=plugin qztessel)" \
     "$(pkg-config --variable=messages qztessel)"

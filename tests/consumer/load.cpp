@@ -1,3 +1,5 @@
+// Usage: load PLUG-IN
+//
 // Loads the installed plug-in into a process that is no host: the loader must
 // name the symbol that is missing, and nothing else may be wrong.
 #include <dlfcn.h>
@@ -5,8 +7,8 @@
 #include <iostream>
 #include <string>
 
-int main() {
-    if (dlopen(PLUGIN_FILE, RTLD_NOW) != nullptr) {
+int main(int, char** arguments) {
+    if (dlopen(arguments[1], RTLD_NOW) != nullptr) {
         std::cerr << "a process without a host could load the plug-in\n";
         return 1;
     }
