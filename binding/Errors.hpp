@@ -51,7 +51,7 @@ enum class Element { Folder, File };
 // The position of an element, counted from 1: an entry of the list, or, if
 // `inner` is not 0, a text in that entry.
 struct ElementPosition {
-    std::size_t outer;
+    std::size_t outer = 1;
     std::size_t inner = 0;
 };
 

@@ -95,7 +95,8 @@ void checkCounts(const HostFrame& frame, CountLimits limits) {
 // takes no memory besides the host's array.
 class Decoder {
 public:
-    explicit Decoder(const HuffmanPathTree& coder) : coder_(coder) {}
+    explicit Decoder(const HuffmanPathTree& coder)
+        : coder_(coder), host_(host()) {}
 
     // An n x 1 cell of the components, each as a char row.
     OwnedArray column(const Components& components) {
@@ -103,7 +104,7 @@ public:
         for (std::size_t i = 0; i < components.size(); ++i) {
             text_.clear();
             coder_.appendPathFrom(components[i], text_);
-            setCell(cell, i, createText(text_));
+            setText(cell, i);
         }
         return cell;
     }
@@ -130,7 +131,7 @@ public:
             for (const Component& file : files[i]) {
                 text_.resize(folderEnd);
                 coder_.appendPathFrom(file, text_);
-                setCell(cell, next++, createText(text_));
+                setText(cell, next++);
             }
         }
         return cell;
@@ -149,7 +150,15 @@ private:
         }
     }
 
+    // Puts the buffer's text into a cell, which owns it also if that throws.
+    void setText(const OwnedArray& cell, std::size_t index) {
+        HostArray* const text = host_.hostCreateCharArray(text_);
+        if (text == nullptr) throw HostAllocationFailure();
+        host_.hostSetCell(cell.get(), index, text);
+    }
+
     const HuffmanPathTree& coder_;
+    HostInterface& host_;
     std::u16string text_;
 };
 

@@ -25,7 +25,7 @@ struct FixedText {
     constexpr FixedText(const char (&literal)[size]) {
         std::copy_n(literal, size, characters);
     }
-    char characters[size];
+    char characters[size] = {};
 };
 
 using MethodBody = void (*)(HostFrame& frame);

@@ -6,12 +6,6 @@ namespace tessel::embedded {
 
 namespace {
 
-std::size_t product(std::size_t a, std::size_t b) {
-    if (b != 0 && a > std::numeric_limits<std::size_t>::max() / b)
-        throw std::length_error("The dimensions are too large.");
-    return a * b;
-}
-
 std::unique_ptr<const Dimensions> listUnlessTwo(const Dimensions& dimensions) {
     if (dimensions.size() == 2) return nullptr;
     return std::make_unique<const Dimensions>(dimensions);
@@ -21,12 +15,14 @@ std::unique_ptr<const Dimensions> listUnlessTwo(const Dimensions& dimensions) {
 
 std::size_t elementCount(const Dimensions& dimensions) {
     std::size_t count = 1;
-    for (const std::size_t extent : dimensions) count = product(count, extent);
+    for (const std::size_t extent : dimensions)
+        count = Shape::product(count, extent);
     return count;
 }
 
-Shape::Shape(std::size_t rows, std::size_t columns)
-    : count_(product(rows, columns)), rows_(rows), columns_(columns) {}
+void Shape::refuse() {
+    throw std::length_error("The dimensions are too large.");
+}
 
 Shape::Shape(const Dimensions& dimensions)
     : count_(elementCount(dimensions)),

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "binding/HostInterface.hpp"
+#include "hosts/embedded/BlockPool.hpp"
 
 namespace tessel::embedded {
 
@@ -36,7 +37,8 @@ std::size_t elementCount(const Dimensions& dimensions);
 // number in a list on the heap.
 class Shape {
 public:
-    Shape(std::size_t rows, std::size_t columns);
+    Shape(std::size_t rows, std::size_t columns)
+        : count_(product(rows, columns)), rows_(rows), columns_(columns) {}
     // Both throw std::length_error if the number of elements does not fit.
     explicit Shape(const Dimensions& dimensions);
     Shape(const Shape& other);
@@ -51,6 +53,14 @@ public:
     friend bool operator==(const Shape& a, const Shape& b) noexcept;
 
 private:
+    static std::size_t product(std::size_t a, std::size_t b) {
+        std::size_t result = 0;
+        if (__builtin_mul_overflow(a, b, &result)) refuse();
+        return result;
+    }
+    [[noreturn]] static void refuse();
+    friend std::size_t elementCount(const Dimensions& dimensions);
+
     std::size_t count_;
     std::size_t rows_;
     std::size_t columns_;
@@ -99,13 +109,7 @@ public:
     void drop() const noexcept {
         if (isUnique() ||
             references_.fetch_sub(1, std::memory_order_acq_rel) == 1)
-            delete this;
-    }
-
-    // Elements may follow the object in its block, so its size is not that of
-    // its type.
-    static void operator delete(void* block) noexcept {
-        ::operator delete(block);
+            destroy();
     }
 
 protected:
@@ -114,6 +118,9 @@ protected:
     virtual ~Array() = default;
 
 private:
+    // Destroys the array and releases its block.
+    virtual void destroy() const noexcept = 0;
+
     mutable std::atomic<std::uint32_t> references_ = 1;
     ValueClass valueClass_;
     Shape shape_;
@@ -163,12 +170,23 @@ private:
     }
     ~InlineArray() override { std::destroy_n(data(), numel()); }
 
+    void destroy() const noexcept override {
+        auto* const block = const_cast<InlineArray*>(this);
+        const std::size_t size = sizeFor(numel());
+        block->~InlineArray();
+        BlockPool::release(block, size);
+    }
+
+    static std::size_t sizeFor(std::size_t count) noexcept {
+        return sizeof(InlineArray) + count * sizeof(Element);
+    }
+
     // A process addresses at most 2^47 bytes.
     static void* allocate(std::size_t count) {
         constexpr std::size_t maxBytes = std::size_t{1} << 47U;
         if (count > (maxBytes - sizeof(InlineArray)) / sizeof(Element))
             throw std::bad_array_new_length();
-        return ::operator new(sizeof(InlineArray) + count * sizeof(Element));
+        return BlockPool::allocate(sizeFor(count));
     }
 
     Element* data() noexcept { return reinterpret_cast<Element*>(this + 1); }
@@ -195,6 +213,8 @@ public:
 
 private:
     ~ContainerArray() override = default;
+
+    void destroy() const noexcept override { delete this; }
 };
 
 }  // namespace tessel::embedded

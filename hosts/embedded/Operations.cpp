@@ -36,11 +36,6 @@ void Operations::checkIndex(std::size_t index, std::size_t count) const {
         errors_.raiseOwn("indexOutside", {number(index + 1), number(count)});
 }
 
-// Changing an array that somebody else holds would change it there, too.
-void Operations::checkUnique(const BorrowedValue& array) const {
-    if (!array.isUnique()) errors_.raiseOwn("arrayShared");
-}
-
 // The first element of an object array, if it lives and is of that class.
 Instance& Operations::livingInstance(const HostArray* array,
                                      const char* className) const {
@@ -163,10 +158,11 @@ HostArray* Operations::hostCreateCell(std::size_t rows, std::size_t columns) {
 void Operations::hostSetCell(HostArray* cell, std::size_t index,
                              HostArray* element) {
     Value taken = Value::adopt(element);
-    BorrowedValue value = checked(cell, ValueClass::Cell);
-    checkIndex(index, value->numel());
-    checkUnique(value);
-    value.own().setElement(index, std::move(taken));
+    checked(cell, ValueClass::Cell);
+    auto& cells = static_cast<Value::Cells&>(*cell);
+    checkIndex(index, cells.numel());
+    if (!cells.isUnique()) errors_.raiseOwn("arrayShared");
+    cells.elements()[index] = std::move(taken);
 }
 
 HostArray* Operations::hostCreateNumeric(std::size_t rows, std::size_t columns,

@@ -88,7 +88,6 @@ public:
 
 private:
     BorrowedValue checked(const HostArray* array, ValueClass needed) const;
-    void checkUnique(const BorrowedValue& array) const;
     void checkIndex(std::size_t index, std::size_t count) const;
     Instance& livingInstance(const HostArray* array,
                              const char* className) const;

@@ -147,21 +147,15 @@ const Array& Value::empty() noexcept {
     return *zeroByZero.array_;
 }
 
-template <class Kind>
-const Kind& Value::as(ValueClass valueClass) const {
-    const Array& array = shown();
-    if (array.valueClass() != valueClass) throw std::bad_variant_access();
-    return static_cast<const Kind&>(array);
+void Value::refuseClass() { throw std::bad_variant_access(); }
+
+void Value::refuseIndex() {
+    throw std::out_of_range("There is no such element.");
 }
 
 bool Value::isComplex() const noexcept {
     return valueClass() == ValueClass::Double &&
            static_cast<const Numbers&>(shown()).content.isComplex;
-}
-
-std::u16string_view Value::charData() const {
-    const auto text = as<Texts>(ValueClass::Char).elements();
-    return {text.data(), text.size()};
 }
 
 const std::vector<double>& Value::doubleData() const {
@@ -178,10 +172,6 @@ bool Value::truth(std::size_t index) const {
 
 const std::shared_ptr<Instance>& Value::instance(std::size_t index) const {
     return elementAt(as<Objects>(ValueClass::Object).content, index);
-}
-
-const Value& Value::element(std::size_t index) const {
-    return elementAt(as<Cells>(ValueClass::Cell).elements(), index);
 }
 
 const std::vector<Value>* Value::findField(std::string_view name) const {

@@ -33,6 +33,8 @@ const char* className(ValueClass valueClass) noexcept;
 //   std::bad_variant_access, an index outside throws std::out_of_range.
 class Value {
 public:
+    using Cells = InlineArray<Value>;
+
     // 0 x 0 double: what a cell element or field is before it is set.
     Value() noexcept = default;
     Value(const Value& other) noexcept : array_(other.array_) {
@@ -90,14 +92,21 @@ public:
 
     // Views and references hold as long as the value is neither changed nor
     // gone.
-    std::u16string_view charData() const;
+    std::u16string_view charData() const {
+        const auto text = as<Texts>(ValueClass::Char).elements();
+        return {text.data(), text.size()};
+    }
     // Of complex data both parts, interleaved.
     const std::vector<double>& doubleData() const;
     const std::vector<std::uint8_t>& byteData() const;
     bool truth(std::size_t index) const;
     const std::shared_ptr<Instance>& instance(std::size_t index) const;
 
-    const Value& element(std::size_t index) const;
+    const Value& element(std::size_t index) const {
+        const auto elements = as<Cells>(ValueClass::Cell).elements();
+        if (index >= elements.size()) refuseIndex();
+        return elements[index];
+    }
     void setElement(std::size_t index, Value element);
 
     // Fields, in the order in which they were first set.
@@ -148,7 +157,6 @@ private:
     };
     using Texts = InlineArray<char16_t>;
     using Truths = InlineArray<std::uint8_t>;
-    using Cells = InlineArray<Value>;
     using Numbers = ContainerArray<Doubles>;
     using Bytes = ContainerArray<std::vector<std::uint8_t>>;
     using Structs = ContainerArray<Fields>;
@@ -167,7 +175,13 @@ private:
     }
     Array& changeable();
     template <class Kind>
-    const Kind& as(ValueClass valueClass) const;
+    const Kind& as(ValueClass valueClass) const {
+        const Array& array = shown();
+        if (array.valueClass() != valueClass) refuseClass();
+        return static_cast<const Kind&>(array);
+    }
+    [[noreturn]] static void refuseClass();
+    [[noreturn]] static void refuseIndex();
     template <class Kind>
     Kind& changeableAs(ValueClass valueClass);
     const std::vector<Value>* findField(std::string_view name) const;
@@ -190,7 +204,6 @@ public:
 
     // To change the array, which must have one reference: the caller's.
     Value& own() noexcept { return value_; }
-    bool isUnique() const noexcept { return value_.array_->isUnique(); }
 
 private:
     Value value_;

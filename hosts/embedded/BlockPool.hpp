@@ -1,0 +1,58 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+
+namespace tessel::embedded {
+
+// BlockPool gives out heap blocks and uses small ones again: a plug-in that
+// hands out names makes and drops an array per name.
+//
+// Invariants: keeps at most maxKept blocks of each size, which are multiples of
+//   granularity up to maxSize; larger blocks go straight to the heap.
+// Threads: each thread has a pool of its own and needs no lock. A block may be
+//   given back on another thread than the one that it came from.
+// Cost: a handful of instructions, instead of the 70 to 250 of the C library's
+//   allocator (callgrind, iteration over 30,000 paths of 11 names).
+class BlockPool {
+public:
+    static constexpr std::size_t granularity = 32;
+    static constexpr std::size_t maxSize = 512;
+    static constexpr std::size_t maxKept = 1024;
+
+    // Throws std::bad_alloc.
+    static void* allocate(std::size_t size);
+
+    // size  as it was asked for.
+    static void release(void* block, std::size_t size) noexcept;
+
+    // How many blocks of that size the calling thread keeps.
+    static std::size_t keptCount(std::size_t size) noexcept;
+
+private:
+    // A free block holds the pointer to the next one.
+    struct FreeBlock {
+        FreeBlock* next;
+    };
+    struct FreeList {
+        FreeBlock* first = nullptr;
+        std::size_t count = 0;
+    };
+    // Blocks are kept only while the thread's Closer exists.
+    enum class Stage : std::uint8_t { Unused, Open, Closed };
+    struct Lists {
+        std::array<FreeList, maxSize / granularity + 1> bySize{};
+        Stage stage = Stage::Unused;
+    };
+    class Closer;
+
+    static std::size_t sizeClass(std::size_t size) noexcept {
+        return (size + granularity - 1) / granularity;
+    }
+    static bool isOpen() noexcept;
+
+    static thread_local Lists lists_;
+};
+
+}  // namespace tessel::embedded
