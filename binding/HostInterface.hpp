@@ -21,8 +21,9 @@
 // through the host's call into it.
 // Threads: the plug-in calls an operation only on the thread on which the host
 // called it, never on a thread that it started itself.
-// Pointers: never null, unless a comment says so. Host and plug-in share one
-// C++ runtime, because standard types and exceptions cross between them.
+// Pointers: never null, unless a comment says so.
+// Runtime: host and plug-in share one C++ runtime, because standard types and
+// exceptions cross between them.
 namespace tessel {
 
 class HostInterface;
@@ -118,9 +119,10 @@ inline constexpr std::uint32_t warnOnCopyError = 1U << 15U;
 //              that it filled a slot nobody asked for.
 // outputs      one slot for each declared output, at least one and at least
 //              outputCount. All are null, but in a constructor the first
-//              holds the new instance, which stays the host's. A method fills a
-//              slot with an array that it hands to the host, also when it
-//              throws afterwards.
+//              holds the new instance, which stays the host's. Whatever else
+//              is in the slots after the call is the host's, whether the
+//              method returned or threw. (The methods of HuffmanPaths fill
+//              their slots last: one that throws has filled none.)
 // inputs       inputCount borrowed arrays; the instance first, but not in a
 //              constructor.
 struct HostFrame {
@@ -188,7 +190,7 @@ public:
     // native  may be null.
     virtual void destroyNativeObject(void* native) noexcept = 0;
 
-    // Called after a load or a copy has set an instance's properties.
+    // Called last, after a load or a copy has set an instance's properties.
     virtual void updateInstance(void* /*native*/) {}
 
     // Whether the host may copy an instance: make a new one and carry over the
@@ -207,15 +209,18 @@ public:
         return nullptr;
     }
 
-    // Restores the native object of a new instance from a saved value, before
-    // the host sets the saved properties. Both are borrowed.
+    // Restores the native object of a new instance, whose constructor does not
+    // run, from a saved value. The host sets the saved properties afterwards,
+    // then calls updateInstance. Both arguments are borrowed. The one of
+    // HuffmanPaths never throws: see hostSetNativeObject.
     virtual void customLoad(HostArray* /*instance*/,
                             const HostSavedValue* /*saved*/) {}
 };
 
 // Getters and setters receive the instance's native object, or null for a
-// static property. A getter hands its result to the host, which gives it to the
-// disposer when it has taken the value over; a setter borrows its value.
+// static property. A setter borrows its value. A getter's result is the host's:
+// it may use, change and keep the array, and gives it to the disposer in the
+// end, exactly once and while the module is loaded. Null: no memory.
 using HostPropertyGetter = HostArray* (*)(void* native);
 using HostPropertySetter = void (*)(void* native, const HostArray* value);
 using HostValueDisposer = void (*)(HostArray* value);  // value may be null
@@ -265,8 +270,9 @@ public:
     virtual const HostArray* hostCellElement(const HostArray* cell,
                                              std::size_t index) = 0;
 
-    // The real parts of all elements, one for each, read as the element type
-    // of `out`; of complex data, stored interleaved, every second value. The
+    // Replaces `out` by the real parts of all elements, one for each, read as
+    // the element type of `out`; of complex data, stored interleaved, every
+    // second value. The
     // plug-in asks without looking at the class first: a host should raise an
     // error rather than read an array of another class.
     virtual void hostRealElements(const HostArray* numeric,
@@ -275,8 +281,10 @@ public:
                                   std::vector<std::uint8_t>& out) = 0;
 
     // The data of a double array, of which the plug-in will read the first
-    // `count` values; borrowed. The plug-in checks neither class nor length: a
-    // host should raise an error unless that many values are there.
+    // `count` doubles as they are in memory; borrowed. The plug-in checks
+    // neither class nor length: a host should raise an error unless there are
+    // that many elements, and for complex data, whose imaginary parts would be
+    // read, too.
     virtual const double* hostDoubleData(const HostArray* numeric,
                                          std::size_t count) = 0;
 
@@ -327,8 +335,9 @@ public:
     virtual void* hostNativeObject(const HostArray* instance,
                                    const char* className) = 0;
 
-    // Gives back, at the end of a custom load, the native object that
-    // hostNativeObject answered.
+    // Gives back the native object that hostNativeObject answered: once for
+    // each custom load that restored something, and never for one that failed,
+    // so that a host can tell them apart.
     virtual void hostSetNativeObject(HostArray* instance, const char* className,
                                      void* native) = 0;
 

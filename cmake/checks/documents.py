@@ -4,7 +4,8 @@
 Checks what pages of Markdown say against what is there:
 
   - a relative link leads to a file of ours;
-  - a block marked cpp is, spaces aside, part of a program of examples/;
+  - a block marked cpp is, spaces aside, part of a program of examples/ or of
+    hosts/minimal/;
   - with --run, each block marked console is run, in one empty folder per page
     and with FOLDER first in the search path: what follows a line "$ COMMAND"
     is its output. A line "..." stands for any lines. In a line with a time in
@@ -99,7 +100,8 @@ def main():
     arguments = parser.parse_args()
     programs = [
         without_spaces(file.read_text())
-        for file in pathlib.Path("examples").glob("*.cpp")
+        for folder in ("examples", "hosts/minimal")
+        for file in pathlib.Path(folder).glob("*.?pp")
     ]
     found = False
     for page in arguments.pages:
