@@ -141,12 +141,14 @@ void measureWorkers(const PathSplitter& splitter, int runs, Internals& result) {
     for (int i = 0; i < runs; ++i) {
         // Encoding uses up the texts, so every run has its own.
         for (const unsigned workers : {1U, 2U}) {
-            coder->asyncFolders = batch.folders;
-            coder->asyncFiles = batch.files;
+            auto folders = batch.folders;
+            auto files = batch.files;
+            tessel::AtomicMaximum longest;
+            tessel::BatchEncoder encoder(coder->code(), longest, folders,
+                                         files);
             (workers == 1 ? one : two).push_back(secondsOf([&] {
-                coder->encodeOnWorkers(workers);
+                encoder.encode(workers);
             }));
-            coder->clearThreadResources();
         }
     }
     result.twoWorkers = medianRatio(one, two);

@@ -6,17 +6,19 @@
 
 namespace tessel {
 
-// The code of every character, for encoding: from a code unit to the bits
-// of its code, nearest the root first, and its leaf in the Huffman tree.
+// The code of every character, for encoding: from a code unit to the bits of
+// its code, nearest the root first, and to its leaf in the Huffman tree.
 //
-// A code of at most `longestInline` bits stands in the table itself. Of a
-// longer one the table only knows the leaf, from which the bits are read off
-// the tree: so a tree as deep as it has leaves costs no more than any other.
+// A code of at most `longestInline` bits is in the table itself. For a longer
+// code the table holds only the leaf, and the bits are read from the tree: so
+// a tree as deep as it has leaves costs no more than any other.
 //
-// Threads: reading is safe from many threads while nobody inserts.
-// Cost: 16 bytes a code unit for each block of 256 units in use.
+// Ownership: a value; copies are independent.
+// Threads: any number of readers while nobody inserts.
+// Cost: 16 bytes per code unit, for each block of 256 units in use.
 class CodeTable {
 public:
+    // A bit writer that holds up to 7 bits takes this many more in 64.
     static constexpr unsigned longestInline = 56;
 
     struct Entry {
@@ -32,13 +34,14 @@ public:
         return entries_[pageStart_[character >> 8] + (character & 0xFFU)];
     }
 
-    // Adds the entry unless the character has one already.
+    // Adds the entry unless the character has one already. If it throws
+    // (std::bad_alloc), nothing changes.
     void insert(char16_t character, const Entry& entry);
 
-    // Takes every code away; keeps the memory.
+    // Removes every code; keeps the memory.
     void clear() noexcept;
 
-    // Characters that have a code.
+    // Number of characters that have a code.
     std::size_t size() const noexcept { return count_; }
 
     // Bytes on the heap.
@@ -50,7 +53,7 @@ public:
 private:
     static constexpr std::size_t pageEntries = 256;
 
-    // Page 0 has no codes and serves all code units whose page is not there.
+    // Page 0 holds no codes; every block of units without codes uses it.
     std::vector<std::uint32_t> pageStart_ =
         std::vector<std::uint32_t>(pageEntries, 0);
     std::vector<Entry> entries_ = std::vector<Entry>(pageEntries);

@@ -1,95 +1,101 @@
 #pragma once
 
-#include <bit>
+#include <array>
 #include <cstddef>
 #include <cstdint>
-#include <cstring>
 #include <vector>
 
 #include "coder/HNode.hpp"
-#include "pathtree/containers.hpp"
 
 namespace tessel {
 
-// What the next bits decode to, several characters at a step, derived from a
-// Huffman tree. It gives exactly what walking the tree bit by bit gives and
-// leaves to that walk whatever it does not hold: codes longer than
-// `windowBits` and bits that lead off the tree.
+// Maps the next `windowBits` bits to the characters that they begin with,
+// several per entry, derived from a Huffman tree. Decoding by the table gives
+// exactly what walking the tree bit by bit gives; codes longer than a window
+// and bits that lead off the tree are left to that walk.
 //
+// Ownership: a value; copies are independent.
+// Threads: any number of readers while nobody builds.
 // Cost: 16 KiB.
 class DecodeTable {
 public:
+    // Chosen so that the table stays within half of a 32 KiB first-level
+    // cache; 12 bits would fill all of it.
     static constexpr unsigned windowBits = 11;
-    static constexpr unsigned mostCharacters = 3;
+    // As many as share eight bytes with the lengths of their codes.
+    static constexpr unsigned maxCharacters = 3;
 
-    // Up to three characters and the bits that they take, in one word: the
-    // characters from the lowest bits up, their count, and the bits that the
-    // first one, two and three take. What fewer characters leave free repeats
-    // the last, so the bits of three are those of all.
-    class Step {
+    // Up to three characters and their code lengths, in one 8-byte word:
+    //
+    //   | characters, 3 x 16 bits | 16 bits: count, end of 1, of 2, of 3 |
+    //
+    // "End of n" is the number of bits that the first n characters take. If
+    // an entry has fewer than three, the last end is repeated, so "end of 3"
+    // is always the total.
+    class Entry {
     public:
-        // Characters that a step is written as, with or without a meaning.
-        static constexpr unsigned writtenCharacters = 4;
+        // Number of code units that a whole entry overlays.
+        static constexpr unsigned writtenUnits = 4;
 
-        // 0: nothing is known, ask the tree.
+        // 0: nothing is known; walk the tree.
         unsigned count() const noexcept { return field(0); }
-        // Bits that all of its characters take.
-        unsigned bits() const noexcept { return field(mostCharacters); }
-        // Bits that the first n take, n from 1 to count().
-        unsigned bitsOf(unsigned n) const noexcept { return field(n); }
+        // Bits that all its characters take.
+        unsigned bitLength() const noexcept { return field(maxCharacters); }
+        // Bits that the first n characters take, n from 1 to count().
+        unsigned bitLengthOf(unsigned n) const noexcept { return field(n); }
 
         // How many of its characters end within so many bits.
-        unsigned countWithin(std::uint64_t bitCount) const noexcept {
+        unsigned charactersWithin(std::uint64_t bitCount) const noexcept {
             unsigned n = count();
-            while (n > 0 && bitsOf(n) > bitCount) --n;
+            while (n > 0 && bitLengthOf(n) > bitCount) --n;
             return n;
         }
 
-        // Writes its characters and, behind them, what is to be overwritten.
-        void writeTo(char16_t* out) const noexcept {
-            static_assert(std::endian::native == std::endian::little);
-            static_assert(sizeof word_ == writtenCharacters * sizeof *out);
-            std::memcpy(out, &word_, sizeof word_);
-        }
+        // Writes writtenUnits code units: its count() characters and then
+        // garbage, which the next write must cover.
+        void writeTo(char16_t* out) const noexcept;
 
-        // Appends a character that ends after so many bits of the window;
-        // there must be fewer than mostCharacters.
+        // Appends a character whose code ends after so many bits of the
+        // window. There must be fewer than maxCharacters.
         void append(char16_t character, unsigned bitCount) noexcept;
 
     private:
-        static constexpr unsigned characterBits = 16;
         static constexpr unsigned fieldBits = 4;
-        static constexpr unsigned fieldsAt = mostCharacters * characterBits;
-        static constexpr std::uint64_t fieldMask = (1U << fieldBits) - 1;
-        static_assert(windowBits < 1U << fieldBits);
+        static constexpr unsigned fieldMask = (1U << fieldBits) - 1;
+        static_assert(windowBits <= fieldMask);
 
         unsigned field(unsigned i) const noexcept {
-            return static_cast<unsigned>((word_ >> (fieldsAt + i * fieldBits)) &
-                                         fieldMask);
+            return (fields_ >> (i * fieldBits)) & fieldMask;
         }
 
-        std::uint64_t word_ = 0;
+        std::array<char16_t, maxCharacters> characters_{};
+        std::uint16_t fields_ = 0;
     };
+    static_assert(sizeof(Entry) == Entry::writtenUnits * sizeof(char16_t));
 
     // Derives the table; an empty tree or one whose root is a leaf gives an
-    // empty table.
+    // empty table. If it throws (std::bad_alloc), the table is empty.
     void build(const std::vector<HNode>& nodes, std::int32_t rootIndex);
 
-    void clear() noexcept { releaseContents(steps_); }
-    bool empty() const noexcept { return steps_.empty(); }
+    void clear() noexcept;
+    bool empty() const noexcept { return entries_.empty(); }
 
-    // The step for the next windowBits bits, the first one least significant.
-    Step operator[](std::uint64_t window) const noexcept {
-        return steps_[window & ((1U << windowBits) - 1)];
+    // The entry for the next windowBits bits, the first one least significant.
+    const Entry& operator[](std::uint64_t window) const noexcept {
+        return entries_[window & ((1U << windowBits) - 1)];
     }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
-        return steps_.capacity() * sizeof(Step);
+        return entries_.capacity() * sizeof(Entry);
     }
 
 private:
-    std::vector<Step> steps_;
+    std::vector<Entry> entries_;
 };
+
+inline void DecodeTable::Entry::writeTo(char16_t* out) const noexcept {
+    __builtin_memcpy(out, this, sizeof *this);
+}
 
 }  // namespace tessel

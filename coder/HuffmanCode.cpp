@@ -1,10 +1,11 @@
-// The Huffman code: construction from frequencies, its compact form and back.
+#include "coder/HuffmanCode.hpp"
 
 #include <algorithm>
+#include <limits>
 #include <stdexcept>
-#include <utility>
 
-#include "coder/HuffmanPathTree.hpp"
+#include "packing/ByteCursor.hpp"
+#include "pathtree/containers.hpp"
 
 namespace tessel {
 
@@ -14,37 +15,31 @@ std::size_t at(std::int32_t position) {
     return static_cast<std::size_t>(position);
 }
 
-bool isPosition(std::int32_t position, std::size_t size) {
-    return position >= 0 && at(position) < size;
-}
-
-void pushLeaf(HuffmanPathTree::HeapQueue& queue, double frequency,
-              char16_t character) {
-    HNode leaf;
-    leaf.frequency = frequency;
-    leaf.character = character;
-    queue.push(leaf);
+std::size_t leavesIn(const std::vector<bool>& shape) {
+    return static_cast<std::size_t>(
+        std::count(shape.begin(), shape.end(), true));
 }
 
 }  // namespace
 
-HuffmanPathTree::HuffmanPathTree() : pathTree(std::make_unique<BPathTree>()) {}
+const char* NoCodeForEmptyString::what() const noexcept {
+    return "No code for an empty string.";
+}
 
-HuffmanPathTree::~HuffmanPathTree() {
-    joinAllGenThreads();
-    clearThreadResources();
+const char* CodeNotFoundException::what() const noexcept {
+    return "Code for the character not found.";
 }
 
 // ---- Construction ----
 
-void HuffmanPathTree::requireNoCode() const {
+void HuffmanCode::requireNoCode() const {
     if (!nodes.empty()) throw std::logic_error("The coder has a code already.");
 }
 
-// Runs `build`, which makes `nodes`, and derives the code. If memory runs
+// Runs `build`, which makes `nodes`, and fills the tables. If memory runs
 // out, there is no code, as before, and it can be built again.
 template <class Build>
-void HuffmanPathTree::buildCode(Build build) {
+void HuffmanCode::buildOrClear(Build build) {
     try {
         build();
         generateCode();
@@ -58,13 +53,13 @@ void HuffmanPathTree::buildCode(Build build) {
     }
 }
 
-void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
-                                     const std::u16string& characters) {
+void HuffmanCode::build(const double* characterFrequencies,
+                        const std::u16string& characters) {
     requireNoCode();
     if (!boolTree.empty())
         throw std::logic_error("The coder has loaded a shape already.");
     try {
-        buildCode([&] {
+        buildOrClear([&] {
             makeHeapAndTree(characterFrequencies, characters);
             generateCompressedTree();
         });
@@ -76,38 +71,21 @@ void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
     }
 }
 
-void HuffmanPathTree::deflateHuffman(
-    const std::unordered_map<char16_t, double>& characterFrequencies) {
-    std::u16string characters;
-    std::vector<double> values;
-    for (const auto& [character, frequency] : characterFrequencies) {
-        characters.push_back(character);
-        values.push_back(frequency);
-    }
-    deflateHuffman(values.data(), characters);
-}
-
-void HuffmanPathTree::makeHeapAndTree(const double* characterFrequencies,
-                                      const std::u16string& characters) {
+void HuffmanCode::makeHeapAndTree(const double* characterFrequencies,
+                                  const std::u16string& characters) {
     releaseContents(frequencies);
     frequencies.reserve(characters.size());
     HeapQueue queue;
-    for (std::size_t i = 0; i < characters.size(); ++i)
-        pushLeaf(queue, characterFrequencies[i], characters[i]);
+    for (std::size_t i = 0; i < characters.size(); ++i) {
+        HNode leaf;
+        leaf.frequency = characterFrequencies[i];
+        leaf.character = characters[i];
+        queue.push(leaf);
+    }
     generateTree(queue);
 }
 
-void HuffmanPathTree::makeHeapAndTree(
-    const std::unordered_map<char16_t, double>& characterFrequencies) {
-    releaseContents(frequencies);
-    frequencies.reserve(characterFrequencies.size());
-    HeapQueue queue;
-    for (const auto& [character, frequency] : characterFrequencies)
-        pushLeaf(queue, frequency, character);
-    generateTree(queue);
-}
-
-void HuffmanPathTree::generateTree(HeapQueue& queue) {
+void HuffmanCode::generateTree(HeapQueue& queue) {
     decodeTable_.clear();
     if (queue.size() < 2) {
         rootIndex = queue.empty() ? -1 : queue.top().index;
@@ -138,36 +116,35 @@ void HuffmanPathTree::generateTree(HeapQueue& queue) {
     rootIndex = queue.top().index;
 }
 
-void HuffmanPathTree::traverse(Visitor visit) {
-    if (!isPosition(rootIndex, nodes.size())) return;
-    std::vector<HNode> pending{nodes[at(rootIndex)]};
-    while (!pending.empty()) {
-        HNode node = pending.back();
-        pending.pop_back();
-        const HNode seen = node;  // the visitor may change its copy
-        visit(this, node);
-        if (seen.right != -1) pending.push_back(nodes[at(seen.right)]);
-        if (seen.left != -1) pending.push_back(nodes[at(seen.left)]);
-    }
+void HuffmanCode::generateCompressedTree() {
+    traverse([this](const HNode& node) {
+        boolTree.push_back(node.isLeaf());
+        if (!node.isLeaf()) return;
+        treeString.push_back(node.character);
+        frequencies.push_back(node.frequency);
+    });
 }
 
-void HuffmanPathTree::generateCode() {
+void HuffmanCode::generateCode() {
     parentOf.assign(nodes.size(), -1);
-    traverse([](HuffmanPathTree* self, HNode& node) {
-        if (node.left != -1) self->parentOf[at(node.left)] = node.index;
-        if (node.right != -1) self->parentOf[at(node.right)] = node.index;
-        if (node.isLeaf()) self->addCode(node);
+    traverse([this](const HNode& node) {
+        if (node.left != -1) parentOf[at(node.left)] = node.index;
+        if (node.right != -1) parentOf[at(node.right)] = node.index;
+        if (node.isLeaf()) addCode(node);
     });
     decodeTable_.build(nodes, rootIndex);
 }
 
-void HuffmanPathTree::addCode(const HNode& leaf) {
+void HuffmanCode::addCode(const HNode& leaf) {
+    const auto parentOfNode = [this](std::int32_t child) {
+        const bool known = child >= 0 && at(child) < parentOf.size();
+        return known ? parentOf[at(child)] : -1;
+    };
     CodeTable::Entry entry;
     entry.leaf = leaf.index;
-    for (std::int32_t child = leaf.index;;) {
-        if (!isPosition(child, parentOf.size())) break;
-        const std::int32_t parent = parentOf[at(child)];
-        if (parent == -1) break;
+    std::int32_t child = leaf.index;
+    for (std::int32_t parent = parentOfNode(child); parent != -1;
+         parent = parentOfNode(child)) {
         if (entry.length == CodeTable::longestInline) {
             entry = {0, leaf.index, 0, true};
             break;
@@ -180,7 +157,75 @@ void HuffmanPathTree::addCode(const HNode& leaf) {
     codes.insert(leaf.character, entry);
 }
 
-std::vector<bool> HuffmanPathTree::codeOf(char16_t character) const {
+// ---- From the compact form ----
+
+void HuffmanCode::restore(const std::u16string& characters) {
+    requireNoCode();
+    if (characters.size() != leavesIn(boolTree)) throw DamagedFormException();
+    buildOrClear([&] {
+        treeString = characters;
+        inflate();
+    });
+}
+
+std::size_t HuffmanCode::inflateFromBoolTree() {
+    const std::size_t leaves = leavesIn(boolTree);
+    if (leaves > treeString.size()) throw DamagedFormException();
+    decodeTable_.clear();
+    nodes.reserve(nodes.size() + boolTree.size());
+    std::size_t character = 0;
+    for (std::size_t k = 0; k < boolTree.size(); ++k) {
+        HNode node;
+        node.index = static_cast<std::int32_t>(k);
+        if (boolTree[k]) node.character = treeString[character++];
+        nodes.push_back(node);
+    }
+    return leaves;
+}
+
+void HuffmanCode::inflateFromCompressedTree() {
+    const bool hasLinks = !boolTree.empty() && !boolTree.front();
+    const auto isUnlinked = [this](const HNode& node) {
+        return node.isLeaf() && node.index >= 0 &&
+               at(node.index) < boolTree.size();
+    };
+    if (hasLinks &&
+        (nodes.empty() || !std::all_of(nodes.begin(), nodes.end(), isUnlinked)))
+        throw std::logic_error("The coder has no unlinked nodes of its shape.");
+    decodeTable_.clear();
+    rootIndex = 0;
+    if (!hasLinks) return;
+    std::vector<std::size_t> open{0};
+    std::size_t handedOut = 0;
+    while (!open.empty()) {
+        const std::size_t top = open.back();
+        if (boolTree[at(nodes[top].index)]) {
+            open.pop_back();
+            continue;
+        }
+        // A shape with more inner nodes than nodes to link: some stay without
+        // children.
+        if (++handedOut >= nodes.size()) return;
+        const auto child = static_cast<std::int32_t>(handedOut);
+        if (nodes[top].left == -1) {
+            nodes[top].left = child;
+        } else {
+            nodes[top].right = child;
+            open.pop_back();
+        }
+        open.push_back(handedOut);
+    }
+}
+
+void HuffmanCode::inflate() {
+    requireNoCode();
+    inflateFromBoolTree();
+    inflateFromCompressedTree();
+}
+
+// ---- Questions ----
+
+std::vector<bool> HuffmanCode::codeOf(char16_t character) const {
     const CodeTable::Entry& entry = codes[character];
     if (!entry.exists()) throw CodeNotFoundException();
     std::vector<bool> bits;
@@ -198,111 +243,26 @@ std::vector<bool> HuffmanPathTree::codeOf(char16_t character) const {
     return bits;
 }
 
-std::vector<double> HuffmanPathTree::getFrequencies() const {
-    return frequencies;
-}
-
-void HuffmanPathTree::setFrequencies(std::vector<double>& newFrequencies) {
-    frequencies = std::exchange(newFrequencies, {});
-}
-
-void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
-    if (&other != this) {
-        boolTree = other.boolTree;
-        treeString = other.treeString;
-        duplicates = other.duplicates;
-        partitionEnds = other.partitionEnds;
-        partitionTracks = other.partitionTracks;
-        maxPartitionTrackLength = other.maxPartitionTrackLength;
-        maxDuplicateTrackLength = other.maxDuplicateTrackLength;
-        maxCodeBytes = other.maxCodeBytes.load();
-        maxDuplicatePathNumber = other.maxDuplicatePathNumber;
-        nextPathNumber = other.nextPathNumber;
-        pathCount = other.pathCount;
-        frequencies = other.frequencies;
-        rootIndex = other.rootIndex;
-        nodes = other.nodes;
-        codes = other.codes;
-        parentOf = other.parentOf;
-        decodeTable_ = other.decodeTable_;
-        endsAscend_ = other.endsAscend_;
+bool HuffmanCode::isShape(const std::vector<bool>& bits) {
+    if (bits.empty()) return true;
+    if (bits.size() > std::numeric_limits<std::int32_t>::max()) return false;
+    std::size_t awaited = 1;
+    for (const bool isLeaf : bits) {
+        if (awaited == 0) return false;
+        if (isLeaf)
+            --awaited;
+        else
+            ++awaited;
     }
-    pathTree = std::make_unique<BPathTree>(*other.pathTree);
+    return awaited == 0;
 }
 
-// ---- Compact form ----
-
-void HuffmanPathTree::generateCompressedTree() {
-    traverse([](HuffmanPathTree* self, HNode& node) {
-        self->boolTree.push_back(node.isLeaf());
-        if (!node.isLeaf()) return;
-        self->treeString.push_back(node.character);
-        self->frequencies.push_back(node.frequency);
-    });
-}
-
-std::vector<bool> HuffmanPathTree::getBoolTree() const { return boolTree; }
-
-std::u16string HuffmanPathTree::getTreeString() const { return treeString; }
-
-void HuffmanPathTree::setTreeString(const std::u16string& newTreeString) {
-    treeString = newTreeString;
-}
-
-std::size_t HuffmanPathTree::inflateFromBoolTree() {
-    const auto leaves = static_cast<std::size_t>(
-        std::count(boolTree.begin(), boolTree.end(), true));
-    if (leaves > treeString.size()) throw DamagedFormException();
-    decodeTable_.clear();
-    nodes.reserve(nodes.size() + boolTree.size());
-    std::size_t character = 0;
-    for (std::size_t k = 0; k < boolTree.size(); ++k) {
-        HNode node;
-        node.index = static_cast<std::int32_t>(k);
-        if (boolTree[k]) node.character = treeString[character++];
-        nodes.push_back(node);
-    }
-    return leaves;
-}
-
-void HuffmanPathTree::inflateFromCompressedTree() {
-    decodeTable_.clear();
-    rootIndex = 0;
-    if (boolTree.empty() || boolTree.front()) return;
-    std::vector<std::size_t> open{0};
-    std::size_t handedOut = 0;
-    while (!open.empty()) {
-        const std::size_t top = open.back();
-        if (boolTree[at(nodes[top].index)]) {
-            open.pop_back();
-            continue;
-        }
-        if (++handedOut >= nodes.size()) return;  // more folders than nodes
-        const auto child = static_cast<std::int32_t>(handedOut);
-        if (nodes[top].left == -1) {
-            nodes[top].left = child;
-        } else {
-            nodes[top].right = child;
-            open.pop_back();
-        }
-        open.push_back(handedOut);
-    }
-}
-
-void HuffmanPathTree::inflate() {
-    inflateFromBoolTree();
-    inflateFromCompressedTree();
-}
-
-void HuffmanPathTree::inflateHuffman(const std::u16string& newTreeString) {
-    requireNoCode();
-    const auto leaves = static_cast<std::size_t>(
-        std::count(boolTree.begin(), boolTree.end(), true));
-    if (newTreeString.size() != leaves) throw DamagedFormException();
-    buildCode([&] {
-        setTreeString(newTreeString);
-        inflate();
-    });
+std::size_t HuffmanCode::memoryBytes() const noexcept {
+    return boolTree.capacity() / 8 + treeString.capacity() * sizeof(char16_t) +
+           frequencies.capacity() * sizeof(double) +
+           nodes.capacity() * sizeof(HNode) +
+           parentOf.capacity() * sizeof(std::int32_t) + codes.memoryBytes() +
+           decodeTable_.memoryBytes();
 }
 
 }  // namespace tessel

@@ -179,14 +179,23 @@ std::span<const std::uint8_t> unpackVector(ByteCursor& cursor,
     return cursor.take(cursor.takeUint(lengthSize));
 }
 
-std::vector<std::uint8_t> compressUint8(std::vector<std::uint8_t>& data) {
+void appendCompressed(std::span<const std::uint8_t> data,
+                      std::vector<std::uint8_t>& out) {
+    const std::size_t before = out.size();
     uLongf length = compressBound(data.size());
-    std::vector<std::uint8_t> result(length);
-    if (compress2(result.data(), &length, data.data(), data.size(),
-                  compressionLevel) != Z_OK)
-        throw std::bad_alloc();  // the buffer is large enough by construction
-    result.resize(length);
-    return result;
+    out.resize(before + length);
+    const int status = compress2(out.data() + before, &length, data.data(),
+                                 data.size(), compressionLevel);
+    // The buffer is large enough by construction, so only memory can be
+    // missing.
+    out.resize(before + (status == Z_OK ? length : 0));
+    if (status != Z_OK) throw std::bad_alloc();
+}
+
+std::vector<std::uint8_t> compressUint8(std::vector<std::uint8_t>& data) {
+    std::vector<std::uint8_t> stream;
+    appendCompressed(data, stream);
+    return stream;
 }
 
 std::vector<std::uint8_t> decompressUint8(ByteIterator begin,

@@ -165,6 +165,12 @@ std::span<const std::uint8_t> unpackVector(ByteCursor& cursor,
 // memory again as the data. Throws std::bad_alloc.
 std::vector<std::uint8_t> compressUint8(std::vector<std::uint8_t>& data);
 
+// Appends the same stream to `out`, which must be another vector than the
+// data, without a buffer of its own. If it throws (std::bad_alloc), nothing
+// is appended.
+void appendCompressed(std::span<const std::uint8_t> data,
+                      std::vector<std::uint8_t>& out);
+
 // What zlib can get out of the stream at `begin`: at most uncompressedSize
 // bytes, fewer when the stream is damaged or shorter. Errors are not
 // reported, and uncompressedSize bytes are allocated first, so use

@@ -11,7 +11,6 @@
 #include "pathtree/NodePool.hpp"
 #include "pathtree/NodeStack.hpp"
 #include "pathtree/PackedComponents.hpp"
-#include "pathtree/PathTracks.hpp"
 
 namespace tessel {
 
@@ -43,6 +42,9 @@ public:
 // of file names, or a whole path with the file name last.
 using Component = std::vector<std::uint8_t>;
 using Components = std::vector<Component>;
+
+// A path track: child positions from the root of the path tree down.
+using PathTrack = std::vector<std::uint64_t>;
 
 // The path that a pass is at: views of the tree, valid during the visit.
 struct PathView {

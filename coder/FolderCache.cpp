@@ -1,20 +1,20 @@
-#include "coder/FolderMemo.hpp"
+#include "coder/FolderCache.hpp"
 
 namespace tessel {
 
-std::uint32_t FolderMemo::hashOf(const PackedComponents& components) noexcept {
+std::uint32_t FolderCache::hashOf(const PackedComponents& components) noexcept {
     return HashIndex::hashOf(components.bytes());
 }
 
-const FolderMemo::Folder* FolderMemo::find(const PackedComponents& components,
-                                           std::uint32_t hash) const noexcept {
+const FolderCache::Folder* FolderCache::find(
+    const PackedComponents& components, std::uint32_t hash) const noexcept {
     const std::size_t position = index_.find(hash, [&](std::size_t candidate) {
         return sameComponent(folders_[candidate].bytes, components.bytes());
     });
     return position == HashIndex::notFound ? nullptr : &folders_[position];
 }
 
-void FolderMemo::reserveFor(std::size_t depth) {
+void FolderCache::reserveFor(std::size_t depth) {
     const std::size_t positions = positions_.size() + depth;
     if (positions > positions_.capacity()) positions_.reserve(2 * positions);
     if (folders_.size() == folders_.capacity())
@@ -23,9 +23,9 @@ void FolderMemo::reserveFor(std::size_t depth) {
 }
 
 // What a failed step leaves behind is not reached from the index.
-void FolderMemo::add(const PackedComponents& components, std::uint32_t hash,
-                     BNode& node, const PathTrack& track) {
-    // More folders than the index can tell apart are just not remembered.
+void FolderCache::add(const PackedComponents& components, std::uint32_t hash,
+                      BNode& node, const PathTrack& track) {
+    // More folders than the index can tell apart are not cached.
     if (folders_.size() > HashIndex::maxPosition) return;
     const std::size_t start = positions_.size();
     positions_.insert(positions_.end(), track.begin(), track.end());
@@ -33,22 +33,22 @@ void FolderMemo::add(const PackedComponents& components, std::uint32_t hash,
     index_.insert(hash, folders_.size() - 1);
 }
 
-const FolderMemo::Folder* FolderMemo::likely(
+const FolderCache::Folder* FolderCache::inHomeSlot(
     std::uint32_t hash) const noexcept {
     const std::size_t position = index_.homeSlot(hash);
     return position == HashIndex::notFound ? nullptr : &folders_[position];
 }
 
-void FolderMemo::fetchEntry(std::uint32_t hash) const noexcept {
+void FolderCache::prefetchEntry(std::uint32_t hash) const noexcept {
     index_.prefetch(hash);
 }
 
-void FolderMemo::fetchFolder(std::uint32_t hash) const noexcept {
-    if (const Folder* folder = likely(hash)) __builtin_prefetch(folder);
+void FolderCache::prefetchFolder(std::uint32_t hash) const noexcept {
+    if (const Folder* folder = inHomeSlot(hash)) __builtin_prefetch(folder);
 }
 
-void FolderMemo::fetchNode(std::uint32_t hash) const noexcept {
-    const Folder* folder = likely(hash);
+void FolderCache::prefetchNode(std::uint32_t hash) const noexcept {
+    const Folder* folder = inHomeSlot(hash);
     if (folder == nullptr) return;
     __builtin_prefetch(folder->node);
     __builtin_prefetch(folder->bytes.data());

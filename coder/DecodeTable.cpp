@@ -1,49 +1,32 @@
-#include <algorithm>
+#include "coder/DecodeTable.hpp"
+
 #include <utility>
 
-#include "coder/CodeTable.hpp"
-#include "coder/DecodeTable.hpp"
+#include "pathtree/containers.hpp"
 
 namespace tessel {
 
-void CodeTable::insert(char16_t character, const Entry& entry) {
-    std::uint32_t& start = pageStart_[character >> 8];
-    if (start == 0) {
-        const auto fresh = static_cast<std::uint32_t>(entries_.size());
-        entries_.reserve(entries_.size() + pageEntries);
-        entries_.resize(entries_.size() + pageEntries);
-        start = fresh;
-    }
-    Entry& place = entries_[start + (character & 0xFFU)];
-    if (place.exists()) return;
-    place = entry;
-    ++count_;
-}
-
-void CodeTable::clear() noexcept {
-    std::fill(pageStart_.begin(), pageStart_.end(), 0U);
-    entries_.resize(pageEntries);
-    count_ = 0;
-}
-
-void DecodeTable::Step::append(char16_t character, unsigned bitCount) noexcept {
+void DecodeTable::Entry::append(char16_t character,
+                                unsigned bitCount) noexcept {
     const unsigned position = count();
-    word_ |= std::uint64_t{character} << (position * characterBits);
-    word_ += std::uint64_t{1} << fieldsAt;
-    // From its own place on to that of all characters.
-    for (unsigned i = position + 1; i <= mostCharacters; ++i) {
-        const unsigned at = fieldsAt + i * fieldBits;
-        word_ &= ~(fieldMask << at);
-        word_ |= std::uint64_t{bitCount} << at;
+    characters_[position] = character;
+    unsigned fields = fields_ + 1U;
+    // Its own end, and that of all characters that are not there.
+    for (unsigned i = position + 1; i <= maxCharacters; ++i) {
+        fields &= ~(fieldMask << (i * fieldBits));
+        fields |= bitCount << (i * fieldBits);
     }
+    fields_ = static_cast<std::uint16_t>(fields);
 }
+
+void DecodeTable::clear() noexcept { releaseContents(entries_); }
 
 namespace {
 
 constexpr std::size_t windows = std::size_t{1} << DecodeTable::windowBits;
 
-// The character that a window begins with, and the bits of its code; none,
-// and 0, if its code is longer than the window or leads off the tree.
+// The character that a window begins with and the length of its code; length
+// 0 if the code is longer than the window or leads off the tree.
 struct FirstCharacter {
     char16_t character = 0;
     unsigned bits = 0;
@@ -89,20 +72,20 @@ void DecodeTable::build(const std::vector<HNode>& nodes,
     const HNode& root = nodes[static_cast<std::size_t>(rootIndex)];
     if (root.isLeaf()) return;
     const auto firsts = firstCharacters(nodes, root);
-    std::vector<Step> built(windows);
+    std::vector<Entry> built(windows);
     for (std::size_t window = 0; window < windows; ++window) {
-        Step& step = built[window];
-        // What is left of the window is filled up with zeros, which may look
-        // like a character but must not reach beyond the window's end.
+        Entry& entry = built[window];
+        // The rest of a window is filled up with zeros. They may look like a
+        // character, so none is taken that ends after the window.
         FirstCharacter next = firsts[window];
         for (unsigned end = next.bits; next.bits != 0 && end <= windowBits;
              end += next.bits) {
-            step.append(next.character, end);
-            if (step.count() == mostCharacters) break;
+            entry.append(next.character, end);
+            if (entry.count() == maxCharacters) break;
             next = firsts[window >> end];
         }
     }
-    steps_ = std::move(built);
+    entries_ = std::move(built);
 }
 
 }  // namespace tessel

@@ -10,14 +10,14 @@
 
 namespace tessel {
 
-// Remembers, for one batch, where in the path tree its folders stand, so
-// that a folder which comes again is found in one step and not level by
-// level: a list in random order has most of its folders again and again.
+// Where the folders of one batch are in the path tree, so that a folder that
+// comes again is found in one step instead of level by level: a list in
+// random order names most of its folders again and again.
 //
 // Ownership: borrows the folders' bytes and the nodes, which must outlive it.
-// Cost: constant time on average; about 60 bytes and 8 bytes a level for
-//   each folder that is different.
-class FolderMemo {
+// Cost: constant time on average; about 60 bytes and 8 bytes per level for
+//   each different folder.
+class FolderCache {
 public:
     struct Folder {
         ComponentView bytes;  // of its packed components
@@ -37,28 +37,29 @@ public:
     // Makes sure that adding a folder of so many components does not throw.
     void reserveFor(std::size_t depth);
 
-    // Adds a folder that find did not find. If it throws, nothing changes.
+    // Adds a folder that find did not find. If it throws (std::bad_alloc),
+    // nothing changes.
     void add(const PackedComponents& components, std::uint32_t hash,
              BNode& node, const PathTrack& track);
 
-    // Ask the processor for what a later find will touch, one dependent step
-    // each: call them in this order, some folders apart. They change nothing
-    // and may be left out.
-    void fetchEntry(std::uint32_t hash) const noexcept;
-    void fetchFolder(std::uint32_t hash) const noexcept;
-    void fetchNode(std::uint32_t hash) const noexcept;
+    // Prefetch what a later find will touch, one dependent step each: call
+    // them in this order, some folders apart. They change nothing and may be
+    // left out.
+    void prefetchEntry(std::uint32_t hash) const noexcept;
+    void prefetchFolder(std::uint32_t hash) const noexcept;
+    void prefetchNode(std::uint32_t hash) const noexcept;
 
     std::span<const std::uint64_t> trackOf(const Folder& folder) const {
         return {positions_.data() + folder.trackStart, folder.trackLength};
     }
 
 private:
-    // The folder that find would look at first, if it may be the one.
-    const Folder* likely(std::uint32_t hash) const noexcept;
+    // The folder in the slot that find looks at first, if it may be the one.
+    const Folder* inHomeSlot(std::uint32_t hash) const noexcept;
 
-    HashIndex index_;  // positions in `folders`
+    HashIndex index_;  // positions in folders_
     std::vector<Folder> folders_;
-    std::vector<std::uint64_t> positions_;  // tracks, one behind the other
+    std::vector<std::uint64_t> positions_;  // all tracks, one after the other
 };
 
 }  // namespace tessel

@@ -1,0 +1,87 @@
+#include "coder/BatchInserter.hpp"
+
+#include <algorithm>
+#include <array>
+
+namespace tessel {
+
+namespace {
+
+// Computes the hashes of a batch's folders some folders ahead and prefetches
+// what the cache will touch for each of them.
+//
+//   folder      i + 15    i + 10    i + 5     i
+//   prefetches  entry     folder    node      is inserted
+//
+// Five folders are about the time that one access to memory takes. Farther
+// apart, the lines would be evicted before they are used.
+class HashPrefetcher {
+public:
+    HashPrefetcher(const std::vector<PackedComponents>& folders,
+                   const FolderCache& cache)
+        : folders_(folders), cache_(cache) {
+        for (std::size_t i = 0; i < maxAhead; ++i) begin(i);
+    }
+
+    // The hash of folder i. Folders are asked for one after the other.
+    std::uint32_t next(std::size_t i) {
+        begin(i + maxAhead);
+        if (i + 2 * stride < folders_.size())
+            cache_.prefetchFolder(hashes_[(i + 2 * stride) % ring]);
+        if (i + stride < folders_.size())
+            cache_.prefetchNode(hashes_[(i + stride) % ring]);
+        return hashes_[i % ring];
+    }
+
+private:
+    static constexpr std::size_t stride = 5;
+    static constexpr std::size_t maxAhead = 3 * stride;
+    static constexpr std::size_t ring = 16;
+    static_assert(ring > maxAhead);
+
+    void begin(std::size_t i) {
+        if (i >= folders_.size()) return;
+        hashes_[i % ring] = FolderCache::hashOf(folders_[i]);
+        cache_.prefetchEntry(hashes_[i % ring]);
+    }
+
+    const std::vector<PackedComponents>& folders_;
+    const FolderCache& cache_;
+    std::array<std::uint32_t, ring> hashes_{};
+};
+
+}  // namespace
+
+void BatchInserter::insert(const std::vector<PackedComponents>& folders,
+                           const std::vector<PackedComponents>& files) {
+    HashPrefetcher hashes(folders, cache_);
+    for (std::size_t i = 0; i < folders.size(); ++i)
+        insertFolder(folders[i], files[i], hashes.next(i));
+}
+
+void BatchInserter::insertFolder(const PackedComponents& components,
+                                 const PackedComponents& fileNames,
+                                 std::uint32_t hash) {
+    numbering_.reserveForPartition(components.size());
+    track_.clear();
+    track_.reserve(components.size() + 1);
+    if (const FolderCache::Folder* cached = cache_.find(components, hash)) {
+        const auto positions = cache_.trackOf(*cached);
+        track_.assign(positions.begin(), positions.end());
+        const std::uint64_t first = tree_.addFiles(*cached->node, fileNames);
+        numbering_.notePartition(track_, true, first, fileNames.size());
+        return;
+    }
+    const std::size_t depth = components.size();
+    cache_.reserveFor(depth);
+    const BPathTree::AddedBatch added =
+        tree_.addBatch(components, fileNames, track_);
+    numbering_.notePartition(track_, added.existed, added.firstFile,
+                             fileNames.size());
+    // Without components the root takes the files and never counts as found.
+    if (depth == 0) return;
+    track_.resize(depth);
+    cache_.add(components, hash, added.folder, track_);
+}
+
+}  // namespace tessel

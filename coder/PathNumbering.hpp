@@ -1,0 +1,109 @@
+#pragma once
+
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <map>
+#include <vector>
+
+#include "coder/PathTracks.hpp"
+
+namespace tessel {
+
+// The largest of the values that raise() has been given.
+//
+// Threads: raise from any number of them at once.
+class AtomicMaximum {
+public:
+    AtomicMaximum() noexcept = default;
+    AtomicMaximum(const AtomicMaximum& other) noexcept : value_(other) {}
+    AtomicMaximum& operator=(const AtomicMaximum& other) noexcept {
+        return *this = std::uint64_t{other};
+    }
+    AtomicMaximum& operator=(std::uint64_t value) noexcept {
+        value_.store(value, std::memory_order_relaxed);
+        return *this;
+    }
+    ~AtomicMaximum() = default;
+
+    operator std::uint64_t() const noexcept {
+        return value_.load(std::memory_order_relaxed);
+    }
+
+    // Relaxed: the value says nothing about any other memory, and whoever
+    // wants the final one has joined the threads that raise it.
+    void raise(std::uint64_t value) noexcept {
+        std::uint64_t known = *this;
+        while (value > known && !value_.compare_exchange_weak(
+                                    known, value, std::memory_order_relaxed)) {
+        }
+    }
+
+private:
+    std::atomic<std::uint64_t> value_ = 0;
+};
+
+// Which paths have which numbers. Numbers count from 1 in the order of
+// addition. The files that one call adds under one folder are a partition;
+// partition k holds the numbers above end k - 1 up to and including end k.
+//
+// Invariants: partitionEnds and partitionTracks have one entry per partition
+//   (a loaded form may hold tracks without ends).
+// Ownership: a value; copies are independent.
+// Cost: 8 bytes and the folder's depth per partition; about 90 bytes per
+//   repeated whole path.
+class PathNumbering {
+public:
+    // True when the path of this number repeats one that was stored before.
+    bool hasDuplicate(std::uint64_t pathNumber) const {
+        return duplicates.contains(pathNumber);
+    }
+
+    // Makes sure that the next notePartition with a track of at most
+    // trackLength + 1 positions does not throw, so that tree and numbering
+    // never disagree.
+    void reserveForPartition(std::size_t trackLength);
+
+    // Counts fileCount paths as one partition. Its track is the folder's,
+    // which must have room for one more position; if the folder existed,
+    // firstFileIndex is appended to it.
+    void notePartition(PathTrack& track, bool existed,
+                       std::uint64_t firstFileIndex, std::size_t fileCount);
+
+    // Counts one whole path. If it existed, takes its track over. If it
+    // throws (std::bad_alloc), nothing changes.
+    void noteWholePath(PathTrack& track, bool existed);
+
+    // The first partition from k on whose end is not below the number; the
+    // number of partitions if there is none. Cost: galloping search, so that
+    // a neighbour is near and a far partition takes few steps; linear if the
+    // ends do not ascend, which only a loaded form can bring about.
+    std::size_t partitionAtOrAfter(std::size_t k, std::uint64_t number) const;
+
+    // Looks anew whether the ends ascend, after they were changed by hand.
+    void checkEnds();
+
+    // Bytes on the heap.
+    std::size_t partitionBytes() const noexcept;
+    std::size_t duplicateBytes() const noexcept;
+
+    // Path number of a repeated whole path -> track of the stored one. An
+    // ordered map: hostile path numbers cannot provoke hash collisions, and
+    // equal content is always written as equal bytes.
+    std::map<std::uint64_t, PathTrack> duplicates;
+    std::vector<std::uint64_t> partitionEnds;  // pathCount after partition k
+    // The folder's track; if the folder existed, the position of the
+    // partition's first file is appended to it.
+    PathTracks partitionTracks;
+    std::uint64_t maxPartitionTrackLength = 0;
+    std::uint64_t maxDuplicateTrackLength = 0;
+    AtomicMaximum maxCodeBytes;  // of all components encoded so far
+    std::uint64_t maxDuplicatePathNumber = 0;
+    std::uint64_t nextPathNumber = 0;  // handed out since the last reset
+    std::uint64_t pathCount = 0;
+
+private:
+    bool endsAscend_ = true;  // partitionEnds can be searched by halves
+};
+
+}  // namespace tessel

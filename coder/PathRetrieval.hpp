@@ -1,0 +1,102 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <iterator>
+#include <span>
+#include <stdexcept>
+#include <vector>
+
+#include "coder/PathNumbering.hpp"
+#include "pathtree/BPathTree.hpp"
+
+namespace tessel {
+
+// Fetches stored paths by number.
+//
+// Ownership: borrows the tree and the numbering, which nobody may change
+//   meanwhile.
+// Threads: any number of readers.
+class PathRetrieval {
+public:
+    PathRetrieval(const BPathTree& tree,
+                  const PathNumbering& numbering) noexcept
+        : tree_(tree), numbering_(numbering) {}
+
+    // See HuffmanPathTree::visitPaths.
+    template <class Numbers, class Visitor>
+    void visit(const Numbers& numbers, Visitor&& visitor) const;
+
+    // See HuffmanPathTree::getPath.
+    void getPath(std::vector<Components>& folderPaths,
+                 std::vector<Components>& filePaths,
+                 const std::vector<double>& numbers) const;
+
+private:
+    // Reads tracks without the heap, unless a folder is this deep.
+    class TrackReader {
+    public:
+        std::span<const std::uint64_t> read(const PathTracks& tracks,
+                                            std::size_t k);
+
+    private:
+        static constexpr std::size_t inlineDepth = 32;
+
+        std::array<std::uint64_t, inlineDepth> inline_;
+        PathTrack longer_;
+    };
+
+    void getByNumber(std::vector<Components>& folderPaths,
+                     std::vector<Components>& filePaths,
+                     const std::vector<double>& numbers) const;
+    void getByTrack(std::vector<Components>& folderPaths,
+                    const std::vector<double>& numbers) const;
+
+    const BPathTree& tree_;
+    const PathNumbering& numbering_;
+};
+
+inline std::span<const std::uint64_t> PathRetrieval::TrackReader::read(
+    const PathTracks& tracks, std::size_t k) {
+    std::size_t length = 0;
+    longer_.clear();
+    tracks.visitPositions(k, [&](std::uint64_t position) {
+        if (length < inlineDepth) {
+            inline_[length++] = position;
+            return;
+        }
+        if (longer_.empty()) longer_.assign(inline_.begin(), inline_.end());
+        longer_.push_back(position);
+    });
+    if (!longer_.empty()) return longer_;
+    return {inline_.data(), length};
+}
+
+template <class Numbers, class Visitor>
+void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
+    const std::vector<std::uint64_t>& ends = numbering_.partitionEnds;
+    TrackReader reader;
+    std::size_t k = 0;
+    auto next = std::begin(numbers);
+    const auto last = std::end(numbers);
+    while (next != last) {
+        std::uint64_t number = *next;
+        k = numbering_.partitionAtOrAfter(k, number);
+        if (k == ends.size()) return;
+        if (k >= numbering_.partitionTracks.size())
+            throw std::out_of_range("A partition has no track.");
+        visitor.beginFolder();
+        const BatchFiles files = tree_.openBatch(
+            reader.read(numbering_.partitionTracks, k),
+            [&visitor](ComponentView name) { visitor.folder(name); });
+        const std::uint64_t base = k > 0 ? ends[k - 1] : 0;
+        while (number <= ends[k]) {
+            visitor.file(files[number - base]);
+            if (++next == last) break;
+            number = *next;
+        }
+    }
+}
+
+}  // namespace tessel
