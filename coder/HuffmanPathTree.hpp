@@ -16,6 +16,7 @@
 #include "coder/PathIteration.hpp"
 #include "coder/PathNumbering.hpp"
 #include "coder/PathRetrieval.hpp"
+#include "packing/sixpacks.hpp"  // for the exceptions
 #include "pathtree/BPathTree.hpp"
 
 namespace tessel {

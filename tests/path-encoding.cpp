@@ -520,18 +520,31 @@ TEST(PathEncoding, EncodingAFolderLeavesItsTexts) {
     EXPECT_EQ(coder->encodedFolders.size(), 2U);
 }
 
+std::vector<tessel::PackedComponents> encodedFoldersOf(tessel::Batch& batch) {
+    const tessel::MutexLock lock(batch.folderResultMutex);
+    return batch.encodedFolders;
+}
+
+std::vector<tessel::PackedComponents> encodedFilesOf(tessel::Batch& batch) {
+    const tessel::MutexLock lock(batch.fileResultMutex);
+    return batch.encodedFiles;
+}
+
 TEST(PathEncoding, WorkersReleaseTheTextsThatTheyEncoded) {
     for (const unsigned threads : threadCounts) {
         const CoderPtr coder = fourLetterCoder();
-        Batch batch = lopsidedBatch();
-        coder->asyncFolders = batch.folders;
-        coder->asyncFiles = batch.files;
-        coder->encodeOnWorkers(threads);
-        EXPECT_EQ(coder->asyncFolders,
-                  std::vector<Texts>(batch.folders.size()));
-        EXPECT_EQ(coder->asyncFiles, std::vector<Texts>(batch.files.size()));
-        EXPECT_TRUE(coder->genThreads.empty());
+        const Batch batch = lopsidedBatch();
+        std::vector<Texts> folders = batch.folders;
+        std::vector<Texts> files = batch.files;
+        tessel::BatchEncoder encoder(coder->code(), coder->maxCodeBytes,
+                                     folders, files);
+        encoder.encode(threads);
+        tessel::Batch& encoded = encoder.batch();
+        EXPECT_EQ(encoded.folders, std::vector<Texts>(batch.folders.size()));
+        EXPECT_EQ(encoded.files, std::vector<Texts>(batch.files.size()));
         EXPECT_EQ(coder->pathCount, 0U);
+        coder->encodedFolders = encodedFoldersOf(encoded);
+        coder->encodedFiles = encodedFilesOf(encoded);
         coder->addPathToBTreeFromAsyncData();
         const CoderPtr whole = fourLetterCoder();
         refusalOf(*whole, batch, threads);
@@ -542,8 +555,12 @@ TEST(PathEncoding, WorkersReleaseTheTextsThatTheyEncoded) {
 
 TEST(PathEncoding, NothingToEncodeNeedsNoWorkers) {
     const CoderPtr coder = fourLetterCoder();
-    coder->encodeOnWorkers(4);
-    EXPECT_TRUE(coder->encodedFolders.empty());
+    std::vector<Texts> folders;
+    std::vector<Texts> files;
+    tessel::BatchEncoder encoder(coder->code(), coder->maxCodeBytes, folders,
+                                 files);
+    encoder.encode(4);
+    EXPECT_TRUE(encodedFoldersOf(encoder.batch()).empty());
     coder->addPathToBTreeFromAsyncData();
     EXPECT_EQ(coder->pathCount, 0U);
 }

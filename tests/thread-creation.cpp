@@ -88,14 +88,25 @@ TEST(ThreadCreation, TheErrorIsThePlatforms) {
 TEST(ThreadCreation, AWorkerThatIsDoneHelpsWithTheOtherFolders) {
     for (const int possible : {1, 2, 3}) {
         const CoderPtr coder = support::fourLetterCoder();
-        coder->asyncFolders = folders();
-        coder->asyncFiles = files();
+        auto folderTexts = folders();
+        auto fileTexts = files();
+        tessel::BatchEncoder encoder(coder->code(), coder->maxCodeBytes,
+                                     folderTexts, fileTexts);
         {
             const FewThreads few(possible);
-            EXPECT_THROW(coder->encodeOnWorkers(4), std::system_error);
+            EXPECT_THROW(encoder.encode(4), std::system_error);
         }
-        EXPECT_EQ(coder->asyncFolders, std::vector<Texts>(8));
-        EXPECT_EQ(coder->asyncFiles, std::vector<Texts>(8));
+        tessel::Batch& batch = encoder.batch();
+        EXPECT_EQ(batch.folders, std::vector<Texts>(8));
+        EXPECT_EQ(batch.files, std::vector<Texts>(8));
+        {
+            const tessel::MutexLock lock(batch.folderResultMutex);
+            coder->encodedFolders = batch.encodedFolders;
+        }
+        {
+            const tessel::MutexLock lock(batch.fileResultMutex);
+            coder->encodedFiles = batch.encodedFiles;
+        }
         coder->addPathToBTreeFromAsyncData();
         const CoderPtr expected = support::fourLetterCoder();
         support::addBatches(*expected, folders(), files(), 1);

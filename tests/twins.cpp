@@ -6,7 +6,8 @@
 #include <algorithm>
 #include <map>
 
-#include "coder/FolderMemo.hpp"
+#include "coder/FolderCache.hpp"
+#include "coder/PathTracks.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Generators.hpp"
 #include "tests/support/Trees.hpp"
@@ -85,26 +86,26 @@ TEST(PathTracks, ATrackTakesAboutAByteAPosition) {
     EXPECT_EQ(tracks[9999], (PathTrack{1, 99, 3, 4}));
 }
 
-// ---- The memo of folders: a map ----
+// ---- The cache of folders: a map ----
 
-RC_GTEST_PROP(FolderMemo, EqualsAMap, ()) {
+RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
     const auto component =
         rc::gen::container<Component>(1, rc::gen::inRange<std::uint8_t>(0, 6));
     const auto folders = *rc::gen::scale(
         5, rc::gen::container<std::vector<Components>>(rc::gen::scale(
                0.01, rc::gen::container<Components>(component))));
     BPathTree tree;
-    tessel::FolderMemo memo;
+    tessel::FolderCache cache;
     ComponentPacker packer;
     std::map<Components, std::pair<BNode*, PathTrack>> expected;
     for (const Components& components : folders) {
         const auto list = support::packedBy(packer, components);
-        const auto hash = tessel::FolderMemo::hashOf(list);
+        const auto hash = tessel::FolderCache::hashOf(list);
         const auto known = expected.find(components);
-        const tessel::FolderMemo::Folder* found = memo.find(list, hash);
+        const tessel::FolderCache::Folder* found = cache.find(list, hash);
         RC_ASSERT((found != nullptr) == (known != expected.end()));
         if (found != nullptr) {
-            const auto track = memo.trackOf(*found);
+            const auto track = cache.trackOf(*found);
             RC_ASSERT(found->node == known->second.first);
             RC_ASSERT(PathTrack(track.begin(), track.end()) ==
                       known->second.second);
@@ -112,22 +113,22 @@ RC_GTEST_PROP(FolderMemo, EqualsAMap, ()) {
         }
         PathTrack track;
         BNode& node = tree.addBatch(list, {}, track).folder;
-        memo.add(list, hash, node, track);
+        cache.add(list, hash, node, track);
         expected[components] = {&node, track};
     }
 }
 
-TEST(FolderMemo, FoldersOfEqualHashAreToldApart) {
+TEST(FolderCache, FoldersOfEqualHashAreToldApart) {
     constexpr std::size_t count = 400000;
-    tessel::FolderMemo memo;
+    tessel::FolderCache cache;
     ComponentPacker packer;
     BPathTree tree;
     for (std::size_t i = 0; i < count; ++i) {
         const auto list =
             support::packedBy(packer, {support::littleEndian(i, 4)});
-        const auto hash = tessel::FolderMemo::hashOf(list);
-        ASSERT_EQ(memo.find(list, hash), nullptr) << i;
-        memo.add(list, hash, *tree.root, {i});
+        const auto hash = tessel::FolderCache::hashOf(list);
+        ASSERT_EQ(cache.find(list, hash), nullptr) << i;
+        cache.add(list, hash, *tree.root, {i});
     }
 }
 
