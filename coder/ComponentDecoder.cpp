@@ -78,26 +78,23 @@ constexpr unsigned entriesPerWindow =
 constexpr std::size_t bitsPerWindow =
     std::size_t{entriesPerWindow} * DecodeTable::windowBits;
 
-// Decoded characters on their way to a text, which appending one by one
+// Holds decoded characters on their way to a text, which appending one by one
 // would check for room each time.
 class TextBuffer {
 public:
     explicit TextBuffer(std::u16string& text) noexcept : text_(text) {}
 
-    void put(DecodeTable::Entry entry) noexcept {
-        entry.writeTo(next_);
-        next_ += entry.count();
-    }
-    void takeBack(unsigned count) noexcept { next_ -= count; }
+    char16_t* begin() noexcept { return units_.data(); }
 
-    void flush() {
-        text_.append(units_.data(),
-                     static_cast<std::size_t>(next_ - units_.data()));
-        next_ = units_.data();
+    // True when a whole window might not fit after `end` any more.
+    bool isFull(const char16_t* end) const noexcept {
+        return end >= units_.data() + units_.size() - maxUnitsPerWindow;
     }
-    // Leaves room for a window.
-    void flushIfFull() {
-        if (next_ >= units_.data() + units_.size() - maxUnitsPerWindow) flush();
+
+    // Appends what is before `end` to the text.
+    void flush(const char16_t* end) {
+        text_.append(units_.data(),
+                     static_cast<std::size_t>(end - units_.data()));
     }
 
 private:
@@ -108,58 +105,33 @@ private:
     std::u16string& text_;
     // Not cleared: a unit is written before it is read.
     std::array<char16_t, 4 * maxUnitsPerWindow> units_;
-    char16_t* next_ = units_.data();
 };
 
-// Decodes from position `bit` as far as the table leads.
-class TableDecoder {
-public:
-    TableDecoder(const DecodeTable& table, ComponentView bytes, std::size_t bit,
-                 TextBuffer& text) noexcept
-        : table_(table), reader_(bytes), bit_(bit), text_(text) {}
+// Where decoding is. Kept in registers: an entry that is written may not be
+// taken for a change of it, so it must not be a member of anything that the
+// buffer can reach.
+struct DecodePosition {
+    std::size_t bit = 0;
+    char16_t* out = nullptr;
+    DecodeTable::Entry last;  // the last entry taken
 
-    std::size_t bit() const noexcept { return bit_; }
-
-    // As long as all entries of a window lie before the end. Returns false
-    // at bits that the table does not know. An unknown entry takes no bits,
-    // so all that follow it in the window are unknown, too.
-    bool decodeWindows(std::size_t end) {
-        while (end - bit_ >= bitsPerWindow) {
-            std::uint64_t window = reader_.from(bit_);
-            for (unsigned k = 0; k < entriesPerWindow; ++k) take(window);
-            if (entry_.count() == 0) return false;
-            text_.flushIfFull();
-        }
-        return true;
+    void take(const DecodeTable& table, std::uint64_t& window) noexcept {
+        last = table[window];
+        last.writeTo(out);
+        out += last.count();
+        bit += last.bitLength();
+        window >>= last.bitLength();
     }
 
-    // The bits that are left, which one window holds. The last entry may
-    // extend past the end: then only the characters that end in time stay.
-    void decodeRest(std::size_t end) {
-        if (bit_ >= end) return;
-        std::uint64_t window = reader_.from(bit_);
-        do take(window);
-        while (bit_ < end && entry_.count() > 0);
-        if (bit_ <= end) return;
-        bit_ -= entry_.bitLength();
-        const unsigned fitting = entry_.charactersWithin(end - bit_);
-        if (fitting > 0) bit_ += entry_.bitLengthOf(fitting);
-        text_.takeBack(entry_.count() - fitting);
+    // Keeps of the last entry, which extends past the end, the characters
+    // that end in time.
+    void fitLast(std::size_t end) noexcept {
+        bit -= last.bitLength();
+        out -= last.count();
+        const unsigned fitting = last.charactersWithin(end - bit);
+        if (fitting > 0) bit += last.bitLengthOf(fitting);
+        out += fitting;
     }
-
-private:
-    void take(std::uint64_t& window) noexcept {
-        entry_ = table_[window];
-        text_.put(entry_);
-        bit_ += entry_.bitLength();
-        window >>= entry_.bitLength();
-    }
-
-    const DecodeTable& table_;
-    BitReader reader_;
-    std::size_t bit_;
-    TextBuffer& text_;
-    DecodeTable::Entry entry_;  // the last one taken
 };
 
 }  // namespace
@@ -184,11 +156,33 @@ std::size_t ComponentDecoder::decodeByTable(ComponentView bytes,
                                             std::size_t bit, std::size_t end,
                                             std::u16string& text) const {
     if (code_.decodeTable().empty()) return bit;
+    const DecodeTable& table = code_.decodeTable();
+    const BitReader reader(bytes);
     TextBuffer buffer(text);
-    TableDecoder decoder(code_.decodeTable(), bytes, bit, buffer);
-    if (decoder.decodeWindows(end)) decoder.decodeRest(end);
-    buffer.flush();
-    return decoder.bit();
+    DecodePosition at{bit, buffer.begin(), {}};
+    // As long as all entries of a window lie before the end. An entry that
+    // knows nothing takes no bits, so those after it know nothing either.
+    while (end - at.bit >= bitsPerWindow) {
+        std::uint64_t window = reader.from(at.bit);
+        for (unsigned k = 0; k < entriesPerWindow; ++k) at.take(table, window);
+        if (at.last.count() == 0) {
+            buffer.flush(at.out);
+            return at.bit;
+        }
+        if (buffer.isFull(at.out)) {
+            buffer.flush(at.out);
+            at.out = buffer.begin();
+        }
+    }
+    // One window holds the bits that are left.
+    if (at.bit < end) {
+        std::uint64_t window = reader.from(at.bit);
+        do at.take(table, window);
+        while (at.bit < end && at.last.count() > 0);
+        if (at.bit > end) at.fitLast(end);
+    }
+    buffer.flush(at.out);
+    return at.bit;
 }
 
 bool ComponentDecoder::appendIfLeaf(std::int32_t& position,

@@ -9,14 +9,14 @@ namespace tessel {
 void DecodeTable::Entry::append(char16_t character,
                                 unsigned bitCount) noexcept {
     const unsigned position = count();
-    characters_[position] = character;
-    unsigned fields = fields_ + 1U;
+    word_ |= std::uint64_t{character} << (position * characterBits);
+    word_ += std::uint64_t{1} << fieldsAt;
     // Its own end, and that of all characters that are not there.
     for (unsigned i = position + 1; i <= maxCharacters; ++i) {
-        fields &= ~(fieldMask << (i * fieldBits));
-        fields |= bitCount << (i * fieldBits);
+        const unsigned at = fieldsAt + i * fieldBits;
+        word_ &= ~(fieldMask << at);
+        word_ |= std::uint64_t{bitCount} << at;
     }
-    fields_ = static_cast<std::uint16_t>(fields);
 }
 
 void DecodeTable::clear() noexcept { releaseContents(entries_); }

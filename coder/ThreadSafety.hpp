@@ -12,7 +12,8 @@
 #define QZTESSEL_THREAD_SAFETY(mark)
 #endif
 #define QZTESSEL_GUARDED_BY(lock) QZTESSEL_THREAD_SAFETY(guarded_by(lock))
-#define QZTESSEL_REQUIRES(lock) QZTESSEL_THREAD_SAFETY(requires_capability(lock))
+#define QZTESSEL_REQUIRES(lock) \
+    QZTESSEL_THREAD_SAFETY(requires_capability(lock))
 #define QZTESSEL_NO_THREAD_SAFETY \
     QZTESSEL_THREAD_SAFETY(no_thread_safety_analysis)
 
