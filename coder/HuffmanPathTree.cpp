@@ -243,7 +243,8 @@ bool HuffmanPathTree::appendToPathIfLeaf(std::int32_t& position,
 }
 
 bool HuffmanPathTree::hasNextPathFromBTree() const {
-    return hasDuplicate(nextPathNumber + 1) || pathTree->hasNextPath();
+    return numbering_.hasDuplicate(numbering_.nextPathNumber + 1) ||
+           pathTree->hasNextPath();
 }
 
 void HuffmanPathTree::getNextPathFromBTree(Components& components) {

@@ -260,10 +260,11 @@ public:
     // ---- Retrieval by number ----
 
     // Visits paths by number, in ascending order, without copies and without
-    // the heap. `numbers` is any range of unsigned integers. Per partition
-    // met, the visitor sees its folder once, then the files asked for:
+    // the heap. `numbers` is any random-access range of unsigned integers.
+    // Per partition met, the visitor sees its folder once, then the files
+    // asked for, of which maxFiles is an upper bound:
     //
-    //   visitor.beginFolder();
+    //   visitor.beginFolder(maxFiles);
     //   visitor.folder(ComponentView);  // each component, the root first
     //   visitor.file(ComponentView);    // each file, in the order of numbers
     //

@@ -66,12 +66,16 @@ private:
     template <class TakeStored, class VisitRepeated>
     void next(TakeStored takeStored, VisitRepeated visitRepeated) {
         const std::uint64_t number = numbering_.nextPathNumber + 1;
-        const auto repeated = numbering_.duplicates.find(number);
-        if (repeated != numbering_.duplicates.end()) {
-            visitRepeated(componentsOf(number, repeated->second));
+        if (numbering_.hasDuplicate(number)) {
+            visitRepeated(
+                componentsOf(number, numbering_.duplicates.at(number)));
         } else {
-            if (!tree_.hasNextPath()) numbering_.nextPathNumber = number;
-            takeStored();
+            try {
+                takeStored();
+            } catch (const NoMorePathException&) {
+                numbering_.nextPathNumber = number;
+                throw;
+            }
         }
         numbering_.nextPathNumber = number;
     }

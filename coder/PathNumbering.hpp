@@ -56,7 +56,7 @@ class PathNumbering {
 public:
     // True when the path of this number repeats one that was stored before.
     bool hasDuplicate(std::uint64_t pathNumber) const {
-        return duplicates.contains(pathNumber);
+        return !duplicates.empty() && duplicates.contains(pathNumber);
     }
 
     // Makes sure that the next notePartition with a track of at most

@@ -27,9 +27,11 @@ public:
            std::vector<Components>& filePaths) noexcept
         : folderPaths_(folderPaths), filePaths_(filePaths) {}
 
-    void beginFolder() {
+    void beginFolder(std::size_t maxFiles) {
         finish();
         started_ = true;
+        folder_.reserve(usualDepth);
+        files_.reserve(maxFiles);
     }
     void folder(ComponentView name) {
         folder_.emplace_back(name.begin(), name.end());
@@ -45,6 +47,9 @@ public:
     }
 
 private:
+    // Saves growing the list of a folder of up to this depth.
+    static constexpr std::size_t usualDepth = 6;
+
     std::vector<Components>& folderPaths_;
     std::vector<Components>& filePaths_;
     bool started_ = false;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
@@ -86,7 +87,9 @@ void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
         if (k == ends.size()) return;
         if (k >= numbering_.partitionTracks.size())
             throw std::out_of_range("A partition has no track.");
-        visitor.beginFolder();
+        const auto left = static_cast<std::uint64_t>(last - next);
+        visitor.beginFolder(
+            static_cast<std::size_t>(std::min(left, ends[k] - number + 1)));
         const BatchFiles files = tree_.openBatch(
             reader.read(numbering_.partitionTracks, k),
             [&visitor](ComponentView name) { visitor.folder(name); });
