@@ -6,9 +6,9 @@ namespace tessel::paths {
 
 namespace {
 
-// Calls onFolder(path, split) for each batch's folder and onFile(path, split)
-// for each file behind it, for the paths from `first` on, until `enough`,
-// asked at each change of folder, says so. Returns the first path not visited.
+// Visits the paths from `first` on: calls onFolder(path, split) at each change
+// of folder and onFile(path, split) for each path. Ends at the change of folder
+// where enough(paths visited) is true. Returns the first path not visited.
 template <class OnFolder, class OnFile, class Enough>
 std::size_t visitPaths(const PathSplitter& splitter, std::size_t first,
                        OnFolder onFolder, OnFile onFile, Enough enough) {

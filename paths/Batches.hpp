@@ -9,14 +9,15 @@
 #include "paths/PathList.hpp"
 #include "paths/PathSplitter.hpp"
 
-// The way of a list into the coder, and of the coder's texts back to paths.
-// Consecutive paths of one folder make one folder entry with several files.
+// From a list to the coder's input, and from the coder's texts back to paths,
+// for programs that feed a coder or a host themselves. (PathStore has a way of
+// its own.) Consecutive paths of one folder make one entry with several files.
 namespace tessel::paths {
 
 using FolderTexts = std::vector<std::vector<std::u16string>>;
 
-// What one call of the coder's insertion takes: the components of folder i
-// are folders[i], the names of its files files[i].
+// Input of one call of the coder's insertion: folders[i] has the components of
+// folder i, files[i] the names of its files.
 struct Batch {
     FolderTexts folders;
     FolderTexts files;
@@ -26,18 +27,19 @@ struct Batch {
 // Hands out a list as batches, in order.
 //
 // Ownership: keeps a reference to the splitter, which must outlive it.
-// Cost: a batch takes some 100 bytes a path, and as many a folder's component.
+// Cost: a batch takes about 100 bytes per path and per component of a folder.
 class BatchReader {
 public:
+    // About 50 MB; longer batches are not added faster.
     static constexpr std::size_t usualPathsPerBatch = 500'000;
 
-    // A batch ends at the first change of folder behind so many paths.
+    // A batch ends at the first change of folder after this many paths.
     explicit BatchReader(const PathSplitter& pathSplitter,
                          std::size_t batchPaths = usualPathsPerBatch)
         : splitter_(&pathSplitter), pathsPerBatch_(batchPaths) {}
 
-    // Replaces `batch` by the next one. Returns false, with `batch` empty,
-    // behind the last.
+    // Replaces `batch` by the next one. After the last one, returns false and
+    // leaves `batch` empty.
     bool next(Batch& batch);
 
 private:
@@ -46,7 +48,7 @@ private:
     std::size_t position_ = 0;
 };
 
-// The components of the folder of a path that is cut there, root first.
+// The components of a path's folder, root first.
 std::vector<std::u16string> folderTexts(std::string_view path,
                                         const PathSplit& split);
 
@@ -60,13 +62,13 @@ CharacterCounts countCharacters(const PathSplitter& splitter);
 CharacterCounts countCharacters(const FolderTexts& folders,
                                 const FolderTexts& files);
 
-// Appends the text of a folder as it stands before its files' names:
-// components from the second on are followed by one '/' each.
+// Appends the text of a folder to which a file's name can be appended: every
+// component but the root is followed by one '/'.
 void appendFolder(const std::vector<std::u16string>& components,
                   std::u16string& text);
 
-// Appends the bytes of a path from its joined text. Returns false, with
-// `path` unchanged, if it is no path's text.
+// Appends the path that has this joined text. Returns false, with `path`
+// unchanged, if no path has it.
 bool textToPath(std::u16string_view joined, std::string& path);
 
 }  // namespace tessel::paths

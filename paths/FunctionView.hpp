@@ -1,6 +1,5 @@
 #pragma once
 
-#include <concepts>
 #include <memory>
 #include <type_traits>
 #include <utility>
@@ -10,23 +9,27 @@ namespace tessel {
 template <class Signature>
 class FunctionView;
 
-// FunctionView refers to something that can be called, for as long as one
-// call of a function takes it as an argument.
+// FunctionView refers to a function object, such as a lambda, for as long as
+// one call takes it as an argument.
 //
 // Ownership: keeps the address of the callable, which must outlive it.
 // Cost: two pointers; an indirect call.
 template <class Result, class... Arguments>
 class FunctionView<Result(Arguments...)> {
 public:
-    template <class Callable>
-    requires(!std::same_as<std::remove_cvref_t<Callable>, FunctionView> &&
-             std::is_invocable_r_v<Result, Callable&, Arguments...>)
-        // Implicit, so that a lambda can be passed where a view is expected.
-        FunctionView(Callable&& callable)
-    noexcept  // NOLINT(google-explicit-*)
+    // Implicit, so that a lambda can be passed where a view is expected.
+    // NOLINTBEGIN(google-explicit-constructor)
+    template <
+        class Callable,
+        class = std::enable_if_t<
+            std::is_class_v<std::remove_cvref_t<Callable>> &&
+            !std::is_same_v<std::remove_cvref_t<Callable>, FunctionView> &&
+            std::is_invocable_r_v<Result, Callable&, Arguments...>>>
+    FunctionView(Callable&& callable) noexcept
         : callable_(const_cast<void*>(
               static_cast<const void*>(std::addressof(callable)))),
           call_(&callAs<std::remove_reference_t<Callable>>) {}
+    // NOLINTEND(google-explicit-constructor)
 
     Result operator()(Arguments... arguments) const {
         return call_(callable_, std::forward<Arguments>(arguments)...);

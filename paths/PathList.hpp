@@ -53,7 +53,7 @@ public:
     static PathList fromText(std::string text, const std::string& name);
 
 private:
-    std::string text_;                 // each path with one byte behind it
+    std::string text_;                 // each path and one byte after it
     std::vector<std::uint64_t> ends_;  // where that byte is
 };
 

@@ -2,68 +2,44 @@
 
 #include <algorithm>
 #include <cstdint>
-#include <functional>
 
 #include "paths/PathText.hpp"
+#include "pathtree/HashIndex.hpp"
 
 namespace tessel::paths {
 
 namespace {
 
-// A set of texts that are beginnings of a list's paths: open addressing, at
-// most half full.
+// A set of texts, which must stay where they are.
 class FolderSet {
 public:
     // Returns false if it was there before.
     bool insert(std::string_view folder) {
-        if (2 * (count_ + 1) > slots_.size()) grow();
-        const std::uint64_t hash = hashOf(folder);
-        Slot& slot = slots_[find(folder, hash)];
-        if (slot.folder.data() != nullptr) return false;
-        slot = {folder, hash};
-        ++count_;
+        const std::uint32_t hash = hashOf(folder);
+        if (find(folder, hash) != HashIndex::notFound) return false;
+        folders_.push_back(folder);
+        index_.insert(hash, folders_.size() - 1);
         return true;
     }
 
     bool contains(std::string_view folder) const {
-        return count_ != 0 &&
-               slots_[find(folder, hashOf(folder))].folder.data() != nullptr;
+        return find(folder, hashOf(folder)) != HashIndex::notFound;
     }
 
 private:
-    struct Slot {
-        std::string_view folder;
-        std::uint64_t hash = 0;
-    };
-
-    static std::uint64_t hashOf(std::string_view folder) noexcept {
-        return std::hash<std::string_view>()(folder);
+    static std::uint32_t hashOf(std::string_view folder) noexcept {
+        return HashIndex::hashOf(
+            {reinterpret_cast<const std::uint8_t*>(folder.data()),
+             folder.size()});
     }
 
-    std::size_t find(std::string_view folder, std::uint64_t hash) const {
-        const std::size_t mask = slots_.size() - 1;
-        std::size_t at = hash & mask;
-        while (slots_[at].folder.data() != nullptr &&
-               (slots_[at].hash != hash || slots_[at].folder != folder)) {
-            at = (at + 1) & mask;
-        }
-        return at;
+    std::size_t find(std::string_view folder, std::uint32_t hash) const {
+        return index_.find(
+            hash, [&](std::size_t i) { return folders_[i] == folder; });
     }
 
-    void grow() {
-        std::vector<Slot> old(std::max<std::size_t>(64, slots_.size() * 2));
-        old.swap(slots_);
-        const std::size_t mask = slots_.size() - 1;
-        for (const Slot& slot : old) {
-            if (slot.folder.data() == nullptr) continue;
-            std::size_t at = slot.hash & mask;
-            while (slots_[at].folder.data() != nullptr) at = (at + 1) & mask;
-            slots_[at] = slot;
-        }
-    }
-
-    std::vector<Slot> slots_;
-    std::size_t count_ = 0;
+    std::vector<std::string_view> folders_;
+    HashIndex index_;
 };
 
 std::size_t firstNameEnd(std::string_view path, std::size_t from) noexcept {
@@ -145,21 +121,23 @@ PathSplitter::PathSplitter(const PathList& paths)
         insertFolders(paths[i], split, folders);
         lastFolder = folder;
     }
-    for (std::size_t i = 0; i < paths.size(); ++i) {
-        if (!folders.contains(paths[i])) continue;
-        // Only here is a root of one character followed by one character.
-        if (splitBelowRoot(paths[i], 1).rootEnd == 0) {
-            if (!std::binary_search(longRoots_.begin(), longRoots_.end(),
-                                    paths[i])) {
-                longRoots_.insert(std::upper_bound(longRoots_.begin(),
-                                                   longRoots_.end(), paths[i]),
-                                  std::string(paths[i]));
-            }
-            continue;
-        }
-        keptApart_[i] = true;
-        ++apartCount_;
+    for (std::size_t i = 0; i < paths.size(); ++i)
+        if (folders.contains(paths[i])) keepApart(i);
+}
+
+// Path i is also a folder.
+void PathSplitter::keepApart(std::size_t i) {
+    const std::string_view path = (*all_)[i];
+    // Only a root of one character followed by one character has no other cut.
+    if (splitBelowRoot(path, 1).rootEnd == 0) {
+        const auto at =
+            std::lower_bound(longRoots_.begin(), longRoots_.end(), path);
+        if (at == longRoots_.end() || *at != path)
+            longRoots_.insert(at, std::string(path));
+        return;
     }
+    keptApart_[i] = true;
+    ++apartCount_;
 }
 
 // The usual root, and for what lies below a path of longRoots that one and its
@@ -180,7 +158,7 @@ std::size_t PathSplitter::rootEnd(std::string_view path) const noexcept {
 PathSplit PathSplitter::usualSplit(std::string_view path) const noexcept {
     const std::size_t root = rootEnd(path);
     if (root == path.size()) {
-        // There is no name behind the root, or no root before the name.
+        // There is no name after the root, or no root before the name.
         const bool bareName = path.find('/') == std::string_view::npos;
         const std::size_t first = decodeCharacter(path).byteCount;
         const std::size_t cut = first == path.size() ? 0

@@ -11,20 +11,20 @@ namespace tessel::paths {
 
 // Where a path is cut into root, folders and file.
 struct PathSplit {
-    std::size_t rootEnd = 0;    // the root is what lies before; it may be empty
-    std::size_t fileStart = 0;  // the file's name is the rest from here
+    std::size_t rootEnd = 0;    // end of the root, which may be empty
+    std::size_t fileStart = 0;  // begin of the file's name
 
     bool operator==(const PathSplit&) const = default;
 };
 
-// The root of a path that is too short to have one: a path of one character
-// is this root and itself as the file. No bytes have this text, so it is no
-// path's beginning, and textToPath leaves it out again.
+// The root of a path of one character, which is too short to have another one.
+// No bytes have this text, so no path begins with it, and textToPath leaves it
+// out.
 inline constexpr char16_t noRoot = 0xDC00;
 
 // Position of the first '/' of path at or after `from` that separates two
-// components, or npos. Of several in a row that is the last one, so that the
-// others belong to the name before; those at the end belong to the file.
+// components, or npos. In a run of '/' it is the last one: the others belong to
+// the name before it. A run at the path's end belongs to the file's name.
 std::size_t findSeparator(std::string_view path, std::size_t from) noexcept;
 
 // Calls visit(std::string_view) for each folder below the root, from the top.
@@ -38,23 +38,41 @@ void forEachFolder(std::string_view path, const PathSplit& split, Visit visit) {
     }
 }
 
-// PathSplitter knows where to cut each path of a list, so that
-//   - the text of the root, then that of each folder and one '/', then the
-//     file's, is the path again,
+// PathSplitter says where to cut each path of a list, for hosts that join
+// components with '/' themselves, so that
+//   - the text of the root, then each folder and one '/', then the file's name
+//     is the path again,
 //   - no component is empty, except the root of a path of one character,
-//   - no file of the list is at the same time a folder of another path, which
-//     would make the coder lose it.
+//   - no file of the list is also a folder of another path: the coder would
+//     lose such a file.
 //
-// Usually the root is "/" for absolute paths and the first name with its '/'
-// for others, and the file is what follows the last '/'. A path that is also
-// a folder of another one (`x/y/z` beside `x/y/z/a`) is cut one level higher:
-// its file is `y/z`. Directly below the root, the root is made longer or
-// shorter until only files can follow it. For `/a` beside `/a/b`, where no
-// other cut is left, the others have the root `/a/`.
+// Cuts, with '|' after the root and after each folder:
+//
+//   path       is cut as     because
+//   /a/b/c     /|a|b|c       the root of an absolute path is its leading '/'
+//   //a/b      //|a|b        all of them
+//   a/b/c      a/|b|c        that of another path is its first name and '/'
+//   a//b//c    a//|b/|c      all but one '/' of a run belong to the name before
+//   /a/b/      /|a|b/        '/' at the end belong to the file's name
+//   a/         a|/           the root must not be all of the path: it loses
+//   //         /|/           its last character
+//   name       n|ame         a path without '/' gives its first character
+//   a          |a            one character is the file; its root is noRoot
+//
+// A path that other paths have as a folder is cut at another place:
+//
+//   path       beside        is cut as   because
+//   /x/y/z     /x/y/z/a      /|x|y/z     the file takes in the folder above
+//   /xyz       /xyz/a        /x|yz       below the root, the root grows
+//   x/y        x/y/a         x|/y        or shrinks, if the name has one
+//                                        character
+//   /a         /a/b          /|a         if it cannot do either, the root of
+//                                        the others grows: /a/|b
 //
 // Ownership: keeps a reference to the list, which must stay as it is.
 // Threads: any number of readers.
-// Cost: a bit a path; while it is made, 48 bytes a folder of the list.
+// Cost: a bit per path; while it is made, 30 to 40 bytes per folder of the
+// list.
 class PathSplitter {
 public:
     explicit PathSplitter(const PathList& paths);
@@ -69,6 +87,7 @@ public:
     const PathList& list() const noexcept { return *all_; }
 
 private:
+    void keepApart(std::size_t i);
     std::size_t rootEnd(std::string_view path) const noexcept;
     PathSplit usualSplit(std::string_view path) const noexcept;
 

@@ -291,7 +291,7 @@ void PathStore::withSoundCoder(FunctionView<void(HuffmanPathTree&)> use) const {
     copy.appendFrom([&](Sink sink) {
         read(0, size_, [&](std::size_t, std::string_view path) { sink(path); });
     });
-    copy.withSoundCoder(use);
+    use(copy.contents_->coder());
 }
 
 // ---- Iteration ----

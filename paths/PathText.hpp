@@ -9,7 +9,7 @@
 // A path is bytes to the operating system and UTF-16 to the coder. This is
 // the way between the two, and it loses nothing:
 //
-//   bytes that are UTF-8        the characters that they stand for
+//   bytes that are UTF-8        the characters that they encode
 //   any other byte, 0x80..0xFF  one lone low surrogate, U+DC80..U+DCFF
 //
 // UTF-8 is read strictly: overlong forms, encoded surrogates and values above
@@ -54,10 +54,10 @@ void appendUtf8(char32_t value, std::string& bytes);
 void appendText(std::string_view bytes, std::u16string& text);
 std::u16string toText(std::string_view bytes);
 
-// Appends the bytes whose text this is and returns true. Returns false, with
-// `bytes` unchanged, if no byte string has this text: it holds a surrogate
-// that is neither half of a pair nor a byte's, or it spells with bytes'
-// surrogates what is UTF-8 after all.
+// Appends the bytes that have this text and returns true. Returns false, with
+// `bytes` unchanged, if there are none: the text has a lone surrogate outside
+// U+DC80..U+DCFF, or its U+DC80..U+DCFF units, taken as bytes, form valid UTF-8
+// (such text is never produced).
 bool appendBytes(std::u16string_view text, std::string& bytes);
 
 }  // namespace tessel::paths

@@ -18,8 +18,9 @@ namespace tessel::paths {
 // must have a code for all their characters.
 //
 // Ownership: keeps a reference to the coder.
-// Threads: works on as many as the hardware runs.
-// Cost: a chunk's text, three times over, for as long as it is added.
+// Threads: works on as many as the hardware runs. What is added does not
+//   depend on their number.
+// Cost: at most a chunk's text and its encoded names, see the limits.
 class StoreAppender {
 public:
     explicit StoreAppender(HuffmanPathTree& coder) : coder_(&coder) {}
@@ -29,11 +30,19 @@ public:
     // Adds what is still to be added.
     void finish();
 
+    // Paths and bytes after which a chunk is added. Each chunk finds its
+    // folders in the tree anew, so chunks should be long; a chunk of this
+    // length takes about a tenth of what a list of millions takes.
+    static constexpr std::size_t maxPathsPerChunk = 250'000;
+    static constexpr std::size_t maxBytesPerChunk = std::size_t{1} << 25U;
+
     // True if the coder may have been changed.
     bool hasStarted() const noexcept { return hasStarted_; }
     std::size_t pathCount() const noexcept { return pathCount_; }
 
 private:
+    void addChunk();
+
     HuffmanPathTree* coder_;
     PathList chunk_;
     std::size_t pathCount_ = 0;

@@ -1,0 +1,73 @@
+// Paths reach the coder in chunks, in order.
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "coder/HuffmanPathTree.hpp"
+#include "paths/CharacterCounter.hpp"
+#include "paths/StoreAppender.hpp"
+#include "paths/StoreReader.hpp"
+
+namespace {
+
+using namespace tessel::paths;
+using tessel::HuffmanPathTree;
+
+std::unique_ptr<HuffmanPathTree> smallCoder() {
+    return coderFor({u"/0123456789ab\xDC00", std::vector<double>(14, 1)});
+}
+
+TEST(StoreAppender, NothingIsAddedBeforeTheEnd) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder);
+    appender.add("a/1");
+    appender.add("b");
+    EXPECT_EQ(coder->pathCount, 0U);
+    EXPECT_FALSE(appender.hasStarted());
+    appender.finish();
+    EXPECT_TRUE(appender.hasStarted());
+    EXPECT_EQ(appender.pathCount(), 2U);
+    EXPECT_EQ(coder->pathCount, 2U);
+    appender.finish();
+    EXPECT_EQ(coder->pathCount, 2U);
+}
+
+TEST(StoreAppender, AFullChunkIsAdded) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder);
+    const std::string big(StoreAppender::maxBytesPerChunk / 4, 'a');
+    for (int i = 0; i < 3; ++i) appender.add(big + std::to_string(i));
+    EXPECT_EQ(coder->pathCount, 0U);
+    appender.add(big + "3");
+    EXPECT_EQ(coder->pathCount, 4U);
+    appender.add("b");
+    appender.finish();
+    std::string text;
+    readPath(*coder, 3, text);
+    EXPECT_EQ(text, big + "3");
+    readPath(*coder, 4, text);
+    EXPECT_EQ(text, "b");
+}
+
+TEST(StoreAppender, ARefusedChunkLeavesTheCoder) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder);
+    appender.add("a");
+    appender.add("?");
+    EXPECT_THROW(appender.finish(), tessel::CodeNotFoundException);
+    EXPECT_FALSE(appender.hasStarted());
+    EXPECT_EQ(coder->pathCount, 0U);
+    EXPECT_TRUE(coder->encodedFolders.empty());
+}
+
+TEST(StoreAppender, TheCoderKnowsItsLongestComponent) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder);
+    appender.add("a/bbbbbbbbbbbbbbbbbbbbbb");
+    appender.finish();
+    EXPECT_EQ(coder->maxCodeBytes,
+              coder->generateCodeFor(u"bbbbbbbbbbbbbbbbbbbbbb").size());
+}
+
+}  // namespace

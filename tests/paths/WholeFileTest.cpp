@@ -1,0 +1,108 @@
+// Files are read and replaced as a whole.
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <system_error>
+#include <vector>
+
+#include "paths/WholeFile.hpp"
+
+namespace {
+
+namespace fs = std::filesystem;
+using tessel::paths::readWholeFile;
+using tessel::paths::replaceFile;
+using Bytes = std::vector<std::uint8_t>;
+
+class WholeFile : public ::testing::Test {
+protected:
+    WholeFile() {
+        std::string pattern =
+            (fs::temp_directory_path() / "wf-XXXXXX").string();
+        folder_ = ::mkdtemp(pattern.data());
+    }
+    ~WholeFile() override { fs::remove_all(folder_); }
+
+    std::string path(const std::string& name) const {
+        return (folder_ / name).string();
+    }
+    std::size_t entries() const {
+        return static_cast<std::size_t>(
+            std::distance(fs::directory_iterator(folder_), {}));
+    }
+
+private:
+    fs::path folder_;
+};
+
+TEST_F(WholeFile, ReadsWhatWasWritten) {
+    const Bytes bytes = {0, 1, 255, 10, 0};
+    replaceFile(path("a"), bytes);
+    EXPECT_EQ(readWholeFile(path("a")), std::string("\0\1\xFF\n\0", 5));
+    replaceFile(path("a"), {});
+    EXPECT_EQ(readWholeFile(path("a")), "");
+    EXPECT_EQ(entries(), 1U);
+}
+
+TEST_F(WholeFile, ReadsFilesOfManyBlocks) {
+    const Bytes bytes(1'000'000, 7);
+    replaceFile(path("a"), bytes);
+    EXPECT_EQ(readWholeFile(path("a")), std::string(1'000'000, 7));
+}
+
+TEST_F(WholeFile, ReadsAPipeToItsEnd) {
+    std::array<int, 2> ends{};
+    ASSERT_EQ(::pipe2(ends.data(), O_CLOEXEC), 0);
+    ASSERT_EQ(::write(ends[1], "text", 4), 4);
+    // The end of the text comes when the last writer is gone.
+    ASSERT_EQ(::close(ends[1]), 0);
+    EXPECT_EQ(readWholeFile("/dev/fd/" + std::to_string(ends[0])), "text");
+    ::close(ends[0]);
+}
+
+TEST_F(WholeFile, KeepsTheTargetsPermissions) {
+    std::ofstream(path("a")) << "old";
+    fs::permissions(path("a"), fs::perms::owner_read | fs::perms::owner_write);
+    replaceFile(path("a"), Bytes{'n'});
+    EXPECT_EQ(fs::status(path("a")).permissions(),
+              fs::perms::owner_read | fs::perms::owner_write);
+    EXPECT_EQ(readWholeFile(path("a")), "n");
+}
+
+TEST_F(WholeFile, FollowsASymbolicLink) {
+    std::ofstream(path("a")) << "old";
+    fs::create_symlink("a", path("link"));
+    replaceFile(path("link"), Bytes{'n'});
+    EXPECT_TRUE(fs::is_symlink(path("link")));
+    EXPECT_EQ(readWholeFile(path("a")), "n");
+}
+
+TEST_F(WholeFile, AFailedReplacementLeavesNothingBehind) {
+    fs::create_directory(path("folder"));
+    std::ofstream(path("folder/file")) << "kept";
+    EXPECT_THROW(replaceFile(path("folder"), Bytes{'n'}), std::system_error);
+    EXPECT_EQ(entries(), 1U);
+    EXPECT_EQ(readWholeFile(path("folder/file")), "kept");
+}
+
+TEST_F(WholeFile, ErrorsNameTheFile) {
+    try {
+        readWholeFile(path("missing"));
+        FAIL() << "nothing was thrown";
+    } catch (const std::system_error& error) {
+        EXPECT_EQ(error.code(), std::errc::no_such_file_or_directory);
+        EXPECT_NE(std::string(error.what()).find(path("missing")),
+                  std::string::npos);
+    }
+    EXPECT_THROW(replaceFile(path("no/file"), Bytes{1}), std::system_error);
+    EXPECT_THROW(readWholeFile(path(".")), std::system_error);
+}
+
+}  // namespace
