@@ -5,7 +5,7 @@
 #include <iostream>
 #include <stdexcept>
 
-#include "bench/Internals.hpp"
+#include "bench/CoreBounds.hpp"
 #include "bench/Series.hpp"
 #include "bench/Timing.hpp"
 
@@ -17,9 +17,9 @@ using tessel::paths::PathSplitter;
 namespace {
 
 constexpr std::array<Operation, operationCount> operations = {
-    Operation::Build,       Operation::Iterate, Operation::FetchAll,
-    Operation::FetchRandom, Operation::Store,   Operation::Restore,
-    Operation::Destroy};
+    Operation::Build,       Operation::Iterate,    Operation::FetchAll,
+    Operation::FetchRandom, Operation::FindNumber, Operation::Store,
+    Operation::Restore,     Operation::Destroy};
 
 PathList readList(const std::string& name) {
     tessel::paths::WalkReport report;
@@ -47,7 +47,7 @@ void describe(const PathList& list, const std::string& name) {
               << fixed(static_cast<double>(list.textBytes()) /
                            static_cast<double>(list.size()),
                        2)
-              << " bytes a path, from " << originOf(name) << ".\n\n";
+              << " bytes per path, from " << originOf(name) << ".\n\n";
     for (const auto& [fact, value] : machineFacts()) {
         std::cout << "- " << fact << ": " << value << '\n';
     }
@@ -67,8 +67,8 @@ void finish(const Options& options, const Json& json) {
     if (!options.jsonFile.empty()) writeJson(options.jsonFile, json);
 }
 
-// A row of one figure for every subject, and behind each but the first how
-// many times the first's it is.
+// A row of one figure for every subject, and after each but the first how many
+// times the first's it is.
 void ratioRow(Table& table, std::string what, const std::vector<double>& values,
               const std::vector<double>& ratios) {
     std::vector<std::string> cells = {std::move(what)};
@@ -92,7 +92,7 @@ void valueRow(Table& table, std::string what, const std::vector<Series>& all,
 }
 
 std::string rivalsTable(const std::vector<Series>& all) {
-    std::vector<std::string> heads = {"a path"};
+    std::vector<std::string> heads = {"per path"};
     for (const Series& one : all) {
         heads.push_back(one.name);
         if (&one != &all.front()) heads.emplace_back("ratio");
@@ -107,8 +107,7 @@ std::string rivalsTable(const std::vector<Series>& all) {
         std::vector<double> ratios;
         for (const Series& one : all) {
             values.push_back(one.nanoseconds(operation));
-            ratios.push_back(
-                medianRatio(one.of(operation), all.front().of(operation)));
+            ratios.push_back(one.times(all.front(), operation));
         }
         ratioRow(table, std::string("ns to ") + nameOf(operation), values,
                  ratios);
@@ -117,24 +116,24 @@ std::string rivalsTable(const std::vector<Series>& all) {
 }
 
 std::string compressorsTable(const std::vector<Compressed>& all,
-                             const Series& library, std::size_t paths) {
+                             const Series& first, std::size_t paths) {
     const auto count = static_cast<double>(paths);
-    Table table({"the whole text", "bytes a path", "ratio", "ns to store",
+    Table table({"the whole text", "bytes per path", "ratio", "ns to store",
                  "ns to restore"});
-    table.row({library.name, threeDigits(library.storedPerPath()), "",
-               threeDigits(library.nanoseconds(Operation::Store)),
-               threeDigits(library.nanoseconds(Operation::Restore))});
+    table.row({first.name, threeDigits(first.storedPerPath()), "",
+               threeDigits(first.nanoseconds(Operation::Store)),
+               threeDigits(first.nanoseconds(Operation::Restore))});
     for (const Compressed& one : all) {
         const double bytes = static_cast<double>(one.bytes) / count;
         table.row({one.name, threeDigits(bytes),
-                   threeDigits(bytes / library.storedPerPath()),
+                   threeDigits(bytes / first.storedPerPath()),
                    threeDigits(one.storeSeconds * 1e9 / count),
                    threeDigits(one.restoreSeconds * 1e9 / count)});
     }
     return table.text();
 }
 
-std::string internalsTable(const Internals& m) {
+std::string boundsTable(const CoreBounds& m) {
     const auto instance = static_cast<double>(m.instanceBytes);
     const auto times = [&](double value, double of) {
         return threeDigits(value / of);
@@ -167,21 +166,30 @@ Json seriesJson(const std::vector<Series>& all) {
             if (one.of(operation).empty()) continue;
             ratios.number(keyOf(operation), one.times(all.front(), operation));
         }
-        subject.object("timesTheLibrarys", ratios);
+        subject.object("timesTheFirsts", ratios);
         subjects.push_back(subject);
     }
     json.list("subjects", subjects);
     return json;
 }
 
-std::vector<SubjectPtr> allSubjects(const PathSplitter& splitter) {
+// Adds a subject, if this program was built with it.
+void addTo(std::vector<SubjectPtr>& subjects, SubjectPtr subject) {
+    if (subject != nullptr) subjects.push_back(std::move(subject));
+}
+
+std::vector<SubjectPtr> allSubjects(const PathSplitter& splitter,
+                                    const Options& options) {
     const PathList& list = splitter.list();
     std::vector<SubjectPtr> subjects;
-    subjects.push_back(makeLibrary(splitter));
-    subjects.push_back(makeTextVector(list));
-    subjects.push_back(makeStringVector(list));
-    subjects.push_back(makeTextBuffer(list));
-    if (auto marisa = makeMarisa(list)) subjects.push_back(std::move(marisa));
+    addTo(subjects, makeStore(list));
+    addTo(subjects, makeCore(splitter));
+    if (options.host) addTo(subjects, options.host(splitter));
+    addTo(subjects, makeArchive(list));
+    addTo(subjects, makeMarisa(list));
+    addTo(subjects, makeTextVector(list));
+    addTo(subjects, makeStringVector(list));
+    addTo(subjects, makeTextBuffer(list));
     return subjects;
 }
 
@@ -198,9 +206,11 @@ PathList headOf(const PathList& list, std::size_t count) {
 Plan planFor(std::size_t paths, int runs) {
     Plan plan;
     const auto more = static_cast<int>(std::min<std::size_t>(
-        100, std::size_t{500'000} / std::max<std::size_t>(paths, 1)));
+        40, std::size_t{500'000} / std::max<std::size_t>(paths, 1)));
     plan.runs = runs == 1 ? 1 : std::max(runs, more);
-    plan.storeRuns = paths > 1'000'000 ? 1 : plan.runs;
+    // A run on the longest lists takes a minute, most of it rivals' building.
+    if (paths > 1'000'000) plan.runs = std::min(runs, 3);
+    plan.storeRuns = paths > 300'000 ? 1 : plan.runs;
     return plan;
 }
 
@@ -231,18 +241,20 @@ void compareRivals(const std::string& listName, const Options& options) {
     describe(list, listName);
 
     Plan plan;
-    plan.runs = plan.storeRuns = options.runs;
-    auto subjects = allSubjects(splitter);
+    plan.runs = options.runs;
+    plan.storeRuns = std::min(options.runs, 2);
+    auto subjects = allSubjects(splitter, options);
     const auto all = measure(subjects, plan);
     std::cout << rivalsTable(all) << '\n' << std::flush;
-    const Internals internals = measureInternals(splitter, options.runs);
-    std::cout << internalsTable(internals) << '\n' << std::flush;
-    const auto compressed = compressText(list);
-    std::cout << compressorsTable(compressed, all.front(), list.size());
+    const CoreBounds bounds = measureCoreBounds(splitter, options.runs);
+    std::cout << boundsTable(bounds) << '\n' << std::flush;
+    std::vector<Compressed> compressed;
+    if (options.compressors) compressed = compressText(list);
+    if (!compressed.empty())
+        std::cout << compressorsTable(compressed, all.front(), list.size());
 
     Json json = describeJson(list, listName);
-    json.object("rivals", seriesJson(all))
-        .object("internals", internals.json());
+    json.object("rivals", seriesJson(all)).object("bounds", bounds.json());
     std::vector<Json> sizes;
     sizes.reserve(compressed.size());
     for (const Compressed& one : compressed) {
@@ -261,7 +273,6 @@ void measureGrowth(const std::string& listName, const Options& options) {
     // Measured beside every longer list, for ratios within a run.
     const PathList yardstick =
         headOf(whole, std::min(whole.size(), yardstickPaths));
-    const PathSplitter yardstickSplitter(yardstick);
     Table table(figureHeads("paths, subject"));
     std::vector<Json> points;
     for (const std::size_t wanted :
@@ -270,15 +281,14 @@ void measureGrowth(const std::string& listName, const Options& options) {
           std::size_t{7'000'000}}) {
         if (wanted > whole.size()) break;
         const PathList list = headOf(whole, wanted);
-        const PathSplitter splitter(list);
         std::vector<SubjectPtr> subjects;
-        subjects.push_back(makeLibrary(splitter));
-        subjects.push_back(makeStringVector(list));
+        addTo(subjects, makeStore(list));
+        addTo(subjects, makeArchive(list));
+        addTo(subjects, makeMarisa(list));
+        addTo(subjects, makeStringVector(list));
         if (wanted > yardstick.size()) {
-            subjects.push_back(makeLibrary(yardstickSplitter));
-        }
-        if (auto marisa = makeMarisa(list)) {
-            subjects.push_back(std::move(marisa));
+            addTo(subjects, makeStore(yardstick));
+            addTo(subjects, makeArchive(yardstick));
         }
         auto all = measure(subjects, planFor(wanted, options.runs));
         for (Series& one : all) {
@@ -304,15 +314,22 @@ void compareOrder(const std::string& sortedName,
                                  sortedName + ".");
     }
     describe(sorted, sortedName);
-    const PathSplitter sortedSplitter(sorted);
-    const PathSplitter shuffledSplitter(shuffled);
     std::vector<SubjectPtr> subjects;
-    subjects.push_back(makeLibrary(sortedSplitter));
-    subjects.push_back(makeLibrary(shuffledSplitter));
+    std::vector<std::string> names;
+    const auto add = [&](SubjectPtr subject, const char* order) {
+        if (subject == nullptr) return;
+        names.push_back(subject->name() + order);
+        subjects.push_back(std::move(subject));
+    };
+    add(makeStore(sorted), ", sorted");
+    add(makeStore(shuffled), ", shuffled");
+    add(makeArchive(sorted), ", sorted");
+    add(makeArchive(shuffled), ", shuffled");
+    add(makeArchive(shuffled, ArchiveKind::Indexed), ", shuffled");
+    add(makeMarisa(shuffled), "");
     Plan plan = planFor(sorted.size(), options.runs);
     auto all = measure(subjects, plan);
-    all[0].name = "sorted";
-    all[1].name = "shuffled";
+    for (std::size_t i = 0; i < all.size(); ++i) all[i].name = names[i];
     std::cout << rivalsTable(all);
     Json json = describeJson(sorted, sortedName);
     finish(options, json.object("order", seriesJson(all)));
@@ -367,15 +384,13 @@ void measureShapes(const Options& options) {
         {"oneFolder", "5,000,000 files in a folder", oneFolder(5'000'000)});
     groups[2].push_back(
         {"chains", "500 chains of 200 folders", chains(500, 200)});
-    Table table(figureHeads("a path of"));
+    Table table(figureHeads("per path of"));
     Json all;
     for (const auto& group : groups) {
-        std::vector<PathSplitter> splitters;
         std::vector<SubjectPtr> subjects;
-        splitters.reserve(group.size());
         subjects.reserve(group.size());
         for (const Shape& shape : group) {
-            subjects.push_back(makeLibrary(splitters.emplace_back(shape.list)));
+            addTo(subjects, makeStore(shape.list));
         }
         const auto series =
             measure(subjects, planFor(group.back().list.size(), options.runs));

@@ -1,13 +1,14 @@
 #include "bench/HostRoute.hpp"
 
 #include <algorithm>
+#include <numeric>
 #include <string_view>
 #include <utility>
 
-#include "bench/CoderJob.hpp"
 #include "bench/Timing.hpp"
 #include "hosts/embedded/FilesetClass.hpp"
 #include "hosts/embedded/Host.hpp"
+#include "paths/Batches.hpp"
 
 namespace bench {
 
@@ -78,10 +79,12 @@ public:
         });
     }
 
-    double fetchRandom(const std::vector<double>& numbers) override {
+    double fetchRandom(const std::vector<std::size_t>& numbers) override {
         return secondsOf([&] {
-            for (const double number : numbers)
-                keep(fetch(instance_, {number}).element(0).charData());
+            for (const std::size_t number : numbers)
+                keep(fetch(instance_, {static_cast<double>(number)})
+                         .element(0)
+                         .charData());
         });
     }
 
@@ -150,9 +153,11 @@ private:
     void fetchAll(const Value& instance, Visit visit) {
         const std::size_t last = paths();
         for (std::size_t first = 1; first <= last; first += numbersPerCall) {
-            const Value cell = fetch(
-                instance,
-                numbersFrom(first, std::min(first + numbersPerCall - 1, last)));
+            std::vector<double> numbers(
+                std::min(numbersPerCall, last - first + 1));
+            std::iota(numbers.begin(), numbers.end(),
+                      static_cast<double>(first));
+            const Value cell = fetch(instance, std::move(numbers));
             for (std::size_t i = 0; i < cell.numel(); ++i)
                 visit(cell.element(i).charData());
         }

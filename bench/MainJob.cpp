@@ -5,24 +5,23 @@
 #include <algorithm>
 #include <iostream>
 #include <optional>
+#include <span>
 #include <utility>
 
-#include "bench/CoderJob.hpp"
+#include "bench/PathReader.hpp"
 #include "bench/Report.hpp"
 #include "bench/Timing.hpp"
+#include "paths/PathList.hpp"
+#include "paths/PathStore.hpp"
 
 namespace bench {
 
-using tessel::HuffmanPathTree;
-using tessel::paths::Batch;
-using tessel::paths::BatchReader;
+using tessel::PathStore;
 using tessel::paths::PathList;
-using tessel::paths::PathSplitter;
 
 namespace {
 
-constexpr std::size_t randomFetches = 100'000;
-constexpr std::size_t comparedAtOnce = 500'000;
+constexpr std::size_t randomReads = 100'000;
 
 struct Step {
     const char* name;
@@ -33,51 +32,41 @@ struct Step {
 struct Measurements {
     std::size_t paths = 0;
     std::size_t textBytes = 0;
-    std::size_t keptApart = 0;
-    HuffmanPathTree::MemoryUsage memory;
+    PathStore::MemoryUsage memory;
     std::size_t storedBytes = 0;
     std::vector<Step> steps;
 };
 
-// Compares texts that come one by one with those of the list.
-class Comparison {
+// Compares paths that come one by one with those of the list.
+class ListComparison {
 public:
-    // So many texts should come in all.
-    Comparison(const PathList& paths, std::size_t texts,
-               std::string nameOfRoute)
-        : list_(&paths), wanted_(texts), route_(std::move(nameOfRoute)) {}
+    ListComparison(const PathList& list, const char* route)
+        : list_(&list), route_(route) {}
 
-    // The next text should be that of path `position`, counted from 0.
-    void expect(std::size_t position, const std::u16string& joined) {
+    // Path `position`, counted from 0, came back as `path`.
+    void expect(std::size_t position, std::string_view path) {
         ++count_;
         if (difference_) return;
-        path_.clear();
-        if (!tessel::paths::textToPath(joined, path_)) {
-            path_ = "(no path's text)";
-        } else if (position < list_->size() && path_ == (*list_)[position]) {
-            return;
-        }
+        const bool isThere = position < list_->size();
+        if (isThere && path == (*list_)[position]) return;
         difference_ =
-            route_ + ": path " + std::to_string(position + 1) +
+            std::string(route_) + ": path " + std::to_string(position) +
             " should be\n  " +
-            (position < list_->size() ? std::string((*list_)[position])
-                                      : "(behind the last)") +
-            "\nand is\n  " + path_;
+            (isThere ? std::string((*list_)[position]) : "(after the last)") +
+            "\nand is\n  " + std::string(path);
     }
 
-    // The first difference, which may be in the number of texts.
-    std::optional<std::string> result() const {
-        if (difference_ || count_ == wanted_) return difference_;
-        return route_ + ": " + std::to_string(count_) + " paths instead of " +
-               std::to_string(wanted_);
+    // The first difference, which may be in the number of paths.
+    std::optional<std::string> result(std::size_t wanted) const {
+        if (difference_ || count_ == wanted) return difference_;
+        return std::string(route_) + ": " + std::to_string(count_) +
+               " paths instead of " + std::to_string(wanted);
     }
 
 private:
     const PathList* list_;
-    std::size_t wanted_;
-    std::string route_;
+    const char* route_;
     std::size_t count_ = 0;
-    std::string path_;
     std::optional<std::string> difference_;
 };
 
@@ -85,15 +74,16 @@ private:
 class MainJob {
 public:
     std::optional<std::string> run(const std::string& listOrFolder) {
-        read(listOrFolder);
-        const PathSplitter splitter = split();
-        CoderPtr coder = code(splitter);
-        add(splitter, *coder);
-        results.memory = coder->memoryUsage();
-        const auto restored = throughForm(std::move(coder));
-        iterateAll(*restored);
-        fetchRandom(*restored);
-        return compare(*restored, splitter);
+        step("read the list",
+             [&] { list_ = tessel::paths::readPaths(listOrFolder, walk); });
+        results.paths = list_.size();
+        results.textBytes = list_.textBytes();
+        PathStore store;
+        step("build", [&] { store = built(); });
+        results.memory = store.memoryUsage();
+        const PathStore loaded = throughBytes(std::move(store));
+        time(loaded);
+        return compare(loaded);
     }
 
     Measurements results;
@@ -101,136 +91,90 @@ public:
 
 private:
     template <class Call>
-    void step(const char* name, std::size_t paths, Call call) {
-        results.steps.push_back({name, secondsOf(call), paths});
+    void step(const char* name, Call call) {
+        results.steps.push_back({name, secondsOf(call), 0});
+        results.steps.back().paths = list_.size();
     }
 
-    void read(const std::string& listOrFolder) {
-        const Stopwatch watch;
-        list_ = tessel::paths::readPaths(listOrFolder, walk);
-        results.paths = list_.size();
-        results.textBytes = list_.textBytes();
-        results.steps.push_back({"read", watch.seconds(), list_.size()});
+    PathStore built() const {
+        return PathStore::from(
+            std::views::iota(std::size_t{0}, list_.size()) |
+            std::views::transform([&](std::size_t i) { return list_[i]; }));
     }
 
-    // Where each path is cut; the texts are made batch by batch.
-    PathSplitter split() {
-        const Stopwatch watch;
-        PathSplitter splitter(list_);
-        splitSeconds_ = watch.seconds();
-        results.keptApart = splitter.keptApartCount();
-        return splitter;
+    // Saves the store, releases it, and loads another one.
+    PathStore throughBytes(PathStore store) {
+        std::vector<std::uint8_t> bytes;
+        step("save", [&] { bytes = store.save(); });
+        results.storedBytes = bytes.size();
+        store = PathStore();
+        step("load", [&] { store = PathStore::load(bytes); });
+        return store;
     }
 
-    CoderPtr code(const PathSplitter& splitter) {
-        tessel::paths::CharacterCounts counts;
-        step("count", list_.size(),
-             [&] { counts = tessel::paths::countCharacters(splitter); });
-        CoderPtr coder;
-        step("code", list_.size(),
-             [&] { coder = coderFor(std::move(counts)); });
-        return coder;
-    }
-
-    void add(const PathSplitter& splitter, HuffmanPathTree& coder) {
-        double addSeconds = 0;
-        BatchReader reader(splitter);
-        Batch batch;
-        for (;;) {
-            const Stopwatch watch;
-            const bool more = reader.next(batch);
-            splitSeconds_ += watch.seconds();
-            if (!more) break;
-            addSeconds += secondsOf([&] {
-                coder.generateCodeAsyncAndAddPaths(batch.folders, batch.files);
-            });
-        }
-        results.steps.insert(results.steps.begin() + 1,
-                             {"split", splitSeconds_, list_.size()});
-        results.steps.push_back({"add", addSeconds, list_.size()});
-    }
-
-    // Serializes the coder, releases it, and restores another one.
-    CoderPtr throughForm(CoderPtr coder) {
-        std::vector<std::uint8_t> form;
-        step("serialize", list_.size(), [&] { coder->serialize(form, true); });
-        results.storedBytes =
-            form.size() + coder->treeString.size() * sizeof(char16_t);
-        const std::u16string treeString = coder->getTreeString();
-        coder.reset();
-        auto restored = std::make_unique<HuffmanPathTree>();
-        step("restore", list_.size(), [&] {
-            restored->deserialize(form, true);
-            restored->inflateHuffman(treeString);
+    void time(const PathStore& store) {
+        step("iterate", [&] {
+            for (const std::string_view path : store) keep(path);
         });
-        return restored;
-    }
-
-    void iterateAll(HuffmanPathTree& coder) {
-        step("iterate all", list_.size(), [&] {
-            iterate(coder, [](const std::u16string& text) { keep(text); });
+        step("iterate in tree order", [&] {
+            store.forEachInTreeOrder([](std::string_view path) { keep(path); });
         });
-    }
-
-    void fetchRandom(const HuffmanPathTree& coder) {
-        const auto numbers = randomNumbers(randomFetches, list_.size());
-        step("random getPath", numbers.size(), [&] {
-            for (const double number : numbers) {
-                fetch(coder, {number},
-                      [](const std::u16string& text) { keep(text); });
+        std::string path;
+        const auto numbers = randomNumbers(randomReads, list_.size());
+        step("read at random", [&] {
+            for (const std::size_t number : numbers) {
+                store.read(number - 1, path);
+                keep(path);
             }
         });
+        results.steps.back().paths = numbers.size();
     }
 
-    std::optional<std::string> compare(HuffmanPathTree& coder,
-                                       const PathSplitter& splitter) {
+    std::optional<std::string> compare(const PathStore& store) {
         std::optional<std::string> difference;
-        step("compare", 2 * list_.size() + randomFetches, [&] {
-            difference = compareByNumber(coder);
-            if (!difference) difference = compareRandom(coder);
-            if (!difference) difference = compareIteration(coder, splitter);
+        step("compare", [&] {
+            difference = compareByNumber(store);
+            if (!difference) difference = compareRandom(store);
+            if (!difference) difference = compareTreeOrder(store);
         });
         return difference;
     }
 
-    std::optional<std::string> compareByNumber(const HuffmanPathTree& coder) {
-        Comparison comparison(list_, list_.size(), "by number");
-        for (std::size_t first = 0; first < list_.size();) {
-            const std::size_t end =
-                std::min(list_.size(), first + comparedAtOnce);
-            fetch(coder, numbersFrom(first + 1, end),
-                  [&](const std::u16string& text) {
-                      comparison.expect(first++, text);
-                  });
-            if (first != end) break;
-        }
-        return comparison.result();
-    }
-
-    std::optional<std::string> compareRandom(const HuffmanPathTree& coder) {
-        Comparison comparison(list_, randomFetches, "random getPath");
-        for (const double number : randomNumbers(randomFetches, list_.size())) {
-            fetch(coder, {number}, [&](const std::u16string& text) {
-                comparison.expect(static_cast<std::size_t>(number) - 1, text);
-            });
-        }
-        return comparison.result();
-    }
-
-    std::optional<std::string> compareIteration(HuffmanPathTree& coder,
-                                                const PathSplitter& splitter) {
-        Comparison comparison(list_, list_.size(), "iterated");
-        const auto order = iterationOrder(coder, splitter);
-        std::size_t i = 0;
-        iterate(coder, [&](const std::u16string& text) {
-            comparison.expect(i < order.size() ? order[i] : list_.size(), text);
-            ++i;
+    std::optional<std::string> compareByNumber(const PathStore& store) const {
+        ListComparison comparison(list_, "by number");
+        store.read(0, store.size(), [&](std::size_t i, std::string_view path) {
+            comparison.expect(i, path);
         });
-        return comparison.result();
+        return comparison.result(list_.size());
+    }
+
+    std::optional<std::string> compareRandom(const PathStore& store) const {
+        ListComparison comparison(list_, "at random");
+        for (const std::size_t number :
+             randomNumbers(randomReads, list_.size())) {
+            comparison.expect(number - 1, store[number - 1]);
+        }
+        return comparison.result(randomReads);
+    }
+
+    // The order is the tree's own, so both sides are sorted.
+    std::optional<std::string> compareTreeOrder(const PathStore& store) const {
+        std::vector<std::string> met;
+        met.reserve(list_.size());
+        store.forEachInTreeOrder(
+            [&](std::string_view path) { met.emplace_back(path); });
+        std::ranges::sort(met);
+        std::vector<std::size_t> order(list_.size());
+        for (std::size_t i = 0; i < order.size(); ++i) order[i] = i;
+        std::ranges::sort(order, {}, [&](std::size_t i) { return list_[i]; });
+        ListComparison comparison(list_, "in tree order");
+        for (std::size_t i = 0; i < met.size(); ++i) {
+            comparison.expect(i < order.size() ? order[i] : i, met[i]);
+        }
+        return comparison.result(list_.size());
     }
 
     PathList list_;
-    double splitSeconds_ = 0;
 };
 
 void sizeRow(Table& table, const char* name, std::size_t bytes,
@@ -249,19 +193,16 @@ std::size_t peakResidentBytes() {
 }
 
 std::string asTable(const Measurements& m) {
-    Table table({"", "total", "a path", "paths/s"});
+    Table table({"", "total", "per path", "paths/s"});
     table.row({"paths", grouped(m.paths)});
-    table.row({"cut in another place", grouped(m.keptApart)});
     sizeRow(table, "text", m.textBytes, m.paths);
     sizeRow(table, "in memory", m.memory.total(), m.paths);
     sizeRow(table, "- names", m.memory.names, m.paths);
-    sizeRow(table, "- nodes", m.memory.nodes, m.paths);
-    sizeRow(table, "- child lists", m.memory.childLists, m.paths);
-    sizeRow(table, "- partition tracks", m.memory.partitionTracks, m.paths);
-    sizeRow(table, "- duplicates", m.memory.duplicates, m.paths);
-    sizeRow(table, "- code", m.memory.code, m.paths);
+    sizeRow(table, "- tree", m.memory.tree, m.paths);
+    sizeRow(table, "- numbers", m.memory.numbers, m.paths);
+    sizeRow(table, "- encoding", m.memory.encoding, m.paths);
     sizeRow(table, "- other", m.memory.other, m.paths);
-    sizeRow(table, "stored", m.storedBytes, m.paths);
+    sizeRow(table, "saved", m.storedBytes, m.paths);
     sizeRow(table, "peak of the process", peakResidentBytes(), m.paths);
     for (const Step& step : m.steps) {
         const auto paths = static_cast<double>(step.paths);

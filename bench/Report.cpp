@@ -61,7 +61,8 @@ std::string fixed(double number, int digits) {
 }
 
 std::string threeDigits(double number) {
-    if (number == 0 || !std::isfinite(number)) return formatted("%g", number);
+    if (std::isnan(number)) return "-";
+    if (number == 0 || std::isinf(number)) return formatted("%g", number);
     const int before = static_cast<int>(std::floor(std::log10(number))) + 1;
     return fixed(number, std::clamp(3 - before, 0, 9));
 }

@@ -1,11 +1,12 @@
 #include "bench/Series.hpp"
 
 #include <algorithm>
+#include <cmath>
 #include <functional>
 #include <stdexcept>
 
-#include "bench/CoderJob.hpp"
 #include "bench/Heap.hpp"
+#include "bench/PathReader.hpp"
 #include "bench/Timing.hpp"
 
 namespace bench {
@@ -58,6 +59,7 @@ private:
         each(Operation::FetchRandom, [&](Subject& s) {
             return s.fetchRandom(randomNumbers(plan_.fetches, s.paths()));
         });
+        findAll();
         if (stores) storeAll(isFirst);
         each(Operation::Destroy, [](Subject& s) { return s.destroy(); });
     }
@@ -73,6 +75,18 @@ private:
             ++i;
             return seconds;
         });
+    }
+
+    void findAll() {
+        for (std::size_t i = 0; i < subjects_->size(); ++i) {
+            Subject& subject = *(*subjects_)[i];
+            const auto seconds = subject.findNumbers(
+                randomNumbers(plan_.fetches, subject.paths()));
+            if (!seconds) continue;
+            series_[i]
+                .seconds[static_cast<std::size_t>(Operation::FindNumber)]
+                .push_back(*seconds);
+        }
     }
 
     void storeAll(bool isFirst) {
@@ -97,21 +111,22 @@ private:
 
 const char* nameOf(Operation operation) {
     constexpr std::array<const char*, operationCount> names = {
-        "build", "iterate", "bulk fetch", "random fetch",
-        "store", "restore", "destroy"};
+        "build",       "iterate", "bulk fetch", "random fetch",
+        "find number", "store",   "restore",    "destroy"};
     return names[static_cast<std::size_t>(operation)];
 }
 
 const char* keyOf(Operation operation) {
     constexpr std::array<const char*, operationCount> keys = {
-        "build", "iterate", "bulkFetch", "randomFetch",
-        "store", "restore", "destroy"};
+        "build",      "iterate", "bulkFetch", "randomFetch",
+        "findNumber", "store",   "restore",   "destroy"};
     return keys[static_cast<std::size_t>(operation)];
 }
 
 std::vector<double> Series::runs(Operation operation) const {
-    const std::size_t count =
-        operation == Operation::FetchRandom ? fetches : paths;
+    const bool isRandom = operation == Operation::FetchRandom ||
+                          operation == Operation::FindNumber;
+    const std::size_t count = isRandom ? fetches : paths;
     std::vector<double> nanoseconds = of(operation);
     for (double& value : nanoseconds) {
         value *= 1e9 / static_cast<double>(count);
@@ -120,10 +135,13 @@ std::vector<double> Series::runs(Operation operation) const {
 }
 
 double Series::nanoseconds(Operation operation) const {
+    if (of(operation).empty()) return std::nan("");
     return median(runs(operation));
 }
 
 double Series::times(const Series& other, Operation operation) const {
+    if (of(operation).empty() || other.of(operation).empty())
+        return std::nan("");
     return medianRatio(runs(operation), other.runs(operation));
 }
 
@@ -144,6 +162,7 @@ Json Series::json() const {
     Json times;
     for (std::size_t i = 0; i < operationCount; ++i) {
         const auto operation = static_cast<Operation>(i);
+        if (of(operation).empty()) continue;
         times.number(keyOf(operation), nanoseconds(operation));
     }
     all.object("nanosecondsPerPath", times);

@@ -16,11 +16,12 @@ enum class Operation {
     Iterate,
     FetchAll,
     FetchRandom,
+    FindNumber,
     Store,
     Restore,
     Destroy
 };
-inline constexpr std::size_t operationCount = 7;
+inline constexpr std::size_t operationCount = 8;
 const char* nameOf(Operation operation);
 const char* keyOf(Operation operation);
 
@@ -30,17 +31,19 @@ struct Series {
     std::size_t memoryBytes = 0;
     std::size_t storedBytes = 0;
     std::size_t paths = 0;
-    std::size_t fetches = 0;  // of FetchRandom
+    std::size_t fetches = 0;  // of FetchRandom and FindNumber
     std::array<std::vector<double>, operationCount> seconds;
 
     const std::vector<double>& of(Operation operation) const {
         return seconds[static_cast<std::size_t>(operation)];
     }
-    // Of one operation in every run, in nanoseconds a path.
+    // Of one operation in every run, in nanoseconds per path. None of an
+    // operation that the subject does not have.
     std::vector<double> runs(Operation operation) const;
-    // Their median.
+    // Their median; not a number if there are none.
     double nanoseconds(Operation operation) const;
-    // The median of how many times another series' it is in the same run.
+    // The median of how many times another series' it is in the same run; not
+    // a number if one of the two has none.
     double times(const Series& other, Operation operation) const;
     double memoryPerPath() const;
     double storedPerPath() const;

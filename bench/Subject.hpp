@@ -14,8 +14,9 @@ namespace bench {
 // is built, asked, stored, restored and destroyed. Each operation returns the
 // seconds that it took, without its preparations.
 //
-// Order: build; then iterate, fetchAll, fetchRandom, verify in any order;
-//   store; restore; verifyRestored; destroyRestored; destroy; and again.
+// Order: build; then iterate, fetchAll, fetchRandom, findNumbers, verify in
+//   any order; store; restore; verifyRestored; destroyRestored; destroy; and
+//   again.
 class Subject {
 public:
     Subject() = default;
@@ -32,8 +33,15 @@ public:
     virtual double iterate() = 0;
     // The full text of every path in the order of the list.
     virtual double fetchAll() = 0;
-    // The full texts of the paths of these numbers, one by one.
-    virtual double fetchRandom(const std::vector<double>& numbers) = 0;
+    // The full texts of the paths of these numbers, one by one. The first
+    // path has number 1.
+    virtual double fetchRandom(const std::vector<std::size_t>& numbers) = 0;
+    // The numbers of the paths that have these numbers, one by one. None if
+    // the subject cannot be asked for them.
+    virtual std::optional<double> findNumbers(
+        const std::vector<std::size_t>& /*numbers*/) {
+        return std::nullopt;
+    }
     virtual double store() = 0;
     virtual double restore() = 0;
     virtual double destroyRestored() = 0;
@@ -49,11 +57,16 @@ public:
 
 using SubjectPtr = std::unique_ptr<Subject>;
 
-// Each of them refers to the splitter and to its list.
-SubjectPtr makeLibrary(const tessel::paths::PathSplitter& splitter);
+// Each of them refers to the list, or the splitter and its list.
+SubjectPtr makeStore(const tessel::paths::PathList& list);
+SubjectPtr makeCore(const tessel::paths::PathSplitter& splitter);
 SubjectPtr makeTextVector(const tessel::paths::PathList& list);
 SubjectPtr makeStringVector(const tessel::paths::PathList& list);
 SubjectPtr makeTextBuffer(const tessel::paths::PathList& list);
+// An index finds a path by its text in lists that are not sorted.
+enum class ArchiveKind { Plain, Indexed };
+SubjectPtr makeArchive(const tessel::paths::PathList& list,
+                       ArchiveKind kind = ArchiveKind::Plain);
 // Null where the program was built without libmarisa.
 SubjectPtr makeMarisa(const tessel::paths::PathList& list);
 

@@ -12,7 +12,7 @@
 #include <string_view>
 #include <utility>
 
-#include "bench/CoderJob.hpp"
+#include "bench/PathReader.hpp"
 #include "bench/Timing.hpp"
 
 namespace {
@@ -136,7 +136,7 @@ void fetchRandom() {
     count([&] {
         for (std::size_t i = 0; i < randomFetches; ++i) {
             const auto number = 1 + numbers.below(coder->pathCount);
-            bench::fetch(*coder, {static_cast<double>(number)},
+            bench::fetch(*coder, std::views::single(number),
                          [](const std::u16string& text) { bench::keep(text); });
         }
     });

@@ -20,7 +20,4 @@ public:
 // Bytes asked for since the program began.
 unsigned long bytesAsked();
 
-// Blocks released since the program began.
-unsigned long blocksReleased();
-
 }  // namespace failing

@@ -8,16 +8,17 @@
 #include <vector>
 
 #include "bench/Comparison.hpp"
+#include "bench/HostRoute.hpp"
 #include "bench/MainJob.hpp"
 
 namespace {
 
 constexpr std::string_view usage =
-    R"(Usage: listing LIST
-       listing --rivals [OPTIONS] LIST
-       listing --growth [OPTIONS] LIST
-       listing --order [OPTIONS] SORTED-LIST SHUFFLED-LIST
-       listing --shapes [OPTIONS]
+    R"(Usage: path-bench LIST
+       path-bench --rivals [OPTIONS] LIST
+       path-bench --growth [OPTIONS] LIST
+       path-bench --order [OPTIONS] SORTED-LIST SHUFFLED-LIST
+       path-bench --shapes [OPTIONS]
 
 LIST is a file of paths, separated by NUL if it has a NUL and otherwise by
 newline, or a folder, of which everything below that is no folder is listed.
@@ -29,8 +30,9 @@ newline, or a folder, of which everything below that is no folder is listed.
   --order    the same on a sorted and a shuffled list
   --shapes   lists that are made to be awkward: wide, flat and deep ones
 
-  --runs N      measure N times and take the medians (5)
-  --json FILE   also write the results to FILE
+  --runs N          measure N times and take the medians (5)
+  --no-compressors  leave out zstd and xz, which take most of the time
+  --json FILE       also write the results to FILE
 )";
 
 struct WrongUsage {
@@ -54,6 +56,7 @@ int positiveNumber(const std::string& text) {
 
 Arguments parse(std::span<char*> words) {
     Arguments arguments;
+    arguments.options.host = bench::makeHostRoute;
     for (std::size_t i = 1; i < words.size(); ++i) {
         const std::string word = words[i];
         const auto value = [&]() -> std::string {
@@ -64,6 +67,8 @@ Arguments parse(std::span<char*> words) {
             arguments.options.jsonFile = value();
         } else if (word == "--runs") {
             arguments.options.runs = positiveNumber(value());
+        } else if (word == "--no-compressors") {
+            arguments.options.compressors = false;
         } else if (word == "--rivals" || word == "--growth" ||
                    word == "--order" || word == "--shapes") {
             if (!arguments.mode.empty()) throw WrongUsage{"two modes"};
@@ -109,10 +114,10 @@ int main(int argc, char** argv) {
             parse({argv, static_cast<std::size_t>(argc)});
         return run(arguments) ? 0 : 1;
     } catch (const WrongUsage& wrong) {
-        std::cerr << "listing: " << wrong.what << "\n\n" << usage;
+        std::cerr << "path-bench: " << wrong.what << "\n\n" << usage;
         return 2;
     } catch (const std::exception& error) {
-        std::cerr << "listing: " << error.what() << '\n';
+        std::cerr << "path-bench: " << error.what() << '\n';
         return 1;
     }
 }

@@ -1,4 +1,4 @@
-#include "bench/CoderJob.hpp"
+#include "bench/PathReader.hpp"
 
 #include <algorithm>
 #include <cstdint>
@@ -8,7 +8,6 @@
 
 namespace bench {
 
-using tessel::Components;
 using tessel::HuffmanPathTree;
 using tessel::paths::forEachFolder;
 using tessel::paths::PathSplitter;
@@ -62,36 +61,27 @@ private:
 
 }  // namespace
 
-void joinFolder(const HuffmanPathTree& coder, const Components& components,
-                std::u16string& text) {
-    text.clear();
-    for (std::size_t i = 0; i < components.size(); ++i) {
-        coder.appendPathFrom(components[i], text);
-        if (i > 0) text += u'/';
-    }
+void PathJoiner::keepFolders(std::size_t depth) {
+    ends_.resize(std::min(depth, ends_.size()));
 }
 
-void joinPath(const HuffmanPathTree& coder, const Components& components,
-              std::u16string& text) {
-    text.clear();
-    for (std::size_t i = 0; i < components.size(); ++i) {
-        coder.appendPathFrom(components[i], text);
-        if (i > 0 && i + 1 < components.size()) text += u'/';
-    }
+void PathJoiner::addFolder(tessel::ComponentView name) {
+    text_.resize(folderEnd());
+    coder_->appendPathFrom(name, text_);
+    if (!ends_.empty()) text_ += u'/';
+    ends_.push_back(text_.size());
 }
 
-std::vector<double> numbersFrom(std::size_t first, std::size_t last) {
-    std::vector<double> numbers(last - first + 1);
-    std::iota(numbers.begin(), numbers.end(), static_cast<double>(first));
-    return numbers;
+const std::u16string& PathJoiner::pathOf(tessel::ComponentView fileName) {
+    text_.resize(folderEnd());
+    coder_->appendPathFrom(fileName, text_);
+    return text_;
 }
 
-std::vector<double> randomNumbers(std::size_t count, std::size_t last) {
+std::vector<std::size_t> randomNumbers(std::size_t count, std::size_t last) {
     std::mt19937_64 random(20230610);  // NOLINT(cert-msc*): on purpose
-    std::vector<double> numbers(count);
-    for (double& number : numbers) {
-        number = static_cast<double>(1 + random() % last);
-    }
+    std::vector<std::size_t> numbers(count);
+    for (std::size_t& number : numbers) number = 1 + random() % last;
     return numbers;
 }
 

@@ -58,11 +58,11 @@ public:
         });
     }
     double fetchAll() override { return iterate(); }
-    double fetchRandom(const std::vector<double>& numbers) override {
+    double fetchRandom(const std::vector<std::size_t>& numbers) override {
         typename Container::Text text;
         return secondsOf([&] {
-            for (const double number : numbers) {
-                read(static_cast<std::size_t>(number) - 1, text);
+            for (const std::size_t number : numbers) {
+                read(number - 1, text);
             }
         });
     }

@@ -1,12 +1,12 @@
-#include "bench/Internals.hpp"
+#include "bench/CoreBounds.hpp"
 
 #include <zlib.h>
 
 #include <stdexcept>
 #include <utility>
 
-#include "bench/CoderJob.hpp"
 #include "bench/Heap.hpp"
+#include "bench/PathReader.hpp"
 #include "bench/Timing.hpp"
 
 namespace bench {
@@ -70,7 +70,7 @@ double uncompressAlone(const Bytes& form, std::size_t payloadBytes) {
 }
 
 // Memory while one batch is added and while its form is read.
-CoderPtr measureMemory(const PathSplitter& splitter, Internals& result) {
+CoderPtr measureMemory(const PathSplitter& splitter, CoreBounds& result) {
     const std::size_t before = heapInUse();
     CoderPtr coder;
     {
@@ -97,7 +97,7 @@ CoderPtr measureMemory(const PathSplitter& splitter, Internals& result) {
 }
 
 // Storing and restoring beside zlib alone on the same bytes.
-void measureZlib(const HuffmanPathTree& coder, int runs, Internals& result) {
+void measureZlib(const HuffmanPathTree& coder, int runs, CoreBounds& result) {
     Bytes payload;
     coder.serialize(payload, false);
     payload.erase(payload.begin(), payload.begin() + lengthBytes);
@@ -119,7 +119,8 @@ void measureZlib(const HuffmanPathTree& coder, int runs, Internals& result) {
     result.restoreToUncompress = medianRatio(restores, uncompresses);
 }
 
-void measureDestroy(const PathSplitter& splitter, int runs, Internals& result) {
+void measureDestroy(const PathSplitter& splitter, int runs,
+                    CoreBounds& result) {
     std::vector<double> builds;
     std::vector<double> destroys;
     for (int i = 0; i < runs; ++i) {
@@ -132,7 +133,8 @@ void measureDestroy(const PathSplitter& splitter, int runs, Internals& result) {
 }
 
 // Encoding alone, on one worker and on two.
-void measureWorkers(const PathSplitter& splitter, int runs, Internals& result) {
+void measureWorkers(const PathSplitter& splitter, int runs,
+                    CoreBounds& result) {
     Batch batch = wholeBatch(splitter);
     const CoderPtr coder =
         coderFor(tessel::paths::countCharacters(batch.folders, batch.files));
@@ -156,7 +158,7 @@ void measureWorkers(const PathSplitter& splitter, int runs, Internals& result) {
 
 }  // namespace
 
-Json Internals::json() const {
+Json CoreBounds::json() const {
     Json all;
     const auto bytes = [&](const char* key, std::size_t value) {
         all.number(key, static_cast<double>(value));
@@ -177,8 +179,8 @@ Json Internals::json() const {
         .number("twoWorkers", twoWorkers);
 }
 
-Internals measureInternals(const PathSplitter& splitter, int runs) {
-    Internals result;
+CoreBounds measureCoreBounds(const PathSplitter& splitter, int runs) {
+    CoreBounds result;
     result.textBytes = splitter.list().textBytes();
     {
         const CoderPtr coder = measureMemory(splitter, result);

@@ -51,12 +51,23 @@ public:
     }
     // By the trie's own numbers: the way from the list's to them is free.
     double fetchAll() override { return iterate(); }
-    double fetchRandom(const std::vector<double>& numbers) override {
+    double fetchRandom(const std::vector<std::size_t>& numbers) override {
         marisa::Agent agent;
         return secondsOf([&] {
-            for (const double number : numbers) {
-                lookUp(*trie_, idOf_[static_cast<std::size_t>(number) - 1],
-                       agent);
+            for (const std::size_t number : numbers) {
+                lookUp(*trie_, idOf_[number - 1], agent);
+            }
+        });
+    }
+
+    std::optional<double> findNumbers(
+        const std::vector<std::size_t>& numbers) override {
+        marisa::Agent agent;
+        return secondsOf([&] {
+            for (const std::size_t number : numbers) {
+                const std::string_view path = (*list_)[number - 1];
+                agent.set_query(path.data(), path.size());
+                keep(trie_->lookup(agent));
             }
         });
     }

@@ -7,7 +7,7 @@ namespace bench {
 
 // What the library's own parts cost on one list, beside what they cannot be
 // faster or smaller than. Bytes, and ratios of times of the same run.
-struct Internals {
+struct CoreBounds {
     std::size_t textBytes = 0;
     std::size_t inputBytes = 0;     // the lists of UTF-16 strings
     std::size_t usageBytes = 0;     // memoryUsage().total()
@@ -25,7 +25,7 @@ struct Internals {
 };
 
 // Measures it, the times `runs` times. The whole list is one batch.
-Internals measureInternals(const tessel::paths::PathSplitter& splitter,
-                           int runs);
+CoreBounds measureCoreBounds(const tessel::paths::PathSplitter& splitter,
+                             int runs);
 
 }  // namespace bench

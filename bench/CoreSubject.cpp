@@ -1,9 +1,9 @@
-// The library itself as a subject.
+// The core itself as a subject: UTF-16 texts in, UTF-16 texts out.
 
 #include <map>
 #include <utility>
 
-#include "bench/CoderJob.hpp"
+#include "bench/PathReader.hpp"
 #include "bench/Subject.hpp"
 #include "bench/Timing.hpp"
 
@@ -30,12 +30,12 @@ CharacterCounts sumOf(const std::map<char16_t, double>& sums) {
     return counts;
 }
 
-class Library : public Subject {
+class CoreSubject : public Subject {
 public:
-    explicit Library(const PathSplitter& pathSplitter)
+    explicit CoreSubject(const PathSplitter& pathSplitter)
         : splitter_(&pathSplitter) {}
 
-    std::string name() const override { return "qztessel"; }
+    std::string name() const override { return "core"; }
     std::size_t paths() const override { return splitter_->list().size(); }
 
     // Counts, makes the code, encodes and inserts; the lists of UTF-16
@@ -66,12 +66,10 @@ public:
         });
     }
 
-    double fetchRandom(const std::vector<double>& numbers) override {
-        std::vector<double> one(1);
+    double fetchRandom(const std::vector<std::size_t>& numbers) override {
         return secondsOf([&] {
-            for (const double number : numbers) {
-                one[0] = number;
-                fetch(*coder_, one,
+            for (const std::size_t number : numbers) {
+                fetch(*coder_, std::views::single(number),
                       [](const std::u16string& text) { keep(text); });
             }
         });
@@ -165,8 +163,8 @@ private:
 
 }  // namespace
 
-SubjectPtr makeLibrary(const PathSplitter& splitter) {
-    return std::make_unique<Library>(splitter);
+SubjectPtr makeCore(const PathSplitter& splitter) {
+    return std::make_unique<CoreSubject>(splitter);
 }
 
 }  // namespace bench
