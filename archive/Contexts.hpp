@@ -1,7 +1,7 @@
 #pragma once
 
 #include <array>
-#include <bit>
+#include <cstddef>
 #include <cstdint>
 
 #include "archive/Format.hpp"
@@ -90,7 +90,7 @@ constexpr std::uint8_t contextAfterOperation(unsigned operation) noexcept {
     // The last prefix length of contexts 1 to 13.
     constexpr std::array<std::uint8_t, 13> last = {0,  2,  4,  6,  8,  10, 12,
                                                    15, 19, 24, 31, 41, 55};
-    for (std::uint8_t i = 0; i < last.size(); ++i)
+    for (std::size_t i = 0; i < last.size(); ++i)
         if (operation <= last[i]) return static_cast<std::uint8_t>(i + 1);
     return afterLongPrefix;
 }

@@ -178,7 +178,7 @@ struct TokenEntry {
     bool ends = false;
 
     std::uint32_t packed() const noexcept {
-        return offset << 6U | length << 1U | std::uint32_t{ends};
+        return offset << 6U | length << 1U | (ends ? 1U : 0U);
     }
     static TokenEntry fromPacked(std::uint32_t bits) noexcept {
         return {bits >> 6U & 0x3FFFFU, bits >> 1U & 31U, (bits & 1U) != 0};

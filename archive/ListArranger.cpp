@@ -1,6 +1,7 @@
 #include "archive/ListArranger.hpp"
 
 #include <algorithm>
+#include <compare>
 #include <cstddef>
 #include <numeric>
 
@@ -113,7 +114,7 @@ bool PathSorter::less(const NameKey& a, const NameKey& b) const {
     if (a.key != b.key) return a.key < b.key;
     const auto order = list_.name(list_.names()[a.number]) <=>
                        list_.name(list_.names()[b.number]);
-    return order != 0 ? order < 0 : a.number < b.number;
+    return std::is_neq(order) ? std::is_lt(order) : a.number < b.number;
 }
 
 void PathSorter::sortNames() {

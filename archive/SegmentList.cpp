@@ -18,7 +18,7 @@ std::strong_ordering SplitPath::operator<=>(
     const std::size_t shared = std::min(folder.size(), other.folder.size());
     const auto start =
         folder.substr(0, shared) <=> other.folder.substr(0, shared);
-    if (start != 0) return start;
+    if (std::is_neq(start)) return start;
     if (folder.size() == other.folder.size()) return name <=> other.name;
     return folder.size() > shared ? folder.substr(shared) <=> other.name
                                   : name <=> other.folder.substr(shared);

@@ -14,18 +14,17 @@ std::uint64_t sumOf(std::span<const std::uint8_t> bytes,
     return XXH64(bytes.data(), bytes.size(), seed);
 }
 
-namespace SumTree {
-
-std::uint64_t pieceSum(std::span<const std::uint8_t> bytes, unsigned pieceShift,
-                       std::uint64_t level, std::uint64_t index) noexcept {
+std::uint64_t SumTree::pieceSum(std::span<const std::uint8_t> bytes,
+                                unsigned pieceShift, std::uint64_t level,
+                                std::uint64_t index) noexcept {
     const std::size_t begin = index << pieceShift;
     const std::size_t size =
         std::min(std::size_t{1} << pieceShift, bytes.size() - begin);
     return sumOf(bytes.subspan(begin, size), seedOf(level, index));
 }
 
-std::uint64_t storedBytes(std::uint64_t bodyBytes,
-                          unsigned pieceShift) noexcept {
+std::uint64_t SumTree::storedBytes(std::uint64_t bodyBytes,
+                                   unsigned pieceShift) noexcept {
     std::uint64_t total = 0;
     std::uint64_t pieces = piecesIn(bodyBytes, pieceShift);
     while (pieces > 1) {
@@ -35,7 +34,8 @@ std::uint64_t storedBytes(std::uint64_t bodyBytes,
     return total;
 }
 
-Levels levelsAbove(std::vector<std::uint64_t> pieceSums, unsigned pieceShift) {
+SumTree::Levels SumTree::levelsAbove(std::vector<std::uint64_t> pieceSums,
+                                     unsigned pieceShift) {
     Levels levels;
     std::vector<std::uint64_t>& sums = pieceSums;
     for (std::uint64_t level = 1; sums.size() > 1; ++level) {
@@ -50,7 +50,5 @@ Levels levelsAbove(std::vector<std::uint64_t> pieceSums, unsigned pieceShift) {
     levels.top = sums.front();
     return levels;
 }
-
-}  // namespace SumTree
 
 }  // namespace tessel::archive
