@@ -43,6 +43,10 @@ struct TokenModel::Kept {
         return counts[token * contextSlots + context];
     }
 
+    // Counts what a token is used in a context, as itself or as a literal.
+    void add(const std::string& text, std::size_t token, std::size_t context,
+             std::uint32_t count, double minUses);
+
     // Tokens that some context keeps.
     std::vector<std::uint32_t> mostUsedFirst() const;
 
@@ -58,24 +62,25 @@ TokenModel::Kept::Kept(const std::vector<std::string>& tokens,
     : counts(tokens.size() * contextSlots) {
     totals.fill(1);
     firstTotals.fill(1);
-    for (std::size_t t = 0; t < tokens.size(); ++t) {
-        const bool isByte = tokens[t].size() == 1;
-        const auto first = static_cast<std::uint8_t>(tokens[t].front());
-        for (std::size_t c = 0; c < contextSlots; ++c) {
-            const std::uint32_t count = uses.of(t, c);
-            const bool isFirst = c == firstTokenContext;
-            // After a shared prefix, a byte alone is always the literal.
-            const bool keep = isFirst  ? !isByte && count >= minUses
-                              : isByte ? count >= 2
-                                       : count >= minUses;
-            if (count == 0 || (!keep && !isByte)) continue;
-            (isFirst ? firstTotals[first] : totals[c]) += count;
-            if (keep)
-                counts[t * contextSlots + c] = count;
-            else
-                (isFirst ? firstLiterals[first] : literals[c]) += count;
-        }
-    }
+    for (std::size_t t = 0; t < tokens.size(); ++t)
+        for (std::size_t c = 0; c < contextSlots; ++c)
+            if (uses.of(t, c) > 0) add(tokens[t], t, c, uses.of(t, c), minUses);
+}
+
+void TokenModel::Kept::add(const std::string& text, std::size_t token,
+                           std::size_t context, std::uint32_t count,
+                           double minUses) {
+    const bool isByte = text.size() == 1;
+    const bool isFirst = context == firstTokenContext;
+    const auto first = static_cast<std::uint8_t>(text.front());
+    // After a shared prefix, a byte alone is always the literal.
+    const bool keep = isByte ? !isFirst && count >= 2 : count >= minUses;
+    if (!keep && !isByte) return;
+    (isFirst ? firstTotals[first] : totals[context]) += count;
+    if (keep)
+        counts[token * contextSlots + context] = count;
+    else
+        (isFirst ? firstLiterals[first] : literals[context]) += count;
 }
 
 std::vector<std::uint32_t> TokenModel::Kept::mostUsedFirst() const {

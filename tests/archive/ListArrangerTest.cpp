@@ -64,7 +64,7 @@ TEST(ListArrangerTest, SortsRandomLists) {
     for (int round = 0; round < 30; ++round) {
         Paths paths(400);
         for (std::string& path : paths) {
-            path = "x";
+            path.assign(1, 'x');
             for (std::size_t i = random() % 14; i > 0; --i)
                 path += "/ab!\xFF"[random() % 5];
         }
@@ -74,10 +74,13 @@ TEST(ListArrangerTest, SortsRandomLists) {
 
 TEST(ListArrangerTest, SortsManyFoldersOnManyWorkers) {
     Paths paths;
-    for (std::uint32_t i = 0; i < 5000; ++i)
-        paths.push_back("folder" + std::to_string(i * 7919 % 5000) +
-                        "/a name longer than eight bytes " +
-                        std::to_string(i % 13));
+    for (std::uint32_t i = 0; i < 5000; ++i) {
+        std::string path = "folder";
+        path += std::to_string(i * 7919 % 5000);
+        path += "/a name longer than eight bytes ";
+        path += std::to_string(i % 13);
+        paths.push_back(path);
+    }
     expectSorted(paths);
 }
 
