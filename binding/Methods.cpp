@@ -6,6 +6,7 @@
 
 #include "binding/Conversions.hpp"
 #include "binding/Errors.hpp"
+#include "binding/PathCells.hpp"
 
 namespace tessel::binding {
 
@@ -91,77 +92,6 @@ void checkCounts(const HostFrame& frame, CountLimits limits) {
     throw HostReturnedException();
 }
 
-// Writes decoded components into cells through one buffer, so that a name
-// takes no memory besides the host's array.
-class Decoder {
-public:
-    explicit Decoder(const HuffmanPathTree& coder)
-        : coder_(coder), host_(host()) {}
-
-    // An n x 1 cell of the components, each as a char row.
-    OwnedArray column(const Components& components) {
-        OwnedArray cell = createCell(components.size(), 1);
-        for (std::size_t i = 0; i < components.size(); ++i) {
-            text_.clear();
-            coder_.appendPathFrom(components[i], text_);
-            setText(cell, i);
-        }
-        return cell;
-    }
-
-    // An n x 1 cell with one such column per list.
-    OwnedArray columns(const std::vector<Components>& lists) {
-        OwnedArray cell = createCell(lists.size(), 1);
-        for (std::size_t i = 0; i < lists.size(); ++i)
-            setCell(cell, i, column(lists[i]));
-        return cell;
-    }
-
-    // A cell of `count` rows, filled from its start with the joined paths. A
-    // folder without components is left out together with its files.
-    OwnedArray joined(const std::vector<Components>& folders,
-                      const std::vector<Components>& files, std::size_t count,
-                      std::u16string_view separator) {
-        OwnedArray cell = createCell(count, 1);
-        std::size_t next = 0;
-        for (std::size_t i = 0; i < folders.size() && i < files.size(); ++i) {
-            if (folders[i].empty()) continue;
-            readFolder(folders[i], separator);
-            const std::size_t folderEnd = text_.size();
-            for (const Component& file : files[i]) {
-                text_.resize(folderEnd);
-                coder_.appendPathFrom(file, text_);
-                setText(cell, next++);
-            }
-        }
-        return cell;
-    }
-
-private:
-    // The text before a folder's file names: the root, which carries its own
-    // separator, then each other folder name followed by a separator.
-    void readFolder(const Components& components,
-                    std::u16string_view separator) {
-        text_.clear();
-        coder_.appendPathFrom(components.front(), text_);
-        for (std::size_t i = 1; i < components.size(); ++i) {
-            coder_.appendPathFrom(components[i], text_);
-            text_ += separator;
-        }
-    }
-
-    // Puts the buffer's text into a cell, which owns it also if that throws.
-    void setText(const OwnedArray& cell, std::size_t index) {
-        HostArray* const text = host_.hostCreateCharArray(text_);
-        if (text == nullptr) throw HostAllocationFailure();
-        host_.hostSetCell(cell.get(), index, text);
-    }
-
-    const HuffmanPathTree& coder_;
-    HostInterface& host_;
-    std::u16string text_;
-};
-
 }  // namespace
 
 void SignatureReleaser::operator()(HostSignature* signature) const noexcept {
@@ -204,30 +134,26 @@ void addPaths(HostFrame& frame) {
 void getPaths(HostFrame& frame) {
     checkCounts(frame, {2, 3, 2});
     if (frame.outputCount == 0) return;
-    HuffmanPathTree& coder = coderOf(frame.inputs[0]);
+    PathCells cells(coderOf(frame.inputs[0]));
     const std::vector<double> numbers = doubles(frame.inputs[1]);
-    std::vector<Components> folders;
-    std::vector<Components> files;
-    coder.getPath(folders, files, numbers);
-    Decoder decoder(coder);
     if (frame.inputCount == 3) {
         const std::u16string separator = host().hostGetUString(frame.inputs[2]);
-        frame.outputs[0] =
-            decoder.joined(folders, files, numbers.size(), separator).release();
+        frame.outputs[0] = cells.joined(numbers, separator).release();
         return;
     }
-    OwnedArray folderCell = decoder.columns(folders);
-    OwnedArray fileCell = decoder.columns(files);
-    frame.outputs[0] = folderCell.release();
-    frame.outputs[1] = fileCell.release();
+    PathCells::FoldersAndFiles found = cells.foldersAndFiles(numbers);
+    frame.outputs[0] = found.folders.release();
+    frame.outputs[1] = found.files.release();
 }
 
 void getNextPath(HostFrame& frame) {
     checkCounts(frame, {1, 1, 1});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
-    Components components;
-    coder.getNextPathFromBTree(components);
-    frame.outputs[0] = Decoder(coder).column(components).release();
+    OwnedArray names;
+    coder.visitNextPath([&](const PathView& path) {
+        names = PathCells(coder).components(path);
+    });
+    frame.outputs[0] = names.release();
 }
 
 void hasNextPath(HostFrame& frame) {

@@ -9,16 +9,6 @@ namespace tessel {
 
 namespace {
 
-// A path number of a request. Infinity and whatever 64 bits cannot hold is
-// above every number in use.
-std::uint64_t pathNumberOf(double value) {
-    if (std::isnan(value) || value <= -1)
-        throw std::out_of_range("A path number is negative or not a number.");
-    constexpr double beyondAll = 18446744073709551616.0;  // 2 to the 64th
-    return value >= beyondAll ? std::numeric_limits<std::uint64_t>::max()
-                              : static_cast<std::uint64_t>(value);
-}
-
 // Copies what is visited to two lists, one entry per folder each. Both lists
 // may be the same one: folder, files, folder, files.
 class Copier {
@@ -58,6 +48,14 @@ private:
 };
 
 }  // namespace
+
+std::uint64_t PathRetrieval::pathNumberOf(double value) {
+    if (std::isnan(value) || value <= -1)
+        throw std::out_of_range("A path number is negative or not a number.");
+    constexpr double beyondAll = 18446744073709551616.0;  // 2 to the 64th
+    return value >= beyondAll ? std::numeric_limits<std::uint64_t>::max()
+                              : static_cast<std::uint64_t>(value);
+}
 
 void PathRetrieval::getPath(std::vector<Components>& folderPaths,
                             std::vector<Components>& filePaths,

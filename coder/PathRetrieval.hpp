@@ -25,6 +25,11 @@ public:
                   const PathNumbering& numbering) noexcept
         : tree_(tree), numbering_(numbering) {}
 
+    // A number of a request as getPath takes it: truncated; infinity, and what
+    // 64 bits cannot hold, is above every number in use. Throws
+    // std::out_of_range for NaN, for -1 and below.
+    static std::uint64_t pathNumberOf(double value);
+
     // See HuffmanPathTree::visitPaths.
     template <class Numbers, class Visitor>
     void visit(const Numbers& numbers, Visitor&& visitor) const;
