@@ -9,6 +9,7 @@ namespace {
 
 std::atomic<long> countdown{0};  // to the failure; 0 or less: none to come
 std::atomic<unsigned long> asked{0};
+std::atomic<unsigned long> released{0};
 
 void* allocate(std::size_t size, std::size_t alignment) {
     asked += size;
@@ -23,6 +24,11 @@ void* allocate(std::size_t size) {
     return allocate(size, alignof(std::max_align_t));
 }
 
+void release(void* memory) noexcept {
+    if (memory != nullptr) ++released;
+    std::free(memory);
+}
+
 }  // namespace
 
 namespace failing {
@@ -31,6 +37,7 @@ Allocation::Allocation(long n) { countdown = n; }
 Allocation::~Allocation() { countdown = 0; }
 bool Allocation::hasFailed() const { return countdown <= 0; }
 unsigned long bytesAsked() { return asked; }
+unsigned long blocksReleased() { return released; }
 
 }  // namespace failing
 
@@ -47,21 +54,21 @@ void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
     }
 }
 void* operator new[](std::size_t size) { return allocate(size); }
-void operator delete(void* memory) noexcept { std::free(memory); }
+void operator delete(void* memory) noexcept { release(memory); }
 void operator delete(void* memory, const std::nothrow_t& /*tag*/) noexcept {
-    std::free(memory);
+    release(memory);
 }
 void operator delete(void* memory, std::size_t /*size*/) noexcept {
-    std::free(memory);
+    release(memory);
 }
 void operator delete(void* memory, std::align_val_t /*alignment*/) noexcept {
-    std::free(memory);
+    release(memory);
 }
 void operator delete(void* memory, std::size_t /*size*/,
                      std::align_val_t /*alignment*/) noexcept {
-    std::free(memory);
+    release(memory);
 }
-void operator delete[](void* memory) noexcept { std::free(memory); }
+void operator delete[](void* memory) noexcept { release(memory); }
 void operator delete[](void* memory, std::size_t /*size*/) noexcept {
-    std::free(memory);
+    release(memory);
 }

@@ -20,4 +20,7 @@ public:
 // Bytes asked for since the program began.
 unsigned long bytesAsked();
 
+// Blocks released since the program began.
+unsigned long blocksReleased();
+
 }  // namespace failing

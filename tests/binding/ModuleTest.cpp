@@ -1,3 +1,4 @@
+#include <dlfcn.h>
 #include <elf.h>
 #include <gtest/gtest.h>
 
@@ -63,4 +64,18 @@ TEST(Exports, AreTheTwoEntryPointsAndNothingElse) {
 TEST(Exports, HostInterfaceIsWantedFromTheProcess) {
     EXPECT_EQ(
         DynamicSymbols(QZTESSEL_PLUGIN).undefined.count("VXHostInterface"), 1U);
+}
+
+// The plug-in in a process that is no host: this one.
+
+TEST(NoHost, LoaderRefusesThePluginAtOnce) {
+    for (const int mode : {RTLD_NOW, RTLD_LAZY, RTLD_NOW | RTLD_GLOBAL}) {
+        void* const handle = dlopen(QZTESSEL_PLUGIN, mode);
+        EXPECT_EQ(handle, nullptr);
+        const char* const error = dlerror();
+        const std::string reason = error == nullptr ? "" : error;
+        EXPECT_NE(reason.find("undefined symbol: VXHostInterface"),
+                  std::string::npos)
+            << reason;
+    }
 }

@@ -1,87 +1,10 @@
-#include <gtest/gtest.h>
-
 #include <limits>
-#include <new>
-#include <stdexcept>
 
-#include "hosts/embedded/HostException.hpp"
+#include "hosts/embedded/Operations.hpp"
 #include "tests/host/HostFixture.hpp"
 
-// Values, names, packages, and what a plug-in can do with arrays.
+// What a plug-in can do with arrays, names, packages and errors.
 namespace tessel::embedded {
-
-TEST(ValueTest, DefaultIsZeroByZeroDouble) {
-    const Value value;
-    EXPECT_EQ(value.valueClass(), ValueClass::Double);
-    EXPECT_EQ(value.dimensions(), (Dimensions{0, 0}));
-    EXPECT_EQ(value.numel(), 0U);
-}
-
-TEST(ValueTest, NumberOfElementsIsProductOfDimensions) {
-    EXPECT_EQ(Value::cell({2, 3, 4}).numel(), 24U);
-    EXPECT_EQ(Value::cell({7}).numel(), 7U);
-    EXPECT_EQ(Value::cell({5, 0, 3}).numel(), 0U);
-    EXPECT_EQ(Value::cell({5, 0, 3}).dimensions(), (Dimensions{5, 0, 3}));
-}
-
-TEST(ValueTest, ArrayWithoutDimensionsHasOneElement) {
-    EXPECT_EQ(Value::cell({}).numel(), 1U);
-    EXPECT_EQ(Value::doubles({}, {3}).numel(), 1U);
-}
-
-TEST(ValueTest, ElementsMustFitDimensions) {
-    EXPECT_THROW(Value::chars({2, 2}, u"abc"), std::invalid_argument);
-    EXPECT_THROW(Value::doubles({2, 1}, {1}), std::invalid_argument);
-    EXPECT_THROW(Value::complexDoubles({1, 1}, {1}), std::invalid_argument);
-    EXPECT_THROW(Value::complexDoubles({2, 1}, {1, 2}), std::invalid_argument);
-    EXPECT_THROW(Value::bytes({0, 0}, {1}), std::invalid_argument);
-    EXPECT_THROW(Value::objects({1, 1}, {nullptr}), std::invalid_argument);
-}
-
-TEST(ValueTest, DimensionsThatOverflowAreRefused) {
-    const std::size_t huge = std::numeric_limits<std::size_t>::max() / 2;
-    EXPECT_THROW(Value::cell({huge, 3}), std::length_error);
-    EXPECT_THROW(Value::structure({3, huge}), std::length_error);
-    EXPECT_EQ(elementCount({huge, 0}), 0U);
-}
-
-TEST(ValueTest, CopiesAreDeep) {
-    Value cell = Value::cell({1, 2});
-    cell.setElement(0, Value::text(u"a"));
-    Value copy = cell;
-    copy.setElement(0, Value::text(u"b"));
-    EXPECT_EQ(cell.element(0), Value::text(u"a"));
-    EXPECT_NE(cell, copy);
-}
-
-TEST(ValueTest, MovedFromValueHasNoElements) {
-    Value source = Value::chars({2, 1, 2}, u"abcd");
-    const Value target = std::move(source);
-    EXPECT_EQ(source.numel(), 0U);  // NOLINT(bugprone-use-after-move)
-    EXPECT_EQ(target.charData(), u"abcd");
-    EXPECT_EQ(target.dimensions(), (Dimensions{2, 1, 2}));
-}
-
-TEST(ValueTest, EqualityComparesClassShapeAndElements) {
-    EXPECT_EQ(Value::logical(true), Value::logicals({1, 1}, {1}));
-    EXPECT_NE(Value::logical(true), Value::bytes({1, 1}, {1}));
-    EXPECT_NE(Value::chars({1, 2}, u"ab"), Value::chars({2, 1}, u"ab"));
-    EXPECT_NE(Value::doubles({1, 2}, {1, 2}),
-              Value::complexDoubles({1, 1}, {1, 2}));
-}
-
-TEST(ValueTest, StructFieldsAreSetElementByElement) {
-    Value value = Value::structure({1, 2});
-    value.setField("b", Value::scalar(1), 1);
-    value.setField("a", Value::scalar(2));
-    EXPECT_EQ(value.fieldNames(), (std::vector<std::string>{"b", "a"}));
-    EXPECT_EQ(value.field("b", 0), Value());
-    EXPECT_EQ(value.field("b", 1), Value::scalar(1));
-    EXPECT_EQ(value.field("a"), Value::scalar(2));
-    EXPECT_FALSE(value.hasField("c"));
-    EXPECT_THROW(value.field("c"), std::out_of_range);
-    EXPECT_THROW(value.field("a", 2), std::out_of_range);
-}
 
 namespace {
 
@@ -174,6 +97,35 @@ TEST_F(OperationsTest, PlacesOutsideAreHostErrors) {
               }),
               "VELOX:embedded:indexOutside");
     operations_.hostReleaseArray(made);
+}
+
+TEST_F(OperationsTest, CellThatIsHeldElsewhereIsNotChanged) {
+    Value cell = Value::cell({1, 1});
+    HostArray* const own = cell.ownArray();
+    const Value witness = cell;
+    EXPECT_EQ(errorKey([&] {
+                  operations_.hostSetCell(
+                      own, 0, operations_.hostCreateLogicalScalar(true));
+              }),
+              "VELOX:embedded:arrayShared");
+    EXPECT_EQ(witness.element(0), Value());
+}
+
+TEST_F(OperationsTest, ConvertedArrayMayBeChangedAndLeavesTheSavedValue) {
+    const Value cell = Value::cell({1, 1});
+    const SavedValue saved(cell);
+    HostArray* const converted = operations_.hostConvert(&saved, "any");
+    operations_.hostSetCell(converted, 0,
+                            operations_.hostCreateLogicalScalar(true));
+    EXPECT_EQ(Value::adopt(converted).element(0), Value::logical(true));
+    EXPECT_EQ(cell.element(0), Value());
+}
+
+TEST_F(OperationsTest, NumericDataIsWrittenThrough) {
+    HostArray* const made =
+        operations_.hostCreateNumeric(2, 1, HostNumericClass::Uint8);
+    static_cast<std::uint8_t*>(operations_.hostNumericData(made))[1] = 9;
+    EXPECT_EQ(Value::adopt(made), Value::byteColumn({0, 9}));
 }
 
 TEST_F(OperationsTest, FieldOfStructWithoutElementsIsHostError) {

@@ -1,4 +1,4 @@
-#include "tests/host/SmallHost.hpp"
+#include "tests/host/UncheckedHost.hpp"
 
 #include <numeric>
 #include <stdexcept>
@@ -13,7 +13,7 @@ const tessel::HostGate* VXHostInterface(std::uint32_t /*wantedVersion*/) {
     return &processGate;
 }
 
-namespace small {
+namespace unchecked {
 
 using tessel::HostArray;
 using tessel::HostNumericClass;
@@ -329,4 +329,4 @@ void Host::hostSignatureMarkOutputs(tessel::HostSignature* signature) {
     static_cast<Signature*>(signature)->calls.emplace_back("outputs");
 }
 
-}  // namespace small
+}  // namespace unchecked

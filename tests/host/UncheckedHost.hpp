@@ -10,10 +10,10 @@
 
 #include "binding/HostInterface.hpp"
 
-// A second host, made to be unlike the embedded one: it checks nothing, runs in
-// the alternative mode, answers null when it has no memory, may return from
-// raising errors, and keeps count of everything it gives away.
-namespace small {
+// A second host, unlike the embedded one: it checks nothing, runs in the
+// alternative mode, answers null when it has no memory, may return from raising
+// errors, and counts everything that it hands out.
+namespace unchecked {
 
 // Counts those of a kind that are alive.
 class Counted {
@@ -210,4 +210,4 @@ private:
     std::map<std::string, Name> names_;
 };
 
-}  // namespace small
+}  // namespace unchecked

@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "binding/Errors.hpp"
-#include "tests/host/SmallHost.hpp"
+#include "tests/host/UncheckedHost.hpp"
 
 // The binding's error values and the one step that raises them.
 namespace {
@@ -58,16 +58,16 @@ TEST(BindingErrors, RethrowIsOfTheErrorsOwnType) {
 }
 
 TEST(BindingErrors, RaisingHandsIdentifierAndArgumentsToTheHost) {
-    small::Host host;
+    unchecked::Host host;
     EXPECT_THROW(
         tessel::binding::raiseHostError(errors::folderElementEmpty("3")),
-        small::Raised);
+        unchecked::Raised);
     EXPECT_EQ(host.errors,
               (std::vector<std::string>{component + "folderElementEmpty(3)"}));
 }
 
 TEST(BindingErrors, RaisingThrowsTheErrorItselfIfTheHostReturns) {
-    small::Host host;
+    unchecked::Host host;
     host.errorEntryReturns = true;
     EXPECT_THROW(
         tessel::binding::raiseHostError(errors::folderElementEmpty("3")),
@@ -78,22 +78,22 @@ TEST(BindingErrors, RaisingThrowsTheErrorItselfIfTheHostReturns) {
 }
 
 TEST(BindingErrors, ElementCheckPassesWhatHasElements) {
-    const small::Host host;
+    const unchecked::Host host;
     tessel::binding::checkNotEmpty(1, Element::Folder, {1});
     tessel::binding::checkNotEmpty(5, Element::File, {9, 9});
     EXPECT_TRUE(host.errors.empty());
 }
 
 TEST(BindingErrors, ElementCheckBuildsPositionAndChoosesError) {
-    small::Host host;
+    unchecked::Host host;
     EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::Folder, {1}),
-                 small::Raised);
+                 unchecked::Raised);
     EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::File, {12, 3}),
-                 small::Raised);
+                 unchecked::Raised);
     EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::Folder, {2, 4}),
-                 small::Raised);
+                 unchecked::Raised);
     EXPECT_THROW(tessel::binding::checkNotEmpty(0, Element::File, {1234567}),
-                 small::Raised);
+                 unchecked::Raised);
     EXPECT_EQ(host.errors, (std::vector<std::string>{
                                component + "folderElementEmpty(1)",
                                component + "fileElementEmpty(12, 3)",
