@@ -55,7 +55,7 @@ void BlockWriter::putOperation(std::size_t place) {
         const std::uint32_t distance = seen_ - list_.nameRef(place).folder;
         const unsigned symbol = jumpSymbol(distance);
         codes_.operations[jumpCode].put(bits_, symbol);
-        bits_.put(distance - (1U << symbol), symbol);
+        bits_.put(distance - std::bit_floor(distance), symbol);
     } else if (code.operation == operationLongPrefix) {
         putLongPrefix(code.prefix);
     }
