@@ -1,0 +1,15 @@
+#pragma once
+
+#include <string>
+
+#include "archive/PathArchive.hpp"
+#include "hosts/console/Interrupts.hpp"
+
+namespace tessel::console {
+
+// Opens an archive: a regular file is mapped; standard input ("-") and pipes
+// are read into memory. Throws ConsoleException, which names the file, if it
+// is damaged or too new, and std::system_error.
+PathArchive openArchive(const std::string& file, const Interrupts& interrupts);
+
+}  // namespace tessel::console

@@ -1,0 +1,54 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "hosts/console/CommandLine.hpp"
+#include "hosts/console/ExitStatus.hpp"
+#include "hosts/console/ProgressBar.hpp"
+#include "hosts/console/Session.hpp"
+
+namespace tessel::console {
+
+// A command of `tessel`, such as `tessel list`. Made, told its command line
+// and run once.
+class Command {
+public:
+    // Parts of every command's help.
+    struct Description {
+        std::string_view name;
+        std::string_view summary;
+        std::string_view examples;
+    };
+
+    Command(const Command&) = delete;
+    Command& operator=(const Command&) = delete;
+    virtual ~Command() = default;
+
+    CommandLine& line() noexcept { return line_; }
+    const CommandLine& line() const noexcept { return line_; }
+
+    // Does the work. Output may be left in the session's buffers, whatever
+    // ends it. Throws what Failure describes.
+    virtual ExitStatus run(Session& session) = 0;
+
+protected:
+    explicit Command(const Description& description);
+
+    // Shown unless -q is given. A command that writes much to a terminal needs
+    // no bar between its lines.
+    ProgressBar::Visibility barVisibility(const Session& session) const;
+    bool isQuiet() const noexcept { return quiet_; }
+
+    // -j N, for commands that use several cores.
+    void addThreads();
+    unsigned threads() const noexcept;
+
+private:
+    CommandLine line_;
+    bool quiet_ = false;
+    std::optional<std::uint64_t> threads_;
+};
+
+}  // namespace tessel::console

@@ -1,0 +1,151 @@
+#include "hosts/console/CommandLine.hpp"
+
+#include <fmt/format.h>
+
+#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <cctype>
+#include <utility>
+
+#include "hosts/console/ConsoleException.hpp"
+
+namespace tessel::console {
+
+namespace {
+
+// Marks words that the parser would not take as they are: "-5" would be a
+// flag, "[ab]" a list of values, "" nothing. No user types this character.
+constexpr char protection = '\x1f';
+
+bool isDigit(char c) noexcept { return c >= '0' && c <= '9'; }
+
+bool isNegativeNumber(std::string_view word) noexcept {
+    return word.size() > 1 && word[0] == '-' && isDigit(word[1]) &&
+           word != "-0";
+}
+
+void unprotect(std::string& word) {
+    if (word.starts_with(protection)) word.erase(0, 1);
+}
+
+CLI::Option* described(CLI::Option* option, const std::string& kind) {
+    return option->type_name(kind);
+}
+
+// A parser's sentence as part of a line.
+std::string asPart(std::string text) {
+    std::erase(text, protection);
+    std::replace(text.begin(), text.end(), '\n', ' ');
+    while (!text.empty() && (text.back() == ' ' || text.back() == '.'))
+        text.pop_back();
+    if (text.size() > 1 && text[1] >= 'a' && text[1] <= 'z' && text[0] >= 'A' &&
+        text[0] <= 'Z')
+        text[0] = static_cast<char>(text[0] - 'A' + 'a');
+    return text;
+}
+
+}  // namespace
+
+CommandLine::CommandLine(std::string command, const std::string& summary,
+                         const std::string& examples)
+    : command_(std::move(command)),
+      app_(std::make_unique<CLI::App>(summary, command_)) {
+    app_->set_help_flag("--help", "Explain the command and exit");
+    app_->footer("Examples:\n" + examples);
+    app_->get_formatter()->column_width(26);
+}
+
+CommandLine::~CommandLine() = default;
+
+void CommandLine::flag(const std::string& names, bool& target,
+                       const std::string& help) {
+    app_->add_flag(names, target, help);
+}
+
+void CommandLine::value(const std::string& names, const std::string& kind,
+                        std::optional<std::string>& target,
+                        const std::string& help) {
+    described(app_->add_option_function<std::string>(
+                  names,
+                  [&target](std::string word) {
+                      unprotect(word);
+                      target = std::move(word);
+                  },
+                  help),
+              kind);
+}
+
+void CommandLine::value(const std::string& names, const std::string& kind,
+                        std::string& target, Need need,
+                        const std::string& help) {
+    words_.push_back(&target);
+    described(app_->add_option(names, target, help), kind)
+        ->required(need == Need::Required);
+}
+
+void CommandLine::number(const std::string& names, const std::string& kind,
+                         std::optional<std::uint64_t>& target,
+                         const std::string& help) {
+    described(app_->add_option(names, target, help), kind);
+}
+
+void CommandLine::choice(const std::string& names,
+                         const std::vector<std::string>& choices,
+                         std::string& target, const std::string& help) {
+    described(app_->add_option(names, target, help)
+                  ->check(CLI::IsMember(choices).description("")),
+              fmt::format("{}", fmt::join(choices, "|")));
+}
+
+void CommandLine::argument(const std::string& name, std::string& target,
+                           Need need, const std::string& help) {
+    words_.push_back(&target);
+    described(app_->add_option(name, target, help), "")
+        ->required(need == Need::Required);
+}
+
+void CommandLine::arguments(const std::string& name,
+                            std::vector<std::string>& target, Need need,
+                            const std::string& help) {
+    wordLists_.push_back(&target);
+    described(app_->add_option(name, target, help), "")
+        ->required(need == Need::Required);
+}
+
+CommandLine::Request CommandLine::parse(std::span<const std::string> words) {
+    // The parser takes the words from the back.
+    std::vector<std::string> reversed;
+    for (auto word = words.rbegin(); word != words.rend(); ++word)
+        reversed.push_back(protect(*word));
+    try {
+        app_->parse(std::move(reversed));
+    } catch (const CLI::CallForHelp&) {
+        return Request::Help;
+    } catch (const CLI::ParseError& error) {
+        fail(asPart(error.what()));
+    }
+    restoreWords();
+    return Request::Run;
+}
+
+std::string CommandLine::help() const { return app_->help(); }
+
+void CommandLine::fail(const std::string& problem) const {
+    throw ConsoleException(ExitStatus::Usage, fmt::format("{}; see `{} --help`",
+                                                          problem, command_));
+}
+
+std::string CommandLine::protect(const std::string& word) const {
+    const bool isNumber = negativeNumbers_ == NegativeNumbers::AreArguments &&
+                          isNegativeNumber(word);
+    const bool isProtected = word.empty() || word.front() == '[' || isNumber;
+    return isProtected ? protection + word : word;
+}
+
+void CommandLine::restoreWords() {
+    for (std::string* word : words_) unprotect(*word);
+    for (auto* list : wordLists_)
+        for (std::string& word : *list) unprotect(word);
+}
+
+}  // namespace tessel::console

@@ -1,0 +1,61 @@
+#include "hosts/console/Failure.hpp"
+
+#include <fmt/format.h>
+
+#include <new>
+#include <stdexcept>
+#include <system_error>
+
+#include "archive/ArchiveExceptions.hpp"
+#include "hosts/console/ConsoleException.hpp"
+
+namespace tessel::console {
+
+namespace {
+
+// A sentence as part of a line: without its full stop.
+std::string asPart(std::string sentence) {
+    while (!sentence.empty() &&
+           (sentence.back() == '.' || sentence.back() == '\n'))
+        sentence.pop_back();
+    for (char& c : sentence)
+        if (c == '\n') c = ' ';
+    return sentence;
+}
+
+}  // namespace
+
+Failure describeCurrentException() {
+    try {
+        throw;
+    } catch (const ConsoleException& failure) {
+        return {failure.status(), asPart(failure.what())};
+    } catch (const std::system_error& failure) {
+        return {ExitStatus::System, asPart(failure.what())};
+    } catch (const std::bad_alloc&) {
+        return {ExitStatus::System,
+                "memory is used up; close other programs or raise the limit"};
+    } catch (const std::exception& failure) {
+        return {ExitStatus::System, asPart(failure.what())};
+    }
+}
+
+void rethrowNaming(const std::string& file) {
+    try {
+        throw;
+    } catch (const DamagedArchiveException& damage) {
+        throw ConsoleException(
+            ExitStatus::Damaged,
+            fmt::format("{}: {}; `tessel verify` lists the damage, `tessel "
+                        "list --salvage` reads what is left",
+                        file, asPart(damage.what())));
+    } catch (const UnsupportedArchiveVersionException& newer) {
+        throw ConsoleException(
+            ExitStatus::BadInput,
+            fmt::format("{}: version {} of the format is newer than this "
+                        "program; install a newer tessel",
+                        file, newer.version()));
+    }
+}
+
+}  // namespace tessel::console

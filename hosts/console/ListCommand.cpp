@@ -1,0 +1,111 @@
+#include "hosts/console/ListCommand.hpp"
+
+#include <fmt/format.h>
+
+#include "hosts/console/ArchiveFile.hpp"
+#include "hosts/console/ConsoleException.hpp"
+#include "hosts/console/Failure.hpp"
+#include "hosts/console/InputFile.hpp"
+
+namespace tessel::console {
+
+namespace {
+
+constexpr Command::Description description = {
+    "list", "Write all paths of an archive, in the order of their numbers",
+    "  tessel list files.tessel | less\n"
+    "  tessel list files.tessel --folder usr/share/doc\n"
+    "  tessel list files.tessel -0 | xargs -0 ls -ld --\n"
+    "  tessel list damaged.tessel --salvage > rescued.txt"};
+
+std::string textOf(const NumberRange& range) {
+    if (range.end - range.begin == 1) return std::to_string(range.begin);
+    return fmt::format("{}-{}", range.begin, range.end - 1);
+}
+
+// "12 lost: 0-7, 100, 200-202", for standard error.
+std::string lossText(const SalvageReport& report) {
+    std::uint64_t lost = 0;
+    std::string ranges;
+    for (const NumberRange& range : report.lost) {
+        lost += range.end - range.begin;
+        ranges += (ranges.empty() ? ": " : ", ") + textOf(range);
+    }
+    return fmt::format("{} paths kept, {} lost{}{}", report.kept, lost, ranges,
+                       report.complete
+                           ? ""
+                           : "; more may be lost after the last number, since "
+                             "the archive's size is not known");
+}
+
+}  // namespace
+
+ListCommand::ListCommand() : Command(description) {
+    line().argument("FILE", file_, CommandLine::Need::Required,
+                    "The archive, or - for standard input");
+    line().flag("-0", nul_, "End each path with NUL instead of newline");
+    line().flag("--numbers", numbers_,
+                "Write each path's number and a tab before it");
+    line().value("--folder", "F", folder_, "Only paths below the folder F");
+    line().flag("--salvage", salvage_,
+                "Read a damaged archive: write every path that is intact, and "
+                "tell on standard error which are lost");
+}
+
+ExitStatus ListCommand::run(Session& session) {
+    PathOutput paths(session.output, nul_ ? Separator::Nul : Separator::Newline,
+                     numbers_ ? Numbering::Numbers : Numbering::None);
+    return salvage_ ? salvage(session, paths) : list(session, paths);
+}
+
+ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
+    const PathArchive archive = openArchive(file_, session.interrupts);
+    ProgressBar bar(barVisibility(session));
+    return inFile(file_, [&] {
+        const auto ranges = archive.folder(folder_.value_or(""));
+        std::uint64_t total = 0;
+        for (const NumberRange& range : ranges)
+            total += range.end - range.begin;
+        bar.begin("listing", ProgressUnit::Paths, total);
+        std::uint64_t done = 0;
+        for (const NumberRange& range : ranges)
+            archive.forEach(range.begin, range.end,
+                            [&](std::uint64_t number, std::string_view path) {
+                                paths.write(number, path);
+                                if (++done % 4096 == 0) bar.update(done);
+                            });
+        return folder_ && total == 0 ? ExitStatus::NoMatch
+                                     : ExitStatus::Success;
+    });
+}
+
+ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {
+    const auto write = [&](std::uint64_t number, std::string_view path) {
+        if (isBelowFolder(path)) paths.write(number, path);
+    };
+    InputFile input(file_, session.interrupts);
+    const SalvageReport report = inFile(input.name(), [&] {
+        return input.isRegular() && file_ != "-"
+                   ? PathArchive::salvage(file_, write)
+                   : PathArchive::salvage(input.readAll(), write);
+    });
+    session.output.flush();
+    if (report.lost.empty() && report.complete && report.damages.empty()) {
+        session.errors.write(fmt::format(
+            "tessel: {}: nothing is lost, all {} paths are intact\n",
+            input.name(), report.kept));
+        return ExitStatus::Success;
+    }
+    throw ConsoleException(
+        ExitStatus::Damaged,
+        fmt::format("{}: {}", input.name(), lossText(report)));
+}
+
+bool ListCommand::isBelowFolder(std::string_view path) const noexcept {
+    if (!folder_ || folder_->empty()) return true;
+    if (!path.starts_with(*folder_)) return false;
+    return folder_->ends_with('/') ||
+           path.substr(folder_->size()).starts_with('/');
+}
+
+}  // namespace tessel::console

@@ -1,0 +1,30 @@
+#pragma once
+
+#include <optional>
+#include <string>
+
+#include "hosts/console/Command.hpp"
+#include "hosts/console/PathOutput.hpp"
+
+namespace tessel::console {
+
+// `tessel list`: writes all paths, or those below a folder, or what is left of
+// a damaged archive.
+class ListCommand : public Command {
+public:
+    ListCommand();
+    ExitStatus run(Session& session) override;
+
+private:
+    ExitStatus list(Session& session, PathOutput& paths) const;
+    ExitStatus salvage(Session& session, PathOutput& paths) const;
+    bool isBelowFolder(std::string_view path) const noexcept;
+
+    std::string file_;
+    bool nul_ = false;
+    bool numbers_ = false;
+    bool salvage_ = false;
+    std::optional<std::string> folder_;
+};
+
+}  // namespace tessel::console

@@ -1,0 +1,29 @@
+#include <unistd.h>
+
+#include <exception>
+#include <string>
+#include <vector>
+
+#include "hosts/console/Console.hpp"
+#include "hosts/console/ConsoleException.hpp"
+#include "hosts/console/ExitStatus.hpp"
+
+int main(int wordCount, char** words) {
+    namespace console = tessel::console;
+    try {
+        console::Interrupts interrupts;
+        console::OutputBuffer output(STDOUT_FILENO, "standard output");
+        console::OutputBuffer errors(STDERR_FILENO, "standard error");
+        console::Session session{interrupts, output, errors};
+        try {
+            return console::runConsole(
+                std::vector<std::string>(words + 1, words + wordCount),
+                session);
+        } catch (const console::ClosedPipeException&) {
+            interrupts.endByClosedPipe();
+        }
+    } catch (const std::exception&) {
+        // Not even the error could be told.
+        return static_cast<int>(console::ExitStatus::System);
+    }
+}
