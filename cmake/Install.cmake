@@ -87,13 +87,6 @@ qztesselAddPkgConfig(
 qztesselAddPkgConfig(qztessel-archive "Finished lists, in files" qztessel
                      -lqztessel_archive)
 
-# ---- The command ----
-
-if(TARGET qztessel_command)
-  install(TARGETS qztessel_command RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
-                                           COMPONENT command)
-endif()
-
 # ---- Documents ----
 
 install(

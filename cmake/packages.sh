@@ -1,11 +1,14 @@
 # Sourced by ./demo and ./check, not run.
 
 # What it takes to build and run; what the checks take beyond that.
-buildPackages=(cmake g++ libxxhash-dev ninja-build zlib1g-dev)
+buildPackages=(
+    cmake g++ libcli11-dev libfmt-dev libre2-dev libxxhash-dev ninja-build
+    nlohmann-json3-dev pkg-config scdoc zlib1g-dev
+)
 checkPackages=(
-    clang clang-format clang-tidy dpkg-dev file libclang-rt-dev libgtest-dev
-    liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev lintian llvm
-    pkg-config python3-xxhash valgrind
+    clang clang-format clang-tidy dpkg-dev file fish libclang-rt-dev
+    libgtest-dev liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev
+    lintian llvm python3-pytest python3-xxhash tmux valgrind zsh
 )
 
 # Installs those of the given Debian packages that are missing. Silent when

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <string>
 
 #include "archive/PathArchive.hpp"
@@ -11,5 +12,10 @@ namespace tessel::console {
 // are read into memory. Throws ConsoleException, which names the file, if it
 // is damaged or too new, and std::system_error.
 PathArchive openArchive(const std::string& file, const Interrupts& interrupts);
+
+// Bytes of the archive's list as a text, with one separator per path.
+inline std::uint64_t listBytes(const ArchiveInfo& info) noexcept {
+    return info.textBytes + info.paths;
+}
 
 }  // namespace tessel::console

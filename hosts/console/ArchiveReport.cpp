@@ -7,6 +7,7 @@
 #include <unordered_set>
 #include <utility>
 
+#include "hosts/console/ArchiveFile.hpp"
 #include "hosts/console/JsonText.hpp"
 #include "hosts/console/OrderedPaths.hpp"
 #include "hosts/console/Quantities.hpp"
@@ -45,6 +46,7 @@ ArchiveReport reportOn(const PathArchive& archive, std::string file,
     ArchiveReport report;
     report.file = std::move(file);
     report.info = archive.info();
+    report.textBytes = listBytes(report.info);
     report.folders =
         report.info.segments > 1 ? countFolders(archive) : report.info.folders;
     OrderedPaths paths(archive, bar);
@@ -70,12 +72,13 @@ std::string tableOf(const ArchiveReport& report) {
     line("paths", info.paths, "");
     line("folders", report.folders, "");
     line("repeats", report.repeats, "");
-    line("text", info.textBytes,
-         fmt::format(" B {:9.2f} B per path", report.perPath(info.textBytes)));
+    line(
+        "text", report.textBytes,
+        fmt::format(" B {:9.2f} B per path", report.perPath(report.textBytes)));
     line("file", info.fileBytes,
          fmt::format(" B {:9.2f} B per path {:6.2f} % of the text",
                      report.perPath(info.fileBytes),
-                     percent(info.fileBytes, info.textBytes)));
+                     percent(info.fileBytes, report.textBytes)));
     line("segments", info.segments, "");
     line("format version", info.formatVersion, "");
     line("shortest path", report.lengths.shortest(), " B");
@@ -101,7 +104,7 @@ std::string jsonOf(const ArchiveReport& report) {
                        {"folders", report.folders},
                        {"repeats", report.repeats},
                        {"segments", info.segments},
-                       {"textBytes", info.textBytes},
+                       {"textBytes", report.textBytes},
                        {"fileBytes", info.fileBytes},
                        {"bytesPerPath", report.perPath(info.fileBytes)},
                        {"shortestPath", report.lengths.shortest()},

@@ -13,8 +13,9 @@ namespace tessel::console {
 struct ArchiveReport {
     std::string file;
     ArchiveInfo info;
-    std::uint64_t folders = 0;  // different ones in the whole archive
-    std::uint64_t repeats = 0;  // paths that are the same as one before
+    std::uint64_t textBytes = 0;  // with one separator per path
+    std::uint64_t folders = 0;    // different ones in the whole archive
+    std::uint64_t repeats = 0;    // paths that are the same as one before
     LengthCounts lengths;
 
     // `bytes` per path; 0 if there is none.

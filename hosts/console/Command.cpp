@@ -15,10 +15,12 @@ Command::Command(const Description& description)
     line_.flag("-q", quiet_, "Show no progress, write only results and errors");
 }
 
-ProgressBar::Visibility Command::barVisibility(const Session& session) const {
-    return quiet_ || isTerminal(session.output.descriptor())
-               ? ProgressBar::Visibility::Hidden
-               : ProgressBar::Visibility::Shown;
+ProgressBar::Visibility Command::barVisibility(const Session& session,
+                                               Writes writes) const {
+    const bool disturbs =
+        writes == Writes::Paths && isTerminal(session.output.descriptor());
+    return quiet_ || disturbs ? ProgressBar::Visibility::Hidden
+                              : ProgressBar::Visibility::Shown;
 }
 
 void Command::addThreads() {

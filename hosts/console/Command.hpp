@@ -36,9 +36,13 @@ public:
 protected:
     explicit Command(const Description& description);
 
-    // Shown unless -q is given. A command that writes much to a terminal needs
-    // no bar between its lines.
-    ProgressBar::Visibility barVisibility(const Session& session) const;
+    // What a command writes to standard output while it works.
+    enum class Writes { Nothing, Paths };
+
+    // Shown unless -q is given, or paths go to a terminal: between them, a bar
+    // would only disturb.
+    ProgressBar::Visibility barVisibility(const Session& session,
+                                          Writes writes) const;
     bool isQuiet() const noexcept { return quiet_; }
 
     // -j N, for commands that use several cores.

@@ -4,7 +4,7 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
-#include <cctype>
+#include <sstream>
 #include <utility>
 
 #include "hosts/console/ConsoleException.hpp"
@@ -13,23 +13,51 @@ namespace tessel::console {
 
 namespace {
 
-// Marks words that the parser would not take as they are: "-5" would be a
-// flag, "[ab]" a list of values, "" nothing. No user types this character.
+// Marks words that the parser would not take as they are: "[ab]" would be a
+// list of values, "" nothing. No user types this character.
 constexpr char protection = '\x1f';
 
-bool isDigit(char c) noexcept { return c >= '0' && c <= '9'; }
+std::string protect(const std::string& word) {
+    return word.empty() || word.front() == '[' ? protection + word : word;
+}
 
-bool isNegativeNumber(std::string_view word) noexcept {
-    return word.size() > 1 && word[0] == '-' && isDigit(word[1]) &&
-           word != "-0";
+// Empty if the word is a number, otherwise what is wrong with it. The parser
+// by itself takes "-1" for a very large number.
+std::string problemOfNumber(const std::string& word) {
+    const bool isNumber =
+        !word.empty() &&
+        word.find_first_not_of("0123456789") == std::string::npos;
+    return isNumber ? "" : fmt::format("'{}' is no number from 0 on", word);
 }
 
 void unprotect(std::string& word) {
     if (word.starts_with(protection)) word.erase(0, 1);
 }
 
+constexpr std::size_t helpColumn = 24;
+constexpr std::size_t helpWidth = 79 - helpColumn;
+
+// Breaks a text into lines that fit beside the names.
+std::string wrappedHelp(const std::string& help) {
+    std::istringstream words(help);
+    std::string text;
+    std::size_t used = 0;
+    for (std::string word; words >> word; used += word.size()) {
+        if (used > 0 && used + 1 + word.size() > helpWidth) {
+            text += '\n';
+            used = 0;
+        } else if (used > 0) {
+            text += ' ';
+            ++used;
+        }
+        text += word;
+    }
+    return text;
+}
+
 CLI::Option* described(CLI::Option* option, const std::string& kind) {
-    return option->type_name(kind);
+    return option->type_name(kind)->description(
+        wrappedHelp(option->get_description()));
 }
 
 // A parser's sentence as part of a line.
@@ -52,14 +80,14 @@ CommandLine::CommandLine(std::string command, const std::string& summary,
       app_(std::make_unique<CLI::App>(summary, command_)) {
     app_->set_help_flag("--help", "Explain the command and exit");
     app_->footer("Examples:\n" + examples);
-    app_->get_formatter()->column_width(26);
+    app_->get_formatter()->column_width(helpColumn);
 }
 
 CommandLine::~CommandLine() = default;
 
 void CommandLine::flag(const std::string& names, bool& target,
                        const std::string& help) {
-    app_->add_flag(names, target, help);
+    app_->add_flag(names, target, wrappedHelp(help));
 }
 
 void CommandLine::value(const std::string& names, const std::string& kind,
@@ -86,7 +114,8 @@ void CommandLine::value(const std::string& names, const std::string& kind,
 void CommandLine::number(const std::string& names, const std::string& kind,
                          std::optional<std::uint64_t>& target,
                          const std::string& help) {
-    described(app_->add_option(names, target, help), kind);
+    described(app_->add_option(names, target, help)->check(problemOfNumber),
+              kind);
 }
 
 void CommandLine::choice(const std::string& names,
@@ -133,13 +162,6 @@ std::string CommandLine::help() const { return app_->help(); }
 void CommandLine::fail(const std::string& problem) const {
     throw ConsoleException(ExitStatus::Usage, fmt::format("{}; see `{} --help`",
                                                           problem, command_));
-}
-
-std::string CommandLine::protect(const std::string& word) const {
-    const bool isNumber = negativeNumbers_ == NegativeNumbers::AreArguments &&
-                          isNegativeNumber(word);
-    const bool isProtected = word.empty() || word.front() == '[' || isNumber;
-    return isProtected ? protection + word : word;
 }
 
 void CommandLine::restoreWords() {

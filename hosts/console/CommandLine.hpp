@@ -18,6 +18,8 @@ namespace tessel::console {
 // CommandLine describes what follows a command's name, reads it and explains
 // it.
 //
+// A negative number, such as "-5", is an argument; "-0" may be a flag.
+//
 // Ownership: borrows the targets of flags, values and arguments, which must
 //   outlive it. They are set by parse.
 // Errors: parse throws ConsoleException with the status Usage.
@@ -28,9 +30,6 @@ public:
     // What a command line asks for.
     enum class Request { Run, Help };
 
-    // Whether "-5" is an argument and no flag. "-0" always is a flag.
-    enum class NegativeNumbers { AreFlags, AreArguments };
-
     // summary   one line
     // examples  whole lines, shown at the end of the help
     CommandLine(std::string command, const std::string& summary,
@@ -38,10 +37,6 @@ public:
     CommandLine(const CommandLine&) = delete;
     CommandLine& operator=(const CommandLine&) = delete;
     ~CommandLine();
-
-    void takeNegativeNumbers() noexcept {
-        negativeNumbers_ = NegativeNumbers::AreArguments;
-    }
 
     // ---- Flags and values: names are such as "-o" or "-f,--force" ----
 
@@ -72,12 +67,10 @@ public:
     [[noreturn]] void fail(const std::string& problem) const;
 
 private:
-    std::string protect(const std::string& word) const;
     void restoreWords();
 
     std::string command_;
     std::unique_ptr<CLI::App> app_;
-    NegativeNumbers negativeNumbers_ = NegativeNumbers::AreFlags;
     std::vector<std::string*> words_;  // targets whose words were protected
     std::vector<std::vector<std::string>*> wordLists_;
 };

@@ -56,7 +56,7 @@ ExitStatus DiffCommand::run(Session& session) {
         line().fail("standard input cannot be both archives");
     const PathArchive first = openArchive(before_, session.interrupts);
     const PathArchive second = openArchive(after_, session.interrupts);
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(barVisibility(session, Writes::Paths));
     PathSet before(first, before_, bar);
     PathSet after(second, after_, bar);
     bar.begin("comparing", ProgressUnit::Paths, first.size() + second.size());

@@ -32,7 +32,7 @@ ExitStatus ExportCommand::run(Session& session) {
     checkOverwrite(store_, force_ ? Overwrite::Allowed : Overwrite::Refused);
     const PathArchive archive = openArchive(file_, session.interrupts);
     session.interrupts.tidyUpFirst();
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(barVisibility(session, Writes::Nothing));
     bar.begin("reading", ProgressUnit::Paths, archive.size());
     std::uint64_t done = 0;
     const auto counted = [&](std::string_view path) {

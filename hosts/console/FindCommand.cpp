@@ -51,7 +51,8 @@ ExitStatus FindCommand::run(Session& session) {
         patterns_, kind(),
         ignoreCase_ ? LetterCase::Ignored : LetterCase::Exact);
     const PathArchive archive = openArchive(file_, session.interrupts);
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(
+        barVisibility(session, count_ ? Writes::Nothing : Writes::Paths));
     bar.begin("searching", ProgressUnit::Steps, 0);
     const FindOptions options = this->options(bar);
     const std::uint64_t found = inFile(file_, [&] {

@@ -35,7 +35,6 @@ std::string outOfRange(const std::string& where, std::uint64_t size) {
 }  // namespace
 
 GetCommand::GetCommand() : Command(description) {
-    line().takeNegativeNumbers();
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().arguments("N", words_, CommandLine::Need::Optional,

@@ -31,7 +31,7 @@ ExitStatus InfoCommand::run(Session& session) {
     const PathArchive archive = openArchive(file_, session.interrupts);
     ArchiveReport report;
     {
-        ProgressBar bar(barVisibility(session));
+        ProgressBar bar(barVisibility(session, Writes::Nothing));
         report = inFile(file_, [&] { return reportOn(archive, file_, bar); });
     }
     if (plot_) replaceFile(*plot_, pictureOf(report), session);

@@ -60,7 +60,7 @@ ExitStatus ListCommand::run(Session& session) {
 
 ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
     const PathArchive archive = openArchive(file_, session.interrupts);
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(barVisibility(session, Writes::Paths));
     return inFile(file_, [&] {
         const auto ranges = archive.folder(folder_.value_or(""));
         std::uint64_t total = 0;

@@ -9,6 +9,7 @@
 
 #include "archive/ArchiveWriter.hpp"
 #include "archive/PathArchive.hpp"
+#include "hosts/console/ArchiveFile.hpp"
 #include "hosts/console/Failure.hpp"
 #include "hosts/console/OutputFile.hpp"
 #include "hosts/console/Terminal.hpp"
@@ -111,7 +112,7 @@ private:
     }
 
     void countOld() {
-        totals_.textBytes = PathArchive::open(file_).info().textBytes;
+        totals_.textBytes = listBytes(PathArchive::open(file_).info());
         oldPaths_ = writer_.size();
     }
 
@@ -148,7 +149,7 @@ ExitStatus PackCommand::run(Session& session) {
     const auto start = Clock::now();
     checkWords(session);
     session.interrupts.tidyUpFirst();
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(barVisibility(session, Writes::Nothing));
     ListInput input({nul_ ? Separator::Nul : Separator::Newline,
                      skipEmpty_ ? EmptyLines::Skipped : EmptyLines::Refused},
                     session, bar);

@@ -65,7 +65,7 @@ std::string knownTotalLine(const ProgressState& state, std::size_t columns) {
     const std::string tail =
         fmt::format(" {:3.0f} %{}{}", share * 100, rateText(state),
                     share < 1 ? timeLeftText(state) : "");
-    const std::size_t fixed = state.label.size() + tail.size() + 4;
+    const std::size_t fixed = state.label.size() + tail.size() + 3;
     if (columns < fixed + 5)
         return fmt::format("{}{}", state.label, tail).substr(0, columns);
     return fmt::format("{} {}{}", state.label,

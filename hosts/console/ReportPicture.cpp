@@ -47,7 +47,7 @@ void drawTitle(const ArchiveReport& report, SvgText& svg) {
     svg.text(margin, 54, 13, TextAnchor::Start,
              fmt::format("{} paths, {} of text in {}: {:.2f} bytes per path",
                          groupedText(info.paths),
-                         bytesText(static_cast<double>(info.textBytes)),
+                         bytesText(static_cast<double>(report.textBytes)),
                          bytesText(static_cast<double>(info.fileBytes)),
                          report.perPath(info.fileBytes)));
 }

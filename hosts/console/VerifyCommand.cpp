@@ -54,7 +54,7 @@ ExitStatus VerifyCommand::run(Session& session) {
 
 void VerifyCommand::verify(Session& session, const std::string& file) {
     const PathArchive archive = openArchive(file, session.interrupts);
-    ProgressBar bar(barVisibility(session));
+    ProgressBar bar(barVisibility(session, Writes::Nothing));
     bar.begin("verifying", ProgressUnit::Steps, 0);
     ScanOptions options;
     options.threads = threads();
