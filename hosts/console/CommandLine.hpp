@@ -8,7 +8,7 @@
 #include <string_view>
 #include <vector>
 
-namespace CLI {
+namespace CLI {  // NOLINT(readability-identifier-naming)
 class App;
 class Option;
 }  // namespace CLI
