@@ -22,8 +22,15 @@ qztesselAddCheck(
   consumer consumer.sh ${CMAKE_COMMAND} ${CMAKE_CXX_COMPILER}
   ${PROJECT_BINARY_DIR} ${PROJECT_BINARY_DIR}/consumer)
 
-qztesselAddCheck(packages packages.sh ${CMAKE_CPACK_COMMAND}
+qztesselAddCheck(packages packages.sh ${CMAKE_COMMAND}
                  ${PROJECT_BINARY_DIR} ${PROJECT_BINARY_DIR}/packages)
+
+file(
+  GLOB pages CONFIGURE_DEPENDS
+  RELATIVE ${PROJECT_SOURCE_DIR}
+  *.md bench/*.md docs/*.md)
+qztesselAddCheck(documents documents.py --run
+                 $<TARGET_FILE_DIR:qztessel_console> ${pages})
 
 # One test per file, so that ctest -j spreads the slowest check of all.
 file(

@@ -1,12 +1,12 @@
 #!/bin/bash
-# Usage: packages.sh CPACK BUILD_FOLDER WORK_FOLDER
+# Usage: packages.sh CMAKE BUILD_FOLDER WORK_FOLDER
 #
-# Makes the Debian packages from a finished build and looks at them: lintian
-# has no error, every library that a program needs is of a package that it
+# Makes the Debian packages from a finished build and looks at them: all that
+# cmake --install copies is in one of them, lintian has no error, every library that a program needs is of a package that it
 # depends on, the command runs from where the packages put it, and, as root,
 # dpkg installs them into an empty root and purges them without a trace.
 set -euo pipefail
-cpack=$1 build=$2 work=$(realpath -m "$3")
+cmake=$1 build=$2 work=$(realpath -m "$3")
 root=$work/root
 rm -rf "$work"
 mkdir -p "$root"
@@ -16,7 +16,7 @@ fail() {
     exit 1
 }
 
-"$cpack" -G DEB --config "$build/CPackConfig.cmake" -B "$work" \
+"${cmake%cmake}cpack" -G DEB --config "$build/CPackConfig.cmake" -B "$work" \
     >"$work/cpack.log" 2>&1 || {
     cat "$work/cpack.log"
     fail "cpack failed"
@@ -28,6 +28,11 @@ names=$(for package in "${packages[@]}"; do
 done | sort | xargs)
 [[ $names == "libqztessel-dev libqztessel1 tessel" ]] ||
     fail "these were made: $names"
+
+"$cmake" --install "$build" --prefix "$work/all/usr" >/dev/null
+missing=$(comm -23 <(cd "$work/all" && find usr | sort) \
+    <(cd "$root" && find usr | sort))
+[[ ! $missing ]] || fail "these are installed and in no package: $missing"
 
 lintian --allow-root --fail-on error --tag-display-limit 0 "${packages[@]}" ||
     fail "lintian finds errors"
@@ -58,15 +63,18 @@ done
 # ---- The command, where it was put ----
 
 command=$root/usr/bin/tessel
-if [[ -x $command ]]; then
-    version=$(dpkg-deb -f "${packages[0]}" Version)
-    [[ $("$command" --version) == *"$version"* ]] ||
-        fail "tessel --version does not say $version"
-    find "$root/usr" -not -type d | sort >"$work/list"
-    "$command" pack -q "$work/list" -o "$work/list.tessel" >/dev/null
-    "$command" list "$work/list.tessel" | cmp - "$work/list" ||
-        fail "the list that tessel packed comes out changed"
-fi
+version=$(dpkg-deb -f "${packages[0]}" Version)
+[[ $("$command" --version) == "tessel $version" ]] ||
+    fail "tessel --version does not say $version"
+find "$root/usr" -not -type d | sort >"$work/list"
+"$command" pack -q "$work/list" -o "$work/list.tessel"
+"$command" list "$work/list.tessel" | cmp - "$work/list" ||
+    fail "the list that tessel packed comes out changed"
+for file in man/man1/tessel{,-pack}.1.gz bash-completion/completions/tessel \
+    zsh/vendor-completions/_tessel fish/vendor_completions.d/tessel.fish \
+    qztessel/messages/VELOX/datastoreio/huffmanpaths.messages; do
+    [[ -f $root/usr/share/$file ]] || fail "no package has $file"
+done
 
 # ---- In and out again ----
 
