@@ -18,20 +18,20 @@
 set -euo pipefail
 cd "$1"
 
-# Prints what the given file may include, as a regular expression.
-allowedFor() {
+# Sets `allowed` to what the given file may include, as a regular expression.
+findAllowed() {
     case $1 in
-    packing/*) echo 'packing/' ;;
-    pathtree/*) echo '(packing|pathtree)/' ;;
-    coder/*) echo '(packing|pathtree|coder)/' ;;
-    paths/*) echo '(packing|pathtree|coder|paths)/' ;;
-    archive/*) echo '(packing|archive)/' ;;
-    binding/*) echo '(packing|pathtree|coder|binding)/' ;;
-    qztessel/*) echo '(paths|archive|qztessel)/' ;;
+    packing/*) allowed='packing/' ;;
+    pathtree/*) allowed='(packing|pathtree)/' ;;
+    coder/*) allowed='(packing|pathtree|coder)/' ;;
+    paths/*) allowed='(packing|pathtree|coder|paths)/' ;;
+    archive/*) allowed='(packing|archive)/' ;;
+    binding/*) allowed='(packing|pathtree|coder|binding)/' ;;
+    qztessel/*) allowed='(paths|archive|qztessel)/' ;;
     hosts/*)
-        echo '(paths/|archive/|qztessel/|hosts/|binding/HostInterface\.hpp$)'
+        allowed='(paths/|archive/|qztessel/|hosts/|binding/HostInterface\.hpp$)'
         ;;
-    *) echo '' ;;
+    *) allowed='' ;;
     esac
 }
 
@@ -42,15 +42,18 @@ report() {
 }
 
 # grep finds nothing in a folder without quoted includes: not a failure.
+named='["<]([^">]*)[">]'
 while IFS=: read -r file line text; do
-    header=$(sed -E 's/^[^"<]*["<]([^">]*)[">].*/\1/' <<<"$text")
+    [[ $text =~ $named ]] || continue
+    header=${BASH_REMATCH[1]}
+    findAllowed "$file"
     if [[ $text != *'"'* ]]; then
         if [[ $header =~ ^(packing|pathtree|coder|paths|archive|binding|hosts)/ ]]; then
             report "$file:$line: <$header> is ours: quote it"
         fi
     elif [[ ! -f $header ]]; then
         report "$file:$line: \"$header\" is no path from the root"
-    elif [[ ! $header =~ ^$(allowedFor "$file") ]]; then
+    elif [[ ! $header =~ ^$allowed ]]; then
         report "$file:$line: may not include \"$header\""
     fi
 done < <(grep -rEn --include='*.?pp' '^[[:space:]]*#[[:space:]]*include' \
