@@ -15,7 +15,7 @@ namespace {
 // The number of hardware threads to assume where the platform knows none.
 constexpr unsigned threadsIfUnknown = 2;
 
-static_assert(ComponentEncoder::slack <= ComponentPacker::slack);
+static_assert(ComponentEncoder::slack <= ComponentArena::slack);
 
 // Encodes folders of a batch into lists of its own.
 class FolderEncoder {
@@ -32,18 +32,18 @@ public:
     }
     void keepBuffers() noexcept {
         const MutexLock lock(batch_.folderResultMutex);
-        batch_.buffers[buffersAt_] = packer_.takeBuffers();
+        batch_.buffers[buffersAt_] = arena_.takeBuffers();
     }
 
     void encode(std::uint64_t folder) {
         folder_ = folder;
         maxInFolder_ = 0;
-        const PackedComponents components = encodeAll(batch_.folders[folder]);
+        const ComponentList components = encodeAll(batch_.folders[folder]);
         {
             const MutexLock lock(batch_.folderResultMutex);
             batch_.encodedFolders[folder] = components;
         }
-        const PackedComponents names = encodeAll(batch_.files[folder]);
+        const ComponentList names = encodeAll(batch_.files[folder]);
         {
             const MutexLock lock(batch_.fileResultMutex);
             batch_.encodedFiles[folder] = names;
@@ -60,19 +60,19 @@ public:
     }
 
 private:
-    PackedComponents encodeAll(const std::vector<std::u16string>& texts) {
+    ComponentList encodeAll(const std::vector<std::u16string>& texts) {
         for (const std::u16string& text : texts) {
             const std::size_t length = encoder_.bytesFor(text);
-            std::uint8_t* to = packer_.extend(length);
+            std::uint8_t* to = arena_.extend(length);
             if (length > 0) encoder_.write(text, to);
             maxInFolder_ = std::max<std::uint64_t>(maxInFolder_, length);
         }
-        return packer_.finish();
+        return arena_.finish();
     }
 
     ComponentEncoder encoder_;
     Batch& batch_;
-    ComponentPacker packer_;
+    ComponentArena arena_;
     std::size_t buffersAt_ = 0;
     std::uint64_t folder_ = 0;
     std::uint64_t maxInFolder_ = 0;
@@ -135,9 +135,9 @@ std::size_t heapBytes(const FolderTexts& lists) {
     return bytes;
 }
 
-std::size_t heapBytes(const std::vector<PackedComponents>& lists) {
-    std::size_t bytes = lists.capacity() * sizeof(PackedComponents);
-    for (const PackedComponents& list : lists) bytes += list.bytes().size();
+std::size_t heapBytes(const std::vector<ComponentList>& lists) {
+    std::size_t bytes = lists.capacity() * sizeof(ComponentList);
+    for (const ComponentList& list : lists) bytes += list.bytes().size();
     return bytes;
 }
 
@@ -287,7 +287,7 @@ void BatchEncoder::collect(const std::vector<Worker>& workers) {
     // What encoding in order would have met.
     if (failed->encoder.folder() == failed->failedFolder)
         maxCodeBytes_.raise(failed->encoder.maxInFolder());
-    const auto raiseBy = [&](const std::vector<PackedComponents>& lists) {
+    const auto raiseBy = [&](const std::vector<ComponentList>& lists) {
         for (std::uint64_t i = 0; i < failed->failedFolder; ++i)
             for (const ComponentView component : lists[i])
                 maxCodeBytes_.raise(component.size());

@@ -9,7 +9,7 @@
 #include "coder/HuffmanCode.hpp"
 #include "coder/PathNumbering.hpp"
 #include "coder/ThreadSafety.hpp"
-#include "pathtree/PackedComponents.hpp"
+#include "pathtree/ComponentArena.hpp"
 
 namespace tessel {
 
@@ -25,13 +25,13 @@ struct Batch {
     FolderTexts files;
 
     mutable Mutex folderResultMutex;
-    std::vector<PackedComponents> encodedFolders
+    std::vector<ComponentList> encodedFolders
         QZTESSEL_GUARDED_BY(folderResultMutex);
     // What the encoded lists point into.
     std::vector<ComponentBuffers> buffers
         QZTESSEL_GUARDED_BY(folderResultMutex);
     mutable Mutex fileResultMutex;
-    std::vector<PackedComponents> encodedFiles
+    std::vector<ComponentList> encodedFiles
         QZTESSEL_GUARDED_BY(fileResultMutex);
 
     // Makes the result lists as long as the list of folders.

@@ -17,7 +17,7 @@ namespace {
 // apart, the lines would be evicted before they are used.
 class HashPrefetcher {
 public:
-    HashPrefetcher(const std::vector<PackedComponents>& folders,
+    HashPrefetcher(const std::vector<ComponentList>& folders,
                    const FolderCache& cache)
         : folders_(folders), cache_(cache) {
         for (std::size_t i = 0; i < maxAhead; ++i) begin(i);
@@ -45,22 +45,22 @@ private:
         cache_.prefetchEntry(hashes_[i % ring]);
     }
 
-    const std::vector<PackedComponents>& folders_;
+    const std::vector<ComponentList>& folders_;
     const FolderCache& cache_;
     std::array<std::uint32_t, ring> hashes_{};
 };
 
 }  // namespace
 
-void BatchInserter::insert(const std::vector<PackedComponents>& folders,
-                           const std::vector<PackedComponents>& files) {
+void BatchInserter::insert(const std::vector<ComponentList>& folders,
+                           const std::vector<ComponentList>& files) {
     HashPrefetcher hashes(folders, cache_);
     for (std::size_t i = 0; i < folders.size(); ++i)
         insertFolder(folders[i], files[i], hashes.next(i));
 }
 
-void BatchInserter::insertFolder(const PackedComponents& components,
-                                 const PackedComponents& fileNames,
+void BatchInserter::insertFolder(const ComponentList& components,
+                                 const ComponentList& fileNames,
                                  std::uint32_t hash) {
     numbering_.reserveForPartition(components.size());
     track_.clear();

@@ -7,7 +7,7 @@
 #include "coder/FolderCache.hpp"
 #include "coder/PathNumbering.hpp"
 #include "pathtree/BPathTree.hpp"
-#include "pathtree/PackedComponents.hpp"
+#include "pathtree/ComponentArena.hpp"
 
 namespace tessel {
 
@@ -27,12 +27,12 @@ public:
     // Inserts folder after folder, in order; entry i of both lists is folder
     // i. Each folder becomes a partition. If memory runs out, the folders
     // before the failure are in, and nothing of the others.
-    void insert(const std::vector<PackedComponents>& folders,
-                const std::vector<PackedComponents>& files);
+    void insert(const std::vector<ComponentList>& folders,
+                const std::vector<ComponentList>& files);
 
 private:
-    void insertFolder(const PackedComponents& components,
-                      const PackedComponents& fileNames, std::uint32_t hash);
+    void insertFolder(const ComponentList& components,
+                      const ComponentList& fileNames, std::uint32_t hash);
 
     BPathTree& tree_;
     PathNumbering& numbering_;

@@ -2,12 +2,12 @@
 
 namespace tessel {
 
-std::uint32_t FolderCache::hashOf(const PackedComponents& components) noexcept {
+std::uint32_t FolderCache::hashOf(const ComponentList& components) noexcept {
     return HashIndex::hashOf(components.bytes());
 }
 
 const FolderCache::Folder* FolderCache::find(
-    const PackedComponents& components, std::uint32_t hash) const noexcept {
+    const ComponentList& components, std::uint32_t hash) const noexcept {
     const std::size_t position = index_.find(hash, [&](std::size_t candidate) {
         return sameComponent(folders_[candidate].bytes, components.bytes());
     });
@@ -23,7 +23,7 @@ void FolderCache::reserveFor(std::size_t depth) {
 }
 
 // What a failed step leaves behind is not reached from the index.
-void FolderCache::add(const PackedComponents& components, std::uint32_t hash,
+void FolderCache::add(const ComponentList& components, std::uint32_t hash,
                       BNode& node, const PathTrack& track) {
     // More folders than the index can tell apart are not cached.
     if (folders_.size() > HashIndex::maxPosition) return;

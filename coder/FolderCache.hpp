@@ -27,11 +27,11 @@ public:
     };
 
     // A hash of the folder's components, to be handed to find and add.
-    static std::uint32_t hashOf(const PackedComponents& components) noexcept;
+    static std::uint32_t hashOf(const ComponentList& components) noexcept;
 
     // The folder of these components, or nullptr if it was not added. Valid
     // until the next add.
-    const Folder* find(const PackedComponents& components,
+    const Folder* find(const ComponentList& components,
                        std::uint32_t hash) const noexcept;
 
     // Makes sure that adding a folder of so many components does not throw.
@@ -39,8 +39,8 @@ public:
 
     // Adds a folder that find did not find. If it throws (std::bad_alloc),
     // nothing changes.
-    void add(const PackedComponents& components, std::uint32_t hash,
-             BNode& node, const PathTrack& track);
+    void add(const ComponentList& components, std::uint32_t hash, BNode& node,
+             const PathTrack& track);
 
     // Prefetch what a later find will touch, one dependent step each: call
     // them in this order, some folders apart. They change nothing and may be

@@ -199,7 +199,7 @@ void HuffmanPathTree::insertBatch(Batch& batch) QZTESSEL_NO_THREAD_SAFETY {
     // than this batch had: it is rebuilt at about the price of an insertion
     // per child.
     constexpr std::size_t childrenWorthAFolder = 16;
-    pathTree->releaseFinder(folders * childrenWorthAFolder);
+    pathTree->releaseChildIndex(folders * childrenWorthAFolder);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,
@@ -276,8 +276,8 @@ HuffmanPathTree::MemoryUsage HuffmanPathTree::memoryUsage() const {
     usage.duplicates = numbering_.duplicateBytes();
     usage.code = code_.memoryBytes();
     usage.batch = batch_.memoryBytes();
-    usage.other = sizeof(HuffmanPathTree) + sizeof(BPathTree) + tree.finder +
-                  tree.iteration;
+    usage.other = sizeof(HuffmanPathTree) + sizeof(BPathTree) +
+                  tree.childIndex + tree.iteration;
     return usage;
 }
 

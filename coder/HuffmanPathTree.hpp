@@ -375,8 +375,8 @@ public:
     std::vector<std::thread> genThreads;
     FolderTexts& asyncFolders = batch_.folders;
     FolderTexts& asyncFiles = batch_.files;
-    std::vector<PackedComponents>& encodedFolders = batch_.encodedFolders;
-    std::vector<PackedComponents>& encodedFiles = batch_.encodedFiles;
+    std::vector<ComponentList>& encodedFolders = batch_.encodedFolders;
+    std::vector<ComponentList>& encodedFiles = batch_.encodedFiles;
     std::mutex& folderResultMutex = batch_.folderResultMutex;
     std::mutex& fileResultMutex = batch_.fileResultMutex;
 };

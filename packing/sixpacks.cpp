@@ -4,9 +4,7 @@
 
 #include <utility>
 
-namespace tessel {
-
-namespace sixpacks {
+namespace tessel::sixpacks {
 
 namespace {
 
@@ -224,5 +222,4 @@ std::vector<std::uint8_t> decompressChecked(
     return result;
 }
 
-}  // namespace sixpacks
-}  // namespace tessel
+}  // namespace tessel::sixpacks

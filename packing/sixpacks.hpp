@@ -8,8 +8,6 @@
 
 #include "packing/ByteCursor.hpp"
 
-namespace tessel {
-
 // Primitives of the stored form: unsigned integers at four widths, bit and
 // byte blocks, and zlib compression.
 //
@@ -25,7 +23,7 @@ namespace tessel {
 //                       | what is left            |
 //   a vector's iterator | nothing: it cannot know | bytes that this process
 //                       | where the data ends     | wrote; inspection only
-namespace sixpacks {
+namespace tessel::sixpacks {
 
 using ByteIterator = std::vector<std::uint8_t>::const_iterator;
 
@@ -187,6 +185,4 @@ std::vector<std::uint8_t> decompressUint8(ByteIterator begin,
 std::vector<std::uint8_t> decompressChecked(
     std::span<const std::uint8_t> stream, std::uint64_t uncompressedSize);
 
-}  // namespace sixpacks
-
-}  // namespace tessel
+}  // namespace tessel::sixpacks

@@ -4,57 +4,13 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <span>
-#include <utility>
+
+#include "pathtree/ChildStore.hpp"
+#include "pathtree/Component.hpp"
 
 namespace tessel {
 
 class BNode;
-class NodePool;
-
-// The bytes of one encoded component, borrowed.
-using ComponentView = std::span<const std::uint8_t>;
-
-// Equal length and equal bytes.
-inline bool sameComponent(ComponentView a, ComponentView b) noexcept {
-    return a.size() == b.size() &&
-           (a.empty() || std::memcmp(a.data(), b.data(), a.size()) == 0);
-}
-
-// Shared ownership of one node: 8 bytes, the count stands in the node.
-//
-// Threads: counts are atomic, so handles to one node may be copied and
-// released on different threads. Releasing the last handle releases what the
-// node owns, without recursion and without allocating memory.
-class BNodePtr {
-public:
-    BNodePtr() noexcept = default;
-    explicit BNodePtr(BNode* target) noexcept;  // takes a new share
-    BNodePtr(const BNodePtr& other) noexcept;
-    BNodePtr(BNodePtr&& other) noexcept
-        : node_(std::exchange(other.node_, nullptr)) {}
-    BNodePtr& operator=(BNodePtr other) noexcept {
-        std::swap(node_, other.node_);
-        return *this;
-    }
-    ~BNodePtr();
-
-    // The handle that takes over a share which the caller owns.
-    static BNodePtr adopt(BNode* owned) noexcept;
-    // Hands the share over to the caller and leaves the handle empty.
-    BNode* release() noexcept { return std::exchange(node_, nullptr); }
-
-    BNode* get() const noexcept { return node_; }
-    BNode& operator*() const noexcept { return *node_; }
-    BNode* operator->() const noexcept { return node_; }
-    explicit operator bool() const noexcept { return node_ != nullptr; }
-    friend bool operator==(const BNodePtr& a, const BNodePtr& b) noexcept {
-        return a.node_ == b.node_;
-    }
-
-private:
-    BNode* node_ = nullptr;
-};
 
 // The children of one node in the order of insertion: a view, valid as long
 // as the node. Children are only ever appended.
@@ -73,61 +29,30 @@ private:
     BNode* owner_;
 };
 
-// The array that several children of a node stand in: one allocation, owned by
-// the node, of which each used slot owns a share of a child.
-struct ChildBlock {
-    std::uint32_t size;
-    std::uint32_t capacity;
-
-    BNode** slots() noexcept { return reinterpret_cast<BNode**>(this + 1); }
-};
-
-// What a node keeps its children by, in one word: nothing, the share of an
-// only child, which many folders have, or an array. Both are aligned to four
-// bytes, so the lowest bit can tell them apart. While a node is released, the
-// child's place may hold the node above it, or none.
-class ChildStore {
-public:
-    ChildStore() noexcept = default;
-    static ChildStore only(BNode* child) noexcept {
-        return ChildStore(reinterpret_cast<std::uintptr_t>(child) | onlyFlag);
-    }
-    static ChildStore array(ChildBlock* block) noexcept {
-        return ChildStore(reinterpret_cast<std::uintptr_t>(block));
-    }
-
-    bool isOnly() const noexcept { return (word_ & onlyFlag) != 0; }
-    BNode* child() const noexcept {
-        return reinterpret_cast<BNode*>(word_ & ~onlyFlag);
-    }
-    // Null if there is none.
-    ChildBlock* block() const noexcept {
-        return isOnly() ? nullptr : reinterpret_cast<ChildBlock*>(word_);
-    }
-    std::size_t size() const noexcept {
-        if (isOnly()) return 1;
-        return word_ == 0 ? 0 : block()->size;
-    }
-
-private:
-    static constexpr std::uintptr_t onlyFlag = 1;
-
-    explicit ChildStore(std::uintptr_t value) noexcept : word_(value) {}
-
-    std::uintptr_t word_ = 0;
-};
-
 // One component of the trie: its value, its children and its share count,
-// in one piece of a slab.
+// in one piece of a NodeSlab.
 //
-//   | children, 8 bytes      | count, 4 | head, 1 | length, 8  | value |
-//   | only if made to have   |          |         | only if    |       |
-//   | children               |          |         | above 62   |       |
-//                            ^ the node's address, a multiple of 4
+//    prefix slot             | the node's address, a multiple of 4
+//   |------------------------|-------------|-----------------|----------- - -
+//   | children, 8            | count, 4    | length 6 | flags 2 bits | value
+//   | only if made a folder  | of shares   | one byte               |
 //
-// Most nodes are files and never have children, so a node made as a leaf has
-// no room for a child store. If it gets children after all, its slab keeps
-// the store for it; the node stays where it is.
+//   length bits | length of the value | the value begins after the byte with
+//   ------------+---------------------+-------------------------------------
+//   0 to 62     | the same            | the value's bytes
+//   63          | 63 to maxInSlab     | length, 8 bytes; the value's bytes
+//   63          | above maxInSlab     | length, 8 bytes; the address of the
+//               |                     | value, 8 bytes: a heap block
+//
+//   flags            | the children's word (ChildStore) is
+//   -----------------+-----------------------------------------------------
+//   0                | nowhere: made as a leaf, and without children so far
+//   hasPrefixSlot    | before the node: made as a folder
+//   hasSlabStore     | in a table of the slab: made as a leaf, but got
+//                    | children after all; the node stays where it is
+//
+// Most nodes are files and never have children, hence the second row's slot
+// only for folders.
 //
 // Invariants: the value never changes; children are only appended; every
 //   child in the list is kept alive by it.
@@ -135,17 +60,19 @@ private:
 // Threads: the count is atomic, all else must not be read while it changes.
 class BNode {
 public:
+    // Longer values have a block of their own, so that slabs stay well
+    // filled: at most this part of 16 KiB is lost at the end of each.
+    static constexpr std::size_t maxInSlab = 1024;
+
     BNode(const BNode&) = delete;
     BNode& operator=(const BNode&) = delete;
 
     // The component's encoded bytes, valid as long as the node.
     ComponentView value() const noexcept {
-        const std::uint8_t* at = afterHead();
-        const unsigned shortLength = head_ >> lengthShift;
+        const std::uint8_t* at = afterFlags();
+        const unsigned shortLength = lengthAndFlags_ >> lengthShift;
         if (shortLength != longLength) return {at, shortLength};
-        std::uint64_t length = 0;
-        std::memcpy(&length, at, sizeof length);
-        return {at + sizeof length, static_cast<std::size_t>(length)};
+        return longValue();
     }
 
     ChildList children() const noexcept {
@@ -153,70 +80,75 @@ public:
     }
     bool isLeaf() const noexcept { return children().empty(); }
 
+    // Heap bytes that the node alone owns outside its slab, as the allocator
+    // counts them: the array of children and a value above maxInSlab.
+    std::size_t childListBytes() const noexcept;
+    std::size_t ownValueBytes() const noexcept;
+
 private:
     friend class BNodePtr;
     friend class ChildList;
     friend class NodePool;
-    friend class NodeSlab;
-    friend struct NodeMemory;
 
-    static constexpr std::uint8_t ownsStoreFlag = 1;  // before the node
-    static constexpr std::uint8_t lateStoreFlag = 2;  // in the slab
+    static constexpr std::uint8_t hasPrefixSlot = 1;
+    static constexpr std::uint8_t hasSlabStore = 2;
     static constexpr unsigned lengthShift = 2;
     static constexpr unsigned longLength = 63;
 
     BNode() noexcept = default;
 
-    const std::uint8_t* afterHead() const noexcept { return &head_ + 1; }
-    std::uint8_t* afterHead() noexcept { return &head_ + 1; }
+    const std::uint8_t* afterFlags() const noexcept {
+        return &lengthAndFlags_ + 1;
+    }
+    std::uint8_t* afterFlags() noexcept { return &lengthAndFlags_ + 1; }
+    ComponentView longValue() const noexcept;
+    // The heap block of the value, or nullptr.
+    std::uint8_t* ownValue() const noexcept;
 
-    void* storeSlot() const noexcept {
+    void* prefixSlot() const noexcept {
         return const_cast<char*>(reinterpret_cast<const char*>(this)) -
                sizeof(ChildStore);
     }
     ChildStore store() const noexcept {
         ChildStore kept;
-        if ((head_ & ownsStoreFlag) != 0)
-            std::memcpy(&kept, storeSlot(), sizeof kept);
-        else if ((head_ & lateStoreFlag) != 0)
-            kept = lateStore();
+        if ((lengthAndFlags_ & hasPrefixSlot) != 0)
+            std::memcpy(&kept, prefixSlot(), sizeof kept);
+        else if ((lengthAndFlags_ & hasSlabStore) != 0)
+            kept = slabStore();
         return kept;
     }
-    ChildStore lateStore() const noexcept;
+    ChildStore slabStore() const noexcept;
     // Throws std::bad_alloc, with nothing changed, when a node that was made
     // as a leaf gets its first store.
-    void setStore(ChildStore kept);
+    void setStore(ChildStore kept) {
+        if ((lengthAndFlags_ & hasPrefixSlot) != 0)
+            std::memcpy(prefixSlot(), &kept, sizeof kept);
+        else
+            setSlabStore(kept);
+    }
+    void setSlabStore(ChildStore kept);
 
-    void share() noexcept {
-        references_.fetch_add(1, std::memory_order_relaxed);
-    }
-    // Gives one share back; true when it was the last.
+    // Relaxed: whoever takes a new share has one already, through which the
+    // node reached this thread.
+    void share() noexcept { shares_.fetch_add(1, std::memory_order_relaxed); }
+    // Gives one share back; true when it was the last. Release: what this
+    // thread did to the node comes before its destruction. Acquire: so does
+    // what the others did.
     bool unshare() noexcept {
-        return references_.fetch_sub(1, std::memory_order_acq_rel) == 1;
+        return shares_.fetch_sub(1, std::memory_order_acq_rel) == 1;
     }
-    // Releases a node whose last share is gone, and all that it alone owns.
+
+    // Releases a node whose last share is gone, and all that it alone owns,
+    // without recursion and without taking memory.
     static void destroy(BNode* dead) noexcept;
     BNode* popChild() noexcept;
-    void leaveWayUp(BNode* above) noexcept;
-    BNode* takeWayUp() noexcept;
+    void stashParent(BNode* parent) noexcept;
+    BNode* unstashParent() noexcept;
+    void releaseOwned() noexcept;
 
-    std::atomic<std::uint32_t> references_ = 1;
-    std::uint8_t head_ = 0;
+    std::atomic<std::uint32_t> shares_ = 1;
+    std::uint8_t lengthAndFlags_ = 0;
 };
-
-inline BNodePtr::BNodePtr(BNode* target) noexcept : node_(target) {
-    if (node_ != nullptr) node_->share();
-}
-inline BNodePtr::BNodePtr(const BNodePtr& other) noexcept
-    : BNodePtr(other.node_) {}
-inline BNodePtr::~BNodePtr() {
-    if (node_ != nullptr && node_->unshare()) BNode::destroy(node_);
-}
-inline BNodePtr BNodePtr::adopt(BNode* owned) noexcept {
-    BNodePtr handle;
-    handle.node_ = owned;
-    return handle;
-}
 
 static_assert(alignof(BNode) >= 4 && alignof(ChildBlock) >= 4);
 
@@ -227,15 +159,5 @@ inline BNode& ChildList::operator[](std::size_t i) const noexcept {
     const ChildStore kept = owner_->store();
     return kept.isOnly() ? *kept.child() : *kept.block()->slots()[i];
 }
-
-// Bytes that nodes take, as the allocator counts them.
-struct NodeMemory {
-    // The node's piece of its slab, its children's array not included.
-    static std::size_t nodeBytes(const BNode& node) noexcept;
-    // The array of the node's children; 0 if it has no array.
-    static std::size_t childListBytes(const BNode& node) noexcept;
-    // Identity and size of the slab that the node lives in.
-    static std::pair<const void*, std::size_t> slab(const BNode& node) noexcept;
-};
 
 }  // namespace tessel

@@ -7,6 +7,8 @@
 #include <unordered_set>
 #include <utility>
 
+#include "pathtree/Insertion.hpp"
+#include "pathtree/NodeSlab.hpp"
 #include "pathtree/NodeWalk.hpp"
 #include "pathtree/containers.hpp"
 
@@ -36,29 +38,6 @@ std::size_t componentBytes(const Components& components) {
 
 }  // namespace
 
-const char* NoMorePathException::what() const noexcept {
-    return "No more paths to provide.";
-}
-
-const char* NoTreeToTraverseException::what() const noexcept {
-    return "Cannot traverse an empty tree for a path.";
-}
-
-const char* EmptyPathForTraverseException::what() const noexcept {
-    return "Cannot traverse an tree for an empty path track.";
-}
-
-const char* UnknownNodeTypeException::what() const noexcept {
-    return "Cannot determine the node type for the given value.";
-}
-
-const BNode& BatchFiles::childAt(const BNode& node, std::uint64_t position) {
-    const ChildList children = node.children();
-    if (position >= children.size())
-        throw std::out_of_range("A position leads outside the path tree.");
-    return children[static_cast<std::size_t>(position)];
-}
-
 BPathTree::BPathTree() {
     root = BNodePtr::adopt(pool_.make({}, NodePool::Kind::folder));
 }
@@ -82,8 +61,8 @@ std::uint64_t BPathTree::findNode(const Component& value,
     return allOnes;
 }
 
-// Not through the finder: `nodes` may be those of any tree, and the finder
-// must not know nodes that this one does not keep alive.
+// Not through the index: `nodes` may be those of any tree, and the index must
+// not know nodes that this one does not keep alive.
 std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
                                             Component& value,
                                             bool& existed) const {
@@ -95,67 +74,8 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     return nodes.size() - 1;
 }
 
-// One insertion on its way down from the root. Unless it is committed, it
-// takes the nodes that it made away again, and the track's new positions.
-class BPathTree::Insertion {
-public:
-    Insertion(BPathTree& target, PathTrack& pathTrack) noexcept
-        : tree_(target),
-          track_(pathTrack),
-          trackLength_(pathTrack.size()),
-          node_(target.root.get()) {}
-    Insertion(const Insertion&) = delete;
-    Insertion& operator=(const Insertion&) = delete;
-    ~Insertion() {
-        if (!committed_) takeBack();
-    }
-
-    // Goes to the child of this value; makes it if there is none. Returns
-    // its position.
-    std::uint64_t enter(ComponentView value, NodePool::Kind kind) {
-        const ChildFinder::Found found = tree_.finder_.find(*node_, value);
-        existed_ = found.child != nullptr;
-        if (existed_) {
-            node_ = found.child;
-            return found.position;
-        }
-        if (firstChanged_ == nullptr) {
-            firstChanged_ = node_;
-            childrenBefore_ = node_->children().size();
-        }
-        BNode& made = tree_.pool_.add(*node_, value, kind);
-        tree_.finder_.noteAppended(*node_);
-        const std::size_t position = node_->children().size() - 1;
-        node_ = &made;
-        return position;
-    }
-
-    BNode& node() const noexcept { return *node_; }
-    // Whether the last component entered was there.
-    bool existed() const noexcept { return existed_; }
-    void commit() noexcept { committed_ = true; }
-
-private:
-    // All new nodes are below the first one that was made.
-    void takeBack() noexcept {
-        tree_.finder_.clear();  // it may know nodes that go
-        if (firstChanged_ != nullptr)
-            NodePool::truncate(*firstChanged_, childrenBefore_);
-        track_.resize(trackLength_);
-    }
-
-    BPathTree& tree_;
-    PathTrack& track_;
-    std::size_t trackLength_;
-    BNode* node_;
-    bool existed_ = false;
-    bool committed_ = false;
-    BNode* firstChanged_ = nullptr;  // the parent of the first new node
-    std::size_t childrenBefore_ = 0;
-};
-
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
-    Insertion insertion(*this, pathTrack);
+    Insertion insertion(*root, pool_, childIndex_, pathTrack);
     std::size_t stored = 0;
     for (std::size_t i = 0; i < components.size(); ++i) {
         const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
@@ -175,7 +95,7 @@ template <class Folder, class Files>
 BPathTree::AddedBatch BPathTree::insertBatch(Folder& components,
                                              Files& fileNames,
                                              PathTrack& pathTrack) {
-    Insertion insertion(*this, pathTrack);
+    Insertion insertion(*root, pool_, childIndex_, pathTrack);
     std::size_t stored = 0;
     for (const ComponentView component : components) {
         const std::uint64_t position =
@@ -216,14 +136,14 @@ bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
     return added.existed;
 }
 
-BPathTree::AddedBatch BPathTree::addBatch(
-    const PackedComponents& folderComponents, const PackedComponents& fileNames,
-    PathTrack& pathTrack) {
+BPathTree::AddedBatch BPathTree::addBatch(const ComponentList& folderComponents,
+                                          const ComponentList& fileNames,
+                                          PathTrack& pathTrack) {
     return insertBatch(folderComponents, fileNames, pathTrack);
 }
 
 std::uint64_t BPathTree::addFiles(BNode& folder,
-                                  const PackedComponents& fileNames) {
+                                  const ComponentList& fileNames) {
     return appendFiles(folder, fileNames);
 }
 
@@ -231,8 +151,8 @@ bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
     return node->isLeaf();
 }
 
-void BPathTree::releaseFinder(std::size_t most) noexcept {
-    if (finder_.indexedChildren() <= most) finder_.clear();
+void BPathTree::releaseChildIndex(std::size_t maxChildren) noexcept {
+    if (childIndex_.indexedChildren() <= maxChildren) childIndex_.clear();
 }
 
 // ---- Iteration ----
@@ -257,7 +177,7 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::reset() {
-    finder_.clear();
+    childIndex_.clear();
     if (root->isLeaf()) return;
     // Room first, so that it changes nothing if memory runs out.
     pendingNodes.reserve(1);
@@ -333,17 +253,6 @@ void BPathTree::traversePath(const PathTrack& pathTrack,
     appendAll(out, found);
 }
 
-void BPathTree::getBatch(Components& folder, Components& files,
-                         const PathTrack& track,
-                         const std::vector<std::uint64_t>& offsets) const {
-    folder.reserve(folder.size() + track.size());
-    files.reserve(files.size() + offsets.size());
-    visitBatch(
-        track, offsets,
-        [&folder](ComponentView value) { appendCopy(value, folder); },
-        [&files](ComponentView value) { appendCopy(value, files); });
-}
-
 void BPathTree::getPath(
     std::vector<Components>& folderPaths, std::vector<Components>& filePaths,
     const std::vector<std::uint64_t>& selectedPartitions,
@@ -358,9 +267,11 @@ void BPathTree::getPath(
         const std::uint64_t partition = selectedPartitions[i];
         if (partition >= partitionTracks.size())
             throw std::out_of_range("A partition does not exist.");
-        getBatch(folders[i], files[i],
-                 partitionTracks[static_cast<std::size_t>(partition)],
-                 fileOffsets[i]);
+        visitBatch(
+            partitionTracks[static_cast<std::size_t>(partition)],
+            fileOffsets[i],
+            [&](ComponentView value) { appendCopy(value, folders[i]); },
+            [&](ComponentView value) { appendCopy(value, files[i]); });
     }
     // Room first, so that nothing is appended if memory runs out.
     const bool oneList = &folderPaths == &filePaths;
@@ -376,20 +287,21 @@ void BPathTree::getPath(
 
 BPathTree::MemoryUsage BPathTree::memoryUsage() const {
     MemoryUsage usage;
-    std::unordered_set<const void*> slabs;
-    const void* latest = nullptr;
+    std::unordered_set<NodeSlab*> slabs;
+    NodeSlab* latest = nullptr;
     const auto account = [&](const BNode& node) {
         usage.names += node.value().size();
-        usage.childLists += NodeMemory::childListBytes(node);
-        const auto [slab, bytes] = NodeMemory::slab(node);
+        usage.nodes += node.ownValueBytes();
+        usage.childLists += node.childListBytes();
+        NodeSlab* slab = NodeSlab::of(&node);
         if (slab == latest) return;
         latest = slab;
-        if (slabs.insert(slab).second) usage.nodes += bytes;
+        if (slabs.insert(slab).second) usage.nodes += slab->memoryBytes();
     };
     account(*root);
     for (NodeWalk walk(*root); walk.next();) account(walk.node());
     usage.nodes -= usage.names;
-    usage.finder = finder_.memoryBytes();
+    usage.childIndex = childIndex_.memoryBytes();
     usage.iteration = pendingNodes.memoryBytes() + parentNodes.memoryBytes() +
                       componentBytes(currentPrefix);
     return usage;

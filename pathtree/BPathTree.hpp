@@ -2,80 +2,23 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <exception>
 #include <span>
 #include <vector>
 
-#include "pathtree/BNode.hpp"
-#include "pathtree/ChildFinder.hpp"
+#include "pathtree/BNodePtr.hpp"
+#include "pathtree/BatchFiles.hpp"
+#include "pathtree/ChildIndex.hpp"
+#include "pathtree/ComponentList.hpp"
 #include "pathtree/NodePool.hpp"
 #include "pathtree/NodeStack.hpp"
 #include "pathtree/PackedComponents.hpp"
+#include "pathtree/PathTreeErrors.hpp"
+#include "pathtree/PathView.hpp"
 
 namespace tessel {
 
-// Iteration was asked for a path and has none left.
-class NoMorePathException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-// A track was to be followed in a tree without paths.
-class NoTreeToTraverseException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-// An empty track was to be followed.
-class EmptyPathForTraverseException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-// A node code of the stored form is none of the four.
-class UnknownNodeTypeException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-// An encoded component, and a list of them: a folder's components, a batch
-// of file names, or a whole path with the file name last.
-using Component = std::vector<std::uint8_t>;
-using Components = std::vector<Component>;
-
 // A path track: child positions from the root of the path tree down.
 using PathTrack = std::vector<std::uint64_t>;
-
-// The path that a pass is at: views of the tree, valid during the visit.
-struct PathView {
-    std::span<const Component> folders;
-    ComponentView name;
-    // So many leading folders are the same nodes as in the path before, which
-    // this tree visited in the same pass: their text need not be decoded anew.
-    std::size_t unchangedFolders;
-};
-
-// The files of one batch, found by its track. Valid as long as the tree.
-class BatchFiles {
-public:
-    // The name of the file at this offset, 1-based within the batch. Throws
-    // std::out_of_range for a position outside the folder.
-    ComponentView operator[](std::uint64_t offset) const {
-        return childAt(*folder_, first_ - 1 + offset).value();
-    }
-
-private:
-    friend class BPathTree;
-
-    BatchFiles(const BNode& folder, std::uint64_t first) noexcept
-        : folder_(&folder), first_(first) {}
-
-    // Throws std::out_of_range if there is no such child.
-    static const BNode& childAt(const BNode& node, std::uint64_t position);
-
-    const BNode* folder_;
-    std::uint64_t first_;  // position of the batch's first file
-};
 
 // BPathTree keeps paths as a trie whose edges are encoded components,
 // compared by length and bytes, never decoded, ordered or interpreted.
@@ -88,10 +31,10 @@ private:
 //   separate. Releasing a tree does not recurse.
 // Threads: no locks. Use a tree and its copies from one thread at a time;
 //   releasing them on different threads is safe.
-// Cost: a file takes its encoded name, 5 to 8 bytes, and 8 bytes in its
-//   folder's child list; a folder takes 8 bytes more, and about 20 for the
-//   list if it has more than one child. Finding a child takes constant time
-//   on average.
+// Cost: a file takes its encoded name, 5 to 8 bytes (13 to 16 for a name of
+//   63 bytes or more, see NodePool), and 8 to 10 bytes in its folder's child
+//   list; a folder takes 8 bytes more, and about 20 for the list if it has
+//   more than one child. Finding a child takes constant time on average.
 class BPathTree {
 public:
     // No position: what a search answers that finds nothing.
@@ -151,15 +94,14 @@ public:
     };
 
     // The same from packed lists, which are only read.
-    AddedBatch addBatch(const PackedComponents& folderComponents,
-                        const PackedComponents& fileNames,
-                        PathTrack& pathTrack);
+    AddedBatch addBatch(const ComponentList& folderComponents,
+                        const ComponentList& fileNames, PathTrack& pathTrack);
 
     // Appends files to a folder of this tree that was found before; returns
     // the position of the first.
-    std::uint64_t addFiles(BNode& folder, const PackedComponents& fileNames);
+    std::uint64_t addFiles(BNode& folder, const ComponentList& fileNames);
 
-    // True when the node has no children.
+    // Inspection. True when the node has no children.
     bool isLeaf(const BNodePtr& node) const noexcept;
 
     // ---- Iteration ----
@@ -185,18 +127,18 @@ public:
         leavePath();
     }
 
-    // Replaces `out` by the next path's components, folders first. Throws
-    // as visitNextPath does.
-    // Cost: the depth of the tree and the bytes of the path.
+    // Inspection. Replaces `out` by the next path's components, folders first.
+    // Throws as visitNextPath does. Cost: the depth of the tree and the bytes
+    // of the path.
     void getNextPath(Components& out);
 
-    // Pushes the node's children, the first on top; the second form onto
-    // pendingNodes.
+    // Inspection. Pushes the node's children, the first on top; the second
+    // form onto pendingNodes.
     void pushAllChildren(const BNodePtr& node, NodeStack& stack) const;
     void pushAllChildren(const BNodePtr& node);
 
-    // True when node is the last child of the stack's top node, by identity;
-    // the second form asks parentNodes. False for an empty stack.
+    // Inspection. True when node is the last child of the stack's top node, by
+    // identity; the second form asks parentNodes. False for an empty stack.
     bool isNodeAtEndOfParent(const BNodePtr& node,
                              const NodeStack& parents) const noexcept;
     bool isNodeAtEndOfParent(const BNodePtr& node) const noexcept;
@@ -249,21 +191,16 @@ public:
         const std::vector<PathTrack>& partitionTracks,
         const std::vector<std::vector<std::uint64_t>>& fileOffsets) const;
 
-    // The same for one batch: appends to folder and files. If it throws, part
-    // of them may be appended.
-    void getBatch(Components& folder, Components& files, const PathTrack& track,
-                  const std::vector<std::uint64_t>& offsets) const;
+    // ---- Stored form (the layout is in BPathTreeForm.cpp) ----
 
-    // ---- Stored form (defined beside its layout, in packing/) ----
-
-    // Appends a code and the value of every node but the root, in pre-order,
-    // and returns the largest number of children of any node.
+    // Inspection. Appends a code and the value of every node but the root, in
+    // pre-order, and returns the largest number of children of any node.
     std::size_t serialize(std::vector<std::uint8_t>& structure,
                           Components& values) const;
 
-    // Replaces the tree by the one that the pair describes and returns its
-    // number of leaves. Values that become nodes are left empty; entries
-    // after a complete tree are ignored; two empty lists are the tree
+    // Inspection. Replaces the tree by the one that the pair describes and
+    // returns its number of leaves. Values that become nodes are left empty;
+    // entries after a complete tree are ignored; two empty lists are the tree
     // without paths. The place in a pass is not reset.
     //
     // Input may be hostile. Throws UnknownNodeTypeException on a code above
@@ -280,15 +217,15 @@ public:
         std::size_t names = 0;       // the values' bytes
         std::size_t nodes = 0;       // all else in the slabs
         std::size_t childLists = 0;  // arrays of children
-        std::size_t finder = 0;      // what speeds up insertion
+        std::size_t childIndex = 0;  // what speeds up insertion
         std::size_t iteration = 0;   // stacks and prefix
     };
     // Cost: a walk over the tree.
     MemoryUsage memoryUsage() const;
 
     // Releases the memory that speeds up insertion, if it holds no more than
-    // `most` children. It comes back by itself when it is needed.
-    void releaseFinder(std::size_t most = ~std::size_t{0}) noexcept;
+    // `maxChildren` children. It comes back by itself when it is needed.
+    void releaseChildIndex(std::size_t maxChildren = ~std::size_t{0}) noexcept;
 
     // ---- State, public for inspection; change it through the operations ----
 
@@ -306,8 +243,6 @@ private:
         return BatchFiles::childAt(node, position);
     }
 
-    class Insertion;
-
     template <class Folder, class Files>
     AddedBatch insertBatch(Folder& components, Files& fileNames,
                            PathTrack& pathTrack);
@@ -317,10 +252,10 @@ private:
     void leavePath() noexcept;
     void closeFinishedFolders() noexcept;
 
-    // Helpers of insertion, which is const for addIfExistsAndFind: the tree
-    // is in the nodes, not in them.
+    // Mutable for addIfExistsAndFind, which is const: the tree's content is
+    // its nodes; these only help to make and to find them.
     mutable NodePool pool_;
-    mutable ChildFinder finder_;
+    mutable ChildIndex childIndex_;
 
     std::size_t unchangedFolders_ = 0;  // see PathView
 };

@@ -1,20 +1,15 @@
-// The stored form of the path tree: two lists with one entry for each node
-// but the root, in pre-order (a node before its children, children in the
+// The stored form of the path tree: two lists with one entry per node but
+// the root, in pre-order (a node before its children, children in the
 // order of insertion).
 //
-//   structure   one code a node:
-//                 code | has children | its parent's last child
-//                 -----+--------------+------------------------
-//                   0  |      no      |          yes
-//                   1  |      yes     |          yes
-//                   2  |      no      |          no
-//                   3  |      yes     |          no
+//   structure   the node's code: see NodeCode.hpp
 //   values      the node's encoded component
 
 #include <algorithm>
 
 #include "packing/sixpacks.hpp"
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/NodeCode.hpp"
 #include "pathtree/NodeWalk.hpp"
 #include "pathtree/TreeBuilder.hpp"
 #include "pathtree/containers.hpp"
@@ -23,14 +18,14 @@ namespace tessel {
 
 std::size_t BPathTree::serialize(std::vector<std::uint8_t>& structure,
                                  Components& values) const {
-    std::size_t mostChildren = root->children().size();
+    std::size_t maxChildren = root->children().size();
     for (NodeWalk walk(*root); walk.next();) {
         const ComponentView value = walk.node().value();
         values.emplace_back(value.begin(), value.end());
         structure.push_back(nodecode::of(walk));
-        mostChildren = std::max(mostChildren, walk.node().children().size());
+        maxChildren = std::max(maxChildren, walk.node().children().size());
     }
-    return mostChildren;
+    return maxChildren;
 }
 
 std::size_t BPathTree::deserialize(std::vector<std::uint8_t>& structure,

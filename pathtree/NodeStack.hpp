@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <vector>
 
-#include "pathtree/BNode.hpp"
+#include "pathtree/BNodePtr.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {
@@ -57,7 +57,8 @@ public:
     }
 
 private:
-    // A node itself, or its children at the positions next to end - 1.
+    // A node itself, or its children at the positions [next, end). `end` is
+    // that of the push: the node may have more children by now.
     struct Range {
         BNodePtr node;
         std::size_t next;

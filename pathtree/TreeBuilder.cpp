@@ -12,7 +12,7 @@ std::vector<std::uint32_t> countChildren(std::span<const std::uint8_t> codes) {
     std::vector<std::uint32_t> counts{0};
     std::vector<std::size_t> open{0};
     for (const std::uint8_t code : codes) {
-        if (open.empty() || code > nodecode::largest) break;
+        if (open.empty() || code > nodecode::maxCode) break;
         ++counts[open.back()];
         if ((code & nodecode::siblingFollows) == 0) open.pop_back();
         if ((code & nodecode::hasChildren) != 0) {
@@ -28,7 +28,7 @@ std::vector<std::uint32_t> countChildren(std::span<const std::uint8_t> codes) {
 TreeBuilder::TreeBuilder(BPathTree& target,
                          std::span<const std::uint8_t> nodeCodes)
     : tree_(target), codes_(nodeCodes), childCounts_(countChildren(nodeCodes)) {
-    tree_.finder_.clear();
+    tree_.childIndex_.clear();
     tree_.root = BNodePtr::adopt(tree_.pool_.make({}, NodePool::Kind::folder));
     reserveChildren(*tree_.root);
     open_.push_back(tree_.root.get());
@@ -41,7 +41,7 @@ void TreeBuilder::reserveChildren(BNode& folder) {
 void TreeBuilder::add(ComponentView value) {
     if (nextCode_ == codes_.size()) throw DamagedFormException();
     const std::uint8_t code = codes_[nextCode_++];
-    const bool known = code <= nodecode::largest;
+    const bool known = code <= nodecode::maxCode;
     const bool isFolder = known && (code & nodecode::hasChildren) != 0;
     BNode& node = tree_.pool_.add(
         *open_.back(), value,

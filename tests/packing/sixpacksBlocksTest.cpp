@@ -74,6 +74,13 @@ TEST(PackedBlocks, UnusedHighBitsAreIgnored) {
     EXPECT_EQ(bitsOf({0xFD, 0x03}), (Bits{true, false, true}));
 }
 
+// No writer makes it, but it says what it means.
+TEST(PackedBlocks, ATrailerOfEightTakesTheWholeByte) {
+    EXPECT_EQ(bitsOf({0x0F, 0x08}),
+              (Bits{true, true, true, true, false, false, false, false}));
+    EXPECT_EQ(bitsOf({0x00, 0xFF, 0x08}).size(), 16U);
+}
+
 TEST(PackedBlocks, AnEmptyBlockIsRefused) {
     Bits bits = {true};
     EXPECT_THROW(bytesToBoolVec({}, bits), DamagedFormException);

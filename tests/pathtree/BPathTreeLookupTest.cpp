@@ -178,19 +178,6 @@ TEST(PathTreeLookup, AnEmptyTrackIsTheRootsBatch) {
     EXPECT_EQ(lookUp(tree, {0}, {{}}, {{2, 1}}), (Lookup{{{}}, {{"g", "f"}}}));
 }
 
-TEST(PathTreeLookup, OneBatchIsAppendedToItsFolderAndItsFiles) {
-    BPathTree tree;
-    addBatch(tree, {"a"}, {"f", "g"});
-    addBatch(tree, {"a"}, {"h", "i"});
-    Components folder = components({"before"});
-    Components files = components({"first"});
-    tree.getBatch(folder, files, {0, 2}, {2, 1});
-    EXPECT_EQ(textsOf(folder), (Names{"before", "a"}));
-    EXPECT_EQ(textsOf(files), (Names{"first", "i", "h"}));
-    EXPECT_THROW(tree.getBatch(folder, files, {0, 2}, {3}), std::out_of_range);
-    EXPECT_THROW(tree.getBatch(folder, files, {1}, {1}), std::out_of_range);
-}
-
 TEST(PathTreeLookup, OneListForBothOutputsTakesFolderAndFilesInTurn) {
     BPathTree tree;
     addBatch(tree, {"a"}, {"f"});

@@ -406,53 +406,24 @@ TEST(PathTreeInsertion, ASourceOutlivesItsCopiesAndTheirInsertions) {
 
 TEST(PathTreeInsertion, ResetReleasesWhatInsertionRemembered) {
     BPathTree tree;
-    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    EXPECT_EQ(tree.memoryUsage().childIndex, 0U);
     for (std::size_t i = 0; i < 100; ++i)
         addWhole(tree, {support::numbered("d", i), "f"});
-    EXPECT_GT(tree.memoryUsage().finder, 100U);
+    EXPECT_GT(tree.memoryUsage().childIndex, 100U);
     tree.reset();
-    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    EXPECT_EQ(tree.memoryUsage().childIndex, 0U);
     EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
 }
 
-TEST(PathTreeInsertion, ReleaseFinderSparesAMemoryThatIsLarge) {
+TEST(PathTreeInsertion, ReleaseChildIndexSparesAMemoryThatIsLarge) {
     BPathTree tree;
     for (std::size_t i = 0; i < 100; ++i)
         addWhole(tree, {support::numbered("d", i), "f"});
-    tree.releaseFinder(50);
-    EXPECT_GT(tree.memoryUsage().finder, 100U);
-    tree.releaseFinder(100);
-    EXPECT_EQ(tree.memoryUsage().finder, 0U);
+    tree.releaseChildIndex(50);
+    EXPECT_GT(tree.memoryUsage().childIndex, 100U);
+    tree.releaseChildIndex(100);
+    EXPECT_EQ(tree.memoryUsage().childIndex, 0U);
     EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
-}
-
-// ---- Handles ----
-
-TEST(PathTreeInsertion, AHeldNodeKeepsWhatIsBelowItAlive) {
-    BNodePtr held;
-    {
-        BPathTree tree;
-        addBatch(tree, {"a", "b"}, {"f", "g"});
-        held = BNodePtr(&tree.root->children()[0].children()[0]);
-    }
-    EXPECT_EQ(support::textOf(held->value()), "b");
-    EXPECT_EQ(childTexts(*held), (Paths{"f", "g"}));
-}
-
-TEST(PathTreeInsertion, HandlesAreSharedMovedAndEmptied) {
-    BPathTree tree;
-    addWhole(tree, {"a"});
-    BNodePtr first(&tree.root->children()[0]);
-    BNodePtr second = first;
-    EXPECT_TRUE(first == second);
-    const BNodePtr moved = std::move(second);
-    EXPECT_FALSE(second);
-    EXPECT_TRUE(moved == first);
-    first = BNodePtr();
-    EXPECT_FALSE(first);
-    EXPECT_EQ(first.get(), nullptr);
-    EXPECT_EQ(support::textOf((*moved).value()), "a");
-    EXPECT_TRUE(BNodePtr() == BNodePtr());
 }
 
 TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
@@ -470,7 +441,7 @@ TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
 // ---- Packed batches ----
 
 TEST(PathTreeInsertion, APackedBatchIsAddedLikeVectors) {
-    tessel::ComponentPacker packer;
+    tessel::ComponentArena packer;
     const auto folder = support::packedBy(packer, components({"a", "b"}));
     const auto files = support::packedBy(packer, components({"f", ""}));
     BPathTree tree;
@@ -490,7 +461,7 @@ TEST(PathTreeInsertion, APackedBatchIsAddedLikeVectors) {
 }
 
 TEST(PathTreeInsertion, APackedFolderOfNoComponentsIsTheRoot) {
-    tessel::ComponentPacker packer;
+    tessel::ComponentArena packer;
     const auto files = support::packedBy(packer, components({"f"}));
     BPathTree tree;
     PathTrack track;

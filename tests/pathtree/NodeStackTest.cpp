@@ -64,6 +64,27 @@ TEST(NodeStack, ChildrenAppendedLaterAreNotOnTheStack) {
     stack.pushChildren(tree.root);
     support::addBatch(tree, {}, {"c"});
     EXPECT_EQ(stack.size(), 2U);
+    EXPECT_EQ(support::textOf(stack.top().value()), "a");
+    stack.pop();
+    EXPECT_EQ(support::textOf(stack.top().value()), "b");
+    stack.pop();
+    EXPECT_TRUE(stack.empty());
+    stack.pushChildren(tree.root);
+    EXPECT_EQ(stack.size(), 3U);
+}
+
+TEST(NodeStack, PushesAfterAReserveTakeNoMemory) {
+    BPathTree tree;
+    support::addBatch(tree, {}, {"a"});
+    tessel::NodeStack stack;
+    EXPECT_EQ(stack.memoryBytes(), 0U);
+    for (std::size_t i = 0; i < 100; ++i) {
+        stack.reserve(1);
+        const std::size_t bytes = stack.memoryBytes();
+        stack.push(tree.root);
+        EXPECT_EQ(stack.memoryBytes(), bytes);
+        EXPECT_LE(bytes, (i + 2) * 40);
+    }
 }
 
 TEST(NodeStack, KeepsItsNodesAlive) {

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/ComponentArena.hpp"
 
 // Short ways to say what most tests need of a path tree. Components are the
 // characters of a text: any bytes will do.
@@ -27,11 +28,11 @@ inline tessel::Components components(const std::vector<std::string>& texts) {
     return list;
 }
 
-// The components as a packed list, valid as long as the packer.
-inline tessel::PackedComponents packedBy(tessel::ComponentPacker& packer,
-                                         const tessel::Components& list) {
-    for (const tessel::Component& value : list) packer.append(value);
-    return packer.finish();
+// The components as a packed list, valid as long as the arena.
+inline tessel::ComponentList packedBy(tessel::ComponentArena& arena,
+                                      const tessel::Components& list) {
+    for (const tessel::Component& value : list) arena.append(value);
+    return arena.finish();
 }
 
 inline std::string textOf(tessel::ComponentView value) {

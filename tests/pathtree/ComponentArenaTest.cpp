@@ -6,7 +6,7 @@
 #include <algorithm>
 
 #include "pathtree/BPathTree.hpp"
-#include "pathtree/PackedComponents.hpp"
+#include "pathtree/ComponentArena.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Generators.hpp"
 #include "tests/support/Trees.hpp"
@@ -15,9 +15,9 @@ namespace {
 
 using tessel::BPathTree;
 using tessel::Component;
-using tessel::ComponentPacker;
+using tessel::ComponentArena;
+using tessel::ComponentList;
 using tessel::Components;
-using tessel::PackedComponents;
 using tessel::PathTrack;
 
 rc::Gen<Component> anyComponent() {
@@ -28,21 +28,21 @@ rc::Gen<Component> anyComponent() {
                  [](std::size_t length) { return Component(length, 0x5A); })}});
 }
 
-Components unpacked(const PackedComponents& list) {
+Components unpacked(const ComponentList& list) {
     Components components;
     for (const tessel::ComponentView value : list)
         components.emplace_back(value.begin(), value.end());
     return components;
 }
 
-RC_GTEST_PROP(PackedComponents, EqualListsOfComponents, ()) {
+RC_GTEST_PROP(ComponentArena, EqualListsOfComponents, ()) {
     const auto expected = *rc::gen::container<std::vector<Components>>(
         rc::gen::scale(0.2, rc::gen::container<Components>(anyComponent())));
-    ComponentPacker packer;
-    std::vector<PackedComponents> lists;
+    ComponentArena arena;
+    std::vector<ComponentList> lists;
     for (const Components& components : expected)
-        lists.push_back(support::packedBy(packer, components));
-    const auto buffers = packer.takeBuffers();
+        lists.push_back(support::packedBy(arena, components));
+    const auto buffers = arena.takeBuffers();
     for (std::size_t i = 0; i < expected.size(); ++i) {
         RC_ASSERT(lists[i].size() == expected[i].size());
         RC_ASSERT(lists[i].empty() == expected[i].empty());
@@ -54,23 +54,23 @@ RC_GTEST_PROP(PackedComponents, EqualListsOfComponents, ()) {
     }
 }
 
-TEST(PackedComponents, APackerIsAsNewAfterItsBuffersWereTaken) {
-    ComponentPacker packer;
-    const auto first = support::packedBy(packer, {{1, 2}, {3}});
-    const auto firstBuffers = packer.takeBuffers();
-    const auto second = support::packedBy(packer, {{4}});
+TEST(ComponentArena, AArenaIsAsNewAfterItsBuffersWereTaken) {
+    ComponentArena arena;
+    const auto first = support::packedBy(arena, {{1, 2}, {3}});
+    const auto firstBuffers = arena.takeBuffers();
+    const auto second = support::packedBy(arena, {{4}});
     EXPECT_EQ(unpacked(first), (Components{{1, 2}, {3}}));
     EXPECT_EQ(unpacked(second), (Components{{4}}));
 }
 
-TEST(PackedComponents, TheSlackBehindAComponentMayBeWritten) {
-    ComponentPacker packer;
+TEST(ComponentArena, TheSlackBehindAComponentMayBeWritten) {
+    ComponentArena arena;
     for (std::size_t length = 0; length < 3000; ++length) {
-        std::uint8_t* to = packer.extend(length);
-        std::fill_n(to, length + ComponentPacker::slack,
+        std::uint8_t* to = arena.extend(length);
+        std::fill_n(to, length + ComponentArena::slack,
                     static_cast<std::uint8_t>(length));
     }
-    const PackedComponents list = packer.finish();
+    const ComponentList list = arena.finish();
     std::size_t length = 0;
     for (const tessel::ComponentView value : list) {
         ASSERT_EQ(value.size(), length);
@@ -82,7 +82,7 @@ TEST(PackedComponents, TheSlackBehindAComponentMayBeWritten) {
 }
 
 // A batch that is inserted packed equals one that is inserted unpacked.
-RC_GTEST_PROP(PackedComponents, InsertionEqualsThatOfVectors, ()) {
+RC_GTEST_PROP(ComponentArena, InsertionEqualsThatOfVectors, ()) {
     const auto component =
         rc::gen::container<Component>(1, rc::gen::inRange<std::uint8_t>(0, 4));
     const auto batches =
@@ -99,9 +99,9 @@ RC_GTEST_PROP(PackedComponents, InsertionEqualsThatOfVectors, ()) {
         std::uint64_t first = 0;
         const bool plainExisted =
             plain.addPath(folderVectors, fileVectors, plainTrack, first);
-        ComponentPacker packer;
-        const auto folderList = support::packedBy(packer, folder);
-        const auto fileList = support::packedBy(packer, files);
+        ComponentArena arena;
+        const auto folderList = support::packedBy(arena, folder);
+        const auto fileList = support::packedBy(arena, files);
         PathTrack packedTrack;
         const BPathTree::AddedBatch added =
             packed.addBatch(folderList, fileList, packedTrack);

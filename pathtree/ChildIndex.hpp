@@ -13,17 +13,22 @@ namespace tessel {
 // Finds the first child with a given value, as a search from the front
 // would, without looking at every child of a wide folder.
 //
-// Two memories serve it: the children found last, which a sorted list of
-// paths asks for again and again, and for each wide folder a hash table from
-// value to first position. Children are only appended and never change, so
-// neither can become wrong; a table takes in the children that came since
-// its last use, whoever appended them. The finder must be cleared before
-// nodes that it has seen are released.
+//   asked first  | a cache of 64 children found last, one per slot: a sorted
+//                | list of paths asks for the same ones again and again
+//   then         | up to 8 children: a search from the front
+//                | more: a hash table from value to first position, one per
+//                | folder, made when the folder is first searched
 //
+// Children are only appended and never change, so neither cache nor table
+// can become wrong; a table takes in the children that came since its last
+// use, whoever appended them. Clear the index before nodes that it has seen
+// are released.
+//
+// Ownership: borrows the nodes.
 // Threads: none; one thread at a time.
-// Cost: a search takes constant time on average; the tables take 11 to 22
-//   bytes a child of the wide folders that were searched.
-class ChildFinder {
+// Cost: a search takes constant time on average. A table takes 11 to 26
+//   bytes per child.
+class ChildIndex {
 public:
     static constexpr std::size_t notFound = HashIndex::notFound;
 
@@ -40,7 +45,7 @@ public:
     void noteAppended(BNode& parent) noexcept;
 
     // Children in all tables.
-    std::size_t indexedChildren() const noexcept { return indexed_; }
+    std::size_t indexedChildren() const noexcept { return indexedChildren_; }
 
     // Forgets everything and releases the memory.
     void clear() noexcept;
@@ -53,7 +58,7 @@ private:
     class Table {
     public:
         // Takes in the children that it does not hold yet; returns how many.
-        std::size_t catchUp(const ChildList& children);
+        std::size_t indexNewChildren(const ChildList& children);
         std::size_t find(const ChildList& children, ComponentView value,
                          std::uint32_t hash) const;
         std::size_t memoryBytes() const noexcept {
@@ -62,20 +67,19 @@ private:
 
     private:
         HashIndex positions_;
-        std::size_t held_ = 0;  // children 0 to held - 1 are in
+        std::size_t size_ = 0;  // children [0, size_) are in
     };
 
-    struct LastFound {
+    struct CacheEntry {
         const BNode* parent = nullptr;
         Found found;
     };
-    static constexpr std::size_t lastFoundPlaces = 64;  // a power of two
 
-    LastFound& lastFoundIn(const BNode& parent) noexcept;
+    CacheEntry& cacheEntryOf(const BNode& parent) noexcept;
 
-    std::vector<LastFound> lastFound_;
+    std::vector<CacheEntry> cache_;
     std::unordered_map<const BNode*, Table> tables_;
-    std::size_t indexed_ = 0;
+    std::size_t indexedChildren_ = 0;
 };
 
 }  // namespace tessel

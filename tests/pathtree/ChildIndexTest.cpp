@@ -4,7 +4,7 @@
 #include <rapidcheck/gtest.h>
 
 #include "pathtree/BPathTree.hpp"
-#include "pathtree/ChildFinder.hpp"
+#include "pathtree/ChildIndex.hpp"
 #include "tests/support/Bytes.hpp"
 #include "tests/support/Trees.hpp"
 
@@ -12,7 +12,7 @@ namespace {
 
 using tessel::BNode;
 using tessel::BPathTree;
-using tessel::ChildFinder;
+using tessel::ChildIndex;
 using tessel::Component;
 using tessel::Components;
 using tessel::PathTrack;
@@ -24,19 +24,19 @@ Component nameOf(unsigned number, unsigned kinds) {
             static_cast<std::uint8_t>(kind >> 8)};
 }
 
-void compareFinder(ChildFinder& finder, const BPathTree& tree, BNode& parent,
-                   const Component& value) {
+void compareIndex(ChildIndex& index, const BPathTree& tree, BNode& parent,
+                  const Component& value) {
     const std::uint64_t expected = tree.findNode(value, parent.children());
-    const ChildFinder::Found found = finder.find(parent, value);
+    const ChildIndex::Found found = index.find(parent, value);
     RC_ASSERT(found.position == expected);
     if (expected != BPathTree::allOnes)
         RC_ASSERT(found.child == &parent.children()[found.position]);
 }
 
-RC_GTEST_PROP(ChildFinder, FindsWhatASearchFromTheFrontFinds, ()) {
+RC_GTEST_PROP(ChildIndex, FindsWhatASearchFromTheFrontFinds, ()) {
     BPathTree tree;
     support::addBatch(tree, {}, {"first", "second", "third"});
-    ChildFinder finder;
+    ChildIndex index;
     const auto kinds = *rc::gen::inRange(1U, 3000U);
     const auto rounds =
         *rc::gen::container<std::vector<std::pair<unsigned, unsigned>>>(
@@ -53,21 +53,21 @@ RC_GTEST_PROP(ChildFinder, FindsWhatASearchFromTheFrontFinds, ()) {
         std::uint64_t first = 0;
         tree.addPath(folder, files, track, first);
         for (unsigned i = 0; i < 10; ++i)
-            compareFinder(finder, tree, parent,
-                          nameOf(start / 3 + i * 11, kinds));
-        compareFinder(finder, tree, parent, {});
+            compareIndex(index, tree, parent,
+                         nameOf(start / 3 + i * 11, kinds));
+        compareIndex(index, tree, parent, {});
     }
     for (unsigned i = 0; i < kinds; i += 1 + kinds / 50)
-        compareFinder(finder, tree, tree.root->children()[i % 3],
-                      nameOf(i, kinds));
-    finder.clear();
-    RC_ASSERT(finder.memoryBytes() == 0U);
-    compareFinder(finder, tree, tree.root->children()[0], nameOf(1, kinds));
+        compareIndex(index, tree, tree.root->children()[i % 3],
+                     nameOf(i, kinds));
+    index.clear();
+    RC_ASSERT(index.memoryBytes() == 0U);
+    compareIndex(index, tree, tree.root->children()[0], nameOf(1, kinds));
 }
 
 // Insertion by the tree, its copies and whole batches in turn: each must
 // find what a search from the front finds, whoever added it.
-RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
+RC_GTEST_PROP(ChildIndex, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
     BPathTree tree;
     BPathTree copy(tree);
     const auto kinds = *rc::gen::inRange(1U, 300U);
@@ -76,7 +76,7 @@ RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
                                rc::gen::arbitrary<unsigned>()));
     for (const unsigned step : steps) {
         BPathTree& used = step % 3 == 0 ? copy : tree;
-        if (step % 11 == 0) used.releaseFinder();
+        if (step % 11 == 0) used.releaseChildIndex();
         if (step % 13 == 0) used.reset();
         const Component value = nameOf(step / 16, kinds);
         if (step % 5 == 0) {  // appended unseen, equal ones too
@@ -99,24 +99,24 @@ RC_GTEST_PROP(ChildFinder, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
     }
 }
 
-TEST(ChildFinder, AroundTheWidthWhereTablesBegin) {
+TEST(ChildIndex, AroundTheWidthWhereTablesBegin) {
     for (unsigned width = 1; width < 40; ++width) {
         BPathTree tree;
-        ChildFinder finder;
+        ChildIndex index;
         for (unsigned i = 0; i < width; ++i) {
             support::addBatch(tree, {}, {support::numbered("n", i)});
             for (unsigned k = 0; k <= i; ++k) {
-                const auto found = finder.find(
+                const auto found = index.find(
                     *tree.root, support::component(support::numbered("n", k)));
                 EXPECT_EQ(found.position, k);
             }
-            EXPECT_EQ(finder.find(*tree.root, support::component("x")).child,
+            EXPECT_EQ(index.find(*tree.root, support::component("x")).child,
                       nullptr);
         }
     }
 }
 
-TEST(ChildFinder, AFolderOfManyThousandsWithEqualNamesBetween) {
+TEST(ChildIndex, AFolderOfManyThousandsWithEqualNamesBetween) {
     BPathTree tree;
     constexpr unsigned count = 30000;
     constexpr unsigned kinds = 20000;
@@ -127,18 +127,18 @@ TEST(ChildFinder, AFolderOfManyThousandsWithEqualNamesBetween) {
     std::uint64_t first = 0;
     tree.addPath(folder, files, track, first);
     BNode& parent = tree.root->children()[0];
-    ChildFinder finder;
+    ChildIndex index;
     for (unsigned i = 0; i < kinds; ++i)
-        ASSERT_EQ(finder.find(parent, nameOf(i, kinds)).position, i);
-    EXPECT_EQ(finder.find(parent, nameOf(kinds, kinds + 1)).child, nullptr);
-    EXPECT_EQ(finder.indexedChildren(), count);
-    EXPECT_GT(finder.memoryBytes(), 8 * count);
-    finder.clear();
-    EXPECT_EQ(finder.indexedChildren(), 0U);
+        ASSERT_EQ(index.find(parent, nameOf(i, kinds)).position, i);
+    EXPECT_EQ(index.find(parent, nameOf(kinds, kinds + 1)).child, nullptr);
+    EXPECT_EQ(index.indexedChildren(), count);
+    EXPECT_GT(index.memoryBytes(), 8 * count);
+    index.clear();
+    EXPECT_EQ(index.indexedChildren(), 0U);
 }
 
 // So many names that some share all the bits of a hash that are kept.
-TEST(ChildFinder, NamesOfEqualHashAreToldApart) {
+TEST(ChildIndex, NamesOfEqualHashAreToldApart) {
     BPathTree tree;
     constexpr std::size_t count = 400000;
     for (std::size_t i = 0; i < count; ++i) {
@@ -149,7 +149,7 @@ TEST(ChildFinder, NamesOfEqualHashAreToldApart) {
     EXPECT_EQ(tree.root->children().size(), count);
 }
 
-TEST(ChildFinder, AWideFolderOfFoldersIsBuiltWithoutADuplicate) {
+TEST(ChildIndex, AWideFolderOfFoldersIsBuiltWithoutADuplicate) {
     BPathTree tree;
     for (int round = 0; round < 3; ++round) {
         for (unsigned i = 0; i < 3000; ++i) {

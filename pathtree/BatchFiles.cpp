@@ -1,0 +1,14 @@
+#include "pathtree/BatchFiles.hpp"
+
+#include <stdexcept>
+
+namespace tessel {
+
+const BNode& BatchFiles::childAt(const BNode& node, std::uint64_t position) {
+    const ChildList children = node.children();
+    if (position >= children.size())
+        throw std::out_of_range("A position leads outside the path tree.");
+    return children[static_cast<std::size_t>(position)];
+}
+
+}  // namespace tessel

@@ -1,0 +1,75 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <iterator>
+
+#include "pathtree/Component.hpp"
+
+namespace tessel {
+
+// A list of encoded components, one after the other in a buffer: a batch is
+// handed to the path tree without an allocation per component or per folder.
+//
+//   | length, 1 byte, or 0xFF and 8 bytes | the component's bytes | ...
+//
+// Ownership: a view. The ComponentBuffers that its ComponentArena filled must
+//   outlive it.
+class ComponentList {
+public:
+    class Iterator {
+    public:
+        using iterator_category = std::input_iterator_tag;
+        using value_type = ComponentView;
+        using difference_type = std::ptrdiff_t;
+        using pointer = void;
+        using reference = ComponentView;
+
+        explicit Iterator(const std::uint8_t* position) noexcept
+            : at_(position) {}
+        ComponentView operator*() const noexcept {
+            if (*at_ != longMark) return {at_ + 1, *at_};
+            std::uint64_t length = 0;
+            std::memcpy(&length, at_ + 1, sizeof length);
+            return {at_ + 1 + sizeof length, static_cast<std::size_t>(length)};
+        }
+        Iterator& operator++() noexcept {
+            const ComponentView here = **this;
+            at_ = here.data() + here.size();
+            return *this;
+        }
+        friend bool operator==(Iterator a, Iterator b) noexcept {
+            return a.at_ == b.at_;
+        }
+
+    private:
+        const std::uint8_t* at_;
+    };
+
+    ComponentList() noexcept = default;
+
+    std::size_t size() const noexcept { return count_; }
+    bool empty() const noexcept { return count_ == 0; }
+    Iterator begin() const noexcept { return Iterator(first_); }
+    Iterator end() const noexcept { return Iterator(first_ + byteCount_); }
+
+    // The whole list as it is in the buffer. Lists of equal components
+    // have equal bytes, and no others have.
+    ComponentView bytes() const noexcept { return {first_, byteCount_}; }
+
+private:
+    friend class ComponentArena;
+
+    static constexpr std::uint8_t longMark = 0xFF;
+
+    ComponentList(const std::uint8_t* start, std::size_t length,
+                  std::size_t components) noexcept
+        : first_(start), byteCount_(length), count_(components) {}
+
+    const std::uint8_t* first_ = nullptr;
+    std::size_t byteCount_ = 0;
+    std::size_t count_ = 0;
+};
+
+}  // namespace tessel

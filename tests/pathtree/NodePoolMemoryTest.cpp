@@ -1,0 +1,48 @@
+// What names of any length take, beside what the tree says that they take.
+
+#include <gtest/gtest.h>
+#include <malloc.h>
+
+#include "pathtree/BPathTree.hpp"
+#include "tests/support/Trees.hpp"
+
+namespace {
+
+using tessel::BPathTree;
+using tessel::Components;
+
+// What the allocator has taken from the system, free pieces included.
+std::size_t heapBytes() {
+    const struct mallinfo2 info = mallinfo2();
+    return info.arena + info.hblkhd;
+}
+
+class NameLengths : public ::testing::TestWithParam<std::size_t> {};
+
+// Free pieces between slabs would count here, though no account has them.
+TEST_P(NameLengths, TakeWhatTheTreeSays) {
+    constexpr std::size_t total = std::size_t{16} << 20;
+    const std::size_t length = GetParam();
+    malloc_trim(0);
+    const std::size_t before = heapBytes();
+    BPathTree tree;
+    for (std::size_t i = 0; i < total / length; ++i) {
+        Components folder = {{1}};
+        Components files = {tessel::Component(length, 2)};
+        tessel::PathTrack track;
+        std::uint64_t first = 0;
+        tree.addPath(folder, files, track, first);
+    }
+    const BPathTree::MemoryUsage usage = tree.memoryUsage();
+    EXPECT_EQ(usage.names, total / length * length + 1);
+    const std::size_t said =
+        usage.names + usage.nodes + usage.childLists + usage.childIndex;
+    EXPECT_LE(heapBytes() - before, said + said / 4);
+    EXPECT_LE(said, total + total / 4 + total / length * 24);
+}
+
+INSTANTIATE_TEST_SUITE_P(Bytes, NameLengths,
+                         ::testing::Values(100, 1000, 1025, 3000, 4060, 4100,
+                                           5000, 9000, 16000, 16400, 40000));
+
+}  // namespace
