@@ -33,19 +33,15 @@ public:
     // The last folder that at() returned.
     std::string_view folder() const noexcept { return {folder_, length_}; }
 
-    // Whether at(folder) decodes nothing or one folder.
-    bool isNear(std::uint32_t folder) const noexcept {
-        return folder + 1 - next_ <= 1 && next_ < blockEnd_;
-    }
-
     // Whether the block holds nothing more than padding of less than a byte.
-    bool isAtEnd() const noexcept;
+    bool isAtEnd() const noexcept { return PieceDecoder::isAtEnd(position_); }
 
 private:
     void start(std::uint32_t folder);
     void decodeNext();
-    unsigned takePrefix();
+    unsigned takePrefix(Position& at) const;
 
+    Position position_;
     char* folder_;
     const char* limit_;
     std::size_t length_ = 0;

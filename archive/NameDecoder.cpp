@@ -2,52 +2,50 @@
 
 namespace tessel::archive {
 
-// Returns the prefix length.
-unsigned NameDecoder::takeRareOperation(unsigned symbol) {
-    unsigned prefix = 0;
+// By value, so that the caller's position stays in registers.
+NameDecoder::Position NameDecoder::takeRareOperation(Position at,
+                                                     unsigned symbol,
+                                                     unsigned& prefix) {
+    prefix = 0;
     switch (symbol) {
         case operationLongPrefix:
-            prefix = takeLongPrefix();
+            prefix = takeLongPrefix(at);
             if (prefix > length_)
-                fail("A name shares more than its predecessor has.");
+                fail(at, "A name shares more than its predecessor has.");
             break;
         case operationNextFolder:
-            takeNextFolder();
+            takeNextFolder(at);
             break;
         case operationJump:
-            takeJump();
+            takeJump(at);
             break;
         default:
-            fail("An operation has no code.");
+            fail(at, "An operation has no code.");
     }
     previous_ = symbol;
     context_ = operationContexts[symbol];
-    return prefix;
+    return at;
 }
 
-void NameDecoder::takeNextFolder() {
-    if (seen_ >= segment_->head().folders)
-        fail("A name is in a folder after the last one.");
+void NameDecoder::takeNextFolder(const Position& at) {
+    if (seen_ >= head().folders)
+        fail(at, "A name is in a folder after the last one.");
     folder_ = seen_++;
 }
 
-void NameDecoder::takeJump() {
-    // A distance is less than the number of folders, which is below 2^23.
+void NameDecoder::takeJump(Position& at) {
+    // A distance is at most the number of folders, which is below 2^23.
     constexpr unsigned maxDistanceBits = 23;
-    std::uint64_t bits = word();
+    std::uint64_t bits = word(at);
     const auto [width, widthBits] =
-        tables_->operationCode(jumpCode).decode(bits);
-    if (width > maxDistanceBits) fail("A jump is too long.");
+        tables().operationCode(jumpCode).decode(bits);
+    if (width > maxDistanceBits) fail(at, "A jump is too long.");
     bits <<= widthBits;
-    bit_ += widthBits + width;
+    at.bit += widthBits + width;
     const std::uint64_t rest = width == 0 ? 0 : bits >> (64 - width);
     const std::uint64_t distance = (std::uint64_t{1} << width) + rest;
-    if (distance > seen_) fail("A jump leads before the first folder.");
+    if (distance > seen_) fail(at, "A jump leads before the first folder.");
     folder_ = seen_ - static_cast<std::uint32_t>(distance);
-}
-
-bool NameDecoder::isAtEnd() const noexcept {
-    return bit_ <= end_ && end_ - bit_ < 8;
 }
 
 }  // namespace tessel::archive

@@ -26,7 +26,7 @@ public:
 
     // Goes to the start of a block, before its first name.
     void start(const Segment::NameBlock& block) noexcept {
-        startAt(block);
+        position_ = startOf(block);
         seen_ = block.seen;
         folder_ = block.seen - 1;
         length_ = 0;
@@ -48,15 +48,17 @@ public:
     std::uint32_t seen() const noexcept { return seen_; }
 
     // Whether the block holds nothing more than padding of less than a byte.
-    bool isAtEnd() const noexcept;
+    bool isAtEnd() const noexcept { return PieceDecoder::isAtEnd(position_); }
 
 private:
-    unsigned takePrefix();
-    unsigned takeRareOperation(unsigned symbol);
-    void takeNextFolder();
-    void takeJump();
-    char* takeShortened(unsigned prefix);
+    unsigned takePrefix(Position& at);
+    Position takeRareOperation(Position at, unsigned symbol, unsigned& prefix);
+    void takeNextFolder(const Position& at);
+    void takeJump(Position& at);
+    char* takeShortened(Position& at, unsigned prefix) const;
+    char* takeRest(Position& at, unsigned context, char* out) const;
 
+    Position position_;
     char* name_;
     const char* limit_;
     std::size_t length_ = 0;
@@ -68,34 +70,50 @@ private:
 
 // ---- Hot paths ----
 
-inline unsigned NameDecoder::takePrefix() {
-    const auto [symbol, bits] = tables_->operationCode(context_).decode(word());
-    bit_ += bits;
-    if (symbol > maxShortPrefix) return takeRareOperation(symbol);
+[[gnu::always_inline]] inline unsigned NameDecoder::takePrefix(Position& at) {
+    const auto [symbol, bits] =
+        tables().operationCode(context_).decode(word(at));
+    at.bit += bits;
+    if (symbol > maxShortPrefix) {
+        unsigned prefix = 0;
+        at = takeRareOperation(at, symbol, prefix);
+        return prefix;
+    }
     const unsigned operation = operationOfSymbol(symbol, previous_);
     previous_ = operation;
     context_ = operationContexts[operation];
     if (operation > length_) [[unlikely]]
-        fail("A name shares more than its predecessor has.");
+        fail(at, "A name shares more than its predecessor has.");
     return operation;
 }
 
+// The tokens up to the name's end.
+[[gnu::always_inline]] inline char* NameDecoder::takeRest(Position& at,
+                                                          unsigned context,
+                                                          char* out) const {
+    const auto codeOf = [this](unsigned c) -> const auto& {
+        return tables().nameCode(c);
+    };
+    return takeTokens(at, context, codeOf, nameContexts, out, limit_);
+}
+
 // The name goes on with another byte than its predecessor, or ends.
-inline char* NameDecoder::takeShortened(unsigned prefix) {
+[[gnu::always_inline]] inline char* NameDecoder::takeShortened(
+    Position& at, unsigned prefix) const {
     const unsigned context =
         prefix == length_
             ? replacedEnd
             : replacedContexts[static_cast<std::uint8_t>(name_[prefix])];
-    const std::uint64_t bits = word();
-    const auto [byte, byteBits] = tables_->replacedCode(context).decode(bits);
-    bit_ += byteBits;
+    const std::uint64_t bits = word(at);
+    const auto [byte, byteBits] = tables().replacedCode(context).decode(bits);
+    at.bit += byteBits;
     char* out = name_ + prefix;
     if (byte == 0) return out;
-    const auto* const first = tables_->firstToken(byte);
+    const auto* const first = tables().firstToken(byte);
     if (first == nullptr) [[unlikely]]
-        fail("A name goes on with a byte that has no code.");
+        fail(at, "A name goes on with a byte that has no code.");
     const Token token = first->code.decode(bits << byteBits);
-    bit_ += token.codeBits();
+    at.bit += token.codeBits();
     unsigned next = token.context();
     if (token.isEscape()) {
         *out++ = static_cast<char>(first->byte);
@@ -104,17 +122,18 @@ inline char* NameDecoder::takeShortened(unsigned prefix) {
         out = append(token, out);
     }
     if (out > limit_) [[unlikely]]
-        fail("A name is longer than the longest.");
+        fail(at, "A name is longer than the longest.");
     if (token.ends()) return out;
-    return takeTokens(next, nameContexts, out, limit_);
+    return takeRest(at, next, out);
 }
 
 inline void NameDecoder::next() {
-    const unsigned prefix = takePrefix();
-    const char* const end =
-        prefix == 0 ? takeTokens(NameStart, nameContexts, name_, limit_)
-                    : takeShortened(prefix);
+    Position at = position_;
+    const unsigned prefix = takePrefix(at);
+    const char* const end = prefix == 0 ? takeRest(at, NameStart, name_)
+                                        : takeShortened(at, prefix);
     length_ = static_cast<std::size_t>(end - name_);
+    position_ = at;
 }
 
 }  // namespace tessel::archive

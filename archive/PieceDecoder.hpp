@@ -28,41 +28,51 @@ public:
     static constexpr std::size_t slack = 32;
 
 protected:
+    // Where in the segment's bits a decoder is. Steps work on a local copy,
+    // which stays in registers: a member would have to be stored and loaded
+    // again around every byte that is written.
+    struct Position {
+        std::uint64_t bit = 0;
+        std::uint64_t end = 0;  // of the block
+    };
+
     PieceDecoder(const Segment& segment, Section section)
         : segment_(&segment),
           tables_(&segment.tables()),
           stream_(segment.dataOf(section)),
           section_(section) {}
 
-    void startAt(const Segment::Block& block) noexcept {
-        bit_ = std::uint64_t{block.begin} * 8;
-        end_ = std::uint64_t{block.end} * 8;
+    static Position startOf(const Segment::Block& block) noexcept {
+        return {std::uint64_t{block.begin} * 8, std::uint64_t{block.end} * 8};
     }
 
-    // At least bitsPerLoad bits from the current position on.
-    std::uint64_t word() const {
-        if (bit_ > end_) [[unlikely]]
-            fail("A block's bits go on after its end.");
-        return loadBits(stream_, bit_);
+    // At least bitsPerLoad bits from the position on.
+    std::uint64_t word(const Position& at) const {
+        if (at.bit > at.end) [[unlikely]]
+            fail(at, "A block's bits go on after its end.");
+        return loadBits(stream_, at.bit);
     }
 
     // Decodes tokens, from the one in this context up to one that ends the
-    // piece, to `out`. Returns the end of the output, which is at most
-    // `limit`.
-    [[gnu::always_inline]] char* takeTokens(unsigned context,
+    // piece, to `out`. codeOf(context) is the code of a context. Returns the
+    // end of the output, which is at most `limit`.
+    template <class CodeOf>
+    [[gnu::always_inline]] char* takeTokens(Position& at, unsigned context,
+                                            CodeOf codeOf,
                                             const ContextTable& contexts,
-                                            char* out, const char* limit) {
+                                            char* out,
+                                            const char* limit) const {
         for (;;) {
-            const Token token = tables_->tokenCode(context).decode(word());
-            bit_ += token.codeBits();
+            const Token token = codeOf(context).decode(word(at));
+            at.bit += token.codeBits();
             out = append(token, out);
             if (out > limit) [[unlikely]]
-                fail("A name or folder is longer than the longest.");
+                fail(at, "A name or folder is longer than the longest.");
             if (token.ends()) return out;
             context = token.context();
             if (token.isEscape()) [[unlikely]] {
-                const auto byte = static_cast<std::uint8_t>(word() >> 56U);
-                bit_ += 8;
+                const auto byte = static_cast<std::uint8_t>(word(at) >> 56U);
+                at.bit += 8;
                 if (byte == 0) return out;
                 *out++ = static_cast<char>(byte);
                 context = contexts[byte];
@@ -80,20 +90,26 @@ protected:
     }
 
     // The rest of a prefix length above maxShortPrefix (Elias's gamma code).
-    unsigned takeLongPrefix();
+    unsigned takeLongPrefix(Position& at) const;
 
-    [[noreturn]] void fail(const char* what) const {
-        segment_->fail(section_, bit_ / 8, what);
+    // Whether nothing more than padding of less than a byte follows.
+    static bool isAtEnd(const Position& at) noexcept {
+        return at.bit <= at.end && at.end - at.bit < 8;
     }
 
-    // NOLINTBEGIN(cppcoreguidelines-non-private-member-variables-in-classes)
+    [[noreturn]] void fail(const Position& at, const char* what) const {
+        segment_->fail(section_, at.bit / 8, what);
+    }
+
+    const SegmentTables& tables() const noexcept { return *tables_; }
+    const SegmentHead& head() const noexcept { return segment_->head(); }
+    const Segment& segment() const noexcept { return *segment_; }
+
+private:
     const Segment* segment_;
     const SegmentTables* tables_;
     const std::uint8_t* stream_;
-    std::uint64_t bit_ = 0;
-    std::uint64_t end_ = 0;  // of the block
     Section section_;
-    // NOLINTEND(cppcoreguidelines-non-private-member-variables-in-classes)
 };
 
 }  // namespace tessel::archive

@@ -74,13 +74,15 @@ SegmentTables::SegmentTables(const SegmentHead& head,
 void SegmentTables::unpackTokenCodes(std::span<const std::uint8_t> section,
                                      std::uint32_t& entries) {
     ByteCursor cursor(section);
-    tokenCodes_.reserve(tokenContextCount);
+    nameCodes_.reserve(FolderStart);
+    folderCodes_.reserve(tokenContextCount - FolderStart);
     for (unsigned context = 0; context < tokenContextCount; ++context) {
         const std::uint32_t first = entries;
         const CodePlaces places = takeCode(cursor, entries, tokens_);
-        const auto& contexts =
-            context < FolderStart ? nameContexts : folderContexts;
-        tokenCodes_.emplace_back(places, first, tokens_, contexts);
+        if (context < FolderStart)
+            nameCodes_.emplace_back(places, first, tokens_, nameContexts);
+        else
+            folderCodes_.emplace_back(places, first, tokens_, folderContexts);
     }
     require(cursor.empty());
 }

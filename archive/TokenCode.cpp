@@ -28,7 +28,7 @@ void TokenList::validate() const {
 
 // Codes count up within a length; each further length doubles them first.
 CodePlaces::CodePlaces(const CountTable& counts) noexcept {
-    if (counts.maxLength == 0) lastCode_[0] = ~std::uint32_t{0};
+    lastCode_.fill(~std::uint32_t{0});  // no code is longer than the longest
     std::uint64_t code = 0;
     std::uint32_t place = 0;
     for (unsigned bits = 1; bits <= counts.maxLength; ++bits) {

@@ -91,16 +91,25 @@ public:
     // The code, of at least `bits` and shortest() bits, at the top of the word.
     Decoded find(std::uint64_t word, unsigned bits) const noexcept {
         const auto top = static_cast<std::uint32_t>(word >> 32U);
-        while (top > lastCode_[bits]) ++bits;
+        // Most codes are at most three bits longer. Counting is faster than a
+        // loop, whose end the processor cannot guess.
+        bits += isLonger(top, bits) + isLonger(top, bits + 1) +
+                isLonger(top, bits + 2);
+        while (isLonger(top, bits) != 0) ++bits;
         const std::uint32_t code =
             bits == 0 ? 0 : static_cast<std::uint32_t>(word >> (64 - bits));
         return {placeOffset_[bits] + code, bits};
     }
 
 private:
+    // 1 if the code at the top has more than so many bits, otherwise 0.
+    unsigned isLonger(std::uint32_t top, unsigned bits) const noexcept {
+        return static_cast<unsigned>(top > lastCode_[bits]);
+    }
+
     // By length: the last code, as the top of a word with ones after it; and
     // the place of the first code less the code itself, which may wrap.
-    std::array<std::uint32_t, maxTokenCodeBits + 1> lastCode_{};
+    std::array<std::uint32_t, maxTokenCodeBits + 4> lastCode_;
     std::array<std::uint32_t, maxTokenCodeBits + 1> placeOffset_{};
     unsigned shortest_ = 0;
 };
