@@ -99,4 +99,20 @@ inline Paths nastyPaths() {
     return paths;
 }
 
+// An archive in memory, open for reading its parts.
+class OpenArchive {
+public:
+    explicit OpenArchive(const Paths& paths,
+                         const tessel::ArchiveOptions& options = {})
+        : reader_(tessel::archive::ArchiveBytes(archiveOf(paths, options))) {}
+
+    const tessel::archive::ArchiveReader& reader() const { return reader_; }
+    const tessel::archive::Segment& segment() const {
+        return reader_.segment(0);
+    }
+
+private:
+    tessel::archive::ArchiveReader reader_;
+};
+
 }  // namespace archives

@@ -1,0 +1,106 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <span>
+#include <string>
+
+#include "archive/ArchiveExceptions.hpp"
+#include "archive/Segment.hpp"
+#include "tests/archive/Archives.hpp"
+
+namespace tessel::archive {
+namespace {
+
+using archives::archiveOf;
+using archives::OpenArchive;
+
+SegmentEntry onlyEntry(const archives::Bytes& bytes) {
+    const FileHeader header = FileHeader::unpack(bytes);
+    return SegmentEntry::unpack(
+        std::span(bytes).subspan(header.directoryOffset), 0);
+}
+
+// Opens the only segment of an archive after `change` was made to its bytes.
+template <class Change>
+void openChanged(Change change) {
+    archives::Bytes bytes = archiveOf(archives::sortedPaths(500));
+    const SegmentEntry entry = onlyEntry(bytes);
+    change(bytes, entry);
+    const Segment segment(std::span(bytes).subspan(entry.offset, entry.bytes),
+                          entry);
+    segment.tables();
+}
+
+TEST(Segment, BlocksFollowEachOther) {
+    const OpenArchive archive(archives::sortedPaths(5000));
+    const Segment& segment = archive.segment();
+    std::uint32_t end = 0;
+    std::uint32_t seen = 0;
+    for (std::uint32_t b = 0; b < segment.nameBlocks(); ++b) {
+        const Segment::NameBlock block = segment.nameBlock(b);
+        EXPECT_EQ(block.begin, end);
+        EXPECT_GE(block.seen, seen);
+        EXPECT_EQ(block.seen, segment.seenBefore(b));
+        end = block.end;
+        seen = block.seen;
+    }
+    EXPECT_EQ(end, segment.bytesOf(Section::Names));
+    end = 0;
+    for (std::uint32_t b = 0; b < segment.folderBlocks(); ++b) {
+        EXPECT_EQ(segment.folderBlock(b).begin, end);
+        end = segment.folderBlock(b).end;
+    }
+    EXPECT_EQ(end, segment.bytesOf(Section::Folders));
+}
+
+TEST(Segment, WideBlocksFollowEachOther) {
+    archives::Paths paths = archives::sortedPaths(300);
+    for (int i = 0; i < 20; ++i)
+        paths[i * 7] = std::string(5000 + i * 37, 'w') + std::to_string(i);
+    std::ranges::sort(paths);
+    const OpenArchive archive(paths);
+    const Segment& segment = archive.segment();
+    ASSERT_GT(segment.bytesOf(Section::WideGroups), 0U);
+    std::uint32_t end = 0;
+    for (std::uint32_t b = 0; b < segment.nameBlocks(); ++b) {
+        EXPECT_EQ(segment.nameBlock(b).begin, end);
+        end = segment.nameBlock(b).end;
+    }
+    EXPECT_EQ(end, segment.bytesOf(Section::Names));
+}
+
+TEST(Segment, RefusesPlacesOutsideASection) {
+    const OpenArchive archive(archives::sortedPaths(100));
+    const Segment& segment = archive.segment();
+    const std::uint64_t bytes = segment.bytesOf(Section::Names);
+    EXPECT_NO_THROW(segment.require(Section::Names, 0, bytes));
+    EXPECT_NO_THROW(segment.require(Section::Names, bytes, 0));
+    EXPECT_THROW(segment.require(Section::Names, 0, bytes + 1),
+                 DamagedArchiveException);
+    EXPECT_THROW(segment.require(Section::Names, bytes + 1, 0),
+                 DamagedArchiveException);
+    EXPECT_THROW(segment.require(Section::Names, 1, ~std::uint64_t{0}),
+                 DamagedArchiveException);
+}
+
+TEST(Segment, RefusesADamagedHeadChecksumOrTable) {
+    EXPECT_NO_THROW(openChanged([](auto&, auto&) {}));
+    EXPECT_THROW(openChanged([](auto& bytes, auto& entry) {
+                     bytes[entry.offset + 20] ^= 1;
+                 }),
+                 DamagedArchiveException);
+    EXPECT_THROW(openChanged([](auto& bytes, auto& entry) {
+                     bytes[entry.offset + segmentHeadBytes] ^= 1;
+                 }),
+                 DamagedArchiveException);
+    EXPECT_THROW(openChanged([](auto& bytes, auto& entry) {
+                     const auto head = SegmentHead::unpack(
+                         std::span(bytes).subspan(entry.offset));
+                     bytes[entry.offset + entry.bytes - head.bodyBytes()] ^= 1;
+                 }),
+                 DamagedArchiveException);
+}
+
+}  // namespace
+}  // namespace tessel::archive
