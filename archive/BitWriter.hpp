@@ -42,7 +42,7 @@ private:
     void flushWord() {
         pendingBits_ -= 32;
         const auto word = static_cast<std::uint32_t>(pending_ >> pendingBits_);
-        if (size_ + 4 > bytes_.size()) bytes_.resize(2 * size_ + 64);
+        if (size_ + 4 > bytes_.size()) grow();
         std::uint8_t* out = bytes_.data() + size_;
         out[0] = static_cast<std::uint8_t>(word >> 24U);
         out[1] = static_cast<std::uint8_t>(word >> 16U);
@@ -52,9 +52,12 @@ private:
     }
 
     void append(std::uint8_t byte) {
-        if (size_ == bytes_.size()) bytes_.resize(2 * size_ + 64);
+        if (size_ == bytes_.size()) grow();
         bytes_[size_++] = byte;
     }
+
+    // Makes room for at least four bytes more.
+    void grow();
 
     std::vector<std::uint8_t> bytes_;  // grown ahead of size_
     std::size_t size_ = 0;

@@ -152,16 +152,17 @@ std::vector<Piece> drawSample(const FrontCoder& list, std::uint64_t bytes) {
     const std::uint64_t drawn = std::min(bytes, all);
     std::vector<Piece> sample;
     std::uint64_t due = all / 2;
-    const auto offer = [&](const Piece& piece) {
+    const auto isDrawn = [&] {
         due += drawn;
-        if (due < all) return;
+        if (due < all) return false;
         due -= all;
-        sample.push_back(piece);
+        return true;
     };
     for (std::size_t place = 0; place < list.names(); ++place)
-        if (list.hasPiece(place)) offer(list.namePiece(place));
+        if (list.hasPiece(place) && isDrawn())
+            sample.push_back(list.namePiece(place));
     for (std::size_t number = 0; number < list.folders(); ++number)
-        offer(list.folderPiece(number));
+        if (isDrawn()) sample.push_back(list.folderPiece(number));
     return sample;
 }
 

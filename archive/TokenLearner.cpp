@@ -266,22 +266,23 @@ void Learner::replacePairs(Sequence& sequence) const {
 // ---- Result ----
 
 TokenUses Learner::countUses() const {
-    TokenUses uses(tokens_.size());
-    for (std::size_t shard = 0; shard < shards; ++shard) {
+    std::vector<TokenUses> uses(workers_.count(), TokenUses(tokens_.size()));
+    workers_.run(shards, [&](std::size_t shard, unsigned worker) {
         const std::uint16_t* token = sequences_[shard].data();
         for (const Piece& piece : shardOf(shard)) {
             const ContextTable& after =
                 piece.folder ? folderContexts : nameContexts;
             std::uint8_t context = piece.context;
             for (; *token != separator; ++token) {
-                uses.add(TokenRef::token(*token, context));
+                uses[worker].add(TokenRef::token(*token, context));
                 context =
                     after[static_cast<std::uint8_t>(tokens_[*token].back())];
             }
             ++token;
         }
-    }
-    return uses;
+    });
+    for (std::size_t w = 1; w < uses.size(); ++w) uses.front() += uses[w];
+    return std::move(uses.front());
 }
 
 }  // namespace
