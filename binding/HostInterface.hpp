@@ -80,7 +80,7 @@ using HostSignature = HostOpaque<struct HostSignatureTag>;
 using HostPackage = HostOpaque<struct HostPackageTag>;
 using HostClass = HostOpaque<struct HostClassTag>;
 // An interned name: equal texts give equal pointers, as long as the host lives.
-// The null name, a null pointer, stands for the empty text.
+// The null name, a null pointer, is that of the empty text.
 using HostName = const HostOpaque<struct HostNameTag>*;
 
 // A message argument of an error.
@@ -163,7 +163,7 @@ public:
 };
 
 // HostClassInfo describes one class: its name, its members, and what becomes of
-// the native object behind each instance.
+// the native object of each instance.
 //
 // Ownership: the host owns it from hostRegisterClass on and deletes it while
 //   the module that made it is still loaded, when no instance is left.

@@ -81,6 +81,8 @@ class Array : public HostArray {
 public:
     Array(const Array&) = delete;
     Array& operator=(const Array&) = delete;
+    // For drop() alone.
+    virtual ~Array() = default;
 
     ValueClass valueClass() const noexcept { return valueClass_; }
     const Shape& shape() const noexcept { return shape_; }
@@ -115,7 +117,6 @@ public:
 protected:
     Array(ValueClass valueClass, Shape shape) noexcept
         : valueClass_(valueClass), shape_(std::move(shape)) {}
-    virtual ~Array() = default;
 
 private:
     // Destroys the array and releases its block.
@@ -143,6 +144,10 @@ public:
         return new (block) InlineArray(valueClass, std::move(shape));
     }
 
+    InlineArray(const InlineArray&) = delete;
+    InlineArray& operator=(const InlineArray&) = delete;
+    ~InlineArray() override { std::destroy_n(data(), numel()); }
+
     std::span<const Element> elements() const noexcept {
         return {data(), numel()};
     }
@@ -168,8 +173,6 @@ private:
         : Array(valueClass, std::move(shape)) {
         std::uninitialized_value_construct_n(data(), numel());
     }
-    ~InlineArray() override { std::destroy_n(data(), numel()); }
-
     void destroy() const noexcept override {
         auto* const block = const_cast<InlineArray*>(this);
         const std::size_t size = sizeFor(numel());
@@ -212,8 +215,6 @@ public:
     Content content;
 
 private:
-    ~ContainerArray() override = default;
-
     void destroy() const noexcept override { delete this; }
 };
 

@@ -39,6 +39,7 @@ public:
     }
 };
 
+// NOLINTNEXTLINE(cppcoreguidelines-avoid-non-const-global-variables)
 constinit thread_local BlockPool::Lists BlockPool::lists_;
 
 bool BlockPool::isOpen() noexcept {

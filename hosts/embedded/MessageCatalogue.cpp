@@ -17,8 +17,8 @@ std::string componentOf(const std::filesystem::path& relative) {
     return component + relative.stem().string();
 }
 
-// The number that {number} at the start of a text stands for, and the length
-// of all of it; length 0 if there is no placeholder.
+// A placeholder {number} at the start of a text: its number and its length with
+// the braces; length 0 if there is none.
 struct Placeholder {
     std::size_t number = 0;
     std::size_t length = 0;

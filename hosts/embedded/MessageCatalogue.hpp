@@ -20,9 +20,10 @@ public:
 // MessageCatalogue holds the texts of messages, by identifier.
 //
 // It is a folder of text files. The file A/B/c.messages has the messages of the
-// component A:B:c, one a line: the key, a colon, the text. {0}, {1} and so on
-// stand for arguments. Lines that are blank or start with # say nothing.
-// Threads: fixed once made.
+// component A:B:c, one per line: the key, a colon, a blank, the text. {0}, {1}
+// and so on are replaced by arguments. Blank lines and lines that start with #
+// are ignored.
+// Threads: any number of readers; it never changes.
 class MessageCatalogue {
 public:
     // Reads all files of the folder. Throws CatalogueException if there is no

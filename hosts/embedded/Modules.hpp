@@ -12,8 +12,8 @@ namespace tessel::embedded {
 
 // Module is one module file in memory.
 //
-// Ownership: owns the loader's handle, and gives it back with itself; whatever
-//   still has code in the module must be gone by then.
+// Ownership: owns the loader's handle and closes it in its destructor; by then,
+//   everything whose code is in the module must be deleted.
 class Module {
 public:
     Module(std::filesystem::path path, void* handle)
@@ -45,8 +45,8 @@ public:
 
     // Loads a module file and calls its entry. For a module that is loaded
     // already it only calls the entry. Raises moduleMissing, moduleUnreadable,
-    // interfaceMissing, entryMissing or entryFailed; what is not loaded
-    // completely is gone, with all it registered.
+    // interfaceMissing, entryMissing or entryFailed; a module that failed is
+    // unloaded again, and its classes are removed.
     void load(const std::filesystem::path& file);
 
     // Removes the classes of a module, or removes them and unloads it. Raises

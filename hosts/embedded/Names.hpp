@@ -20,7 +20,7 @@ private:
 
 // NameTable keeps each text once, so that names can be compared as pointers.
 //
-// Ownership: the table owns the names; none goes before the table.
+// Ownership: owns the names, which live as long as the table.
 class NameTable {
 public:
     // The name of a text; null for the empty text.

@@ -116,7 +116,7 @@ public:
     // Adds the field to all elements if it is new.
     void setField(std::string_view name, Value value, std::size_t index = 0);
 
-    // A value with an array of its own, which is changed as nobody else's.
+    // A copy that shares no array with this value.
     Value clone() const { return Value(shown().clone()); }
 
     // Equal class, dimensions and elements; instances by identity.
@@ -167,7 +167,7 @@ private:
 
     static Value complexOrReal(Shape shape, std::vector<double> parts,
                                bool isComplex);
-    // What a null pointer stands for; never changed, never deleted.
+    // The array of a value without one; never changed, never deleted.
     static const Array& empty() noexcept;
 
     const Array& shown() const noexcept {

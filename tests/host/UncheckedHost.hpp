@@ -18,7 +18,7 @@ namespace unchecked {
 // Counts those of a kind that are alive.
 class Counted {
 public:
-    explicit Counted(long& aliveCount) : alive_(aliveCount) { ++alive_; }
+    explicit Counted(long& alive) : alive_(alive) { ++alive_; }
     Counted(const Counted&) = delete;
     Counted& operator=(const Counted&) = delete;
     ~Counted() { --alive_; }
@@ -30,7 +30,7 @@ private:
 // An array of any class; which of the parts counts is up to its user.
 class Box final : public tessel::HostArray {
 public:
-    explicit Box(long& aliveCount) : counted_(aliveCount) {}
+    explicit Box(long& alive) : counted_(alive) {}
 
     std::vector<std::size_t> dimensions = {0, 0};
     bool isCell = false;
@@ -56,7 +56,7 @@ public:
 
 class Signature final : public tessel::HostSignature {
 public:
-    explicit Signature(long& aliveCount) : counted_(aliveCount) {}
+    explicit Signature(long& alive) : counted_(alive) {}
     std::vector<std::string> calls;
 
 private:
@@ -65,7 +65,7 @@ private:
 
 // What this host throws when it raises an error.
 struct Raised : std::exception {
-    explicit Raised(std::string errorText) : text(std::move(errorText)) {}
+    explicit Raised(std::string what) : text(std::move(what)) {}
     const char* what() const noexcept override { return text.c_str(); }
     std::string text;
 };

@@ -53,8 +53,8 @@ std::size_t heapBytes() {
 
 }  // namespace
 
-HostJob::HostJob(Host& jobHost, const paths::PathList& pathList)
-    : host_(jobHost), list_(pathList), splitter_(pathList) {}
+HostJob::HostJob(Host& host, const paths::PathList& list)
+    : host_(host), list_(list), splitter_(list) {}
 
 JobResults HostJob::run() {
     results_ = {};
@@ -223,7 +223,7 @@ void HostJob::compareInOrder(std::size_t number, std::u16string_view joined,
     throw DifferenceException(
         route + ": path " + std::to_string(number) + " should be\n" +
         std::string(number <= list_.size() ? list_[number - 1]
-                                           : "(behind the last)") +
+                                           : "(after the last)") +
         "\nand is\n" + path);
 }
 

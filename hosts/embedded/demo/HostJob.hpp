@@ -42,7 +42,7 @@ public:
 // Ownership: refers to the host and the list, which must outlive it.
 class HostJob {
 public:
-    HostJob(Host& jobHost, const paths::PathList& pathList);
+    HostJob(Host& host, const paths::PathList& list);
 
     // Throws DifferenceException, and HostException as the host raises it.
     JobResults run();
