@@ -1,7 +1,5 @@
 #include "binding/PathCells.hpp"
 
-#include <ranges>
-
 #include "binding/Conversions.hpp"
 #include "coder/PathRetrieval.hpp"
 
@@ -11,12 +9,6 @@ namespace {
 
 // Names from the tree, in lists of views.
 using NameViews = std::span<const ComponentView>;
-
-// Each number is judged when its turn comes: those after the last path are
-// ignored, whatever they are.
-auto pathNumbers(const std::vector<double>& numbers) {
-    return std::views::transform(numbers, PathRetrieval::pathNumberOf);
-}
 
 }  // namespace
 
@@ -115,7 +107,7 @@ PathCells::FoldersAndFiles PathCells::foldersAndFiles(
     if (hasTracksOnly())
         return {columns(foldersByTrack(numbers)), createCell(0, 1)};
     Collector collector;
-    coder_.visitPaths(pathNumbers(numbers), collector);
+    coder_.visitPaths(PathNumbers(numbers), collector);
     OwnedArray folders = columns(collector.folders());
     return {std::move(folders), columns(collector.files())};
 }
@@ -127,7 +119,7 @@ OwnedArray PathCells::joined(const std::vector<double>& numbers,
         foldersByTrack(numbers);  // throws if a number is none
         return cell;
     }
-    coder_.visitPaths(pathNumbers(numbers), Joiner(*this, cell, separator));
+    coder_.visitPaths(PathNumbers(numbers), Joiner(*this, cell, separator));
     return cell;
 }
 

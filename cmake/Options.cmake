@@ -12,6 +12,7 @@ target_compile_options(
             -Wshadow
             -Wnon-virtual-dtor
             -Wold-style-cast
+            $<$<CXX_COMPILER_ID:Clang>:-Wthread-safety>
             $<$<BOOL:${QZTESSEL_WERROR}>:-Werror>)
 
 # Release keeps the containers unchecked. Elsewhere an index outside a vector

@@ -127,7 +127,7 @@ std::size_t heapBytes(const std::u16string& text) {
 }
 
 std::size_t heapBytes(const FolderTexts& lists) {
-    std::size_t bytes = lists.capacity() * sizeof(lists[0]);
+    std::size_t bytes = lists.capacity() * sizeof(FolderTexts::value_type);
     for (const auto& texts : lists) {
         bytes += texts.capacity() * sizeof(std::u16string);
         for (const std::u16string& text : texts) bytes += heapBytes(text);

@@ -82,6 +82,8 @@ constexpr std::size_t bitsPerWindow =
 // would check for room each time.
 class TextBuffer {
 public:
+    // The units are not cleared: each is written before it is read.
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
     explicit TextBuffer(std::u16string& text) noexcept : text_(text) {}
 
     char16_t* begin() noexcept { return units_.data(); }
@@ -103,7 +105,6 @@ private:
         bitsPerWindow + DecodeTable::Entry::writtenUnits;
 
     std::u16string& text_;
-    // Not cleared: a unit is written before it is read.
     std::array<char16_t, 4 * maxUnitsPerWindow> units_;
 };
 

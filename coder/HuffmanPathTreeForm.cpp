@@ -202,7 +202,7 @@ PackedSizeT takeWidth(ByteCursor& cursor) {
 class FormReader {
 public:
     // New partitions are appended to those of `before`.
-    explicit FormReader(const PathNumbering& before) : numbering(before) {
+    explicit FormReader(PathNumbering before) : numbering(std::move(before)) {
         numbering.duplicates.clear();
     }
 

@@ -26,6 +26,8 @@ public:
     }
     ~AtomicMaximum() = default;
 
+    // Implicit, because it reads as the number that it is.
+    // NOLINTNEXTLINE(google-explicit-constructor)
     operator std::uint64_t() const noexcept {
         return value_.load(std::memory_order_relaxed);
     }

@@ -2,7 +2,6 @@
 
 #include <cmath>
 #include <limits>
-#include <ranges>
 #include <utility>
 
 namespace tessel {
@@ -79,9 +78,7 @@ void PathRetrieval::getByNumber(std::vector<Components>& folderPaths,
                                 std::vector<Components>& filePaths,
                                 const std::vector<double>& numbers) const {
     Copier copier(folderPaths, filePaths);
-    // A number is judged when its turn comes, because those after the last
-    // partition's end are ignored, whatever they are.
-    visit(std::views::transform(numbers, pathNumberOf), copier);
+    visit(PathNumbers(numbers), copier);
     copier.finish();
 }
 

@@ -43,6 +43,9 @@ private:
     // Reads tracks without the heap, unless a folder is this deep.
     class TrackReader {
     public:
+        // The array is not cleared: a position is written before it is read.
+        // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
+        TrackReader() noexcept {}  // NOLINT(modernize-use-equals-default)
         std::span<const std::uint64_t> read(const PathTracks& tracks,
                                             std::size_t k);
 
@@ -78,6 +81,40 @@ inline std::span<const std::uint64_t> PathRetrieval::TrackReader::read(
     if (!longer_.empty()) return longer_;
     return {inline_.data(), length};
 }
+
+// The numbers of a request as a range for visit, each converted when its turn
+// comes: those after the last partition's end are ignored, whatever they are.
+class PathNumbers {
+public:
+    class Iterator {
+    public:
+        explicit Iterator(const double* position) noexcept : at_(position) {}
+        std::uint64_t operator*() const {
+            return PathRetrieval::pathNumberOf(*at_);
+        }
+        Iterator& operator++() noexcept {
+            ++at_;
+            return *this;
+        }
+        friend std::ptrdiff_t operator-(Iterator a, Iterator b) noexcept {
+            return a.at_ - b.at_;
+        }
+        friend bool operator==(Iterator a, Iterator b) noexcept = default;
+
+    private:
+        const double* at_;
+    };
+
+    explicit PathNumbers(std::span<const double> values) noexcept
+        : values_(values) {}
+    Iterator begin() const noexcept { return Iterator(values_.data()); }
+    Iterator end() const noexcept {
+        return Iterator(values_.data() + values_.size());
+    }
+
+private:
+    std::span<const double> values_;
+};
 
 template <class Numbers, class Visitor>
 void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {

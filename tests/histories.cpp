@@ -483,4 +483,63 @@ RC_GTEST_PROP(Histories, WhatWasReadIsWrittenAgain, ()) {
     }
 }
 
+// ---- The third voice: a plain list ----
+
+// paths[n - 1] is path n, as long as no file becomes a folder: folders and
+// files have names of their own here.
+RC_GTEST_PROP(Histories, NumbersAreThoseOfAPlainList, ()) {
+    CoderPtr coder = support::coderWith(alphabet, {7, 6, 5, 4, 3, 2, 1});
+    std::vector<Texts> paths;
+    const auto below = [](unsigned n) { return *rc::gen::inRange(0U, n); };
+    const auto nameOf = [&](bool folder, unsigned kinds) {
+        std::u16string name(1 + below(kinds), alphabet[2]);
+        name[0] = alphabet[folder ? 0 : 1];
+        return name;
+    };
+    const unsigned rounds = below(12);
+    for (unsigned round = 0; round < rounds; ++round) {
+        std::vector<Texts> folders;
+        std::vector<Texts> files;
+        for (unsigned i = below(8); i > 0; --i) {
+            Texts& folder = folders.emplace_back();
+            for (unsigned depth = 1 + below(3); depth > 0; --depth)
+                folder.push_back(nameOf(true, 3));
+            Texts& names = files.emplace_back();
+            for (unsigned k = below(6); k > 0; --k)
+                names.push_back(nameOf(false, 5));
+        }
+        const bool refused = !folders.empty() && below(4) == 0;
+        if (refused) files[below(static_cast<unsigned>(files.size()))] = {u""};
+        for (std::size_t i = 0; i < folders.size() && !refused; ++i) {
+            for (const std::u16string& name : files[i]) {
+                paths.push_back(folders[i]);
+                paths.back().push_back(name);
+            }
+        }
+        try {
+            support::addBatches(*coder, folders, files, below(4));
+            RC_ASSERT(!refused);
+        } catch (const tessel::NoCodeForEmptyString&) {
+            RC_ASSERT(refused);
+        }
+        if (below(3) == 0)
+            coder = support::restoredFrom(support::formOf(*coder, true), true,
+                                          *coder);
+    }
+    RC_ASSERT(coder->pathCount == paths.size());
+    for (std::size_t n = 1; n <= paths.size(); ++n) {
+        const auto answer = support::found(*coder, {static_cast<double>(n)});
+        RC_ASSERT(answer && answer->files.size() == 1U);
+        Texts path = support::decodedBy(*coder, answer->folders[0]);
+        path.push_back(support::decodedBy(*coder, answer->files[0])[0]);
+        RC_ASSERT(path == paths[n - 1]);
+    }
+    std::vector<Texts> iterated = support::iterated(*coder);
+    std::sort(iterated.begin(), iterated.end());
+    std::sort(paths.begin(), paths.end());
+    // A folder without files is iterated as a path of its own.
+    RC_ASSERT(std::includes(iterated.begin(), iterated.end(), paths.begin(),
+                            paths.end()));
+}
+
 }  // namespace

@@ -133,27 +133,49 @@ Outcome load(HuffmanPathTree& coder, Bytes& form, bool compress) {
     return outcome;
 }
 
-template <class Use>
-void allowing(Use use) {
-    try {
-        use();
-    } catch (const DamagedFormException&) {
-    } catch (const tessel::NoMorePathException&) {
-    } catch (const tessel::NoTreeToTraverseException&) {
-    } catch (const tessel::EmptyPathForTraverseException&) {
-    } catch (const std::out_of_range&) {
+// Runs `use`, which may throw one of these and nothing else.
+template <class... Failures>
+struct Allowing {
+    template <class Use>
+    static void run(Use use) {
+        try {
+            use();
+        } catch (const std::exception& failure) {
+            const bool allowed =
+                (... || (dynamic_cast<const Failures*>(&failure) != nullptr));
+            EXPECT_TRUE(allowed) << failure.what();
+        }
     }
-}
+};
 
+// The tree's own paths always come; only the track of a repeated one may lead
+// nowhere, and only a name may be none in this code.
 void iterateAll(HuffmanPathTree& coder) {
     coder.resetPathsToBTree();
     for (int i = 0; i < 400 && coder.hasNextPathFromBTree(); ++i) {
-        allowing([&coder] {
-            Components path;
-            coder.getNextPathFromBTree(path);
-            support::decodedBy(coder, path);
-        });
+        Components path;
+        if (coder.hasDuplicate(coder.nextPathNumber + 1))
+            Allowing<tessel::NoTreeToTraverseException,
+                     tessel::EmptyPathForTraverseException,
+                     std::out_of_range>::run([&] {
+                coder.getNextPathFromBTree(path);
+            });
+        else
+            EXPECT_NO_THROW(coder.getNextPathFromBTree(path));
+        Allowing<DamagedFormException>::run(
+            [&] { support::decodedBy(coder, path); });
     }
+}
+
+// `found` answers std::out_of_range by nothing. Tracks without ends may be
+// empty, or there may be no tree.
+void lookUp(const HuffmanPathTree& coder, const std::vector<double>& numbers) {
+    const auto look = [&] { support::found(coder, numbers); };
+    if (coder.partitionEnds.empty())
+        Allowing<tessel::NoTreeToTraverseException,
+                 tessel::EmptyPathForTraverseException>::run(look);
+    else
+        EXPECT_NO_THROW(look());
 }
 
 void fetchAll(const HuffmanPathTree& coder) {
@@ -161,14 +183,14 @@ void fetchAll(const HuffmanPathTree& coder) {
     std::vector<double> all;
     for (int n = 1; n < 24; ++n) {
         const std::vector<double> one = {static_cast<double>(n)};
-        allowing([&] { support::found(coder, one); });
+        lookUp(coder, one);
         all.push_back(one[0]);
     }
-    allowing([&] { support::found(coder, all); });
-    allowing([&] { support::found(coder, rare); });
+    lookUp(coder, all);
+    lookUp(coder, rare);
     const auto count = static_cast<double>(coder.pathCount);
-    allowing([&] { support::found(coder, {count}); });
-    allowing([&] { support::found(coder, {count + 1, 1}); });
+    lookUp(coder, {count});
+    lookUp(coder, {count + 1, 1});
 }
 
 // What was accepted is written and read again without a change.
@@ -189,7 +211,7 @@ void storeAgain(const HuffmanPathTree& coder) {
 
 void useThoroughly(HuffmanPathTree& coder) {
     EXPECT_EQ(support::brokenInvariant(coder, true), "");
-    allowing([&] { coder.inflateHuffman(u"abc"); });
+    Allowing<DamagedFormException>::run([&] { coder.inflateHuffman(u"abc"); });
     iterateAll(coder);
     fetchAll(coder);
     storeAgain(coder);

@@ -1,12 +1,39 @@
 // What is left behind when memory runs out, at every allocation in turn.
 
 #include <gtest/gtest.h>
+#include <zlib.h>
 
 #include <new>
 
 #include "tests/support/AllocationMeter.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Trees.hpp"
+
+namespace {
+
+bool zlibHasMemory = true;
+
+}  // namespace
+
+// The linker sends the calls of these two to the wrappers.
+extern "C" {
+int __real_compress2(Bytef* to, uLongf* toBytes, const Bytef* from,
+                     uLong fromBytes, int level);
+int __real_uncompress(Bytef* to, uLongf* toBytes, const Bytef* from,
+                      uLong fromBytes);
+
+int __wrap_compress2(Bytef* to, uLongf* toBytes, const Bytef* from,
+                     uLong fromBytes, int level) {
+    return zlibHasMemory ? __real_compress2(to, toBytes, from, fromBytes, level)
+                         : Z_MEM_ERROR;
+}
+
+int __wrap_uncompress(Bytef* to, uLongf* toBytes, const Bytef* from,
+                      uLong fromBytes) {
+    return zlibHasMemory ? __real_uncompress(to, toBytes, from, fromBytes)
+                         : Z_MEM_ERROR;
+}
+}
 
 namespace {
 
@@ -104,9 +131,8 @@ TEST(MemoryFailures, ABatchLeavesTheFoldersBeforeTheFailureAdded) {
         EXPECT_EQ(support::brokenInvariant(*coder), "");
         EXPECT_EQ(coder->pathCount, added ? before + 40 : before);
         EXPECT_EQ(coder->partitionEnds.size(), added ? 4U : 3U);
-        // No file of the batch is there unless all are.
-        // (A whole path that was added twice is yielded twice.)
-        EXPECT_EQ(support::iterated(*coder).size(), before + (added ? 40 : 0));
+        // Neither the folder nor any of its files is there unless all are.
+        EXPECT_EQ(support::iterated(*coder).size(), coder->pathCount);
         support::addBatch(*coder, {u"a", u"b"}, {u"dd"});
         const CoderPtr back = support::restoredFrom(
             support::formOf(*coder, false), false, *coder);
@@ -363,19 +389,116 @@ TEST(MemoryFailures, DecodingLeavesTheTextAsItWas) {
     });
 }
 
-TEST(MemoryFailures, WritingLeavesTheCoderAsItWas) {
+TEST(MemoryFailures, AFormIsAppendedOrNothingOfIt) {
     const CoderPtr coder = filledCoder();
-    const Bytes form = support::formOf(*coder, false);
-    forEachAllocation([&](std::size_t n) {
-        Bytes out;
-        const bool written =
-            succeedsWith(n, [&] { coder->serialize(out, false); });
-        if (written) {
-            EXPECT_EQ(out, form);
-        }
-        return written;
+    for (const bool compress : {false, true}) {
+        const Bytes form = support::formOf(*coder, compress);
+        forEachAllocation([&](std::size_t n) {
+            Bytes out = {1, 2, 3};
+            const bool written =
+                succeedsWith(n, [&] { coder->serialize(out, compress); });
+            Bytes expected = {1, 2, 3};
+            if (written)
+                expected.insert(expected.end(), form.begin(), form.end());
+            EXPECT_EQ(out, expected);
+            return written;
+        });
+        EXPECT_EQ(support::formOf(*coder, compress), form);
+    }
+}
+
+// zlib takes its own memory, which no wrapper sees.
+TEST(MemoryFailures, ZlibsLackOfMemoryIsNoDamage) {
+    const CoderPtr coder = filledCoder();
+    Bytes form = support::formOf(*coder, true);
+    const Bytes before = support::formOf(*coder, false);
+    zlibHasMemory = false;
+    Bytes out = {1, 2, 3};
+    EXPECT_THROW(coder->serialize(out, true), std::bad_alloc);
+    EXPECT_THROW(coder->deserialize(form, true), std::bad_alloc);
+    zlibHasMemory = true;
+    EXPECT_EQ(out, (Bytes{1, 2, 3}));
+    EXPECT_EQ(support::formOf(*coder, false), before);
+}
+
+TEST(MemoryFailures, ACopyIsMadeOrTheCoderIsAsItWas) {
+    const std::vector<double> frequencies = {4, 3, 2, 1, 1};
+    const CoderPtr source = support::coderWith(u"abcd\x4e2d", frequencies);
+    support::addBatches(*source, {{u"d"}, {u"c", u"d"}},
+                        {{u"a", u"b"}, {u"\x4e2d"}});
+    support::addWhole(*source, {u"d", u"a"});
+    forEachAllocation([&source](std::size_t n) {
+        const CoderPtr coder = filledCoder();
+        const Bytes before = support::formOf(*coder, false);
+        const std::vector<Texts> paths = support::iterated(*coder);
+        const bool copied = succeedsWith(n, [&] { coder->copyTree(*source); });
+        EXPECT_EQ(support::formOf(*coder, false),
+                  copied ? support::formOf(*source, false) : before);
+        EXPECT_EQ(coder->getTreeString(),
+                  copied ? source->getTreeString() : u"acbd");
+        EXPECT_EQ(coder->nodes.size(), copied ? 9U : 7U);
+        EXPECT_EQ(support::iterated(*coder),
+                  copied ? support::iterated(*source) : paths);
+        EXPECT_EQ(support::brokenInvariant(*coder), "");
+        return copied;
     });
-    EXPECT_EQ(support::formOf(*coder, false), form);
+}
+
+// Each call of a pass fails at each of its allocations and is repeated.
+TEST(MemoryFailures, APassWithRepeatedPathsIsRepeatable) {
+    const CoderPtr coder = filledCoder();
+    const std::vector<Texts> paths = support::iterated(*coder);
+    forEachAllocation([&](std::size_t n) {
+        coder->resetPathsToBTree();
+        std::vector<Texts> seen;
+        bool failed = false;
+        while (coder->hasNextPathFromBTree()) {
+            Components path;
+            if (!succeedsWith(n, [&] { coder->getNextPathFromBTree(path); })) {
+                failed = true;
+                path.clear();
+                coder->getNextPathFromBTree(path);
+            }
+            seen.push_back(support::decodedBy(*coder, path));
+        }
+        EXPECT_EQ(seen, paths);
+        EXPECT_EQ(coder->nextPathNumber, paths.size());
+        return !failed;
+    });
+}
+
+// What was reserved for a partition is enough to note it.
+TEST(MemoryFailures, NotingAPartitionTakesNoMemory) {
+    tessel::PathNumbering numbering;
+    for (std::uint64_t i = 0; i < 200; ++i) {
+        tessel::PathTrack track = {~std::uint64_t{0}, i};
+        track.reserve(3);
+        numbering.reserveForPartition(2);
+        const AllocationFailure none(0);
+        numbering.notePartition(track, i % 2 == 0, ~std::uint64_t{0}, 1);
+        EXPECT_FALSE(none.happened());
+    }
+    EXPECT_EQ(numbering.partitionTracks.size(), 200U);
+}
+
+TEST(MemoryFailures, VisitingPathsByNumberTakesNoMemory) {
+    struct Counter {
+        void beginFolder(std::size_t /*maxFiles*/) { ++folders; }
+        void folder(tessel::ComponentView name) { bytes += name.size(); }
+        void file(tessel::ComponentView name) { bytes += name.size(); }
+        std::size_t folders = 0;
+        std::size_t bytes = 0;
+    };
+    const CoderPtr coder = filledCoder();
+    const std::uint64_t numbers[] = {1, 2, 3, 4, 5};
+    Counter counter;
+    {
+        const AllocationFailure none(0);
+        coder->visitPaths(numbers, counter);
+        EXPECT_FALSE(none.happened());
+    }
+    EXPECT_EQ(counter.folders, 3U);
+    EXPECT_GT(counter.bytes, 0U);
 }
 
 TEST(MemoryFailures, ReleasingTakesNoMemory) {

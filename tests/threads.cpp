@@ -131,7 +131,17 @@ TEST(Threads, CopiesAreReleasedOnDifferentThreads) {
                               {u"/", nameOf(7), nameOf(0), u"filea"},
                               {u"late", nameOf(i)});
         }
+        const CoderPtr kept = std::move(coders[2]);
+        const std::vector<Texts> paths = support::iterated(*kept);
+        EXPECT_GT(paths.size(), 300U);
+        coders.erase(coders.begin() + 2);
         releaseTogether(std::move(coders));
+        // What the others shared with it, and what only they made and it
+        // sees, is still there.
+        EXPECT_EQ(support::iterated(*kept), paths);
+        EXPECT_EQ(support::brokenInvariant(*kept), "");
+        support::addBatch(*kept, {u"/", nameOf(7)}, {u"after"});
+        EXPECT_EQ(support::iterated(*kept).size(), paths.size() + 1);
     }
 }
 

@@ -51,7 +51,7 @@ void compareWithWalk(const HuffmanPathTree& coder, const Bytes& bytes) {
                             tessel::DamagedFormException);
 }
 
-RC_GTEST_PROP(Decoding, GivesBackWhatWasEncoded, ()) {
+RC_GTEST_PROP(ComponentDecoder, GivesBackWhatWasEncoded, ()) {
     const auto characters = *anyAlphabet();
     const auto frequencies = *rc::gen::container<Frequencies>(
         characters.size(), support::anyFrequency());
@@ -72,7 +72,7 @@ RC_GTEST_PROP(Decoding, GivesBackWhatWasEncoded, ()) {
     RC_ASSERT(loaded.generatePathFrom(bytes) == text);
 }
 
-RC_GTEST_PROP(Decoding, OfAnyBytesIsTheWalkOfTheirBits, ()) {
+RC_GTEST_PROP(ComponentDecoder, OfAnyBytesIsTheWalkOfTheirBits, ()) {
     const auto characters = *anyAlphabet();
     const auto frequencies = *rc::gen::container<Frequencies>(
         characters.size(), support::anyFrequency());
@@ -83,7 +83,7 @@ RC_GTEST_PROP(Decoding, OfAnyBytesIsTheWalkOfTheirBits, ()) {
     compareWithWalk(*coder, bytes);
 }
 
-RC_GTEST_PROP(Decoding, InATreeWithHolesIsTheWalkOfItsBits, ()) {
+RC_GTEST_PROP(ComponentDecoder, InATreeWithHolesIsTheWalkOfItsBits, ()) {
     HuffmanPathTree coder;
     coder.boolTree = *rc::gen::container<std::vector<bool>>(
         rc::gen::weightedElement<bool>({{3, false}, {2, true}}));
@@ -118,7 +118,7 @@ LongCodes longCodes(std::size_t count, double factor) {
     return codes;
 }
 
-TEST(Decoding, EveryCharacterOfALongCodeAloneAndBetweenOthers) {
+TEST(ComponentDecoder, EveryCharacterOfALongCodeAloneAndBetweenOthers) {
     for (const double factor : {1.5, 1.6180339887498949, 2.0}) {
         const LongCodes codes = longCodes(150, factor);
         for (std::size_t i = 0; i < codes.characters.size(); ++i) {
@@ -138,7 +138,7 @@ TEST(Decoding, EveryCharacterOfALongCodeAloneAndBetweenOthers) {
     }
 }
 
-TEST(Decoding, CodesAroundTheLongestThatTheTableHolds) {
+TEST(ComponentDecoder, CodesAroundTheLongestThatTheTableHolds) {
     const LongCodes codes = longCodes(100, 2);
     const unsigned longest = tessel::CodeTable::longestInline;
     bool seen[100] = {};
@@ -154,7 +154,7 @@ TEST(Decoding, CodesAroundTheLongestThatTheTableHolds) {
     EXPECT_TRUE(seen[longest] && seen[longest + 1]);
 }
 
-RC_GTEST_PROP(Decoding, GivesBackTextsInLongCodes, ()) {
+RC_GTEST_PROP(ComponentDecoder, GivesBackTextsInLongCodes, ()) {
     static const LongCodes codes = longCodes(120, 2);
     const auto text = *support::anyTextOf(rc::gen::weightedOneOf<char16_t>(
         {{1, rc::gen::elementOf(codes.characters)},
@@ -164,7 +164,7 @@ RC_GTEST_PROP(Decoding, GivesBackTextsInLongCodes, ()) {
     RC_ASSERT(codes.coder->generatePathFrom(bytes) == text);
 }
 
-TEST(Decoding, AllCodeUnitsInOneCode) {
+TEST(ComponentDecoder, AllCodeUnitsInOneCode) {
     std::u16string characters;
     for (unsigned unit = 0; unit <= 0xFFFF; ++unit)
         characters.push_back(static_cast<char16_t>(unit));
@@ -178,7 +178,7 @@ TEST(Decoding, AllCodeUnitsInOneCode) {
 
 // Every length of a text, so that its end meets every place in a byte and in
 // the decoder's windows.
-TEST(Decoding, TextsOfEveryLength) {
+TEST(ComponentDecoder, TextsOfEveryLength) {
     const CoderPtr coder =
         support::coderWith(u"abcdefg", {40, 20, 9, 5, 3, 2, 1});
     const model::Code expected =
@@ -193,6 +193,128 @@ TEST(Decoding, TextsOfEveryLength) {
         ASSERT_EQ(bytes, model::encode(expected, text).bytes);
         ASSERT_EQ(coder->generatePathFrom(bytes), text);
     }
+}
+
+// ---- Examples ----
+
+TEST(ComponentDecoder, WhatWasEncodedWithEachWorkedExampleComesBack) {
+    struct Example {
+        std::u16string characters;
+        std::vector<double> frequencies;
+    };
+    const Example examples[] = {{u"abc", {2, 1, 1}},
+                                {u"abcd", {1, 1, 1, 1}},
+                                {u"abcde", {5, 1, 2, 1, 3}}};
+    for (const Example& example : examples) {
+        const CoderPtr coder =
+            support::coderWith(example.characters, example.frequencies);
+        std::u16string whole;
+        for (const char16_t character : example.characters) {
+            const std::u16string single(1, character);
+            EXPECT_EQ(coder->generatePathFrom(coder->generateCodeFor(single)),
+                      single);
+            whole += single + example.characters;
+            EXPECT_EQ(coder->generatePathFrom(coder->generateCodeFor(whole)),
+                      whole);
+        }
+    }
+}
+
+TEST(ComponentDecoder, TheTrailerAloneIsTheEmptyText) {
+    const CoderPtr coder = support::fourLetterCoder();
+    for (std::uint8_t trailer = 0; trailer < 8; ++trailer)
+        EXPECT_EQ(coder->generatePathFrom({trailer}), u"");
+    EXPECT_EQ(HuffmanPathTree().generatePathFrom({0}), u"");
+}
+
+TEST(ComponentDecoder, BitsBehindTheLastWholeCodeAreIgnored) {
+    const CoderPtr coder = support::fourLetterCoder();
+    EXPECT_EQ(coder->generatePathFrom({0b0111, 3}), u"d");
+    EXPECT_EQ(coder->generatePathFrom({0b1, 1}), u"");
+}
+
+TEST(ComponentDecoder, UnusedHighBitsDoNotMatter) {
+    const CoderPtr coder = support::fourLetterCoder();
+    EXPECT_EQ(coder->generatePathFrom({0b11111101, 2}), u"b");
+    EXPECT_EQ(coder->generatePathFrom({0xFF, 0xFF, 0}), u"dddd");
+}
+
+TEST(ComponentDecoder, AnEmptyVectorIsRefused) {
+    EXPECT_THROW(support::fourLetterCoder()->generatePathFrom({}),
+                 tessel::DamagedFormException);
+    EXPECT_THROW(HuffmanPathTree().generatePathFrom({}),
+                 tessel::DamagedFormException);
+}
+
+TEST(ComponentDecoder, ATrailerAboveSevenIsRefused) {
+    const CoderPtr coder = support::fourLetterCoder();
+    for (unsigned trailer = 8; trailer < 256; ++trailer) {
+        const auto last = static_cast<std::uint8_t>(trailer);
+        EXPECT_THROW(coder->generatePathFrom({last}),
+                     tessel::DamagedFormException);
+        EXPECT_THROW(coder->generatePathFrom({0x00, last}),
+                     tessel::DamagedFormException);
+    }
+}
+
+TEST(ComponentDecoder, BitsWithoutACodeAreRefused) {
+    EXPECT_THROW(HuffmanPathTree().generatePathFrom({0x00, 1}),
+                 tessel::DamagedFormException);
+    EXPECT_THROW(support::coderWith(u"a", {1})->generatePathFrom({0x00, 1}),
+                 tessel::DamagedFormException);
+}
+
+TEST(ComponentDecoder, ATreeThatIsOneLeafGivesACharacterForEachBit) {
+    HuffmanPathTree coder;
+    coder.boolTree = {true};
+    coder.inflateHuffman(u"a");
+    EXPECT_EQ(coder.generatePathFrom({0}), u"");
+    EXPECT_EQ(coder.generatePathFrom({0x05, 3}), u"aaa");
+    EXPECT_EQ(coder.generatePathFrom({0x00, 0x00, 0}), u"aaaaaaaa");
+}
+
+TEST(ComponentDecoder, AppendingKeepsWhatTheTextHeld) {
+    const CoderPtr coder = support::fourLetterCoder();
+    std::u16string text = u"before ";
+    coder->appendPathFrom(coder->generateCodeFor(u"dab"), text);
+    EXPECT_EQ(text, u"before dab");
+}
+
+TEST(ComponentDecoder, ARefusedAppendLeavesTheTextAsItWas) {
+    HuffmanPathTree coder;
+    coder.boolTree = support::bitsOf("001");  // a = 00, all else is missing
+    coder.setTreeString(u"a");
+    coder.inflate();
+    coder.generateCode();
+    std::u16string text = u"before";
+    EXPECT_THROW(coder.appendPathFrom(Bytes{0b100, 3}, text),
+                 tessel::DamagedFormException);
+    EXPECT_EQ(text, u"before");
+    EXPECT_THROW(coder.appendPathFrom(Bytes{}, text),
+                 tessel::DamagedFormException);
+    EXPECT_EQ(text, u"before");
+}
+
+TEST(ComponentDecoder, ALeafIsAppendedAndTheWalkReturnsToTheRoot) {
+    const CoderPtr coder = support::coderWith(u"abc", {2, 1, 1});
+    std::u16string text = u"x";
+    std::int32_t position = 0;  // the leaf b, which was taken first
+    EXPECT_TRUE(coder->appendToPathIfLeaf(position, text));
+    EXPECT_EQ(text, u"xb");
+    EXPECT_EQ(position, coder->rootIndex);
+    EXPECT_FALSE(coder->appendToPathIfLeaf(position, text));
+    EXPECT_EQ(text, u"xb");
+    EXPECT_EQ(position, coder->rootIndex);
+}
+
+TEST(ComponentDecoder, APositionThatIsNoNodeIsRefused) {
+    const CoderPtr coder = support::coderWith(u"abc", {2, 1, 1});
+    std::u16string text;
+    for (std::int32_t position : {-1, 5, 1000, std::int32_t{-2147483647}}) {
+        EXPECT_THROW(coder->appendToPathIfLeaf(position, text),
+                     tessel::DamagedFormException);
+    }
+    EXPECT_EQ(text, u"");
 }
 
 }  // namespace

@@ -795,4 +795,29 @@ TEST(CoderForm, ATreeStringOfAnotherLengthIsRefusedAfterReading) {
     EXPECT_EQ(support::codeText(coder, u'b'), "1");
 }
 
+// Whole paths raise the count beyond every end.
+TEST(CoderForm, TheWidthOfEndsIsThatOfTheCountOfPaths) {
+    const CoderPtr coder = support::fourLetterCoder();
+    support::addBatch(*coder, {u"a"}, {u"b"});
+    for (unsigned i = 0; i < 300; ++i) {
+        tessel::Components path = {{1, 2},
+                                   {static_cast<std::uint8_t>(i % 256),
+                                    static_cast<std::uint8_t>(i / 256), 3}};
+        coder->addPathToBTree(path);
+    }
+    const Bytes form = support::formOf(*coder, false);
+    using tessel::sixpacks::PackedSizeT;
+    tessel::sixpacks::ByteCursor cursor(form);
+    cursor.take(8);
+    tessel::sixpacks::unpackVector(cursor, PackedSizeT::Uint64);  // shape
+    tessel::sixpacks::unpackVector(cursor, PackedSizeT::Uint64);  // codes
+    const std::uint64_t values = cursor.takeUint(PackedSizeT::Uint64);
+    ASSERT_EQ(cursor.takeByte(), 0U);
+    for (std::uint64_t i = 0; i < values; ++i)
+        tessel::sixpacks::unpackVector(cursor, PackedSizeT::Uint8);
+    EXPECT_EQ(cursor.takeByte(), 1U);  // the marker of partitions
+    EXPECT_EQ(cursor.takeByte(), 1U);  // 301 needs two bytes
+    EXPECT_EQ(cursor.takeByte(), 0U);  // their count needs one
+}
+
 }  // namespace

@@ -220,4 +220,35 @@ TEST(CompactForm, AShapeWithTooFewNodesLeavesChildrenOut) {
                  tessel::DamagedFormException);
 }
 
+// ---- Steps out of order ----
+
+std::size_t nodesSeen(HuffmanPathTree& coder) {
+    std::size_t seen = 0;
+    coder.traverse([&seen](HuffmanPathTree*, tessel::HNode&) { ++seen; });
+    return seen;
+}
+
+TEST(CompactForm, InflatingAfterACodeWasBuiltIsRefused) {
+    const CoderPtr coder = support::fourLetterCoder();
+    EXPECT_THROW(coder->inflate(), std::logic_error);
+    EXPECT_EQ(coder->nodes.size(), 7U);
+    EXPECT_EQ(nodesSeen(*coder), 7U);
+    EXPECT_THROW(coder->inflateFromCompressedTree(), std::logic_error);
+    coder->inflateFromBoolTree();
+    EXPECT_THROW(coder->inflateFromCompressedTree(), std::logic_error);
+    EXPECT_EQ(nodesSeen(*coder), 7U);
+}
+
+TEST(CompactForm, LinkingNodesThatWereNotMadeIsRefused) {
+    HuffmanPathTree coder;
+    coder.boolTree = {false, true, true};
+    EXPECT_THROW(coder.inflateFromCompressedTree(), std::logic_error);
+    EXPECT_EQ(nodesSeen(coder), 0U);
+    coder.setTreeString(u"ab");
+    coder.inflate();
+    EXPECT_EQ(nodesSeen(coder), 3U);
+    EXPECT_THROW(coder.inflateFromCompressedTree(), std::logic_error);
+    EXPECT_EQ(nodesSeen(coder), 3U);
+}
+
 }  // namespace

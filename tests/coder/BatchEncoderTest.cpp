@@ -1,5 +1,5 @@
-// From texts to encoded components and into the tree: one component, a batch
-// on workers, whole paths, and the bookkeeping of both.
+// A batch on workers: how it is split, its order, and what a refused one
+// leaves.
 
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
@@ -9,136 +9,43 @@
 #include <string>
 
 #include "tests/support/Coders.hpp"
-#include "tests/support/Exceptions.hpp"
 
 namespace {
 
 using support::Bytes;
 using support::CoderPtr;
-using support::coderWith;
 using support::fourLetterCoder;
 using support::Texts;
-using tessel::Components;
 using tessel::HuffmanPathTree;
-using tessel::PathTrack;
-using Ends = std::vector<std::uint64_t>;
 using Range = std::pair<std::uint64_t, std::uint64_t>;
 
 constexpr unsigned threadCounts[] = {0, 1, 2, 3, 7, 64};
 
-// ---- One component ----
-
-TEST(PathEncoding, OneCharacterIsItsCodePacked) {
-    const CoderPtr coder = fourLetterCoder();
-    EXPECT_EQ(coder->generateCodeFor(u"a"), (Bytes{0x00, 0x02}));
-}
-
-TEST(PathEncoding, CodesFollowEachOtherFromTheLowestBitUp) {
-    const CoderPtr coder = fourLetterCoder();
-    // d 11, c 01, b 10, a 00, d 11
-    EXPECT_EQ(coder->generateCodeFor(u"dcbad"),
-              (Bytes{0b00'01'10'11, 0b11, 2}));
-}
-
-TEST(PathEncoding, FullBytesAreFollowedByAnEmptyOne) {
-    const CoderPtr coder = fourLetterCoder();
-    EXPECT_EQ(coder->generateCodeFor(u"dddd"), (Bytes{0xFF, 0x00, 0x00}));
-}
-
-TEST(PathEncoding, AnEmptyComponentHasNoCode) {
-    const CoderPtr coder = fourLetterCoder();
-    try {
-        coder->generateCodeFor(u"");
-        FAIL() << "an empty text was encoded";
-    } catch (const tessel::NoCodeForEmptyString& failure) {
-        EXPECT_STREQ(failure.what(), "No code for an empty string.");
-    }
-    EXPECT_EQ(coder->maxCodeBytes, 0U);
-}
-
-TEST(PathEncoding, ACharacterOutsideTheAlphabetHasNoCode) {
-    const CoderPtr coder = fourLetterCoder();
-    try {
-        coder->generateCodeFor(u"abxd");
-        FAIL() << "an unknown character was encoded";
-    } catch (const tessel::CodeNotFoundException& failure) {
-        EXPECT_STREQ(failure.what(), "Code for the character not found.");
-    }
-    EXPECT_EQ(coder->maxCodeBytes, 0U);
-}
-
-TEST(PathEncoding, TheLongestComponentIsRemembered) {
-    const CoderPtr coder = fourLetterCoder();
-    coder->generateCodeFor(u"abcd");
-    EXPECT_EQ(coder->maxCodeBytes, 3U);
-    coder->generateCodeFor(u"a");
-    EXPECT_EQ(coder->maxCodeBytes, 3U);
-    coder->generateCodeFor(std::u16string(16, u'a'));
-    EXPECT_EQ(coder->maxCodeBytes, 6U);
-}
-
-TEST(PathEncoding, ATreeThatIsOneLeafEncodesEveryTextToTheEmptyComponent) {
-    HuffmanPathTree coder;
-    coder.boolTree = {true};
-    coder.inflateHuffman(u"a");
-    EXPECT_EQ(coder.generateCodeFor(u"a"), Bytes());
-    EXPECT_EQ(coder.generateCodeFor(u"aaaa"), Bytes());
-    EXPECT_EQ(coder.maxCodeBytes, 0U);
-    EXPECT_THROW(coder.generateCodeFor(u"b"), tessel::CodeNotFoundException);
-    EXPECT_THROW(coder.generateCodeFor(u""), tessel::NoCodeForEmptyString);
-}
-
-TEST(PathEncoding, ABatchOfACodeThatIsOneLeafIsStoredAndReadBack) {
-    HuffmanPathTree coder;
-    coder.boolTree = {true};
-    coder.inflateHuffman(u"a");
-    support::addBatch(coder, {u"a", u"aa"}, {u"a", u"aaa"});
-    EXPECT_EQ(coder.pathCount, 2U);
-    const CoderPtr back =
-        support::restoredFrom(support::formOf(coder, false), false, coder);
-    EXPECT_EQ(support::formOf(*back, false), support::formOf(coder, false));
-    Components path;
-    back->resetPathsToBTree();
-    back->getNextPathFromBTree(path);
-    EXPECT_EQ(path, (Components{{}, {}, {}}));
-}
-
-TEST(PathEncoding, TheExceptionsDeriveFromTheStandardBaseAlone) {
-    EXPECT_TRUE(
-        support::derivesFromStandardBaseAlone<tessel::NoCodeForEmptyString>());
-    EXPECT_TRUE(
-        support::derivesFromStandardBaseAlone<tessel::CodeNotFoundException>());
-    EXPECT_TRUE(
-        support::derivesFromStandardBaseAlone<tessel::DamagedFormException>());
-    EXPECT_TRUE(support::derivesFromStandardBaseAlone<
-                tessel::InvalidUintConversionException>());
-}
-
 // ---- How a batch is split ----
 
-TEST(PathEncoding, TenFoldersOnFourThreadsLeaveTheRemainderToTheLast) {
+TEST(BatchEncoder, TenFoldersOnFourThreadsLeaveTheRemainderToTheLast) {
     EXPECT_EQ(HuffmanPathTree::splitFolders(10, 4),
               (std::vector<Range>{{0, 1}, {2, 3}, {4, 5}, {6, 9}}));
 }
 
-TEST(PathEncoding, MoreThreadsThanFoldersGiveEachFolderAWorker) {
+TEST(BatchEncoder, MoreThreadsThanFoldersGiveEachFolderAWorker) {
     EXPECT_TRUE(HuffmanPathTree::splitFolders(0, 4).empty());
     EXPECT_EQ(HuffmanPathTree::splitFolders(3, 8),
               (std::vector<Range>{{0, 0}, {1, 1}, {2, 2}}));
 }
 
-TEST(PathEncoding, AsManyThreadsAsFoldersGiveEachFolderAWorker) {
+TEST(BatchEncoder, AsManyThreadsAsFoldersGiveEachFolderAWorker) {
     const std::vector<Range> ranges = HuffmanPathTree::splitFolders(8, 8);
     ASSERT_EQ(ranges.size(), 8U);
     for (std::uint64_t w = 0; w < 8; ++w) EXPECT_EQ(ranges[w], Range(w, w));
 }
 
-TEST(PathEncoding, AnUnknownNumberOfThreadsCountsAsTwo) {
+TEST(BatchEncoder, AnUnknownNumberOfThreadsCountsAsTwo) {
     EXPECT_EQ(HuffmanPathTree::splitFolders(5, 0),
               (std::vector<Range>{{0, 1}, {2, 4}}));
 }
 
-TEST(PathEncoding, EverySplitCoversEachFolderOnce) {
+TEST(BatchEncoder, EverySplitCoversEachFolderOnce) {
     for (std::uint64_t n = 1; n < 40; ++n) {
         for (unsigned threads = 0; threads < 40; ++threads) {
             const auto ranges = HuffmanPathTree::splitFolders(n, threads);
@@ -157,49 +64,7 @@ TEST(PathEncoding, EverySplitCoversEachFolderOnce) {
 
 // ---- A batch ----
 
-TEST(PathEncoding, ANewFoldersTrackHasOnePositionPerComponent) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {u"a", u"b"}, {u"c", u"d"});
-    ASSERT_EQ(coder->partitionTracks.size(), 1U);
-    EXPECT_EQ(coder->partitionTracks[0], (PathTrack{0, 0}));
-    EXPECT_EQ(coder->maxPartitionTrackLength, 0U);
-    EXPECT_EQ(coder->partitionEnds, (Ends{2}));
-    EXPECT_EQ(coder->pathCount, 2U);
-}
-
-TEST(PathEncoding, ANewFolderLeavesTheLongestPartitionTrackAsItWas) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {u"a", u"b"}, {u"c"});
-    support::addBatch(*coder, {u"a", u"b"}, {u"d"});
-    ASSERT_EQ(coder->maxPartitionTrackLength, 3U);
-    support::addBatch(*coder, {u"d"}, {u"a"});
-    EXPECT_EQ(coder->partitionTracks[2], (PathTrack{1}));
-    EXPECT_EQ(coder->maxPartitionTrackLength, 3U);
-    support::addBatch(*coder, {u"c", u"a", u"b", u"d"}, {u"a"});
-    EXPECT_EQ(coder->partitionTracks[3], (PathTrack{2, 0, 0, 0}));
-    EXPECT_EQ(coder->maxPartitionTrackLength, 3U);
-}
-
-TEST(PathEncoding, AStoredFoldersTrackEndsWithTheFirstNewFile) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {u"a", u"b"}, {u"c", u"d"});
-    support::addBatch(*coder, {u"a", u"b"}, {u"cc", u"dd", u"c"});
-    ASSERT_EQ(coder->partitionTracks.size(), 2U);
-    EXPECT_EQ(coder->partitionTracks[1], (PathTrack{0, 0, 2}));
-    EXPECT_EQ(coder->maxPartitionTrackLength, 3U);
-    EXPECT_EQ(coder->partitionEnds, (Ends{2, 5}));
-    EXPECT_EQ(coder->pathCount, 5U);
-}
-
-TEST(PathEncoding, ASecondBatchAppendsAfterTheFirst) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatches(*coder, {{u"a"}, {u"b"}}, {{u"a"}, {u"b", u"c"}});
-    support::addBatches(*coder, {{u"c"}, {u"d"}}, {{u"a"}, {u"b", u"c"}});
-    EXPECT_EQ(coder->partitionEnds, (Ends{1, 3, 4, 6}));
-    EXPECT_EQ(coder->pathCount, 6U);
-}
-
-TEST(PathEncoding, ABatchTakesBothListsOver) {
+TEST(BatchEncoder, ABatchTakesBothListsOver) {
     const CoderPtr coder = fourLetterCoder();
     for (const std::size_t count : {1U, 5U}) {
         std::vector<Texts> folders(count, Texts{u"a"});
@@ -214,27 +79,7 @@ TEST(PathEncoding, ABatchTakesBothListsOver) {
     EXPECT_TRUE(coder->genThreads.empty());
 }
 
-TEST(PathEncoding, AFolderWithoutFilesIsAPartitionOfNoPaths) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatches(*coder, {{u"a"}, {u"b"}}, {{}, {u"c"}});
-    EXPECT_EQ(coder->partitionEnds, (Ends{0, 1}));
-    EXPECT_EQ(coder->pathCount, 1U);
-    EXPECT_EQ(support::iterated(*coder),
-              (std::vector<Texts>{{u"a"}, {u"b", u"c"}}));
-}
-
-TEST(PathEncoding, FilesWithoutAFolderGoUnderTheRoot) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {}, {u"a", u"b"});
-    EXPECT_EQ(coder->partitionTracks[0], PathTrack{});
-    EXPECT_EQ(support::iterated(*coder), (std::vector<Texts>{{u"a"}, {u"b"}}));
-    const auto answer = support::found(*coder, {2});
-    ASSERT_TRUE(answer);
-    EXPECT_EQ(answer->folders, (std::vector<Components>{{}}));
-    EXPECT_EQ(support::decodedBy(*coder, answer->files[0]), Texts{u"b"});
-}
-
-TEST(PathEncoding, InsertionIsInInputOrderOnAnyNumberOfThreads) {
+TEST(BatchEncoder, InsertionIsInInputOrderOnAnyNumberOfThreads) {
     std::vector<Texts> folders;
     std::vector<Texts> files;
     for (int i = 0; i < 50; ++i) {
@@ -252,7 +97,7 @@ TEST(PathEncoding, InsertionIsInInputOrderOnAnyNumberOfThreads) {
     }
 }
 
-TEST(PathEncoding, OneWorkersBodyFillsItsRangeOnly) {
+TEST(BatchEncoder, OneWorkersBodyFillsItsRangeOnly) {
     const CoderPtr coder = fourLetterCoder();
     coder->asyncFolders = {{u"a"}, {u"b"}, {u"c"}};
     coder->asyncFiles = {{u"a", u"b"}, {u"c"}, {}};
@@ -277,7 +122,7 @@ TEST(PathEncoding, OneWorkersBodyFillsItsRangeOnly) {
 
 // ---- Refused batches ----
 
-TEST(PathEncoding, ABatchOfNoFoldersReturnsAtOnce) {
+TEST(BatchEncoder, ABatchOfNoFoldersReturnsAtOnce) {
     const CoderPtr coder = fourLetterCoder();
     std::vector<Texts> none;
     coder->generateCodeAsyncAndAddPaths(none, none);
@@ -286,7 +131,7 @@ TEST(PathEncoding, ABatchOfNoFoldersReturnsAtOnce) {
     EXPECT_TRUE(coder->partitionTracks.empty());
 }
 
-TEST(PathEncoding, ARefusedFoldersTextsCanBeMendedAndTriedAgain) {
+TEST(BatchEncoder, ARefusedFoldersTextsCanBeMendedAndTriedAgain) {
     const CoderPtr coder = fourLetterCoder();
     std::vector<Texts> folders = {{u"a", u"b"}};
     std::vector<Texts> files = {{u"c", u"x"}};
@@ -301,7 +146,7 @@ TEST(PathEncoding, ARefusedFoldersTextsCanBeMendedAndTriedAgain) {
     EXPECT_TRUE(coder->asyncFolders.empty());
 }
 
-TEST(PathEncoding, OneListForFoldersAndFilesIsRefused) {
+TEST(BatchEncoder, OneListForFoldersAndFilesIsRefused) {
     const CoderPtr coder = fourLetterCoder();
     std::vector<Texts> both = {{u"a"}, {u"b"}};
     EXPECT_THROW(coder->generateCodeAsyncAndAddPaths(both, both),
@@ -309,7 +154,7 @@ TEST(PathEncoding, OneListForFoldersAndFilesIsRefused) {
     EXPECT_EQ(both, (std::vector<Texts>{{u"a"}, {u"b"}}));
 }
 
-TEST(PathEncoding, ListsOfDifferentLengthAreRefusedAndNothingChanges) {
+TEST(BatchEncoder, ListsOfDifferentLengthAreRefusedAndNothingChanges) {
     const CoderPtr coder = fourLetterCoder();
     support::addBatch(*coder, {u"a"}, {u"b"});
     const Bytes before = support::formOf(*coder, false);
@@ -350,7 +195,7 @@ Refused refusalOf(HuffmanPathTree& coder, const Batch& batch,
     return Refused::no;
 }
 
-TEST(PathEncoding, TheFailureOfTheFirstFailingFolderIsThrown) {
+TEST(BatchEncoder, TheFailureOfTheFirstFailingFolderIsThrown) {
     Batch batch;
     batch.folders[7] = {u""};
     batch.files[5] = {u"a", u""};
@@ -369,7 +214,7 @@ TEST(PathEncoding, TheFailureOfTheFirstFailingFolderIsThrown) {
     }
 }
 
-TEST(PathEncoding, ARefusedBatchInsertsNothingAndTheCoderCanBeUsedOn) {
+TEST(BatchEncoder, ARefusedBatchInsertsNothingAndTheCoderCanBeUsedOn) {
     for (const unsigned threads : threadCounts) {
         for (std::size_t bad = 0; bad < 8; ++bad) {
             const CoderPtr coder = fourLetterCoder();
@@ -389,7 +234,7 @@ TEST(PathEncoding, ARefusedBatchInsertsNothingAndTheCoderCanBeUsedOn) {
     }
 }
 
-TEST(PathEncoding, ARefusedSingleFolderInsertsNothing) {
+TEST(BatchEncoder, ARefusedSingleFolderInsertsNothing) {
     const CoderPtr coder = fourLetterCoder();
     std::vector<Texts> folders = {{u"a"}};
     std::vector<Texts> files = {{u"b", u""}};
@@ -404,7 +249,7 @@ TEST(PathEncoding, ARefusedSingleFolderInsertsNothing) {
     EXPECT_EQ(coder->pathCount, 1U);
 }
 
-TEST(PathEncoding, WhatARefusedBatchLeavesDoesNotDependOnTheThreads) {
+TEST(BatchEncoder, WhatARefusedBatchLeavesDoesNotDependOnTheThreads) {
     // Long components before and behind the failure.
     for (std::size_t tall = 0; tall < 8; ++tall) {
         Batch batch;
@@ -424,7 +269,7 @@ TEST(PathEncoding, WhatARefusedBatchLeavesDoesNotDependOnTheThreads) {
     }
 }
 
-TEST(PathEncoding, TheFailingFoldersOwnComponentsUpToTheFailureCount) {
+TEST(BatchEncoder, TheFailingFoldersOwnComponentsUpToTheFailureCount) {
     for (std::size_t bad = 0; bad < 8; ++bad) {
         Batch batch;
         batch.files[bad] = {std::u16string(2000, u'a'), u"x",
@@ -450,7 +295,7 @@ Batch lopsidedBatch() {
     return batch;
 }
 
-TEST(PathEncoding, ALopsidedBatchIsInsertedInOrderOnAnyNumberOfThreads) {
+TEST(BatchEncoder, ALopsidedBatchIsInsertedInOrderOnAnyNumberOfThreads) {
     Batch batch = lopsidedBatch();
     for (std::size_t i = 0; i < batch.folders.size(); ++i)
         batch.folders[i] = {std::u16string(i % 29, u'b') + u"a"};
@@ -468,7 +313,7 @@ TEST(PathEncoding, ALopsidedBatchIsInsertedInOrderOnAnyNumberOfThreads) {
 
 // The second worker meets a long name in its own folders, runs out of them
 // and then meets the failure among the first worker's.
-TEST(PathEncoding, ALongNameBehindTheFailureDoesNotCount) {
+TEST(BatchEncoder, ALongNameBehindTheFailureDoesNotCount) {
     Batch batch = lopsidedBatch();
     const std::size_t half = batch.folders.size() / 2;
     batch.files[batch.files.size() - 1] = {std::u16string(2000, u'a')};
@@ -482,7 +327,7 @@ TEST(PathEncoding, ALongNameBehindTheFailureDoesNotCount) {
 
 // The failure of the lowest folder, and the longest component up to it,
 // whichever worker met it and whatever else failed.
-RC_GTEST_PROP(PathEncoding, ALopsidedBatchIsRefusedAsInOrder, ()) {
+RC_GTEST_PROP(BatchEncoder, ALopsidedBatchIsRefusedAsInOrder, ()) {
     Batch batch = lopsidedBatch();
     const auto position = rc::gen::inRange<std::size_t>(0, 700);
     const auto bad = *rc::gen::nonEmpty(
@@ -508,7 +353,7 @@ RC_GTEST_PROP(PathEncoding, ALopsidedBatchIsRefusedAsInOrder, ()) {
     if (tall > lowest) RC_ASSERT(first->maxCodeBytes < 200U);
 }
 
-TEST(PathEncoding, EncodingAFolderLeavesItsTexts) {
+TEST(BatchEncoder, EncodingAFolderLeavesItsTexts) {
     const CoderPtr coder = fourLetterCoder();
     coder->asyncFolders = {{u"a"}, {u"b"}};
     coder->asyncFiles = {{u"c"}, {u"d"}};
@@ -530,7 +375,7 @@ std::vector<tessel::PackedComponents> encodedFilesOf(tessel::Batch& batch) {
     return batch.encodedFiles;
 }
 
-TEST(PathEncoding, WorkersReleaseTheTextsThatTheyEncoded) {
+TEST(BatchEncoder, WorkersReleaseTheTextsThatTheyEncoded) {
     for (const unsigned threads : threadCounts) {
         const CoderPtr coder = fourLetterCoder();
         const Batch batch = lopsidedBatch();
@@ -553,7 +398,7 @@ TEST(PathEncoding, WorkersReleaseTheTextsThatTheyEncoded) {
     }
 }
 
-TEST(PathEncoding, NothingToEncodeNeedsNoWorkers) {
+TEST(BatchEncoder, NothingToEncodeNeedsNoWorkers) {
     const CoderPtr coder = fourLetterCoder();
     std::vector<Texts> folders;
     std::vector<Texts> files;
@@ -565,7 +410,7 @@ TEST(PathEncoding, NothingToEncodeNeedsNoWorkers) {
     EXPECT_EQ(coder->pathCount, 0U);
 }
 
-TEST(PathEncoding, ACoderWithoutACodeRefusesEveryBatch) {
+TEST(BatchEncoder, ACoderWithoutACodeRefusesEveryBatch) {
     HuffmanPathTree coder;
     for (const unsigned threads : threadCounts)
         EXPECT_EQ(refusalOf(coder, Batch(), threads),
@@ -573,136 +418,23 @@ TEST(PathEncoding, ACoderWithoutACodeRefusesEveryBatch) {
     EXPECT_EQ(coder.pathCount, 0U);
 }
 
-// ---- Whole paths ----
+// ---- What a refused batch holds ----
 
-TEST(PathEncoding, AWholePathAddedTwiceIsADuplicateTheSecondTime) {
+TEST(BatchEncoder, WhatARefusedBatchHoldsIsNamedAndReleased) {
     const CoderPtr coder = fourLetterCoder();
-    support::addWhole(*coder, {u"a", u"b"});
-    support::addWhole(*coder, {u"a", u"b"});
-    EXPECT_FALSE(coder->hasDuplicate(1));
-    EXPECT_TRUE(coder->hasDuplicate(2));
-    EXPECT_FALSE(coder->hasDuplicate(3));
-    ASSERT_EQ(coder->duplicates.size(), 1U);
-    EXPECT_EQ(coder->duplicates.at(2), (PathTrack{0, 0}));
-    EXPECT_EQ(coder->pathCount, 2U);
-    EXPECT_EQ(coder->maxDuplicateTrackLength, 2U);
-    EXPECT_EQ(coder->maxDuplicatePathNumber, 2U);
-    EXPECT_TRUE(coder->partitionEnds.empty());
-}
-
-TEST(PathEncoding, ANewWholePathIsCountedAndNoDuplicate) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addWhole(*coder, {u"a", u"b"});
-    support::addWhole(*coder, {u"a", u"c"});
-    EXPECT_TRUE(coder->duplicates.empty());
-    EXPECT_EQ(coder->maxDuplicatePathNumber, 0U);
-    EXPECT_EQ(coder->maxDuplicateTrackLength, 0U);
-    EXPECT_EQ(coder->pathCount, 2U);
-}
-
-TEST(PathEncoding, TheLongestDuplicateTrackIsRemembered) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addWhole(*coder, {u"a", u"b", u"c"});
-    support::addWhole(*coder, {u"a", u"b", u"c"});
-    support::addWhole(*coder, {u"a", u"b"});
-    EXPECT_EQ(coder->duplicates.at(3), (PathTrack{0, 0}));
-    EXPECT_EQ(coder->maxDuplicateTrackLength, 3U);
-    EXPECT_EQ(coder->maxDuplicatePathNumber, 3U);
-}
-
-TEST(PathEncoding, AWholePathOfNoComponentsIsStillCounted) {
-    const CoderPtr coder = fourLetterCoder();
-    Components none;
-    coder->addPathToBTree(none);
-    EXPECT_EQ(coder->pathCount, 1U);
-    EXPECT_TRUE(coder->duplicates.empty());
-}
-
-TEST(PathEncoding, APartitionOfRawComponentsIsMovedIn) {
-    const CoderPtr coder = fourLetterCoder();
-    Components folder = {{0x00, 2}};
-    Components files = {{0x01, 2}, {0x02, 2}};
-    coder->addPathToBTree(folder, files);
-    EXPECT_EQ(folder, (Components{{}}));
-    EXPECT_EQ(files, (Components{{}, {}}));
-    EXPECT_EQ(coder->partitionEnds, (Ends{2}));
-    EXPECT_EQ(coder->maxCodeBytes, 0U);
-}
-
-// ---- A file that becomes a folder ----
-
-TEST(PathEncoding, AFileWhoseNameServesAsAFolderIsNoPathAnyMore) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {u"a"}, {u"b", u"c"});
-    support::addBatch(*coder, {u"a", u"b"}, {u"d"});
-    EXPECT_EQ(coder->pathCount, 3U);
-    EXPECT_EQ(coder->partitionTracks[1], (PathTrack{0, 0, 0}));
-    EXPECT_EQ(support::iterated(*coder),
-              (std::vector<Texts>{{u"a", u"b", u"d"}, {u"a", u"c"}}));
-}
-
-TEST(PathEncoding, NumbersOfABatchWhoseFirstFileBecameAFolderPointElsewhere) {
-    const CoderPtr coder = fourLetterCoder();
-    support::addBatch(*coder, {u"a"}, {u"b"});
-    support::addBatch(*coder, {u"a"}, {u"c", u"d"});
-    support::addBatch(*coder, {u"a", u"c"}, {u"aa"});
-    // The second batch's track now ends at the folder c.
-    const auto answer = support::found(*coder, {2});
-    ASSERT_TRUE(answer);
-    EXPECT_EQ(support::decodedBy(*coder, answer->folders[0]),
-              (Texts{u"a", u"c"}));
-    EXPECT_EQ(support::decodedBy(*coder, answer->files[0]), Texts{u"aa"});
-    // Where its second file was sought there is nothing.
-    EXPECT_FALSE(support::found(*coder, {3}));
-    // The third batch joined a stored folder and is found.
-    const auto third = support::found(*coder, {4});
-    ASSERT_TRUE(third);
-    EXPECT_EQ(support::decodedBy(*coder, third->files[0]), Texts{u"aa"});
-}
-
-TEST(PathEncoding, APathThatIsAlsoAFolderSplitElsewhereStaysApart) {
-    const CoderPtr coder = fourLetterCoder();
-    // c/a is a file and a folder: the file is split one level higher.
-    support::addBatches(*coder, {{u"b"}, {u"b", u"c", u"a"}, {u"b", u"c"}},
-                        {{u"cda"}, {u"d"}, {u"b"}});
-    EXPECT_EQ(
-        support::iterated(*coder),
-        (std::vector<Texts>{
-            {u"b", u"cda"}, {u"b", u"c", u"a", u"d"}, {u"b", u"c", u"b"}}));
-    const auto answer = support::found(*coder, {1, 2, 3});
-    ASSERT_TRUE(answer);
-    EXPECT_EQ(support::decodedBy(*coder, answer->files[0]), Texts{u"cda"});
-}
-
-// ---- Workers' remains ----
-
-TEST(PathEncoding, ClearingWithoutWorkersDoesNothing) {
-    const CoderPtr coder = fourLetterCoder();
-    coder->joinAllGenThreads();
-    coder->clearThreadResources();
-    support::addBatch(*coder, {u"a"}, {u"b"});
-    coder->joinAllGenThreads();
-    coder->clearThreadResources();
-    EXPECT_EQ(coder->pathCount, 1U);
-}
-
-TEST(PathEncoding, JoiningWaitsForTheThreadsAndForgetsThem) {
-    const CoderPtr coder = fourLetterCoder();
-    bool done = false;
-    coder->genThreads.emplace_back([&done] { done = true; });
-    coder->genThreads.emplace_back();  // not joinable
-    coder->joinAllGenThreads();
-    EXPECT_TRUE(done);
-    EXPECT_TRUE(coder->genThreads.empty());
-}
-
-TEST(PathEncoding, TheDestructorJoinsWorkers) {
-    bool done = false;
-    {
-        const CoderPtr coder = fourLetterCoder();
-        coder->genThreads.emplace_back([&done] { done = true; });
-    }
-    EXPECT_TRUE(done);
+    EXPECT_EQ(coder->memoryUsage().batch, 0U);
+    Batch batch;
+    batch.files[0] = {u"x"};
+    batch.files[7] = Texts(100, std::u16string(500, u'a'));
+    EXPECT_EQ(refusalOf(*coder, batch, 1), Refused::unknownCharacter);
+    EXPECT_GT(coder->memoryUsage().batch, 100U * 1000);
+    EXPECT_LT(coder->memoryUsage().batch, 120U * 1000);
+    EXPECT_TRUE(coder->encodedFolders.empty());
+    coder->resetPathsToBTree();
+    EXPECT_EQ(coder->memoryUsage().batch, 0U);
+    EXPECT_EQ(refusalOf(*coder, batch, 7), Refused::unknownCharacter);
+    EXPECT_EQ(refusalOf(*coder, Batch(), 7), Refused::no);
+    EXPECT_EQ(coder->memoryUsage().batch, 0U);
 }
 
 }  // namespace

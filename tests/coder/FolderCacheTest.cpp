@@ -1,0 +1,65 @@
+// The cache of folders beside a map.
+
+#include <gtest/gtest.h>
+#include <rapidcheck/gtest.h>
+
+#include <map>
+
+#include "coder/FolderCache.hpp"
+#include "tests/support/Bytes.hpp"
+#include "tests/support/Trees.hpp"
+
+namespace {
+
+using tessel::BNode;
+using tessel::BPathTree;
+using tessel::Component;
+using tessel::ComponentPacker;
+using tessel::Components;
+using tessel::PathTrack;
+
+RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
+    const auto component =
+        rc::gen::container<Component>(1, rc::gen::inRange<std::uint8_t>(0, 6));
+    const auto folders = *rc::gen::scale(
+        5, rc::gen::container<std::vector<Components>>(rc::gen::scale(
+               0.01, rc::gen::container<Components>(component))));
+    BPathTree tree;
+    tessel::FolderCache cache;
+    ComponentPacker packer;
+    std::map<Components, std::pair<BNode*, PathTrack>> expected;
+    for (const Components& components : folders) {
+        const auto list = support::packedBy(packer, components);
+        const auto hash = tessel::FolderCache::hashOf(list);
+        const auto known = expected.find(components);
+        const tessel::FolderCache::Folder* found = cache.find(list, hash);
+        RC_ASSERT((found != nullptr) == (known != expected.end()));
+        if (found != nullptr) {
+            const auto track = cache.trackOf(*found);
+            RC_ASSERT(found->node == known->second.first);
+            RC_ASSERT(PathTrack(track.begin(), track.end()) ==
+                      known->second.second);
+            continue;
+        }
+        PathTrack track;
+        BNode& node = tree.addBatch(list, {}, track).folder;
+        cache.add(list, hash, node, track);
+        expected[components] = {&node, track};
+    }
+}
+
+TEST(FolderCache, FoldersOfEqualHashAreToldApart) {
+    constexpr std::size_t count = 400000;
+    tessel::FolderCache cache;
+    ComponentPacker packer;
+    BPathTree tree;
+    for (std::size_t i = 0; i < count; ++i) {
+        const auto list =
+            support::packedBy(packer, {support::littleEndian(i, 4)});
+        const auto hash = tessel::FolderCache::hashOf(list);
+        ASSERT_EQ(cache.find(list, hash), nullptr) << i;
+        cache.add(list, hash, *tree.root, {i});
+    }
+}
+
+}  // namespace

@@ -1,0 +1,117 @@
+// Numbers, partitions and repeated paths, without a tree.
+
+#include <gtest/gtest.h>
+
+#include <thread>
+
+#include "coder/PathNumbering.hpp"
+
+namespace {
+
+using tessel::AtomicMaximum;
+using tessel::PathNumbering;
+using tessel::PathTrack;
+using Ends = std::vector<std::uint64_t>;
+
+void note(PathNumbering& numbering, std::size_t files) {
+    PathTrack track = {1};
+    numbering.reserveForPartition(track.size());
+    numbering.notePartition(track, false, 0, files);
+}
+
+// What partitionAtOrAfter must answer.
+std::size_t searched(const Ends& ends, std::size_t k, std::uint64_t number) {
+    while (k < ends.size() && ends[k] < number) ++k;
+    return k;
+}
+
+void compareSearch(const PathNumbering& numbering) {
+    const Ends& ends = numbering.partitionEnds;
+    for (std::size_t k = 0; k <= ends.size(); ++k)
+        for (std::uint64_t number = 0; number < 15; ++number)
+            EXPECT_EQ(numbering.partitionAtOrAfter(k, number),
+                      searched(ends, k, number))
+                << "from " << k << " for " << number;
+}
+
+TEST(PathNumbering, PartitionsEndAtThePathsCountedSoFar) {
+    PathNumbering numbering;
+    note(numbering, 3);
+    note(numbering, 0);
+    PathTrack track = {4, 5};
+    numbering.reserveForPartition(2);
+    numbering.notePartition(track, true, 9, 2);
+    EXPECT_EQ(numbering.partitionEnds, (Ends{3, 3, 5}));
+    EXPECT_EQ(numbering.pathCount, 5U);
+    EXPECT_EQ(numbering.partitionTracks[0], PathTrack{1});
+    EXPECT_EQ(numbering.partitionTracks[2], (PathTrack{4, 5, 9}));
+    EXPECT_EQ(numbering.maxPartitionTrackLength, 3U);
+}
+
+TEST(PathNumbering, TheSearchFindsWhatOneFromTheFrontFinds) {
+    PathNumbering numbering;
+    compareSearch(numbering);
+    for (const std::size_t files : {1U, 0U, 0U, 2U, 3U, 0U, 4U}) {
+        note(numbering, files);
+        compareSearch(numbering);
+    }
+}
+
+// A count that was set back, as deserializePathTree does, makes ends fall.
+TEST(PathNumbering, EndsThatFallAreNoticedWhenAPartitionIsAdded) {
+    PathNumbering numbering;
+    note(numbering, 2);
+    note(numbering, 8);
+    numbering.pathCount = 2;
+    note(numbering, 1);
+    EXPECT_EQ(numbering.partitionEnds, (Ends{2, 10, 3}));
+    compareSearch(numbering);
+    note(numbering, 9);
+    compareSearch(numbering);
+}
+
+TEST(PathNumbering, EndsThatFallAreNoticedWhenTheyAreCheckedAnew) {
+    PathNumbering numbering;
+    numbering.partitionEnds = {2, 10, 3, 12};
+    numbering.checkEnds();
+    compareSearch(numbering);
+    const PathNumbering copy = numbering;
+    compareSearch(copy);
+    numbering.partitionEnds = {2, 3, 10, 12};
+    numbering.checkEnds();
+    compareSearch(numbering);
+}
+
+TEST(PathNumbering, OnlyAPathThatExistedIsADuplicate) {
+    PathNumbering numbering;
+    PathTrack track = {1, 2};
+    numbering.noteWholePath(track, false);
+    EXPECT_FALSE(numbering.hasDuplicate(1));
+    numbering.noteWholePath(track, true);
+    EXPECT_TRUE(numbering.hasDuplicate(2));
+    EXPECT_FALSE(numbering.hasDuplicate(3));
+    EXPECT_EQ(numbering.duplicates.at(2), (PathTrack{1, 2}));
+    EXPECT_EQ(numbering.maxDuplicateTrackLength, 2U);
+    EXPECT_EQ(numbering.maxDuplicatePathNumber, 2U);
+    EXPECT_EQ(numbering.pathCount, 2U);
+    EXPECT_GT(numbering.duplicateBytes(), 2 * sizeof(std::uint64_t));
+}
+
+TEST(AtomicMaximum, IsTheLargestOfWhatAnyThreadRaised) {
+    AtomicMaximum maximum;
+    std::vector<std::thread> threads;
+    for (std::uint64_t t = 0; t < 4; ++t)
+        threads.emplace_back([&maximum, t] {
+            for (std::uint64_t i = 0; i < 1000; ++i) maximum.raise(4 * i + t);
+        });
+    for (std::thread& thread : threads) thread.join();
+    EXPECT_EQ(maximum, 3999U);
+    maximum.raise(5);
+    EXPECT_EQ(maximum, 3999U);
+    const AtomicMaximum copy = maximum;
+    maximum = 2;
+    EXPECT_EQ(maximum, 2U);
+    EXPECT_EQ(copy, 3999U);
+}
+
+}  // namespace
