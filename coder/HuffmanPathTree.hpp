@@ -262,9 +262,10 @@ public:
     // Visits paths by number, in ascending order, without copies and without
     // the heap. `numbers` is any random-access range of unsigned integers.
     // Per partition met, the visitor sees its folder once, then the files
-    // asked for, of which maxFiles is an upper bound:
+    // asked for; usualFiles is how many they are at most, unless numbers
+    // repeat or descend:
     //
-    //   visitor.beginFolder(maxFiles);
+    //   visitor.beginFolder(usualFiles);
     //   visitor.folder(ComponentView);  // each component, the root first
     //   visitor.file(ComponentView);    // each file, in the order of numbers
     //

@@ -16,11 +16,11 @@ public:
            std::vector<Components>& filePaths) noexcept
         : folderPaths_(folderPaths), filePaths_(filePaths) {}
 
-    void beginFolder(std::size_t maxFiles) {
+    void beginFolder(std::size_t usualFiles) {
         finish();
         started_ = true;
         folder_.reserve(usualDepth);
-        files_.reserve(maxFiles);
+        files_.reserve(usualFiles);
     }
     void folder(ComponentView name) {
         folder_.emplace_back(name.begin(), name.end());

@@ -11,6 +11,7 @@ using support::addBatches;
 using support::addWhole;
 using support::CoderPtr;
 using support::decodedBy;
+using support::encodedBy;
 using support::fourLetterCoder;
 using support::Texts;
 using tessel::Components;
