@@ -157,7 +157,7 @@ CommandLine::Request CommandLine::parse(std::span<const std::string> words) {
     return Request::Run;
 }
 
-std::string CommandLine::help() const { return app_->help(); }
+std::string CommandLine::help() const { return app_->help() + "\n"; }
 
 void CommandLine::fail(const std::string& problem) const {
     throw ConsoleException(ExitStatus::Usage, fmt::format("{}; see `{} --help`",

@@ -31,12 +31,12 @@ bool writeDifferences(PathSet& before, PathSet& after, ProgressBar& bar,
         if (step % 4096 == 0)
             bar.update(before.pathsRead() + after.pathsRead());
         const auto order = compare(before, after);
-        if (order < 0) write("- ", *before.path());
-        if (order > 0) write("+ ", *after.path());
-        differ |= order != 0;
+        if (std::is_lt(order)) write("- ", *before.path());
+        if (std::is_gt(order)) write("+ ", *after.path());
+        differ |= std::is_neq(order);
         // advance() changes what the order was taken from.
-        if (order <= 0) before.advance();
-        if (order >= 0) after.advance();
+        if (std::is_lteq(order)) before.advance();
+        if (std::is_gteq(order)) after.advance();
     }
     return differ;
 }

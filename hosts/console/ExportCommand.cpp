@@ -1,6 +1,7 @@
 #include "hosts/console/ExportCommand.hpp"
 
-#include <ranges>
+#include <cstddef>
+#include <iterator>
 #include <string_view>
 
 #include "hosts/console/ArchiveFile.hpp"
@@ -17,6 +18,41 @@ constexpr Command::Description description = {
     "  tessel export files.tessel -o files.store\n"
     "  tessel pack files.store -o files.tessel   the way back"};
 
+// An archive's paths as a range that shows in a bar how far it is.
+struct CountedPaths {
+    class Iterator {
+    public:
+        using iterator_concept = std::input_iterator_tag;
+        using value_type = std::string_view;
+        using difference_type = std::ptrdiff_t;
+
+        explicit Iterator(const CountedPaths& paths)
+            : paths_(paths.archive.begin()), bar_(&paths.bar) {}
+
+        std::string_view operator*() const noexcept { return *paths_; }
+        Iterator& operator++() {
+            if (paths_.number() % 4096 == 0) bar_->update(paths_.number());
+            ++paths_;
+            return *this;
+        }
+        void operator++(int) { ++*this; }
+
+        friend bool operator==(const Iterator& it, std::default_sentinel_t) {
+            return it.paths_ == std::default_sentinel;
+        }
+
+    private:
+        PathArchive::Iterator paths_;
+        ProgressBar* bar_;
+    };
+
+    Iterator begin() const { return Iterator(*this); }
+    std::default_sentinel_t end() const noexcept { return {}; }
+
+    const PathArchive& archive;
+    ProgressBar& bar;
+};
+
 }  // namespace
 
 ExportCommand::ExportCommand() : Command(description) {
@@ -31,24 +67,14 @@ ExitStatus ExportCommand::run(Session& session) {
     checkNoTerminal(store_, session);
     checkOverwrite(store_, force_ ? Overwrite::Allowed : Overwrite::Refused);
     const PathArchive archive = openArchive(file_, session.interrupts);
-    session.interrupts.tidyUpFirst();
     ProgressBar bar(barVisibility(session, Writes::Nothing));
     bar.begin("reading", ProgressUnit::Paths, archive.size());
-    std::uint64_t done = 0;
-    const auto counted = [&](std::string_view path) {
-        if (++done % 4096 == 0) {
-            session.interrupts.throwIfStopped();
-            bar.update(done);
-        }
-        return path;
-    };
     const PathStore store = inFile(file_, [&] {
-        return PathStore::from(
-            std::ranges::subrange(archive.begin(), archive.end()) |
-            std::views::transform(counted));
+        return PathStore::from(CountedPaths{archive, bar});
     });
-    session.interrupts.throwIfStopped();
-    replaceFile(store_, store.save(), session);
+    const auto bytes = store.save();
+    session.interrupts.tidyUpFirst();
+    replaceFile(store_, bytes, session);
     return ExitStatus::Success;
 }
 

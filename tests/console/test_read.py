@@ -354,6 +354,7 @@ def test_help_and_version(tessel):
         assert command.encode() in overview
         text = tessel(command, "--help").out.decode()
         assert "Examples:\n" in text and f"tessel {command} " in text
+        assert text.endswith("\n")
         assert max(len(line) for line in text.split("\n")) <= 80
 
 

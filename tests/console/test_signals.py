@@ -45,6 +45,7 @@ def test_an_interrupt_while_it_packs(tessel):
     for delay in [0.2, 0.6, 1.2]:
         run = tessel.start("pack", "list", "-o", "a.tessel", "-f", "--level",
                            "best", stdout=subprocess.DEVNULL)
+        wait_for_leftover(tessel, run)
         time.sleep(delay)
         run.send_signal(signal.SIGINT)
         assert run.wait() == 130
