@@ -3,7 +3,6 @@
 #include <fmt/format.h>
 
 #include <cstddef>
-#include <utility>
 
 namespace tessel::console {
 
@@ -19,18 +18,18 @@ bool isLetter(char c) noexcept {
 void appendByte(char c, LetterCase letterCase, PatternAlphabet alphabet,
                 std::string& expression) {
     const bool isDigit = c >= '0' && c <= '9';
-    if (!isAscii(c) && alphabet == PatternAlphabet::Bytes)
+    const bool needsCode = isAscii(c) ? !isLetter(c) && !isDigit
+                                      : alphabet == PatternAlphabet::Bytes;
+    if (needsCode)
         expression += fmt::format("\\x{:02X}", static_cast<unsigned char>(c));
     else if (isLetter(c) && letterCase == LetterCase::Ignored &&
              alphabet == PatternAlphabet::Bytes)
         expression += fmt::format("(?i:{})", c);
-    else if (isLetter(c) || isDigit || !isAscii(c))
-        expression.push_back(c);
     else
-        expression += fmt::format("\\x{:02X}", static_cast<unsigned char>(c));
+        expression.push_back(c);
 }
 
-std::string wrapped(std::string expression, LetterCase letterCase,
+std::string wrapped(const std::string& expression, LetterCase letterCase,
                     PatternAlphabet alphabet) {
     const bool folds =
         letterCase == LetterCase::Ignored && alphabet == PatternAlphabet::Utf8;
@@ -46,7 +45,7 @@ public:
 
     std::string run() {
         while (at_ < glob_.size()) step();
-        return wrapped(std::move(expression_), letterCase_, alphabet_);
+        return wrapped(expression_, letterCase_, alphabet_);
     }
 
 private:
@@ -138,7 +137,7 @@ std::string textToExpression(std::string_view text, LetterCase letterCase,
                              PatternAlphabet alphabet) {
     std::string expression;
     for (const char c : text) appendByte(c, letterCase, alphabet, expression);
-    return wrapped(std::move(expression), letterCase, alphabet);
+    return wrapped(expression, letterCase, alphabet);
 }
 
 }  // namespace tessel::console
