@@ -41,6 +41,7 @@ public:
                 writer.add((*list_)[i]);
             }
             writer.finish();
+            bytes->shrink_to_fit();
             bytes_ = std::move(bytes);
             archive_ = std::make_unique<PathArchive>(PathArchive::over(view()));
         });
