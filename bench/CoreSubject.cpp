@@ -1,5 +1,6 @@
 // The core itself as a subject: UTF-16 texts in, UTF-16 texts out.
 
+#include <array>
 #include <map>
 #include <utility>
 
@@ -69,7 +70,7 @@ public:
     double fetchRandom(const std::vector<std::size_t>& numbers) override {
         return secondsOf([&] {
             for (const std::size_t number : numbers) {
-                fetch(*coder_, std::views::single(number),
+                fetch(*coder_, std::array<std::size_t, 1>{number},
                       [](const std::u16string& text) { keep(text); });
             }
         });

@@ -11,6 +11,7 @@
 #include "bench/PathReader.hpp"
 #include "bench/Report.hpp"
 #include "bench/Timing.hpp"
+#include "paths/IndexedRange.hpp"
 #include "paths/PathList.hpp"
 #include "paths/PathStore.hpp"
 
@@ -97,9 +98,8 @@ private:
     }
 
     PathStore built() const {
-        return PathStore::from(
-            std::views::iota(std::size_t{0}, list_.size()) |
-            std::views::transform([&](std::size_t i) { return list_[i]; }));
+        return PathStore::from(tessel::paths::IndexedRange(
+            0, list_.size(), [&](std::size_t i) { return list_[i]; }));
     }
 
     // Saves the store, releases it, and loads another one.

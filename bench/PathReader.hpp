@@ -3,13 +3,13 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
-#include <ranges>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
 #include "paths/Batches.hpp"
+#include "paths/IndexedRange.hpp"
 
 // Reading the core itself, as UTF-16 texts, without the store around it.
 namespace bench {
@@ -72,7 +72,8 @@ void fetch(const tessel::HuffmanPathTree& coder, const Numbers& numbers,
 
 // The numbers first to last.
 inline auto numbersFrom(std::size_t first, std::size_t last) {
-    return std::views::iota(first, last + 1);
+    return tessel::paths::IndexedRange(first, last + 1,
+                                       [](std::size_t i) { return i; });
 }
 
 // `count` random numbers from 1 to `last`, the same ones every time.

@@ -1,10 +1,10 @@
 // The store of paths as a subject: the library as a C++ program uses it.
 
-#include <ranges>
 #include <utility>
 
 #include "bench/Subject.hpp"
 #include "bench/Timing.hpp"
+#include "paths/IndexedRange.hpp"
 #include "paths/PathStore.hpp"
 
 namespace bench {
@@ -17,9 +17,8 @@ namespace {
 class StoreSubject : public Subject {
     // A range of the list's paths.
     auto views() const {
-        return std::views::iota(std::size_t{0}, list_->size()) |
-               std::views::transform(
-                   [this](std::size_t i) { return (*list_)[i]; });
+        return tessel::paths::IndexedRange(
+            0, list_->size(), [this](std::size_t i) { return (*list_)[i]; });
     }
 
 public:

@@ -136,7 +136,7 @@ void fetchRandom() {
     count([&] {
         for (std::size_t i = 0; i < randomFetches; ++i) {
             const auto number = 1 + numbers.below(coder->pathCount);
-            bench::fetch(*coder, std::views::single(number),
+            bench::fetch(*coder, std::array<std::size_t, 1>{number},
                          [](const std::u16string& text) { bench::keep(text); });
         }
     });

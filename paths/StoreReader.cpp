@@ -1,12 +1,13 @@
 #include "paths/StoreReader.hpp"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
-#include <ranges>
 #include <stdexcept>
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
+#include "paths/IndexedRange.hpp"
 #include "paths/Segments.hpp"
 
 namespace tessel::paths {
@@ -63,7 +64,7 @@ public:
 private:
     struct Level {
         ComponentView name;
-        std::size_t end;  // of the folders down to here, in path_
+        std::size_t end = 0;  // of the folders down to here, in path_
     };
 
     std::size_t endOf(std::size_t depth) const noexcept {
@@ -149,7 +150,7 @@ void readPath(const HuffmanPathTree& coder, std::size_t i, std::string& text) {
     thread_local PathDecoder decoder;
     decoder.startOn(coder);
     const auto keep = [&](std::string_view path) { text.assign(path); };
-    visitTexts(coder, decoder, std::views::single(i + 1), 1, keep);
+    visitTexts(coder, decoder, std::array<std::size_t, 1>{i + 1}, 1, keep);
 }
 
 void readPaths(const HuffmanPathTree& coder, std::size_t first,
@@ -157,7 +158,8 @@ void readPaths(const HuffmanPathTree& coder, std::size_t first,
     PathDecoder decoder;
     decoder.startOn(coder);
     std::size_t number = first;
-    visitTexts(coder, decoder, std::views::iota(first + 1, last + 1),
+    visitTexts(coder, decoder,
+               IndexedRange(first, last, [](std::size_t i) { return i + 1; }),
                last - first,
                [&](std::string_view path) { visit(number++, path); });
 }
@@ -170,11 +172,10 @@ void readPaths(const HuffmanPathTree& coder,
     std::size_t next = 0;
     while (next < numbers.size()) {
         const std::size_t end = endOfRun(numbers, next);
-        const auto run = numbers.subspan(next, end - next);
         visitTexts(coder, decoder,
-                   std::views::transform(
-                       run, [](std::size_t number) { return number + 1; }),
-                   run.size(), [&](std::string_view path) {
+                   IndexedRange(next, end,
+                                [&](std::size_t i) { return numbers[i] + 1; }),
+                   end - next, [&](std::string_view path) {
                        visit(numbers[next++], path);
                    });
     }

@@ -10,6 +10,7 @@
 #include <array>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <list>
 #include <ranges>
 #include <sstream>
@@ -19,12 +20,14 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
+#include "paths/IndexedRange.hpp"
 #include "paths/PathStore.hpp"
 
 namespace {
 
 using tessel::DamagedFormException;
 using tessel::PathStore;
+using tessel::paths::IndexedRange;
 using Bytes = std::vector<std::uint8_t>;
 using Numbers = std::vector<std::size_t>;
 using Strings = std::vector<std::string>;
@@ -127,12 +130,15 @@ TEST(PathStore, TakesRangesOfEveryKind) {
     expectHolds(PathStore::from(std::list<std::string>{"a/b", "c"}), expected);
     const std::vector<std::string_view> views = {"a/b", "c"};
     expectHolds(PathStore::from(views), expected);
-    std::istringstream words("a/b c");
-    expectHolds(PathStore::from(std::ranges::istream_view<std::string>(words)),
-                expected);
-    const auto made = views | std::views::transform([](std::string_view view) {
-                          return std::string(view);
-                      });
+    // Can be read only once.
+    struct Words {
+        std::istringstream text{"a/b c"};
+        auto begin() { return std::istream_iterator<std::string>(text); }
+        static auto end() { return std::istream_iterator<std::string>(); }
+    };
+    expectHolds(PathStore::from(Words()), expected);
+    const IndexedRange made(
+        0, views.size(), [&](std::size_t i) { return std::string(views[i]); });
     expectHolds(PathStore::from(made), expected);
 }
 
@@ -340,11 +346,11 @@ TEST(PathStore, AnEmptyPathIsRefusedWithItsPosition) {
     EXPECT_EQ(refusalOf(store, {""}), "The path at position 0 is empty.");
     std::istringstream lines("b\n\nc");
     const auto read = [&] {
-        return std::views::iota(0, 3) | std::views::transform([&](int) {
-                   std::string line;
-                   std::getline(lines, line);
-                   return line;
-               });
+        return IndexedRange(0, 3, [&](std::size_t) {
+            std::string line;
+            std::getline(lines, line);
+            return line;
+        });
     };
     EXPECT_THROW(store.append(read()), std::invalid_argument);
     EXPECT_THROW(store.append(std::string_view()), std::invalid_argument);
@@ -356,12 +362,10 @@ TEST(PathStore, ARangeThatThrowsLeavesTheStore) {
     for (const std::size_t failing : {0U, 10U, 150'000U, 250'000U}) {
         PathStore store = PathStore::from(Strings{"a/1", "0/2"});
         std::size_t seen = 0;
-        const auto paths =
-            std::views::iota(std::size_t{0}, std::size_t{160'000}) |
-            std::views::transform([&](std::size_t i) {
-                if (seen++ == failing) throw std::length_error("enough");
-                return std::string("a/").append(1 + i % 9, '0');
-            });
+        const IndexedRange paths(0, 160'000, [&](std::size_t i) {
+            if (seen++ == failing) throw std::length_error("enough");
+            return std::string("a/").append(1 + i % 9, '0');
+        });
         EXPECT_THROW(store.append(paths), std::length_error);
         expectHolds(store, {"a/1", "0/2"});
         store.append("a/3");
