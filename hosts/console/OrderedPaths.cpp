@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <numeric>
 #include <span>
+#include <utility>
 
 namespace tessel::console {
 
@@ -60,8 +61,8 @@ void OrderedPaths::Run::readAhead(const PathArchive& archive,
 
 // ---- OrderedPaths ----
 
-OrderedPaths::OrderedPaths(const PathArchive& archive, ProgressBar& bar)
-    : archive_(archive) {
+OrderedPaths::OrderedPaths(PathArchive archive, ProgressBar& bar)
+    : archive_(std::move(archive)) {
     bar.begin("reading", ProgressUnit::Paths, archive_.size());
     if (isInByteOrder(archive_, bar)) {
         sorted_.emplace(archive_.begin());

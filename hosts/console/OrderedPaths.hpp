@@ -19,10 +19,10 @@ namespace tessel::console {
 // the runs are merged, so that each path is read twice and memory stays at one
 // number per path and some megabytes.
 //
-// Ownership: keeps a copy of the archive; borrows the bar.
+// Ownership: keeps the archive; borrows the bar.
 class OrderedPaths {
 public:
-    OrderedPaths(const PathArchive& archive, ProgressBar& bar);
+    OrderedPaths(PathArchive archive, ProgressBar& bar);
 
     // The next path, or nothing at the end. The view is valid until the next
     // call.
