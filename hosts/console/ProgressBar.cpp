@@ -22,6 +22,7 @@ constexpr std::size_t maxBarWidth = 40;
 
 // Whether a line is on the terminal. Relaxed suffices: whoever wipes a line
 // too much or too few does no harm.
+// NOLINTNEXTLINE(cppcoreguidelines-avoid-non-const-global-variables)
 std::atomic<bool> lineIsShown = false;
 
 void writeToTerminal(std::string_view text) noexcept {
@@ -112,7 +113,7 @@ void ProgressBar::update(std::uint64_t done) {
     writeToTerminal("\r" + line + "\x1b[K");
 }
 
-void ProgressBar::finish() noexcept {
+void ProgressBar::finish() const noexcept {
     if (visible_) wipe();
 }
 

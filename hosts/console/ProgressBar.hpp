@@ -51,7 +51,7 @@ public:
     }
 
     // Removes the line.
-    void finish() noexcept;
+    void finish() const noexcept;
 
     // Removes the line of whatever bar is shown, from any thread.
     static void wipe() noexcept;

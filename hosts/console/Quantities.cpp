@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstddef>
 #include <string_view>
 
@@ -49,7 +50,7 @@ std::string durationText(double seconds) {
     // An estimate from the first moments may be absurd.
     constexpr double most = 359'999;
     const auto whole =
-        static_cast<std::uint64_t>(std::clamp(seconds, 0.0, most) + 0.5);
+        static_cast<std::uint64_t>(std::lround(std::clamp(seconds, 0.0, most)));
     const std::uint64_t minutes = whole / 60;
     if (minutes < 60) return fmt::format("{}:{:02}", minutes, whole % 60);
     return fmt::format("{}:{:02}:{:02}", minutes / 60, minutes % 60,
