@@ -1,4 +1,4 @@
-// Six small fixed workloads whose instructions bench/regress counts. Each
+// Small fixed workloads whose instructions bench/regress counts. Each
 // makes its own input, which is not counted, and runs on one thread.
 
 #include <valgrind/callgrind.h>
@@ -12,6 +12,7 @@
 #include <string_view>
 #include <utility>
 
+#include "archive/PathArchive.hpp"
 #include "bench/PathReader.hpp"
 #include "bench/Timing.hpp"
 
@@ -154,16 +155,66 @@ void storeAndRestore() {
     });
 }
 
+// ---- The archive, on one thread and in memory ----
+
+std::vector<std::uint8_t> archiveOf(const PathList& list) {
+    tessel::ArchiveOptions options;
+    options.threads = 1;
+    std::vector<std::uint8_t> bytes;
+    tessel::ArchiveWriter writer(bytes, options);
+    for (std::size_t i = 0; i < list.size(); ++i) writer.add(list[i]);
+    writer.finish();
+    return bytes;
+}
+
+void buildArchive() {
+    const PathList list = madeUpList();
+    count([&] { bench::keep(archiveOf(list)); });
+}
+
+// Counts what a call does with a newly opened archive, so that the checks at
+// the first touch of each piece are counted, too.
+template <class Call>
+void countOnArchive(Call call) {
+    const auto bytes = archiveOf(madeUpList());
+    const auto archive = tessel::PathArchive::over(bytes);
+    count([&] { call(archive); });
+}
+
+void getFromArchive(const tessel::PathArchive& archive) {
+    Numbers numbers;
+    std::string path;
+    for (std::size_t i = 0; i < randomFetches; ++i) {
+        archive.read(numbers.below(archive.size()), path);
+        bench::keep(path);
+    }
+}
+
+void iterateArchive(const tessel::PathArchive& archive) {
+    archive.forEach(
+        [](std::uint64_t, std::string_view path) { bench::keep(path); });
+}
+
+void findInArchive(const tessel::PathArchive& archive) {
+    tessel::FindOptions options;
+    options.threads = 1;
+    bench::keep(archive.find("confignu", options));
+}
+
 using Workload = std::pair<std::string_view, std::function<void()>>;
 
-const std::array<Workload, 6>& workloads() {
-    static const std::array<Workload, 6> all = {{
+const std::array<Workload, 10>& workloads() {
+    static const std::array<Workload, 10> all = {{
         {"build-sorted", [] { build(madeUpList()); }},
         {"build-shuffled", [] { build(shuffled(madeUpList())); }},
         {"iterate", iterateAll},
         {"fetch-all", fetchAll},
         {"fetch-random", fetchRandom},
         {"store-and-restore", storeAndRestore},
+        {"archive-build", buildArchive},
+        {"archive-get", [] { countOnArchive(getFromArchive); }},
+        {"archive-iterate", [] { countOnArchive(iterateArchive); }},
+        {"archive-find", [] { countOnArchive(findInArchive); }},
     }};
     return all;
 }

@@ -17,13 +17,8 @@ std::unique_ptr<HuffmanPathTree> coderFor(CharacterCounts counts) {
 }
 
 void CharacterCounter::addBytes(std::string_view bytes) {
-    Page& ascii = *pages_.front();
-    forEachUnit(bytes, [&](char16_t unit) {
-        if (unit < pageSize)
-            ++ascii[unit];
-        else
-            add(unit);
-    });
+    Page& firstPage = *pages_.front();
+    forEachUnit(bytes, [&](char16_t unit) { add(firstPage, unit); });
 }
 
 CharacterCounts CharacterCounter::result() const {

@@ -35,7 +35,8 @@ public:
 
     void add(char16_t unit) { ++page(unit / pageSize)[unit % pageSize]; }
     void add(std::u16string_view text) {
-        for (const char16_t unit : text) add(unit);
+        Page& firstPage = *pages_.front();
+        for (const char16_t unit : text) add(firstPage, unit);
     }
     // Counts the units of the bytes' text.
     void addBytes(std::string_view bytes);
@@ -46,6 +47,15 @@ private:
     static constexpr std::size_t pageSize = 256;
     static constexpr std::size_t pageCount = (std::size_t{1} << 16U) / pageSize;
     using Page = std::array<std::uint64_t, pageSize>;
+
+    // The first page, where most units of most paths are, stays in a register
+    // while a text is counted.
+    void add(Page& firstPage, char16_t unit) {
+        if (unit < pageSize)
+            ++firstPage[unit];
+        else
+            add(unit);
+    }
 
     Page& page(std::size_t i) {
         if (pages_[i] == nullptr) pages_[i] = std::make_unique<Page>();

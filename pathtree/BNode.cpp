@@ -67,7 +67,7 @@ BNode* BNode::popChild() noexcept {
 }
 
 // Remembers the parent, or none, in the place that popChild made free.
-void BNode::stashParent(BNode* parent) noexcept {
+inline void BNode::stashParent(BNode* parent) noexcept {
     ChildBlock* block = store().block();
     if (block != nullptr)
         block->slots()[block->size] = parent;
@@ -75,14 +75,14 @@ void BNode::stashParent(BNode* parent) noexcept {
         setStore(ChildStore::only(parent));
 }
 
-BNode* BNode::unstashParent() noexcept {
+inline BNode* BNode::unstashParent() noexcept {
     const ChildStore kept = store();
     if (!kept.isOnly()) return kept.block()->slots()[kept.block()->size];
     setStore(ChildStore());
     return kept.child();
 }
 
-void BNode::releaseOwned() noexcept {
+inline void BNode::releaseOwned() noexcept {
     if (ChildBlock* block = store().block()) std::free(block);
     if (lengthAndFlags_ >> lengthShift == longLength) std::free(ownValue());
     NodeSlab* slab = NodeSlab::of(this);

@@ -21,7 +21,10 @@ struct Answer {
 
 // Runs plain_reader.py on the bytes.
 Answer readPlainly(const std::vector<std::uint8_t>& bytes) {
-    const std::string file = testing::TempDir() + "plain-reader.tessel";
+    // One file per test: tests run side by side.
+    const std::string file =
+        testing::TempDir() + "plain-reader-" +
+        testing::UnitTest::GetInstance()->current_test_info()->name();
     std::ofstream(file, std::ios::binary)
         .write(reinterpret_cast<const char*>(bytes.data()),
                static_cast<std::streamsize>(bytes.size()));
