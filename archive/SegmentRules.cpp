@@ -13,7 +13,7 @@ namespace tessel::archive {
 namespace {
 
 bool isWithout(std::string_view text, char byte) noexcept {
-    return text.find(byte) == text.npos;
+    return text.find(byte) == std::string_view::npos;
 }
 
 }  // namespace

@@ -34,7 +34,7 @@ public:
 
     // The first token of names that share a prefix and go on with `byte`.
     struct FirstToken {
-        std::uint8_t byte;
+        std::uint8_t byte = 0;
         TokenCode<firstLookupBits> code;
     };
 

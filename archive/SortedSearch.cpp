@@ -65,7 +65,8 @@ bool SortedSearch::startsBefore(const Target& target,
     if (order != 0) return order < 0;
     if (folder.size() >= target.path.size()) return false;
     const std::string_view rest = target.path.substr(folder.size());
-    if (target.aim == Aim::Equal && rest.find('/') == rest.npos) return true;
+    if (target.aim == Aim::Equal && rest.find('/') == std::string_view::npos)
+        return true;
     return firstNameOf(candidate) < rest;
 }
 

@@ -21,7 +21,7 @@ public:
     constexpr Token(TokenEntry entry, unsigned context,
                     unsigned codeBits) noexcept
         : packed_(entry.offset << 14U | entry.length << 9U |
-                  std::uint32_t{entry.ends} << 8U | context << 5U | codeBits) {}
+                  (entry.ends ? 1U << 8U : 0U) | context << 5U | codeBits) {}
 
     // Stands for a token whose code is too long for a lookup.
     static constexpr Token tooLong() noexcept { return {{}, 0, 31}; }
@@ -109,7 +109,7 @@ private:
 
     // By length: the last code, as the top of a word with ones after it; and
     // the place of the first code less the code itself, which may wrap.
-    std::array<std::uint32_t, maxTokenCodeBits + 4> lastCode_;
+    std::array<std::uint32_t, maxTokenCodeBits + 4> lastCode_{};
     std::array<std::uint32_t, maxTokenCodeBits + 1> placeOffset_{};
     unsigned shortest_ = 0;
 };

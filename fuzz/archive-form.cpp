@@ -160,7 +160,8 @@ void searchEverywhere(const PathArchive& archive) {
     options.threads = 1;
     std::size_t found = 0;
     const auto few = [&](std::uint64_t, std::string_view path) {
-        fuzz::require(path.find('a') != path.npos, "a found path holds it");
+        fuzz::require(path.find('a') != std::string_view::npos,
+                      "a found path holds it");
         return ++found < maxShownPaths;
     };
     const std::string_view texts[] = {"a"};
