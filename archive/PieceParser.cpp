@@ -63,7 +63,7 @@ void PieceParser::tryLiteral(std::uint32_t at, std::uint8_t context,
 void PieceParser::tryTokens(const Piece& piece, std::uint32_t at,
                             std::uint8_t context) {
     const TokenTrie& trie = model_.trie();
-    const std::uint8_t* costs = model_.costs() + context;
+    const std::uint8_t* costs = model_.costs();  // none if no token exists
     const std::uint32_t start = costOf(ways_[at]);
     TokenTrie::Base base = trie.root();
     std::uint32_t token = 0;
@@ -71,7 +71,8 @@ void PieceParser::tryTokens(const Piece& piece, std::uint32_t at,
         if (!trie.step(base, static_cast<std::uint8_t>(piece.text[i]), token))
             return;
         if (token == TokenTrie::noToken) continue;
-        const std::uint32_t cost = start + costs[token * contextSlots];
+        const std::uint32_t cost =
+            start + costs[token * contextSlots + context];
         ways_[i + 1] = std::min(ways_[i + 1], wayOf(cost, i + 1 - at, token));
     }
 }
