@@ -23,6 +23,11 @@ function(qztesselAddLibrary name)
   target_compile_features(${target} PUBLIC cxx_std_20)
   # An installed library must not name a target that is not installed.
   target_link_libraries(${target} PRIVATE $<BUILD_INTERFACE:qztessel_options>)
+  if(QZTESSEL_SANITIZE)
+    # Sanitized tests spend their time here; a test itself compiles in a third
+    # of the time without.
+    target_compile_options(${target} PRIVATE -O1)
+  endif()
   set_target_properties(
     ${target}
     PROPERTIES EXPORT_NAME ${name}
