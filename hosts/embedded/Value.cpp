@@ -142,7 +142,9 @@ Value Value::textLists(const std::vector<std::vector<std::u16string>>& lists) {
 // ---- Looking into values ----
 
 const Array& Value::empty() noexcept {
+    // Made at the first call: without memory for it, the host ends here.
     static const Value zeroByZero(
+        // NOLINTNEXTLINE(bugprone-unhandled-exception-at-new)
         new Numbers(ValueClass::Double, Shape(0, 0), {{}, false}));
     return *zeroByZero.array_;
 }

@@ -106,7 +106,7 @@ Value HostJob::makeInstance() {
         elements.push_back(Value::texts(folder));
     for (const auto& files : all.files) elements.push_back(Value::texts(files));
     all = {};
-    const Value foldersAndFiles = Value::cellColumn(std::move(elements));
+    const Value foldersAndFiles = Value::cellColumn(elements);
     Value instance;
     step("make, mode files", [&] {
         instance = host_.construct(filesetClassName, Value::text(u"files"),
