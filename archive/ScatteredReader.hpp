@@ -1,12 +1,12 @@
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <span>
+#include <vector>
 
-#include "archive/FunctionRef.hpp"
 #include "archive/PackedNumbers.hpp"
+#include "archive/PathBatch.hpp"
 #include "archive/PathCursor.hpp"
 #include "archive/PathVisitor.hpp"
 #include "archive/Segment.hpp"
@@ -14,14 +14,15 @@
 namespace tessel::archive {
 
 // ScatteredReader reads many paths of one segment whose places lie anywhere.
-// It looks some paths ahead and asks the processor for their bytes, so that
-// their ways through the memory overlap. Paths that lie close together are
-// decoded on from each other instead.
+// Where the places ascend, it decodes the paths one after the other, those
+// that lie close together on from each other. Otherwise it decodes them in
+// batches.
 //
 // Numbers are those of the archive and must be in the segment.
 //
 // Ownership: borrows the segment.
 // Threads: one thread at a time.
+// Cost: that of a batch.
 class ScatteredReader {
 public:
     explicit ScatteredReader(const Segment& segment);
@@ -32,34 +33,23 @@ public:
     bool read(std::uint64_t first, std::uint64_t last, PathVisitor visitor);
 
 private:
-    // Paths between the first look at a path's place and its decoding. Eight
-    // suffice to hide the memory's latency: the decoding of one path takes as
-    // long as one access.
-    static constexpr std::size_t lookahead = 8;
-
-    struct Coming {
-        std::uint64_t place = 0;
-        bool isFar = false;  // from the path before
-    };
-
     template <class NumberAt>
     bool readAll(std::uint64_t count, NumberAt numberAt, PathVisitor visitor);
-    void announce(std::uint64_t index, std::uint64_t number);
-    void prefetch(std::uint64_t index, std::uint64_t count);
-    Coming& coming(std::uint64_t index) noexcept {
-        return coming_[index % lookahead];
-    }
-    std::uint32_t blockOf(std::uint64_t place) const noexcept {
-        return static_cast<std::uint32_t>(place / perBlock_);
-    }
+    template <class NumberAt>
+    void findPlaces(std::uint64_t count, NumberAt numberAt);
+    template <class NumberAt>
+    bool showAscending(NumberAt numberAt, PathVisitor visitor);
+    template <class NumberAt>
+    bool showBatch(NumberAt numberAt, PathVisitor visitor);
+    void prefetch(std::size_t i) const noexcept;
 
     const Segment& segment_;
     PackedNumbers order_;
     PathCursor paths_;
+    PathBatch batch_;
     std::uint32_t perBlock_;
     bool inPlace_;
-    std::uint64_t lastPlace_;
-    std::array<Coming, lookahead> coming_{};
+    std::vector<std::uint32_t> places_;  // of the paths that come next
 };
 
 }  // namespace tessel::archive
