@@ -13,16 +13,9 @@ GivenOrderSearch::GivenOrderSearch(const Segment& segment)
 
 // The start of the block in which the folder is first named.
 std::uint64_t GivenOrderSearch::firstPlaceAfter(std::uint32_t folder) const {
-    std::uint32_t first = 0;
-    std::uint32_t last = segment_.nameBlocks() - 1;
-    while (first < last) {
-        const std::uint32_t middle = first + (last - first + 1) / 2;
-        if (segment_.seenBefore(middle) <= folder)
-            first = middle;
-        else
-            last = middle - 1;
-    }
-    return std::uint64_t{first} * segment_.head().namesPerBlock;
+    return std::uint64_t{
+               segment_.blockNaming(folder, 0, segment_.nameBlocks() - 1)} *
+           segment_.head().namesPerBlock;
 }
 
 std::uint64_t GivenOrderSearch::find(std::string_view path) {

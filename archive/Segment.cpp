@@ -169,6 +169,31 @@ std::uint32_t Segment::seenBefore(std::uint32_t block) const {
            sumOfFirst(group + 8, block % blocksPerGroup);
 }
 
+std::uint32_t Segment::blockNaming(std::uint32_t folder, std::uint32_t first,
+                                   std::uint32_t last) const {
+    const auto seenBeforeGroup = [this](std::uint32_t group) {
+        requireGroup(Section::NameGroups, group * blocksPerGroup,
+                     nameGroupBytes);
+        return loadLittle<std::uint32_t>(nameGroup(group * blocksPerGroup) + 4);
+    };
+    std::uint32_t group = first / blocksPerGroup;
+    for (std::uint32_t end = last / blocksPerGroup; group < end;) {
+        const std::uint32_t middle = group + (end - group + 1) / 2;
+        if (seenBeforeGroup(middle) <= folder)
+            group = middle;
+        else
+            end = middle - 1;
+    }
+    std::uint32_t seen = seenBeforeGroup(group);
+    std::uint32_t block = group * blocksPerGroup;
+    const std::uint8_t* const added = nameGroup(block) + 8;
+    const std::uint32_t end = std::min<std::uint32_t>(
+        last, block + static_cast<std::uint32_t>(blocksPerGroup) - 1);
+    while (block < end && seen + added[block % blocksPerGroup] <= folder)
+        seen += added[block++ % blocksPerGroup];
+    return std::max(block, first);
+}
+
 // ---- Hints ----
 
 void Segment::prefetchTwoLines(Section section,
@@ -203,6 +228,24 @@ void Segment::prefetchFolder(std::uint32_t nameBlock) const noexcept {
     const std::uint8_t* const group = nameGroup(nameBlock);
     prefetchFolderLines(loadLittle<std::uint32_t>(group + 4) +
                         sumOfFirst(group + 8, nameBlock % blocksPerGroup) - 1);
+}
+
+void Segment::prefetchFolderBlocks(std::uint32_t block) const noexcept {
+    constexpr std::uint64_t lines = 8;  // some 16 blocks
+    const std::uint8_t* const group = folderGroup(block);
+    const std::uint64_t begin =
+        std::uint64_t{loadLittle<std::uint32_t>(group)} +
+        sumOfFirst(group + 4, block % blocksPerGroup);
+    for (std::uint64_t line = 0; line < lines; line += 2)
+        prefetchTwoLines(Section::Folders, begin + 64 * line);
+}
+
+void Segment::prefetchNameGroups(std::uint32_t first,
+                                 std::uint32_t last) const noexcept {
+    constexpr std::uint32_t most = 8;
+    for (std::uint32_t block = first, left = most; block <= last && left > 0;
+         block += blocksPerGroup, --left)
+        __builtin_prefetch(nameGroup(block));
 }
 
 void Segment::prefetchBlock(const NameBlock& block) const noexcept {

@@ -97,6 +97,11 @@ public:
     // Folders named before a name block, without a look at the block.
     std::uint32_t seenBefore(std::uint32_t block) const;
 
+    // The name block from first to last in which a folder is first named, if
+    // there is one. Looks at the groups, not at the blocks.
+    std::uint32_t blockNaming(std::uint32_t folder, std::uint32_t first,
+                              std::uint32_t last) const;
+
     // ---- Hints ----
 
     // Ask the processor for what will be read soon, in this order, some paths
@@ -110,6 +115,12 @@ public:
 
     // The same for a block that is already found.
     void prefetchBlock(const NameBlock& block) const noexcept;
+
+    // The bytes from the start of a folder block on, for a search in it and
+    // those that follow.
+    void prefetchFolderBlocks(std::uint32_t block) const noexcept;
+    void prefetchNameGroups(std::uint32_t first,
+                            std::uint32_t last) const noexcept;
 
 private:
     // The group of a block, sound or not.

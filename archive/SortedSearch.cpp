@@ -31,18 +31,10 @@ SortedSearch::SortedSearch(const Segment& segment)
 
 // ---- Folders ----
 
-// The block between first and last in which the folder is first named.
-std::uint32_t SortedSearch::blockOfFirst(std::uint32_t folder,
-                                         std::uint32_t first,
-                                         std::uint32_t last) const {
-    return lastThat(first, std::max(first, last), [&](std::uint32_t block) {
-        return segment_.seenBefore(block) <= folder;
-    });
-}
-
 std::string_view SortedSearch::firstNameOf(const Candidate& candidate) {
-    const std::uint32_t block = blockOfFirst(
-        candidate.number, candidate.firstBlock, candidate.lastBlock);
+    const std::uint32_t block = segment_.blockNaming(
+        candidate.number, heads_.nameBlock(candidate.firstHead),
+        heads_.nameBlock(candidate.lastHead));
     const std::uint64_t start =
         std::uint64_t{block} * segment_.head().namesPerBlock;
     const std::uint64_t end = std::min<std::uint64_t>(
@@ -55,92 +47,143 @@ std::string_view SortedSearch::firstNameOf(const Candidate& candidate) {
                   "A block does not name the folders that it should.");
 }
 
+// Unknown if the folder is one of those that the target is in.
+SortedSearch::Order SortedSearch::compare(const Target& target,
+                                          const Candidate& candidate) {
+    const std::string_view folder = candidate.folder;
+    const int order = folder.compare(target.path.substr(0, folder.size()));
+    if (order != 0) return order < 0 ? Order::Before : Order::NotBefore;
+    if (folder.size() == target.nameStart) {
+        ownFolder_ = candidate.number;
+        if (target.aim == Aim::Equal) return Order::Before;
+    }
+    return folder.size() == target.path.size() ? Order::NotBefore
+                                               : Order::Unknown;
+}
+
 // Whether the candidate's first path is less than the target.
 bool SortedSearch::startsBefore(const Target& target,
                                 const Candidate& candidate) {
-    const std::string_view folder = candidate.folder;
-    const std::size_t shared = std::min(folder.size(), target.path.size());
-    const int order =
-        folder.substr(0, shared).compare(target.path.substr(0, shared));
-    if (order != 0) return order < 0;
-    if (folder.size() >= target.path.size()) return false;
-    const std::string_view rest = target.path.substr(folder.size());
-    if (target.aim == Aim::Equal && rest.find('/') == std::string_view::npos)
-        return true;
-    return firstNameOf(candidate) < rest;
+    const Order order = compare(target, candidate);
+    if (order != Order::Unknown) return order == Order::Before;
+    return firstNameOf(candidate) < target.path.substr(candidate.folder.size());
 }
 
 // ---- The way down ----
 
 std::uint32_t SortedSearch::lastHeadBefore(const Target& target) {
     return lastThat(0, heads_.size() - 1, [&](std::uint32_t head) {
-        return startsBefore(target,
-                            {heads_.folder(head), heads_.number(head),
-                             heads_.nameBlock(head), heads_.nameBlock(head)});
+        return startsBefore(
+            target, {heads_.folder(head), heads_.number(head), head, head});
     });
+}
+
+// The last folder of a block that starts before the target, from `folder` on,
+// of which that is known. What a later folder tells holds for those before it,
+// so the first names of folders that the target is in are looked at only if no
+// other folder tells.
+std::uint32_t SortedSearch::lastOfBlockBefore(const Target& target,
+                                              std::uint32_t head,
+                                              std::uint32_t folder) {
+    const std::uint32_t perBlock = segment_.head().foldersPerBlock;
+    const std::uint32_t end =
+        std::min(folder + perBlock, segment_.head().folders);
+    const auto candidate = [&](std::uint32_t number) {
+        return Candidate{folders_.at(number), number, head, head + 1};
+    };
+    std::uint32_t next = folder + 1;
+    for (; next < end; ++next) {
+        const Order order = compare(target, candidate(next));
+        if (order == Order::NotBefore) break;
+        if (order == Order::Before) folder = next;
+    }
+    while (folder + 1 < next && startsBefore(target, candidate(folder + 1)))
+        ++folder;
+    return folder;
 }
 
 std::uint32_t SortedSearch::lastFolderBefore(const Target& target,
                                              std::uint32_t head) {
     const SegmentHead& sizes = segment_.head();
-    const auto isBefore = [&](std::uint32_t folder) {
-        return startsBefore(
-            target, {folders_.at(folder), folder, heads_.nameBlock(head),
-                     heads_.nameBlock(head + 1)});
-    };
     const std::uint32_t firstBlock = heads_.folderBlock(head);
-    const std::uint32_t block = lastThat(
-        firstBlock,
-        std::min<std::uint32_t>(firstBlock + sizes.folderBlocksPerHead,
-                                segment_.folderBlocks()) -
-            1,
-        [&](std::uint32_t b) { return isBefore(b * sizes.foldersPerBlock); });
-    std::uint32_t folder = block * sizes.foldersPerBlock;
-    const std::uint32_t end =
-        std::min<std::uint32_t>(folder + sizes.foldersPerBlock, sizes.folders);
-    while (folder + 1 < end && isBefore(folder + 1)) ++folder;
-    return folder;
+    segment_.prefetchFolderBlocks(firstBlock);
+    const std::uint32_t block =
+        lastThat(firstBlock,
+                 std::min<std::uint32_t>(firstBlock + sizes.folderBlocksPerHead,
+                                         segment_.folderBlocks()) -
+                     1,
+                 [&](std::uint32_t b) {
+                     const std::uint32_t folder = b * sizes.foldersPerBlock;
+                     return startsBefore(
+                         target, {folders_.at(folder), folder, head, head + 1});
+                 });
+    return lastOfBlockBefore(target, head, block * sizes.foldersPerBlock);
+}
+
+// Whether the block's first path is less than the target. Names suffice in the
+// target's own folder.
+bool SortedSearch::blockStartsBefore(const Target& target,
+                                     std::uint32_t block) {
+    paths_.seek(std::uint64_t{block} * segment_.head().namesPerBlock);
+    if (paths_.folderNumber() == ownFolder_)
+        return paths_.name() < target.name();
+    return paths_.path() < target.path;
 }
 
 std::uint32_t SortedSearch::lastBlockBefore(const Target& target,
                                             std::uint32_t head,
                                             std::uint32_t folder) {
     const std::uint32_t firstBlock = heads_.nameBlock(head);
-    const std::uint32_t lastBlock = heads_.nameBlock(head + 1);
-    const std::uint32_t first = blockOfFirst(folder, firstBlock, lastBlock);
-    const std::uint32_t last = blockOfFirst(folder + 1, first, lastBlock);
+    const std::uint32_t lastBlock =
+        std::max(firstBlock, heads_.nameBlock(head + 1));
+    const std::uint32_t first =
+        segment_.blockNaming(folder, firstBlock, lastBlock);
+    const std::uint32_t last =
+        segment_.blockNaming(folder + 1, first, lastBlock);
     return lastThat(first, last, [&](std::uint32_t block) {
-        return paths_.at(std::uint64_t{block} * segment_.head().namesPerBlock) <
-               target.path;
+        return blockStartsBefore(target, block);
     });
 }
 
-// The first place from the block's start on whose path is not less.
-std::uint64_t SortedSearch::scanBlock(std::string_view path,
-                                      std::uint32_t block) {
+// The block before whose second path the target belongs, at the earliest, and
+// at the latest before the first path of the next block.
+std::uint32_t SortedSearch::search(const Target& target) {
+    ownFolder_ = unknown;
+    const std::uint32_t head = lastHeadBefore(target);
+    segment_.prefetchNameGroups(heads_.nameBlock(head),
+                                heads_.nameBlock(head + 1));
+    return lastBlockBefore(target, head, lastFolderBefore(target, head));
+}
+
+std::uint64_t SortedSearch::lowerBound(std::string_view path) {
     const std::uint32_t perBlock = segment_.head().namesPerBlock;
-    std::uint64_t place = std::uint64_t{block} * perBlock;
+    std::uint64_t place =
+        std::uint64_t{search({path, Aim::LowerBound})} * perBlock;
     const std::uint64_t end =
         std::min<std::uint64_t>(place + perBlock, segment_.size());
     while (place < end && paths_.at(place) < path) ++place;
     return place;
 }
 
-std::uint64_t SortedSearch::search(const Target& target) {
-    const std::uint32_t head = lastHeadBefore(target);
-    const std::uint32_t folder = lastFolderBefore(target, head);
-    return scanBlock(target.path, lastBlockBefore(target, head, folder));
+bool SortedSearch::isInOwnFolder(const Target& target) {
+    return ownFolder_ == unknown ? paths_.folder() == target.folder()
+                                 : paths_.folderNumber() == ownFolder_;
 }
 
-std::uint64_t SortedSearch::lowerBound(std::string_view path) {
-    return search({path, Aim::LowerBound});
-}
-
+// Compares names first: they are there, folders would have to be decoded.
 std::uint64_t SortedSearch::find(std::string_view path) {
-    const std::uint64_t place = search({path, Aim::Equal});
-    if (place == segment_.size() || paths_.at(place) != path)
-        return segment_.size();
-    return place;
+    const Target target(path, Aim::Equal);
+    const std::string_view name = target.name();
+    const std::uint32_t perBlock = segment_.head().namesPerBlock;
+    std::uint64_t place = std::uint64_t{search(target)} * perBlock;
+    // With the first path of the next block.
+    const std::uint64_t end =
+        std::min<std::uint64_t>(place + perBlock + 1, segment_.size());
+    for (; place < end; ++place) {
+        paths_.seek(place);
+        if (paths_.name() == name && isInOwnFolder(target)) return place;
+    }
+    return segment_.size();
 }
 
 }  // namespace tessel::archive

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <string_view>
 
@@ -43,34 +44,53 @@ private:
         Equal
     };
     struct Target {
+        Target(std::string_view wanted, Aim how) noexcept
+            : path(wanted), nameStart(wanted.rfind('/') + 1), aim(how) {}
+
+        std::string_view folder() const noexcept {
+            return path.substr(0, nameStart);
+        }
+        std::string_view name() const noexcept {
+            return path.substr(nameStart);
+        }
+
         std::string_view path;
+        std::size_t nameStart;  // 0 without '/'
         Aim aim;
     };
-    // A folder and the name blocks in which its first path must be.
+    // A folder, and the heads between whose first paths its own first path
+    // must be.
     struct Candidate {
         std::string_view folder;
         std::uint32_t number;
-        std::uint32_t firstBlock;
-        std::uint32_t lastBlock;
+        std::uint32_t firstHead;
+        std::uint32_t lastHead;
     };
+    // What a folder's text says of the order of its first path and the target.
+    enum class Order { Before, NotBefore, Unknown };
 
+    static constexpr std::uint64_t unknown = ~std::uint64_t{0};
+
+    Order compare(const Target& target, const Candidate& candidate);
     bool startsBefore(const Target& target, const Candidate& candidate);
     std::string_view firstNameOf(const Candidate& candidate);
-    std::uint32_t blockOfFirst(std::uint32_t folder, std::uint32_t first,
-                               std::uint32_t last) const;
 
     std::uint32_t lastHeadBefore(const Target& target);
     std::uint32_t lastFolderBefore(const Target& target, std::uint32_t head);
+    std::uint32_t lastOfBlockBefore(const Target& target, std::uint32_t head,
+                                    std::uint32_t folder);
+    bool blockStartsBefore(const Target& target, std::uint32_t block);
     std::uint32_t lastBlockBefore(const Target& target, std::uint32_t head,
                                   std::uint32_t folder);
-    std::uint64_t search(const Target& target);
-    std::uint64_t scanBlock(std::string_view path, std::uint32_t block);
+    std::uint32_t search(const Target& target);
+    bool isInOwnFolder(const Target& target);
 
     const Segment& segment_;
     FolderHeads heads_;
     PathCursor paths_;
     PathBuffer buffer_;
     FolderDecoder folders_;
+    std::uint64_t ownFolder_ = unknown;  // of the target, once it came by
 };
 
 }  // namespace tessel::archive
