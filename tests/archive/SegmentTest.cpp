@@ -55,6 +55,30 @@ TEST(Segment, BlocksFollowEachOther) {
     EXPECT_EQ(end, segment.bytesOf(Section::Folders));
 }
 
+TEST(Segment, FindsTheBlockThatNamesAFolder) {
+    const OpenArchive archive(archives::sortedPaths(2000));
+    const Segment& segment = archive.segment();
+    const std::uint32_t last = segment.nameBlocks() - 1;
+    ASSERT_GT(last, 2 * blocksPerGroup);
+    std::uint32_t expected = 0;
+    for (std::uint32_t folder = 0; folder < segment.head().folders; ++folder) {
+        while (expected < last && segment.seenBefore(expected + 1) <= folder)
+            ++expected;
+        ASSERT_EQ(segment.blockNaming(folder, 0, last), expected);
+        ASSERT_EQ(segment.blockNaming(folder, expected, last), expected);
+        ASSERT_EQ(segment.blockNaming(folder, 0, expected), expected);
+    }
+}
+
+TEST(Segment, NamesABlockOfTheRangeEvenIfNoneFits) {
+    const OpenArchive archive(archives::sortedPaths(2000));
+    const Segment& segment = archive.segment();
+    const std::uint32_t folders = segment.head().folders;
+    EXPECT_EQ(segment.blockNaming(0, 20, 40), 20U);
+    EXPECT_EQ(segment.blockNaming(folders, 20, 40), 40U);
+    EXPECT_EQ(segment.blockNaming(folders, 40, 20), 40U);
+}
+
 TEST(Segment, WideBlocksFollowEachOther) {
     archives::Paths paths = archives::sortedPaths(300);
     // Letters in no order, so that neither prefixes nor tokens shorten them.
