@@ -18,7 +18,7 @@ namespace tessel::paths {
 
 namespace {
 
-static_assert(ComponentEncoder::slack <= ComponentPacker::slack);
+static_assert(ComponentEncoder::slack <= ComponentArena::slack);
 
 // Fewer paths are not worth a thread: they are encoded in the time that it
 // takes to start one, 20 to 50 microseconds.
@@ -35,7 +35,7 @@ public:
 
     void encode(const PathList& paths, std::size_t begin, std::size_t end) {
         for (std::size_t i = begin; i < end;) i = encodeFolder(paths, i, end);
-        part_.buffers = packer_.takeBuffers();
+        part_.buffers = arena_.takeBuffers();
     }
 
     EncodedChunk takePart() noexcept { return std::move(part_); }
@@ -49,13 +49,13 @@ private:
         if (folders.empty()) put({});
         forEachSegment(folders,
                        [&](std::string_view segment) { put(segment); });
-        part_.folders.push_back(packer_.finish());
+        part_.folders.push_back(arena_.finish());
         std::size_t i = first;
         do {
             put(paths[i].substr(folders.size()));
             ++i;
         } while (i < end && foldersOf(paths[i]) == folders);
-        part_.files.push_back(packer_.finish());
+        part_.files.push_back(arena_.finish());
         return i;
     }
 
@@ -66,12 +66,12 @@ private:
         else
             appendText(segment, text_);
         const std::size_t length = encoder_.bytesFor(text_);
-        encoder_.write(text_, packer_.extend(length));
+        encoder_.write(text_, arena_.extend(length));
         part_.maxComponentBytes = std::max(part_.maxComponentBytes, length);
     }
 
     ComponentEncoder encoder_;
-    ComponentPacker packer_;
+    ComponentArena arena_;
     std::u16string text_;
     EncodedChunk part_;
 };

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "paths/PathList.hpp"
-#include "pathtree/PackedComponents.hpp"
+#include "pathtree/ComponentArena.hpp"
 
 namespace tessel {
 
@@ -18,8 +18,8 @@ namespace tessel::paths {
 // Some consecutive paths as the coder inserts them: an entry per run of paths
 // of one folder, with the folder's segments and the files' names.
 struct EncodedChunk {
-    std::vector<PackedComponents> folders;
-    std::vector<PackedComponents> files;
+    std::vector<ComponentList> folders;
+    std::vector<ComponentList> files;
     ComponentBuffers buffers;  // what both lists point into
     std::size_t maxComponentBytes = 0;
 };

@@ -11,7 +11,6 @@
 #include "pathtree/ComponentList.hpp"
 #include "pathtree/NodePool.hpp"
 #include "pathtree/NodeStack.hpp"
-#include "pathtree/PackedComponents.hpp"
 #include "pathtree/PathTreeErrors.hpp"
 #include "pathtree/PathView.hpp"
 

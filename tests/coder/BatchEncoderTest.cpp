@@ -365,12 +365,12 @@ TEST(BatchEncoder, EncodingAFolderLeavesItsTexts) {
     EXPECT_EQ(coder->encodedFolders.size(), 2U);
 }
 
-std::vector<tessel::PackedComponents> encodedFoldersOf(tessel::Batch& batch) {
+std::vector<tessel::ComponentList> encodedFoldersOf(tessel::Batch& batch) {
     const tessel::MutexLock lock(batch.folderResultMutex);
     return batch.encodedFolders;
 }
 
-std::vector<tessel::PackedComponents> encodedFilesOf(tessel::Batch& batch) {
+std::vector<tessel::ComponentList> encodedFilesOf(tessel::Batch& batch) {
     const tessel::MutexLock lock(batch.fileResultMutex);
     return batch.encodedFiles;
 }

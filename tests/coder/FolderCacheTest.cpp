@@ -14,7 +14,7 @@ namespace {
 using tessel::BNode;
 using tessel::BPathTree;
 using tessel::Component;
-using tessel::ComponentPacker;
+using tessel::ComponentArena;
 using tessel::Components;
 using tessel::PathTrack;
 
@@ -26,7 +26,7 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
                0.01, rc::gen::container<Components>(component))));
     BPathTree tree;
     tessel::FolderCache cache;
-    ComponentPacker packer;
+    ComponentArena packer;
     std::map<Components, std::pair<BNode*, PathTrack>> expected;
     for (const Components& components : folders) {
         const auto list = support::packedBy(packer, components);
@@ -51,7 +51,7 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
 TEST(FolderCache, FoldersOfEqualHashAreToldApart) {
     constexpr std::size_t count = 400000;
     tessel::FolderCache cache;
-    ComponentPacker packer;
+    ComponentArena packer;
     BPathTree tree;
     for (std::size_t i = 0; i < count; ++i) {
         const auto list =

@@ -12,9 +12,9 @@
 namespace {
 
 using namespace tessel::paths;
+using tessel::ComponentList;
 using tessel::ComponentView;
 using tessel::HuffmanPathTree;
-using tessel::PackedComponents;
 using Texts = std::vector<std::vector<std::u16string>>;
 
 PathList listOf(const std::vector<std::string>& paths) {
@@ -32,9 +32,9 @@ std::unique_ptr<HuffmanPathTree> coderOf(const PathList& paths) {
 }
 
 Texts textsOf(const HuffmanPathTree& coder,
-              const std::vector<PackedComponents>& lists) {
+              const std::vector<ComponentList>& lists) {
     Texts texts;
-    for (const PackedComponents& list : lists) {
+    for (const ComponentList& list : lists) {
         texts.emplace_back();
         for (const ComponentView component : list)
             coder.appendPathFrom(component, texts.back().emplace_back());
@@ -102,7 +102,7 @@ TEST(ChunkEncoder, TheLongestComponentIsKnown) {
     std::size_t longest = 0;
     const EncodedChunk chunk = encodeChunk(coder->code(), paths, 1);
     for (const auto* lists : {&chunk.folders, &chunk.files})
-        for (const PackedComponents& list : *lists)
+        for (const ComponentList& list : *lists)
             for (const ComponentView component : list)
                 longest = std::max(longest, component.size());
     EXPECT_EQ(chunk.maxComponentBytes, longest);
