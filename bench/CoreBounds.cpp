@@ -8,6 +8,7 @@
 #include "bench/Heap.hpp"
 #include "bench/PathReader.hpp"
 #include "bench/Timing.hpp"
+#include "coder/BatchEncoder.hpp"
 
 namespace bench {
 

@@ -8,6 +8,8 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
+#include "coder/PathIteration.hpp"
+#include "coder/PathRetrieval.hpp"
 #include "paths/Batches.hpp"
 #include "paths/IndexedRange.hpp"
 
@@ -43,8 +45,9 @@ template <class Visit>
 void iterate(tessel::HuffmanPathTree& coder, Visit visit) {
     PathJoiner joiner(coder);
     coder.resetPathsToBTree();
-    while (coder.hasNextPathFromBTree()) {
-        coder.visitNextPath([&](const tessel::PathView& path) {
+    tessel::PathIteration pass(*coder.pathTree, coder.numbering());
+    while (pass.hasNext()) {
+        pass.visitNext([&](const tessel::PathView& path) {
             joiner.keepFolders(path.unchangedFolders);
             for (const auto& name :
                  path.folders.subspan(path.unchangedFolders)) {
@@ -67,7 +70,8 @@ void fetch(const tessel::HuffmanPathTree& coder, const Numbers& numbers,
         void folder(tessel::ComponentView name) { joiner.addFolder(name); }
         void file(tessel::ComponentView name) { visit(joiner.pathOf(name)); }
     };
-    coder.visitPaths(numbers, Joining{PathJoiner(coder), std::move(visit)});
+    tessel::PathRetrieval(*coder.pathTree, coder.numbering())
+        .visit(numbers, Joining{PathJoiner(coder), std::move(visit)});
 }
 
 // The numbers first to last.

@@ -7,6 +7,7 @@
 #include "binding/Conversions.hpp"
 #include "binding/Errors.hpp"
 #include "binding/PathCells.hpp"
+#include "coder/PathIteration.hpp"
 
 namespace tessel::binding {
 
@@ -150,9 +151,10 @@ void getNextPath(HostFrame& frame) {
     checkCounts(frame, {1, 1, 1});
     HuffmanPathTree& coder = coderOf(frame.inputs[0]);
     OwnedArray names;
-    coder.visitNextPath([&](const PathView& path) {
-        names = PathCells(coder).components(path);
-    });
+    PathIteration(*coder.pathTree, coder.numbering())
+        .visitNext([&](const PathView& path) {
+            names = PathCells(coder).components(path);
+        });
     frame.outputs[0] = names.release();
 }
 

@@ -1,7 +1,6 @@
 #include "binding/PathCells.hpp"
 
 #include "binding/Conversions.hpp"
-#include "coder/PathRetrieval.hpp"
 
 namespace tessel::binding {
 
@@ -107,7 +106,7 @@ PathCells::FoldersAndFiles PathCells::foldersAndFiles(
     if (hasTracksOnly())
         return {columns(foldersByTrack(numbers)), createCell(0, 1)};
     Collector collector;
-    coder_.visitPaths(PathNumbers(numbers), collector);
+    retrieval().visit(PathNumbers(numbers), collector);
     OwnedArray folders = columns(collector.folders());
     return {std::move(folders), columns(collector.files())};
 }
@@ -119,7 +118,7 @@ OwnedArray PathCells::joined(const std::vector<double>& numbers,
         foldersByTrack(numbers);  // throws if a number is none
         return cell;
     }
-    coder_.visitPaths(PathNumbers(numbers), Joiner(*this, cell, separator));
+    retrieval().visit(PathNumbers(numbers), Joiner(*this, cell, separator));
     return cell;
 }
 

@@ -8,6 +8,7 @@
 
 #include "binding/HostAccess.hpp"
 #include "coder/HuffmanPathTree.hpp"
+#include "coder/PathRetrieval.hpp"
 
 namespace tessel::binding {
 
@@ -55,6 +56,10 @@ private:
     void setName(const OwnedArray& cell, std::size_t index, ComponentView name);
     // Puts the buffer's text into the cell.
     void setText(const OwnedArray& cell, std::size_t index);
+
+    PathRetrieval retrieval() const noexcept {
+        return {*coder_.pathTree, coder_.numbering()};
+    }
 
     const HuffmanPathTree& coder_;
     HostInterface& host_;

@@ -1,16 +1,29 @@
 # Adds the static library qztessel_NAME, which consumers know as
 # qztessel::NAME, from the sources and headers of the given rooms. Includes are
 # written from the root, here and in the installed package.
+#
+#   qztesselAddLibrary(NAME ROOM... [PUBLIC_HEADERS FILE...])
+#
+# PUBLIC_HEADERS are those that a consumer may include, and what they include;
+# only they are installed. Without the list, all headers are public.
 function(qztesselAddLibrary name)
+  cmake_parse_arguments(PARSE_ARGV 1 arg "" "" PUBLIC_HEADERS)
   set(target qztessel_${name})
-  list(TRANSFORM ARGN APPEND /*.cpp OUTPUT_VARIABLE sourcePatterns)
-  list(TRANSFORM ARGN APPEND /*.hpp OUTPUT_VARIABLE headerPatterns)
+  set(rooms ${arg_UNPARSED_ARGUMENTS})
+  list(TRANSFORM rooms APPEND /*.cpp OUTPUT_VARIABLE sourcePatterns)
+  list(TRANSFORM rooms APPEND /*.hpp OUTPUT_VARIABLE headerPatterns)
   list(TRANSFORM sourcePatterns PREPEND ${PROJECT_SOURCE_DIR}/)
   list(TRANSFORM headerPatterns PREPEND ${PROJECT_SOURCE_DIR}/)
   file(GLOB sources CONFIGURE_DEPENDS ${sourcePatterns})
   file(GLOB headers CONFIGURE_DEPENDS ${headerPatterns})
+  set(publicHeaders ${headers})
+  if(arg_PUBLIC_HEADERS)
+    set(publicHeaders ${arg_PUBLIC_HEADERS})
+    list(TRANSFORM publicHeaders PREPEND ${PROJECT_SOURCE_DIR}/)
+  endif()
+  list(REMOVE_ITEM headers ${publicHeaders})
 
-  add_library(${target} STATIC ${sources})
+  add_library(${target} STATIC ${sources} ${headers})
   add_library(qztessel::${name} ALIAS ${target})
   target_sources(
     ${target}
@@ -19,7 +32,7 @@ function(qztesselAddLibrary name)
            BASE_DIRS
            ${PROJECT_SOURCE_DIR}
            FILES
-           ${headers})
+           ${publicHeaders})
   target_compile_features(${target} PUBLIC cxx_std_20)
   # An installed library must not name a target that is not installed.
   target_link_libraries(${target} PRIVATE $<BUILD_INTERFACE:qztessel_options>)

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <array>
 
+#include "pathtree/TreeInserter.hpp"
+
 namespace tessel {
 
 namespace {
@@ -68,14 +70,15 @@ void BatchInserter::insertFolder(const ComponentList& components,
     if (const FolderCache::Folder* cached = cache_.find(components, hash)) {
         const auto positions = cache_.trackOf(*cached);
         track_.assign(positions.begin(), positions.end());
-        const std::uint64_t first = tree_.addFiles(*cached->node, fileNames);
+        const std::uint64_t first =
+            tree_.inserter().addFiles(*cached->node, fileNames);
         numbering_.notePartition(track_, true, first, fileNames.size());
         return;
     }
     const std::size_t depth = components.size();
     cache_.reserveFor(depth);
-    const BPathTree::AddedBatch added =
-        tree_.addBatch(components, fileNames, track_);
+    const TreeInserter::AddedBatch added =
+        tree_.inserter().addBatch(*tree_.root, components, fileNames, track_);
     numbering_.notePartition(track_, added.existed, added.firstFile,
                              fileNames.size());
     // Without components the root takes the files and never counts as found.

@@ -3,6 +3,8 @@
 #include <bit>
 #include <cstring>
 
+#include "coder/CoderErrors.hpp"
+
 namespace tessel {
 
 namespace {

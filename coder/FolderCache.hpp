@@ -5,8 +5,10 @@
 #include <span>
 #include <vector>
 
-#include "pathtree/BPathTree.hpp"
+#include "pathtree/BNode.hpp"
+#include "pathtree/ComponentList.hpp"
 #include "pathtree/HashIndex.hpp"
+#include "pathtree/PathTrack.hpp"
 
 namespace tessel {
 

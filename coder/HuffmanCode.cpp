@@ -4,6 +4,7 @@
 #include <limits>
 #include <stdexcept>
 
+#include "coder/CoderErrors.hpp"
 #include "packing/ByteCursor.hpp"
 #include "pathtree/containers.hpp"
 
@@ -21,14 +22,6 @@ std::size_t leavesIn(const std::vector<bool>& shape) {
 }
 
 }  // namespace
-
-const char* NoCodeForEmptyString::what() const noexcept {
-    return "No code for an empty string.";
-}
-
-const char* CodeNotFoundException::what() const noexcept {
-    return "Code for the character not found.";
-}
 
 // ---- Construction ----
 

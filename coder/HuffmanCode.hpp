@@ -2,7 +2,6 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <exception>
 #include <queue>
 #include <string>
 #include <vector>
@@ -12,18 +11,6 @@
 #include "coder/HNode.hpp"
 
 namespace tessel {
-
-// An empty text was to be encoded.
-class NoCodeForEmptyString : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
-
-// A text to be encoded holds a character that has no code.
-class CodeNotFoundException : public std::exception {
-public:
-    const char* what() const noexcept override;
-};
 
 // A Huffman code over UTF-16 code units: its tree, the tables for encoding
 // and decoding that follow from it, and its compact form (the tree's shape

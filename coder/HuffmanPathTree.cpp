@@ -2,9 +2,15 @@
 
 #include <stdexcept>
 
+#include "coder/BatchEncoder.hpp"
 #include "coder/BatchInserter.hpp"
 #include "coder/ComponentDecoder.hpp"
 #include "coder/ComponentEncoder.hpp"
+#include "coder/HuffmanCode.hpp"
+#include "coder/PathIteration.hpp"
+#include "coder/PathNumbering.hpp"
+#include "coder/PathRetrieval.hpp"
+#include "pathtree/TreeInserter.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {
@@ -26,7 +32,34 @@ struct CharacterList {
 
 }  // namespace
 
-HuffmanPathTree::HuffmanPathTree() : pathTree(std::make_unique<BPathTree>()) {}
+// No worker is there yet that could write to the batch.
+HuffmanPathTree::HuffmanPathTree() QZTESSEL_NO_THREAD_SAFETY
+    : code_(std::make_unique<HuffmanCode>()),
+      numbering_(std::make_unique<PathNumbering>()),
+      batch_(std::make_unique<Batch>()),
+      boolTree(code_->boolTree),
+      treeString(code_->treeString),
+      frequencies(code_->frequencies),
+      rootIndex(code_->rootIndex),
+      nodes(code_->nodes),
+      codes(code_->codes),
+      parentOf(code_->parentOf),
+      pathTree(std::make_unique<BPathTree>()),
+      duplicates(numbering_->duplicates),
+      partitionEnds(numbering_->partitionEnds),
+      partitionTracks(numbering_->partitionTracks),
+      maxPartitionTrackLength(numbering_->maxPartitionTrackLength),
+      maxDuplicateTrackLength(numbering_->maxDuplicateTrackLength),
+      maxCodeBytes(numbering_->maxCodeBytes),
+      maxDuplicatePathNumber(numbering_->maxDuplicatePathNumber),
+      nextPathNumber(numbering_->nextPathNumber),
+      pathCount(numbering_->pathCount),
+      asyncFolders(batch_->folders),
+      asyncFiles(batch_->files),
+      encodedFolders(batch_->encodedFolders),
+      encodedFiles(batch_->encodedFiles),
+      folderResultMutex(batch_->folderResultMutex),
+      fileResultMutex(batch_->fileResultMutex) {}
 
 HuffmanPathTree::~HuffmanPathTree() { joinAllGenThreads(); }
 
@@ -34,58 +67,58 @@ HuffmanPathTree::~HuffmanPathTree() { joinAllGenThreads(); }
 
 void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
                                      const std::u16string& characters) {
-    code_.build(characterFrequencies, characters);
+    code_->build(characterFrequencies, characters);
 }
 
 void HuffmanPathTree::deflateHuffman(
     const std::unordered_map<char16_t, double>& characterFrequencies) {
     const CharacterList list(characterFrequencies);
-    code_.build(list.frequencies.data(), list.characters);
+    code_->build(list.frequencies.data(), list.characters);
 }
 
 void HuffmanPathTree::makeHeapAndTree(const double* characterFrequencies,
                                       const std::u16string& characters) {
-    code_.makeHeapAndTree(characterFrequencies, characters);
+    code_->makeHeapAndTree(characterFrequencies, characters);
 }
 
 void HuffmanPathTree::makeHeapAndTree(
     const std::unordered_map<char16_t, double>& characterFrequencies) {
     const CharacterList list(characterFrequencies);
-    code_.makeHeapAndTree(list.frequencies.data(), list.characters);
+    code_->makeHeapAndTree(list.frequencies.data(), list.characters);
 }
 
 void HuffmanPathTree::generateTree(HeapQueue& queue) {
-    code_.generateTree(queue);
+    code_->generateTree(queue);
 }
 
 void HuffmanPathTree::traverse(Visitor visit) {
-    code_.traverse([&](HNode& node) { visit(this, node); });
+    code_->traverse([&](HNode& node) { visit(this, node); });
 }
 
-void HuffmanPathTree::generateCode() { code_.generateCode(); }
+void HuffmanPathTree::generateCode() { code_->generateCode(); }
 
-void HuffmanPathTree::addCode(const HNode& leaf) { code_.addCode(leaf); }
+void HuffmanPathTree::addCode(const HNode& leaf) { code_->addCode(leaf); }
 
 std::vector<bool> HuffmanPathTree::codeOf(char16_t character) const {
-    return code_.codeOf(character);
+    return code_->codeOf(character);
 }
 
 std::vector<double> HuffmanPathTree::getFrequencies() const {
-    return code_.frequencies;
+    return code_->frequencies;
 }
 
 void HuffmanPathTree::setFrequencies(std::vector<double>& newFrequencies) {
-    code_.frequencies = std::exchange(newFrequencies, {});
+    code_->frequencies = std::exchange(newFrequencies, {});
 }
 
 // All copies are made before the first member is replaced.
 void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
     auto newTree = std::make_unique<BPathTree>(*other.pathTree);
     if (&other != this) {
-        HuffmanCode newCode = other.code_;
-        PathNumbering newNumbering = other.numbering_;
-        code_ = std::move(newCode);
-        numbering_ = std::move(newNumbering);
+        HuffmanCode newCode = *other.code_;
+        PathNumbering newNumbering = *other.numbering_;
+        *code_ = std::move(newCode);
+        *numbering_ = std::move(newNumbering);
     }
     pathTree = std::move(newTree);
 }
@@ -93,44 +126,44 @@ void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
 // ---- Compact form ----
 
 void HuffmanPathTree::generateCompressedTree() {
-    code_.generateCompressedTree();
+    code_->generateCompressedTree();
 }
 
 std::vector<bool> HuffmanPathTree::getBoolTree() const {
-    return code_.boolTree;
+    return code_->boolTree;
 }
 
 std::u16string HuffmanPathTree::getTreeString() const {
-    return code_.treeString;
+    return code_->treeString;
 }
 
 void HuffmanPathTree::setTreeString(const std::u16string& newTreeString) {
-    code_.treeString = newTreeString;
+    code_->treeString = newTreeString;
 }
 
 std::size_t HuffmanPathTree::inflateFromBoolTree() {
-    return code_.inflateFromBoolTree();
+    return code_->inflateFromBoolTree();
 }
 
 void HuffmanPathTree::inflateFromCompressedTree() {
-    code_.inflateFromCompressedTree();
+    code_->inflateFromCompressedTree();
 }
 
-void HuffmanPathTree::inflate() { code_.inflate(); }
+void HuffmanPathTree::inflate() { code_->inflate(); }
 
 void HuffmanPathTree::inflateHuffman(const std::u16string& newTreeString) {
-    code_.restore(newTreeString);
+    code_->restore(newTreeString);
 }
 
 // ---- Encoding and adding ----
 
 Component HuffmanPathTree::generateCodeFor(const std::u16string& text) {
-    const ComponentEncoder encoder(code_);
+    const ComponentEncoder encoder(*code_);
     const std::size_t length = encoder.bytesFor(text);
     Component bytes(length + ComponentEncoder::slack);
     if (length > 0) encoder.write(text, bytes.data());
     bytes.resize(length);
-    numbering_.maxCodeBytes.raise(length);
+    numbering_->maxCodeBytes.raise(length);
     return bytes;
 }
 
@@ -150,13 +183,13 @@ void HuffmanPathTree::generateCodeAsyncAndAddPaths(FolderTexts& folders,
     if (folders.empty()) return;
     joinAllGenThreads();
     // The texts may be what a refused batch left in this very object.
-    BatchEncoder encoder(code_, numbering_.maxCodeBytes, folders, files);
+    BatchEncoder encoder(*code_, numbering_->maxCodeBytes, folders, files);
     clearThreadResources();
     try {
         encoder.encode(hardwareThreads);
     } catch (...) {
-        batch_.takeOver(encoder.batch());
-        if (batch_.folders.size() > 1) batch_.clearResults();
+        batch_->takeOver(encoder.batch());
+        if (batch_->folders.size() > 1) batch_->clearResults();
         throw;
     }
     insertBatch(encoder.batch());
@@ -166,13 +199,13 @@ void HuffmanPathTree::generateCodeForPath(std::uint64_t first,
                                           std::uint64_t last) {
     const std::uint64_t end =
         last < asyncFolders.size() ? last + 1 : asyncFolders.size();
-    BatchEncoder::encodeRange(code_, batch_, {first, end},
-                              numbering_.maxCodeBytes);
+    BatchEncoder::encodeRange(*code_, *batch_, {first, end},
+                              numbering_->maxCodeBytes);
 }
 
-std::vector<HuffmanPathTree::FirstAndLast> HuffmanPathTree::splitFolders(
-    std::uint64_t n, unsigned hardwareThreads) {
-    std::vector<FirstAndLast> ranges;
+std::vector<std::pair<std::uint64_t, std::uint64_t>>
+HuffmanPathTree::splitFolders(std::uint64_t n, unsigned hardwareThreads) {
+    std::vector<std::pair<std::uint64_t, std::uint64_t>> ranges;
     for (const auto [begin, end] :
          BatchEncoder::splitFolders(n, hardwareThreads))
         ranges.emplace_back(begin, end - 1);
@@ -185,43 +218,43 @@ void HuffmanPathTree::joinAllGenThreads() {
     releaseContents(genThreads);
 }
 
-void HuffmanPathTree::clearThreadResources() { batch_.clear(); }
+void HuffmanPathTree::clearThreadResources() { batch_->clear(); }
 
-void HuffmanPathTree::addPathToBTreeFromAsyncData() { insertBatch(batch_); }
+void HuffmanPathTree::addPathToBTreeFromAsyncData() { insertBatch(*batch_); }
 
 // No worker is left that could write to the batch.
 void HuffmanPathTree::insertBatch(Batch& batch) QZTESSEL_NO_THREAD_SAFETY {
     const std::size_t folders = batch.encodedFolders.size();
-    BatchInserter(*pathTree, numbering_)
+    BatchInserter(*pathTree, *numbering_)
         .insert(batch.encodedFolders, batch.encodedFiles);
     batch.clear();
     // Search memory is worth keeping only while it serves many more folders
     // than this batch had: it is rebuilt at about the price of an insertion
     // per child.
     constexpr std::size_t childrenWorthAFolder = 16;
-    pathTree->releaseChildIndex(folders * childrenWorthAFolder);
+    pathTree->inserter().releaseIndex(folders * childrenWorthAFolder);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,
                                      Components& fileNames) {
     const std::size_t fileCount = fileNames.size();
-    numbering_.reserveForPartition(folderComponents.size());
+    numbering_->reserveForPartition(folderComponents.size());
     PathTrack track;
     track.reserve(folderComponents.size() + 1);
     std::uint64_t first = 0;
     const bool existed =
         pathTree->addPath(folderComponents, fileNames, track, first);
-    numbering_.notePartition(track, existed, first, fileCount);
+    numbering_->notePartition(track, existed, first, fileCount);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& components) {
     PathTrack track;
     const bool existed = pathTree->addPath(components, track);
-    numbering_.noteWholePath(track, existed);
+    numbering_->noteWholePath(track, existed);
 }
 
 bool HuffmanPathTree::hasDuplicate(std::uint64_t pathNumber) const {
-    return numbering_.hasDuplicate(pathNumber);
+    return numbering_->hasDuplicate(pathNumber);
 }
 
 // ---- Decoding, iteration, retrieval ----
@@ -234,25 +267,25 @@ std::u16string HuffmanPathTree::generatePathFrom(const Component& bytes) const {
 
 void HuffmanPathTree::appendPathFrom(ComponentView bytes,
                                      std::u16string& text) const {
-    ComponentDecoder(code_).appendText(bytes, text);
+    ComponentDecoder(*code_).appendText(bytes, text);
 }
 
 bool HuffmanPathTree::appendToPathIfLeaf(std::int32_t& position,
                                          std::u16string& text) const {
-    return ComponentDecoder(code_).appendIfLeaf(position, text);
+    return ComponentDecoder(*code_).appendIfLeaf(position, text);
 }
 
 bool HuffmanPathTree::hasNextPathFromBTree() const {
-    return numbering_.hasDuplicate(numbering_.nextPathNumber + 1) ||
+    return numbering_->hasDuplicate(numbering_->nextPathNumber + 1) ||
            pathTree->hasNextPath();
 }
 
 void HuffmanPathTree::getNextPathFromBTree(Components& components) {
-    PathIteration(*pathTree, numbering_).getNext(components);
+    PathIteration(*pathTree, *numbering_).getNext(components);
 }
 
 void HuffmanPathTree::resetPathsToBTree() {
-    PathIteration(*pathTree, numbering_).reset();
+    PathIteration(*pathTree, *numbering_).reset();
     joinAllGenThreads();
     clearThreadResources();
 }
@@ -260,7 +293,7 @@ void HuffmanPathTree::resetPathsToBTree() {
 void HuffmanPathTree::getPath(std::vector<Components>& folderPaths,
                               std::vector<Components>& filePaths,
                               const std::vector<double>& partitions) const {
-    PathRetrieval(*pathTree, numbering_)
+    PathRetrieval(*pathTree, *numbering_)
         .getPath(folderPaths, filePaths, partitions);
 }
 
@@ -272,12 +305,13 @@ HuffmanPathTree::MemoryUsage HuffmanPathTree::memoryUsage() const {
     usage.names = tree.names;
     usage.nodes = tree.nodes;
     usage.childLists = tree.childLists;
-    usage.partitionTracks = numbering_.partitionBytes();
-    usage.duplicates = numbering_.duplicateBytes();
-    usage.code = code_.memoryBytes();
-    usage.batch = batch_.memoryBytes();
-    usage.other = sizeof(HuffmanPathTree) + sizeof(BPathTree) +
-                  tree.childIndex + tree.iteration;
+    usage.partitionTracks = numbering_->partitionBytes();
+    usage.duplicates = numbering_->duplicateBytes();
+    usage.code = code_->memoryBytes();
+    usage.batch = batch_->memoryBytes();
+    usage.other = sizeof(HuffmanPathTree) + sizeof(HuffmanCode) +
+                  sizeof(PathNumbering) + sizeof(Batch) + sizeof(BPathTree) +
+                  sizeof(TreeInserter) + tree.childIndex + tree.iteration;
     return usage;
 }
 

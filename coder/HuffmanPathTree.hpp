@@ -5,21 +5,28 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <mutex>
+#include <queue>
 #include <string>
 #include <thread>
 #include <unordered_map>
 #include <utility>
 #include <vector>
 
-#include "coder/BatchEncoder.hpp"
-#include "coder/HuffmanCode.hpp"
-#include "coder/PathIteration.hpp"
-#include "coder/PathNumbering.hpp"
-#include "coder/PathRetrieval.hpp"
+#include "coder/AtomicMaximum.hpp"
+#include "coder/CodeTable.hpp"
+#include "coder/CoderErrors.hpp"
+#include "coder/HNode.hpp"
+#include "coder/PathTracks.hpp"
 #include "packing/sixpacks.hpp"  // for the exceptions
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/ComponentList.hpp"
 
 namespace tessel {
+
+struct Batch;
+class HuffmanCode;
+class PathNumbering;
 
 // HuffmanPathTree keeps a very large list of file paths in compact form: a
 // Huffman code over UTF-16 code units, and a path tree whose components are
@@ -52,10 +59,11 @@ namespace tessel {
 //   lists of files.
 class HuffmanPathTree {
 public:
-    using HeapQueue = HuffmanCode::HeapQueue;
+    using HeapQueue = std::priority_queue<HNode, std::vector<HNode>,
+                                          HNodeFrequencyComparator>;
     using Visitor = std::function<void(HuffmanPathTree*, HNode&)>;
-    using FolderTexts = tessel::FolderTexts;
-    using FirstAndLast = std::pair<std::uint64_t, std::uint64_t>;
+    // Folder i as a list of component texts, or the names of the files in it.
+    using FolderTexts = std::vector<std::vector<std::u16string>>;
 
     HuffmanPathTree();
     HuffmanPathTree(const HuffmanPathTree&) = delete;
@@ -191,8 +199,8 @@ public:
 
     // The folders of each worker, first and last, when n of them meet that
     // many hardware threads (0: two).
-    static std::vector<FirstAndLast> splitFolders(std::uint64_t n,
-                                                  unsigned hardwareThreads);
+    static std::vector<std::pair<std::uint64_t, std::uint64_t>> splitFolders(
+        std::uint64_t n, unsigned hardwareThreads);
 
     // Encodes the folders first to last of asyncFolders and asyncFiles into
     // encodedFolders and encodedFiles, which must be as long. Throws what
@@ -238,20 +246,11 @@ public:
     // True while a path is left in the pass that resetPathsToBTree began.
     bool hasNextPathFromBTree() const;
 
-    // Calls visit(const PathView&) with the next path and moves on: views of
-    // its components, valid during the visit, and how many leading folders
-    // are those of the path visited before. Throws NoMorePathException when
-    // none is left; the path is counted as handed out even then. If memory
-    // runs out, or visit throws, the pass stays before this path.
-    template <class Visit>
-    void visitNextPath(Visit&& visit) {
-        PathIteration(*pathTree, numbering_)
-            .visitNext(std::forward<Visit>(visit));
-    }
-
     // The next path's components. A stored path replaces what `components`
     // held; a repeated one, whose number is in `duplicates`, is appended to
-    // it. Throws as visitNextPath does.
+    // it. Throws NoMorePathException when none is left; the path is counted
+    // as handed out even then. If memory runs out, the pass stays before this
+    // path. PathIteration answers without copies.
     void getNextPathFromBTree(Components& components);
 
     // Starts a new pass; also releases what workers left.
@@ -259,34 +258,13 @@ public:
 
     // ---- Retrieval by number ----
 
-    // Visits paths by number, in ascending order, without copies and without
-    // the heap. `numbers` is any random-access range of unsigned integers.
-    // Per partition met, the visitor sees its folder once, then the files
-    // asked for; usualFiles is how many they are at most, unless numbers
-    // repeat or descend:
-    //
-    //   visitor.beginFolder(usualFiles);
-    //   visitor.folder(ComponentView);  // each component, the root first
-    //   visitor.file(ComponentView);    // each file, in the order of numbers
-    //
-    // The views are valid as long as the coder has the paths. The visit ends
-    // at the first number that is above the last partition's end. Pass
-    // numbers in ascending order: a number smaller than its predecessor is
-    // looked up in the predecessor's partition and may return another file
-    // of that folder.
-    //
-    // Throws std::out_of_range for a number that leads outside the tree; the
-    // paths before it have been visited then.
-    // Cost: for each partition met a search in partitionEnds and its track.
-    template <class Numbers, class PathVisitor>
-    void visitPaths(const Numbers& numbers, PathVisitor&& visitor) const {
-        PathRetrieval(*pathTree, numbering_)
-            .visit(numbers, std::forward<PathVisitor>(visitor));
-    }
-
-    // The same, copied: one entry for each partition met, its folder's
-    // components appended to folderPaths and the encoded names of the files
-    // asked for to filePaths. Numbers are truncated.
+    // Fetches paths by number: appends one entry for each partition met, its
+    // folder's components to folderPaths and the encoded names of the files
+    // asked for to filePaths. Numbers are truncated. Pass them in ascending
+    // order: a number smaller than its predecessor is looked up in the
+    // predecessor's partition and may return another file of that folder. The
+    // first number that is above the last partition's end is the last one
+    // looked at. PathRetrieval answers without copies.
     //
     // In a coder that was loaded with tracks and no ends, numbers are those
     // of partitions, whose folders are appended to folderPaths alone.
@@ -344,42 +322,51 @@ public:
 
     // ---- State, public for inspection; change it through the operations ----
 
-    const HuffmanCode& code() const noexcept { return code_; }
-    const PathNumbering& numbering() const noexcept { return numbering_; }
+    const HuffmanCode& code() const noexcept { return *code_; }
+    const PathNumbering& numbering() const noexcept { return *numbering_; }
+    PathNumbering& numbering() noexcept { return *numbering_; }
 
 private:
     void insertBatch(Batch& batch);
 
-    HuffmanCode code_;
-    PathNumbering numbering_;
-    Batch batch_;  // what a refused batch left, or what was put there
+    std::unique_ptr<HuffmanCode> code_;
+    std::unique_ptr<PathNumbering> numbering_;
+    // What a refused batch left, or what was put there.
+    std::unique_ptr<Batch> batch_;
 
 public:
-    // What each of these means is said in the part that it names.
-    std::vector<bool>& boolTree = code_.boolTree;
-    std::u16string& treeString = code_.treeString;
+    // What each of these means is said in the part that has it.
+
+    // ---- HuffmanCode ----
+    std::vector<bool>& boolTree;
+    std::u16string& treeString;
+    std::vector<double>& frequencies;
+    std::int32_t& rootIndex;
+    std::vector<HNode>& nodes;
+    CodeTable& codes;
+    std::vector<std::int32_t>& parentOf;
+
     std::unique_ptr<BPathTree> pathTree;
-    std::map<std::uint64_t, PathTrack>& duplicates = numbering_.duplicates;
-    std::vector<std::uint64_t>& partitionEnds = numbering_.partitionEnds;
-    PathTracks& partitionTracks = numbering_.partitionTracks;
-    std::uint64_t& maxPartitionTrackLength = numbering_.maxPartitionTrackLength;
-    std::uint64_t& maxDuplicateTrackLength = numbering_.maxDuplicateTrackLength;
-    AtomicMaximum& maxCodeBytes = numbering_.maxCodeBytes;
-    std::uint64_t& maxDuplicatePathNumber = numbering_.maxDuplicatePathNumber;
-    std::uint64_t& nextPathNumber = numbering_.nextPathNumber;
-    std::uint64_t& pathCount = numbering_.pathCount;
-    std::vector<double>& frequencies = code_.frequencies;
-    std::int32_t& rootIndex = code_.rootIndex;
-    std::vector<HNode>& nodes = code_.nodes;
-    CodeTable& codes = code_.codes;
-    std::vector<std::int32_t>& parentOf = code_.parentOf;
+
+    // ---- PathNumbering ----
+    std::map<std::uint64_t, PathTrack>& duplicates;
+    std::vector<std::uint64_t>& partitionEnds;
+    PathTracks& partitionTracks;
+    std::uint64_t& maxPartitionTrackLength;
+    std::uint64_t& maxDuplicateTrackLength;
+    AtomicMaximum& maxCodeBytes;
+    std::uint64_t& maxDuplicatePathNumber;
+    std::uint64_t& nextPathNumber;
+    std::uint64_t& pathCount;
+
+    // ---- Batch, and workers that a caller of its steps started ----
     std::vector<std::thread> genThreads;
-    FolderTexts& asyncFolders = batch_.folders;
-    FolderTexts& asyncFiles = batch_.files;
-    std::vector<ComponentList>& encodedFolders = batch_.encodedFolders;
-    std::vector<ComponentList>& encodedFiles = batch_.encodedFiles;
-    std::mutex& folderResultMutex = batch_.folderResultMutex;
-    std::mutex& fileResultMutex = batch_.fileResultMutex;
+    FolderTexts& asyncFolders;
+    FolderTexts& asyncFiles;
+    std::vector<ComponentList>& encodedFolders;
+    std::vector<ComponentList>& encodedFiles;
+    std::mutex& folderResultMutex;
+    std::mutex& fileResultMutex;
 };
 
 }  // namespace tessel

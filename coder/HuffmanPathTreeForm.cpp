@@ -27,8 +27,12 @@
 #include <stdexcept>
 #include <utility>
 
+#include "coder/HuffmanCode.hpp"
 #include "coder/HuffmanPathTree.hpp"
+#include "coder/PathNumbering.hpp"
+#include "packing/ByteCursor.hpp"
 #include "packing/sixpacks.hpp"
+#include "pathtree/NodeCode.hpp"
 #include "pathtree/NodeWalk.hpp"
 #include "pathtree/TreeBuilder.hpp"
 
@@ -313,11 +317,11 @@ void HuffmanPathTree::serialize(std::vector<std::uint8_t>& out,
         std::size_t payloadLength = 0;
         if (compress) {
             Bytes payload;
-            FormWriter(*pathTree, numbering_, payload).write(boolTree);
+            FormWriter(*pathTree, *numbering_, payload).write(boolTree);
             payloadLength = payload.size();
             sixpacks::appendCompressed(payload, out);
         } else {
-            FormWriter(*pathTree, numbering_, out).write(boolTree);
+            FormWriter(*pathTree, *numbering_, out).write(boolTree);
             payloadLength = out.size() - bodyAt;
         }
         for (std::size_t j = 0; j < sizeof(std::uint64_t); ++j)
@@ -336,11 +340,11 @@ void HuffmanPathTree::deserialize(std::vector<std::uint8_t>& in,
     Bytes payload;
     if (compress) payload = sixpacks::decompressChecked(body, payloadLength);
     ByteCursor cursor(compress ? std::span<const std::uint8_t>(payload) : body);
-    FormReader reader(numbering_);
+    FormReader reader(*numbering_);
     reader.read(cursor);
-    code_.boolTree = std::move(reader.shape);
+    code_->boolTree = std::move(reader.shape);
     pathTree = std::move(reader.tree);
-    numbering_ = std::move(reader.numbering);
+    *numbering_ = std::move(reader.numbering);
 }
 
 std::size_t HuffmanPathTree::serializePathTree(

@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <new>
 #include <span>
+#include <utility>
 
 #include "coder/PathNumbering.hpp"
 #include "pathtree/BPathTree.hpp"
@@ -20,12 +21,17 @@ public:
     PathIteration(BPathTree& tree, PathNumbering& numbering) noexcept
         : tree_(tree), numbering_(numbering) {}
 
+    // True while a path is left in the pass that reset began.
     bool hasNext() const {
         return numbering_.hasDuplicate(numbering_.nextPathNumber + 1) ||
                tree_.hasNextPath();
     }
 
-    // See HuffmanPathTree::visitNextPath.
+    // Calls visit(const PathView&) with the next path and moves on: views of
+    // its components, valid during the visit, and how many leading folders
+    // are those of the path visited before. Throws NoMorePathException when
+    // none is left; the path is counted as handed out even then. If memory
+    // runs out, or visit throws, the pass stays before this path.
     template <class Visit>
     void visitNext(Visit&& visit) {
         next(

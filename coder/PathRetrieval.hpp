@@ -11,6 +11,7 @@
 
 #include "coder/PathNumbering.hpp"
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/TrackLookup.hpp"
 
 namespace tessel {
 
@@ -30,7 +31,25 @@ public:
     // std::out_of_range for NaN, for -1 and below.
     static std::uint64_t pathNumberOf(double value);
 
-    // See HuffmanPathTree::visitPaths.
+    // Visits paths by number, in ascending order, without copies and without
+    // the heap. `numbers` is any random-access range of unsigned integers.
+    // Per partition met, the visitor sees its folder once, then the files
+    // asked for; usualFiles is how many they are at most, unless numbers
+    // repeat or descend:
+    //
+    //   visitor.beginFolder(usualFiles);
+    //   visitor.folder(ComponentView);  // each component, the root first
+    //   visitor.file(ComponentView);    // each file, in the order of numbers
+    //
+    // The views are valid as long as the coder has the paths. The visit ends
+    // at the first number that is above the last partition's end. Pass
+    // numbers in ascending order: a number smaller than its predecessor is
+    // looked up in the predecessor's partition and may return another file
+    // of that folder.
+    //
+    // Throws std::out_of_range for a number that leads outside the tree; the
+    // paths before it have been visited then.
+    // Cost: for each partition met a search in partitionEnds and its track.
     template <class Numbers, class Visitor>
     void visit(const Numbers& numbers, Visitor&& visitor) const;
 
@@ -132,9 +151,11 @@ void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
         const auto left = static_cast<std::uint64_t>(last - next);
         visitor.beginFolder(
             static_cast<std::size_t>(std::min(left, ends[k] - number + 1)));
-        const BatchFiles files = tree_.openBatch(
-            reader.read(numbering_.partitionTracks, k),
-            [&visitor](ComponentView name) { visitor.folder(name); });
+        const BatchFiles files =
+            TrackLookup(*tree_.root)
+                .openBatch(
+                    reader.read(numbering_.partitionTracks, k),
+                    [&visitor](ComponentView name) { visitor.folder(name); });
         const std::uint64_t base = k > 0 ? ends[k - 1] : 0;
         while (number <= ends[k]) {
             visitor.file(files[number - base]);

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "pathtree/BPathTree.hpp"
+#include "pathtree/PathTrack.hpp"
 
 namespace tessel {
 
@@ -25,8 +25,6 @@ public:
 
     // A copy of track i, which must be below size().
     PathTrack operator[](std::size_t i) const;
-    PathTrack front() const { return (*this)[0]; }
-    PathTrack back() const { return (*this)[count_ - 1]; }
 
     // Calls visit(position) for every position of track i, in order, without
     // a copy.

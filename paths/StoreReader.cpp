@@ -7,6 +7,8 @@
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
+#include "coder/PathIteration.hpp"
+#include "coder/PathRetrieval.hpp"
 #include "paths/IndexedRange.hpp"
 #include "paths/Segments.hpp"
 
@@ -128,7 +130,8 @@ void visitTexts(const HuffmanPathTree& coder, PathDecoder& decoder,
                 const Numbers& numbers, std::size_t count, Visit visit) {
     TextVisitor<Visit> visitor(decoder, visit);
     try {
-        coder.visitPaths(numbers, visitor);
+        PathRetrieval(*coder.pathTree, coder.numbering())
+            .visit(numbers, visitor);
     } catch (const std::out_of_range&) {
         if (visitor.isVisiting()) throw;
         throw DamagedFormException();
@@ -185,8 +188,9 @@ void readInTreeOrder(HuffmanPathTree& coder, PathVisitor visit) {
     PathDecoder decoder;
     decoder.startOn(coder);
     coder.resetPathsToBTree();
-    while (coder.hasNextPathFromBTree())
-        coder.visitNextPath([&](const PathView& path) {
+    PathIteration pass(*coder.pathTree, coder.numbering());
+    while (pass.hasNext())
+        pass.visitNext([&](const PathView& path) {
             decoder.replaceFolders(path.folders, path.unchangedFolders);
             visit(decoder.pathOf(path.name));
         });

@@ -3,13 +3,13 @@
 #include <algorithm>
 #include <iterator>
 #include <stdexcept>
-#include <type_traits>
 #include <unordered_set>
 #include <utility>
 
-#include "pathtree/Insertion.hpp"
 #include "pathtree/NodeSlab.hpp"
 #include "pathtree/NodeWalk.hpp"
+#include "pathtree/TrackLookup.hpp"
+#include "pathtree/TreeInserter.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {
@@ -38,8 +38,8 @@ std::size_t componentBytes(const Components& components) {
 
 }  // namespace
 
-BPathTree::BPathTree() {
-    root = BNodePtr::adopt(pool_.make({}, NodePool::Kind::folder));
+BPathTree::BPathTree() : inserter_(std::make_unique<TreeInserter>()) {
+    root = inserter_->makeRoot();
 }
 
 BPathTree::BPathTree(const BPathTree& other)
@@ -47,7 +47,8 @@ BPathTree::BPathTree(const BPathTree& other)
       pendingNodes(other.pendingNodes),
       parentNodes(other.parentNodes),
       currentPrefix(other.currentPrefix),
-      spareFlag(other.spareFlag) {}
+      spareFlag(other.spareFlag),
+      inserter_(std::make_unique<TreeInserter>()) {}
 
 BPathTree::~BPathTree() = default;
 
@@ -69,90 +70,25 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     const std::uint64_t found = findNode(value, nodes);
     existed = found != allOnes;
     if (existed) return found;
-    pool_.add(nodes.node(), value, NodePool::Kind::leaf);
+    inserter_->add(nodes.node(), value, NodePool::Kind::leaf);
     releaseContents(value);
     return nodes.size() - 1;
 }
 
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
-    Insertion insertion(*root, pool_, childIndex_, pathTrack);
-    std::size_t stored = 0;
-    for (std::size_t i = 0; i < components.size(); ++i) {
-        const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
-                                                    : NodePool::Kind::leaf;
-        const std::uint64_t position = insertion.enter(components[i], kind);
-        if (!insertion.existed()) continue;
-        pathTrack.push_back(position);
-        ++stored;
-    }
-    insertion.commit();
-    for (std::size_t i = stored; i < components.size(); ++i)
-        releaseContents(components[i]);
-    return insertion.existed();
-}
-
-template <class Folder, class Files>
-BPathTree::AddedBatch BPathTree::insertBatch(Folder& components,
-                                             Files& fileNames,
-                                             PathTrack& pathTrack) {
-    Insertion insertion(*root, pool_, childIndex_, pathTrack);
-    std::size_t stored = 0;
-    for (const ComponentView component : components) {
-        const std::uint64_t position =
-            insertion.enter(component, NodePool::Kind::folder);
-        pathTrack.push_back(position);
-        if (insertion.existed()) ++stored;
-    }
-    const std::uint64_t first = appendFiles(insertion.node(), fileNames);
-    insertion.commit();
-    if constexpr (std::is_same_v<Folder, Components>) {
-        for (std::size_t i = stored; i < components.size(); ++i)
-            releaseContents(components[i]);
-        for (Component& name : fileNames) releaseContents(name);
-    }
-    return {insertion.node(), insertion.existed(), first};
-}
-
-template <class Files>
-std::uint64_t BPathTree::appendFiles(BNode& folder, const Files& fileNames) {
-    const std::size_t before = folder.children().size();
-    if (fileNames.empty()) return before;
-    NodePool::reserve(folder, fileNames.size());
-    try {
-        for (const ComponentView name : fileNames)
-            pool_.add(folder, name, NodePool::Kind::leaf);
-    } catch (...) {
-        NodePool::truncate(folder, before);
-        throw;
-    }
-    return before;
+    return inserter_->addPath(*root, components, pathTrack);
 }
 
 bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
                         PathTrack& pathTrack, std::uint64_t& firstFileIndex) {
-    const AddedBatch added =
-        insertBatch(folderComponents, fileNames, pathTrack);
+    const TreeInserter::AddedBatch added =
+        inserter_->addBatch(*root, folderComponents, fileNames, pathTrack);
     firstFileIndex = added.existed ? added.firstFile : allOnes;
     return added.existed;
 }
 
-BPathTree::AddedBatch BPathTree::addBatch(const ComponentList& folderComponents,
-                                          const ComponentList& fileNames,
-                                          PathTrack& pathTrack) {
-    return insertBatch(folderComponents, fileNames, pathTrack);
-}
-
-std::uint64_t BPathTree::addFiles(BNode& folder,
-                                  const ComponentList& fileNames) {
-    return appendFiles(folder, fileNames);
-}
-
 bool BPathTree::isLeaf(const BNodePtr& node) const noexcept {
     return node->isLeaf();
-}
-
-void BPathTree::releaseChildIndex(std::size_t maxChildren) noexcept {
-    if (childIndex_.indexedChildren() <= maxChildren) childIndex_.clear();
 }
 
 // ---- Iteration ----
@@ -177,7 +113,7 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
 }
 
 void BPathTree::reset() {
-    childIndex_.clear();
+    inserter_->releaseIndex();
     if (root->isLeaf()) return;
     // Room first, so that it changes nothing if memory runs out.
     pendingNodes.reserve(1);
@@ -239,17 +175,12 @@ void BPathTree::getNextPath(Components& out) {
 
 // ---- Lookup ----
 
-BatchFiles BPathTree::filesOfRoot() const {
-    if (root->isLeaf()) throw std::out_of_range("A track leads nowhere.");
-    return {*root, 0};
-}
-
 void BPathTree::traversePath(const PathTrack& pathTrack,
                              Components& out) const {
     Components found;
     found.reserve(pathTrack.size());
-    visitTrack(pathTrack,
-               [&found](ComponentView value) { appendCopy(value, found); });
+    TrackLookup(*root).visitTrack(
+        pathTrack, [&found](ComponentView value) { appendCopy(value, found); });
     appendAll(out, found);
 }
 
@@ -267,7 +198,7 @@ void BPathTree::getPath(
         const std::uint64_t partition = selectedPartitions[i];
         if (partition >= partitionTracks.size())
             throw std::out_of_range("A partition does not exist.");
-        visitBatch(
+        TrackLookup(*root).visitBatch(
             partitionTracks[static_cast<std::size_t>(partition)],
             fileOffsets[i],
             [&](ComponentView value) { appendCopy(value, folders[i]); },
@@ -301,7 +232,7 @@ BPathTree::MemoryUsage BPathTree::memoryUsage() const {
     account(*root);
     for (NodeWalk walk(*root); walk.next();) account(walk.node());
     usage.nodes -= usage.names;
-    usage.childIndex = childIndex_.memoryBytes();
+    usage.childIndex = inserter_->indexBytes();
     usage.iteration = pendingNodes.memoryBytes() + parentNodes.memoryBytes() +
                       componentBytes(currentPrefix);
     return usage;

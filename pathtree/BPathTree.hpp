@@ -2,22 +2,19 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <span>
+#include <memory>
 #include <vector>
 
 #include "pathtree/BNodePtr.hpp"
-#include "pathtree/BatchFiles.hpp"
-#include "pathtree/ChildIndex.hpp"
-#include "pathtree/ComponentList.hpp"
-#include "pathtree/NodePool.hpp"
+#include "pathtree/Component.hpp"
 #include "pathtree/NodeStack.hpp"
+#include "pathtree/PathTrack.hpp"
 #include "pathtree/PathTreeErrors.hpp"
 #include "pathtree/PathView.hpp"
 
 namespace tessel {
 
-// A path track: child positions from the root of the path tree down.
-using PathTrack = std::vector<std::uint64_t>;
+class TreeInserter;
 
 // BPathTree keeps paths as a trie whose edges are encoded components,
 // compared by length and bytes, never decoded, ordered or interpreted.
@@ -83,22 +80,8 @@ public:
     bool addPath(Components& folderComponents, Components& fileNames,
                  PathTrack& pathTrack, std::uint64_t& firstFileIndex);
 
-    // A folder that took files: its node, whether it was stored already (the
-    // root, for a folder without components, never counts as stored) and the
-    // position of the first of the files.
-    struct AddedBatch {
-        BNode& folder;
-        bool existed;
-        std::uint64_t firstFile;
-    };
-
-    // The same from packed lists, which are only read.
-    AddedBatch addBatch(const ComponentList& folderComponents,
-                        const ComponentList& fileNames, PathTrack& pathTrack);
-
-    // Appends files to a folder of this tree that was found before; returns
-    // the position of the first.
-    std::uint64_t addFiles(BNode& folder, const ComponentList& fileNames);
+    // The faster routes of those who know where a folder is.
+    TreeInserter& inserter() noexcept { return *inserter_; }
 
     // Inspection. True when the node has no children.
     bool isLeaf(const BNodePtr& node) const noexcept;
@@ -143,46 +126,18 @@ public:
     bool isNodeAtEndOfParent(const BNodePtr& node) const noexcept;
 
     // ---- Lookup ----
-    // Positions that lead outside the tree throw std::out_of_range. Views are
-    // valid as long as the tree. When something is thrown, components may
-    // have been visited already; output lists are unchanged.
+    // Positions that lead outside the tree throw std::out_of_range; the
+    // outputs are then unchanged. TrackLookup answers without copies.
 
-    // Calls visit(ComponentView) with each component along the track. Throws
+    // Inspection. Appends to `out` the components along the track. Throws
     // NoTreeToTraverseException on a tree without paths, otherwise
     // EmptyPathForTraverseException on an empty track.
-    template <class Visit>
-    void visitTrack(std::span<const std::uint64_t> track, Visit&& visit) const;
-
-    // Calls visitFolder(ComponentView) with each folder component of the
-    // batch to which the track belongs, then returns its files.
-    //
-    // The track ends at | the folder is   | the first file's position is
-    // ------------------+-----------------+------------------------------
-    // a node with files | that node       | 0: the batch made the folder
-    // a leaf            | the leaf's      | the leaf's: the batch joined an
-    //                   | parent          | existing folder
-    //
-    // So a batch that made its folder and brought no file is answered as if
-    // the folder were a file.
-    template <class VisitFolder>
-    BatchFiles openBatch(std::span<const std::uint64_t> track,
-                         VisitFolder&& visitFolder) const;
-
-    // The same, and then visitFile(ComponentView) with the files at these
-    // offsets (1-based within the batch), in the order given.
-    template <class VisitFolder, class VisitFile>
-    void visitBatch(std::span<const std::uint64_t> track,
-                    std::span<const std::uint64_t> offsets,
-                    VisitFolder&& visitFolder, VisitFile&& visitFile) const;
-
-    // Inspection. Appends to `out` the components along the track. Throws as
-    // visitTrack does.
     void traversePath(const PathTrack& pathTrack, Components& out) const;
 
     // Inspection. For each entry i of selectedPartitions (a position in
     // partitionTracks, 0-based) appends to folderPaths the batch's folder
     // components and to filePaths the names of the files at fileOffsets[i],
-    // in that order: see openBatch. One list may be both outputs.
+    // in that order: see TrackLookup. One list may be both outputs.
     void getPath(
         std::vector<Components>& folderPaths,
         std::vector<Components>& filePaths,
@@ -222,10 +177,6 @@ public:
     // Cost: a walk over the tree.
     MemoryUsage memoryUsage() const;
 
-    // Releases the memory that speeds up insertion, if it holds no more than
-    // `maxChildren` children. It comes back by itself when it is needed.
-    void releaseChildIndex(std::size_t maxChildren = ~std::size_t{0}) noexcept;
-
     // ---- State, public for inspection; change it through the operations ----
 
     BNodePtr root;
@@ -235,64 +186,12 @@ public:
     bool spareFlag = false;    // copied, otherwise unused
 
 private:
-    friend class TreeBuilder;
-
-    BatchFiles filesOfRoot() const;
-    static const BNode& childAt(const BNode& node, std::uint64_t position) {
-        return BatchFiles::childAt(node, position);
-    }
-
-    template <class Folder, class Files>
-    AddedBatch insertBatch(Folder& components, Files& fileNames,
-                           PathTrack& pathTrack);
-    template <class Files>
-    std::uint64_t appendFiles(BNode& folder, const Files& fileNames);
     const BNode& enterFolders();
     void leavePath() noexcept;
     void closeFinishedFolders() noexcept;
 
-    // Mutable for addIfExistsAndFind, which is const: the tree's content is
-    // its nodes; these only help to make and to find them.
-    mutable NodePool pool_;
-    mutable ChildIndex childIndex_;
-
+    std::unique_ptr<TreeInserter> inserter_;
     std::size_t unchangedFolders_ = 0;  // see PathView
 };
-
-template <class Visit>
-void BPathTree::visitTrack(std::span<const std::uint64_t> track,
-                           Visit&& visit) const {
-    if (root->isLeaf()) throw NoTreeToTraverseException();
-    if (track.empty()) throw EmptyPathForTraverseException();
-    const BNode* node = root.get();
-    for (const std::uint64_t position : track) {
-        node = &childAt(*node, position);
-        visit(node->value());
-    }
-}
-
-template <class VisitFolder>
-BatchFiles BPathTree::openBatch(std::span<const std::uint64_t> track,
-                                VisitFolder&& visitFolder) const {
-    if (track.empty()) return filesOfRoot();
-    const BNode* folder = root.get();
-    for (const std::uint64_t position : track.first(track.size() - 1)) {
-        folder = &childAt(*folder, position);
-        visitFolder(folder->value());
-    }
-    const BNode& end = childAt(*folder, track.back());
-    if (end.isLeaf()) return {*folder, track.back()};
-    visitFolder(end.value());
-    return {end, 0};
-}
-
-template <class VisitFolder, class VisitFile>
-void BPathTree::visitBatch(std::span<const std::uint64_t> track,
-                           std::span<const std::uint64_t> offsets,
-                           VisitFolder&& visitFolder,
-                           VisitFile&& visitFile) const {
-    const BatchFiles files = openBatch(track, visitFolder);
-    for (const std::uint64_t offset : offsets) visitFile(files[offset]);
-}
 
 }  // namespace tessel

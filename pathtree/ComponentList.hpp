@@ -3,7 +3,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <iterator>
 
 #include "pathtree/Component.hpp"
 
@@ -20,12 +19,6 @@ class ComponentList {
 public:
     class Iterator {
     public:
-        using iterator_category = std::input_iterator_tag;
-        using value_type = ComponentView;
-        using difference_type = std::ptrdiff_t;
-        using pointer = void;
-        using reference = ComponentView;
-
         explicit Iterator(const std::uint8_t* position) noexcept
             : at_(position) {}
         ComponentView operator*() const noexcept {

@@ -4,7 +4,6 @@
 #include <vector>
 
 #include "pathtree/BNodePtr.hpp"
-#include "pathtree/containers.hpp"
 
 namespace tessel {
 
@@ -49,7 +48,9 @@ public:
     void clear() noexcept { ranges_.clear(); }
 
     // Makes sure that the next `more` pushes do not throw.
-    void reserve(std::size_t more) { reserveGently(ranges_, more); }
+    void reserve(std::size_t more) {
+        if (more > ranges_.capacity() - ranges_.size()) grow(more);
+    }
 
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {
@@ -65,6 +66,8 @@ private:
         std::size_t end;
         bool isNode;
     };
+
+    void grow(std::size_t more);
 
     std::vector<Range> ranges_;
 };

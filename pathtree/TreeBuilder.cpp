@@ -1,6 +1,7 @@
 #include "pathtree/TreeBuilder.hpp"
 
-#include "packing/sixpacks.hpp"
+#include "packing/ByteCursor.hpp"
+#include "pathtree/NodeCode.hpp"
 
 namespace tessel {
 
@@ -27,11 +28,12 @@ std::vector<std::uint32_t> countChildren(std::span<const std::uint8_t> codes) {
 
 TreeBuilder::TreeBuilder(BPathTree& target,
                          std::span<const std::uint8_t> nodeCodes)
-    : tree_(target), codes_(nodeCodes), childCounts_(countChildren(nodeCodes)) {
-    tree_.childIndex_.clear();
-    tree_.root = BNodePtr::adopt(tree_.pool_.make({}, NodePool::Kind::folder));
-    reserveChildren(*tree_.root);
-    open_.push_back(tree_.root.get());
+    : inserter_(target.inserter()),
+      codes_(nodeCodes),
+      childCounts_(countChildren(nodeCodes)) {
+    target.root = inserter_.makeRoot();
+    reserveChildren(*target.root);
+    open_.push_back(target.root.get());
 }
 
 void TreeBuilder::reserveChildren(BNode& folder) {
@@ -43,9 +45,9 @@ void TreeBuilder::add(ComponentView value) {
     const std::uint8_t code = codes_[nextCode_++];
     const bool known = code <= nodecode::maxCode;
     const bool isFolder = known && (code & nodecode::hasChildren) != 0;
-    BNode& node = tree_.pool_.add(
-        *open_.back(), value,
-        isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf);
+    BNode& node =
+        inserter_.add(*open_.back(), value,
+                      isFolder ? NodePool::Kind::folder : NodePool::Kind::leaf);
     if (!known) throw UnknownNodeTypeException();
     if ((code & nodecode::siblingFollows) == 0) open_.pop_back();
     if (isFolder) {

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "pathtree/BPathTree.hpp"
-#include "pathtree/NodeCode.hpp"
+#include "pathtree/TreeInserter.hpp"
 
 namespace tessel {
 
@@ -41,7 +41,7 @@ public:
 private:
     void reserveChildren(BNode& folder);
 
-    BPathTree& tree_;
+    TreeInserter& inserter_;
     std::span<const std::uint8_t> codes_;
     std::vector<std::uint32_t> childCounts_;  // of the root and each folder
     std::size_t nextCount_ = 0;

@@ -5,6 +5,8 @@
 
 #include <new>
 
+#include "coder/PathNumbering.hpp"
+#include "coder/PathRetrieval.hpp"
 #include "tests/support/AllocationMeter.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Trees.hpp"
@@ -494,7 +496,8 @@ TEST(MemoryFailures, VisitingPathsByNumberTakesNoMemory) {
     Counter counter;
     {
         const AllocationFailure none(0);
-        coder->visitPaths(numbers, counter);
+        tessel::PathRetrieval(*coder->pathTree, coder->numbering())
+            .visit(numbers, counter);
         EXPECT_FALSE(none.happened());
     }
     EXPECT_EQ(counter.folders, 3U);

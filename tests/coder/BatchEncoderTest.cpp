@@ -8,6 +8,7 @@
 #include <stdexcept>
 #include <string>
 
+#include "coder/BatchEncoder.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {

@@ -6,6 +6,7 @@
 #include <map>
 
 #include "coder/FolderCache.hpp"
+#include "pathtree/TreeInserter.hpp"
 #include "tests/support/Bytes.hpp"
 #include "tests/support/Trees.hpp"
 
@@ -42,7 +43,8 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
             continue;
         }
         PathTrack track;
-        BNode& node = tree.addBatch(list, {}, track).folder;
+        BNode& node =
+            tree.inserter().addBatch(*tree.root, list, {}, track).folder;
         cache.add(list, hash, node, track);
         expected[components] = {&node, track};
     }

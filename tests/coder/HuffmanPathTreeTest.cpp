@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include "coder/HuffmanCode.hpp"
+#include "coder/PathNumbering.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {

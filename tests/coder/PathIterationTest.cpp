@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "coder/PathIteration.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {
@@ -16,6 +17,7 @@ using support::fourLetterCoder;
 using support::Texts;
 using tessel::Components;
 using tessel::HuffmanPathTree;
+using tessel::PathIteration;
 
 TEST(PathIteration, ResetStartsAgainFromTheFirstPath) {
     const CoderPtr coder = fourLetterCoder();
@@ -109,9 +111,13 @@ struct Seen {
     std::size_t unchangedFolders;
 };
 
+PathIteration passOf(HuffmanPathTree& coder) {
+    return {*coder.pathTree, coder.numbering()};
+}
+
 Seen nextSeen(HuffmanPathTree& coder) {
     Seen seen;
-    coder.visitNextPath([&seen](const tessel::PathView& path) {
+    passOf(coder).visitNext([&seen](const tessel::PathView& path) {
         seen.path.assign(path.folders.begin(), path.folders.end());
         seen.path.emplace_back(path.name.begin(), path.name.end());
         seen.unchangedFolders = path.unchangedFolders;
@@ -164,7 +170,7 @@ TEST(PathIteration, AVisitorThatThrowsLeavesThePassBeforeThePath) {
     const std::vector<Texts> paths = {{u"a", u"b"}, {u"a", u"b"}, {u"c"}};
     for (const Texts& path : paths) {
         const auto refuse = [](const tessel::PathView&) { throw 5; };
-        EXPECT_THROW(coder->visitNextPath(refuse), int);
+        EXPECT_THROW(passOf(*coder).visitNext(refuse), int);
         EXPECT_EQ(decodedBy(*coder, nextSeen(*coder).path), path);
     }
     EXPECT_FALSE(coder->hasNextPathFromBTree());

@@ -10,6 +10,7 @@
 #include <limits>
 #include <stdexcept>
 
+#include "coder/PathRetrieval.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {
@@ -25,6 +26,7 @@ using support::fourLetterCoder;
 using support::Texts;
 using tessel::Components;
 using tessel::HuffmanPathTree;
+using tessel::PathRetrieval;
 
 constexpr double infinity = std::numeric_limits<double>::infinity();
 constexpr double nan = std::numeric_limits<double>::quiet_NaN();
@@ -404,13 +406,17 @@ struct Visited {
     std::vector<std::size_t> bounds;
 };
 
+PathRetrieval retrievalOf(const HuffmanPathTree& coder) {
+    return {*coder.pathTree, coder.numbering()};
+}
+
 TEST(PathRetrieval, VisitedViewsAreWhatIsCopied) {
     const CoderPtr coder = threePartitions();
     const std::vector<std::vector<std::uint64_t>> requests = {
         {}, {1}, {5}, {2, 3, 4, 8}, {1, 1, 9}, {4, 10, 5}, {100}, {9, 8}};
     for (const auto& numbers : requests) {
         Visited visited;
-        coder->visitPaths(numbers, visited);
+        retrievalOf(*coder).visit(numbers, visited);
         const auto answer =
             found(*coder, std::vector<double>(numbers.begin(), numbers.end()));
         ASSERT_TRUE(answer);
@@ -433,7 +439,7 @@ TEST(PathRetrieval, AFolderDeeperThanTheTrackReadersArrayIsVisited) {
         addBatch(*coder, folder, {u"b"});
         addBatch(*coder, folder, {u"c"});
         Visited visited;
-        coder->visitPaths(std::vector<std::uint64_t>{1, 2}, visited);
+        retrievalOf(*coder).visit(std::vector<std::uint64_t>{1, 2}, visited);
         ASSERT_EQ(visited.folders.size(), 2U);
         for (const Components& seen : visited.folders)
             EXPECT_EQ(decodedBy(*coder, seen), folder);

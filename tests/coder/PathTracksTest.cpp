@@ -46,8 +46,8 @@ RC_GTEST_PROP(PathTracks, EqualAListOfLists,
     for (std::size_t i = 0; i < expected.size(); ++i)
         RC_ASSERT(tracks[i] == expected[i]);
     if (!expected.empty()) {
-        RC_ASSERT(tracks.front() == expected.front());
-        RC_ASSERT(tracks.back() == expected.back());
+        RC_ASSERT(tracks[0] == expected.front());
+        RC_ASSERT(tracks[tracks.size() - 1] == expected.back());
     }
     std::vector<PathTrack> visited;
     tracks.forEach(
@@ -60,7 +60,7 @@ RC_GTEST_PROP(PathTracks, EqualAListOfLists,
     RC_ASSERT(copy.memoryBytes() <= tracks.memoryBytes());
     copy.push_back({1});
     RC_ASSERT(!(copy == tracks));
-    RC_ASSERT(copy.back() == PathTrack{1});
+    RC_ASSERT(copy[copy.size() - 1] == PathTrack{1});
 }
 
 TEST(PathTracks, ATrackTakesAboutAByteAPosition) {

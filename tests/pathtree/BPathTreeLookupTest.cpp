@@ -193,59 +193,6 @@ TEST(PathTreeLookup, OneListForBothOutputsTakesFolderAndFilesInTurn) {
     EXPECT_EQ(textsOf(both[4]), Names{"g"});
 }
 
-// ---- Views ----
-
-// What visitBatch visits: folder components, then files.
-std::pair<Names, Names> visited(const BPathTree& tree, const PathTrack& track,
-                                const Positions& offsets) {
-    std::pair<Names, Names> seen;
-    tree.visitBatch(
-        track, offsets,
-        [&seen](tessel::ComponentView value) {
-            EXPECT_TRUE(seen.second.empty());
-            seen.first.push_back(support::textOf(value));
-        },
-        [&seen](tessel::ComponentView value) {
-            seen.second.push_back(support::textOf(value));
-        });
-    return seen;
-}
-
-TEST(PathTreeLookup, ABatchIsVisitedWithoutItsFirstFileAsAFolder) {
-    BPathTree tree;
-    addBatch(tree, {"a", "b"}, {"f", "g"});
-    addBatch(tree, {"a", "b"}, {"h", "i"});
-    const Names folder = {"a", "b"};
-    EXPECT_EQ(visited(tree, {0, 0}, {2, 1}),
-              (std::pair{folder, Names{"g", "f"}}));
-    EXPECT_EQ(visited(tree, {0, 0, 2}, {2, 1}),
-              (std::pair{folder, Names{"i", "h"}}));
-    EXPECT_EQ(visited(tree, {0, 0, 2}, {}), (std::pair{folder, Names{}}));
-}
-
-TEST(PathTreeLookup, FilesOfAnOpenBatchAreAskedForOneByOne) {
-    BPathTree tree;
-    addBatch(tree, {"a"}, {"f"});
-    addBatch(tree, {"a"}, {"g", "h"});
-    const PathTrack track = {0, 1};
-    const tessel::BatchFiles files =
-        tree.openBatch(track, [](tessel::ComponentView folder) {
-            EXPECT_EQ(support::textOf(folder), "a");
-        });
-    EXPECT_EQ(support::textOf(files[2]), "h");
-    EXPECT_EQ(support::textOf(files[1]), "g");
-    EXPECT_THROW(files[3], std::out_of_range);
-}
-
-TEST(PathTreeLookup, VisitsOutsideTheTreeAreOutOfRange) {
-    BPathTree tree;
-    addBatch(tree, {"a"}, {"f", "g"});
-    EXPECT_THROW(visited(tree, {1}, {1}), std::out_of_range);
-    EXPECT_THROW(visited(tree, {0, 0, 0}, {1}), std::out_of_range);
-    EXPECT_THROW(visited(tree, {0}, {3}), std::out_of_range);
-    EXPECT_THROW(visited(BPathTree(), {}, {}), std::out_of_range);
-}
-
 // Asks with outputs that hold something, which a refusal must not change.
 void expectRefused(const BPathTree& tree, const Positions& selected,
                    const std::vector<PathTrack>& tracks,

@@ -415,17 +415,6 @@ TEST(PathTreeInsertion, ResetReleasesWhatInsertionRemembered) {
     EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
 }
 
-TEST(PathTreeInsertion, ReleaseChildIndexSparesAMemoryThatIsLarge) {
-    BPathTree tree;
-    for (std::size_t i = 0; i < 100; ++i)
-        addWhole(tree, {support::numbered("d", i), "f"});
-    tree.releaseChildIndex(50);
-    EXPECT_GT(tree.memoryUsage().childIndex, 100U);
-    tree.releaseChildIndex(100);
-    EXPECT_EQ(tree.memoryUsage().childIndex, 0U);
-    EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
-}
-
 TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
     BPathTree tree;
     addWhole(tree, {"a", "b"});
@@ -436,43 +425,6 @@ TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
     EXPECT_TRUE(tree.isLeaf(file));
     addWhole(tree, {"a", "b", "c"});
     EXPECT_FALSE(tree.isLeaf(file));
-}
-
-// ---- Packed batches ----
-
-TEST(PathTreeInsertion, APackedBatchIsAddedLikeVectors) {
-    tessel::ComponentArena packer;
-    const auto folder = support::packedBy(packer, components({"a", "b"}));
-    const auto files = support::packedBy(packer, components({"f", ""}));
-    BPathTree tree;
-    PathTrack track;
-    const BPathTree::AddedBatch made = tree.addBatch(folder, files, track);
-    EXPECT_FALSE(made.existed);
-    EXPECT_EQ(made.firstFile, 0U);
-    EXPECT_EQ(track, (PathTrack{0, 0}));
-    const BPathTree::AddedBatch found = tree.addBatch(folder, files, track);
-    EXPECT_TRUE(found.existed);
-    EXPECT_EQ(found.firstFile, 2U);
-    EXPECT_EQ(&found.folder, &made.folder);
-    EXPECT_EQ(track, (PathTrack{0, 0, 0, 0}));
-    EXPECT_EQ(tree.addFiles(made.folder, files), 4U);
-    EXPECT_EQ(allPaths(tree),
-              (Paths{"a/b/f", "a/b/", "a/b/f", "a/b/", "a/b/f", "a/b/"}));
-}
-
-TEST(PathTreeInsertion, APackedFolderOfNoComponentsIsTheRoot) {
-    tessel::ComponentArena packer;
-    const auto files = support::packedBy(packer, components({"f"}));
-    BPathTree tree;
-    PathTrack track;
-    for (const std::uint64_t first : {0U, 1U}) {
-        const BPathTree::AddedBatch added = tree.addBatch({}, files, track);
-        EXPECT_EQ(&added.folder, tree.root.get());
-        EXPECT_FALSE(added.existed);
-        EXPECT_EQ(added.firstFile, first);
-        EXPECT_TRUE(track.empty());
-    }
-    EXPECT_EQ(allPaths(tree), (Paths{"f", "f"}));
 }
 
 }  // namespace

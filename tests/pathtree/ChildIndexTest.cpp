@@ -5,6 +5,7 @@
 
 #include "pathtree/BPathTree.hpp"
 #include "pathtree/ChildIndex.hpp"
+#include "pathtree/TreeInserter.hpp"
 #include "tests/support/Bytes.hpp"
 #include "tests/support/Trees.hpp"
 
@@ -76,7 +77,7 @@ RC_GTEST_PROP(ChildIndex, InsertionFindsWhatASearchFromTheFrontFinds, ()) {
                                rc::gen::arbitrary<unsigned>()));
     for (const unsigned step : steps) {
         BPathTree& used = step % 3 == 0 ? copy : tree;
-        if (step % 11 == 0) used.releaseChildIndex();
+        if (step % 11 == 0) used.inserter().releaseIndex();
         if (step % 13 == 0) used.reset();
         const Component value = nameOf(step / 16, kinds);
         if (step % 5 == 0) {  // appended unseen, equal ones too

@@ -7,6 +7,7 @@
 
 #include "pathtree/BPathTree.hpp"
 #include "pathtree/ComponentArena.hpp"
+#include "pathtree/TreeInserter.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Generators.hpp"
 #include "tests/support/Trees.hpp"
@@ -103,8 +104,9 @@ RC_GTEST_PROP(ComponentArena, InsertionEqualsThatOfVectors, ()) {
         const auto folderList = support::packedBy(arena, folder);
         const auto fileList = support::packedBy(arena, files);
         PathTrack packedTrack;
-        const BPathTree::AddedBatch added =
-            packed.addBatch(folderList, fileList, packedTrack);
+        const tessel::TreeInserter::AddedBatch added =
+            packed.inserter().addBatch(*packed.root, folderList, fileList,
+                                       packedTrack);
         RC_ASSERT(added.existed == plainExisted);
         RC_ASSERT(packedTrack == plainTrack);
         if (plainExisted) RC_ASSERT(added.firstFile == first);

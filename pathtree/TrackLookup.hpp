@@ -1,0 +1,76 @@
+#pragma once
+
+#include <cstdint>
+#include <span>
+
+#include "pathtree/BNode.hpp"
+#include "pathtree/BatchFiles.hpp"
+#include "pathtree/PathTreeErrors.hpp"
+
+namespace tessel {
+
+// Follows tracks through a path tree. Positions that lead outside the tree
+// throw std::out_of_range; components may have been visited by then.
+//
+// Ownership: borrows the root. The views that it hands out are valid as long
+//   as the tree.
+// Threads: any number of readers.
+class TrackLookup {
+public:
+    using Track = std::span<const std::uint64_t>;
+
+    explicit TrackLookup(const BNode& root) noexcept : root_(root) {}
+
+    // Calls visit(ComponentView) with each component along the track. Throws
+    // NoTreeToTraverseException on a tree without paths, otherwise
+    // EmptyPathForTraverseException on an empty track.
+    template <class Visit>
+    void visitTrack(Track track, Visit&& visit) const {
+        if (root_.isLeaf()) throw NoTreeToTraverseException();
+        if (track.empty()) throw EmptyPathForTraverseException();
+        const BNode* node = &root_;
+        for (const std::uint64_t position : track) {
+            node = &BatchFiles::childAt(*node, position);
+            visit(node->value());
+        }
+    }
+
+    // Calls visitFolder(ComponentView) with each folder component of the
+    // batch to which the track belongs, then returns its files.
+    //
+    // The track ends at | the folder is   | the first file's position is
+    // ------------------+-----------------+------------------------------
+    // a node with files | that node       | 0: the batch made the folder
+    // a leaf            | the leaf's      | the leaf's: the batch joined an
+    //                   | parent          | existing folder
+    //
+    // So a batch that made its folder and brought no file is answered as if
+    // the folder were a file.
+    template <class VisitFolder>
+    BatchFiles openBatch(Track track, VisitFolder&& visitFolder) const {
+        if (track.empty()) return BatchFiles::ofRoot(root_);
+        const BNode* folder = &root_;
+        for (const std::uint64_t position : track.first(track.size() - 1)) {
+            folder = &BatchFiles::childAt(*folder, position);
+            visitFolder(folder->value());
+        }
+        const BNode& end = BatchFiles::childAt(*folder, track.back());
+        if (end.isLeaf()) return {*folder, track.back()};
+        visitFolder(end.value());
+        return {end, 0};
+    }
+
+    // The same, and then visitFile(ComponentView) with the files at these
+    // offsets (1-based within the batch), in the order given.
+    template <class VisitFolder, class VisitFile>
+    void visitBatch(Track track, std::span<const std::uint64_t> offsets,
+                    VisitFolder&& visitFolder, VisitFile&& visitFile) const {
+        const BatchFiles files = openBatch(track, visitFolder);
+        for (const std::uint64_t offset : offsets) visitFile(files[offset]);
+    }
+
+private:
+    const BNode& root_;
+};
+
+}  // namespace tessel
