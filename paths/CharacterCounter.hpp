@@ -34,10 +34,7 @@ public:
     CharacterCounter() : pages_(pageCount) { page(0); }
 
     void add(char16_t unit) { ++page(unit / pageSize)[unit % pageSize]; }
-    void add(std::u16string_view text) {
-        Page& firstPage = *pages_.front();
-        for (const char16_t unit : text) add(firstPage, unit);
-    }
+    void add(std::u16string_view text);
     // Counts the units of the bytes' text.
     void addBytes(std::string_view bytes);
 

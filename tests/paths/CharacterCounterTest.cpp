@@ -25,6 +25,27 @@ TEST(CharacterCounter, CountsUnitsOfAllPages) {
               (std::vector<double>{1, 3, 1, 1, 1, 1, 1, 1}));
 }
 
+TEST(CharacterCounter, AUnitOfAnotherPageIsCountedWhereverItIs) {
+    for (std::size_t length = 1; length < 12; ++length) {
+        for (std::size_t at = 0; at < length; ++at) {
+            for (const char16_t far : {u'\x100', u'\xFF61', u'\xFF'}) {
+                std::u16string text(length, u'a');
+                text[at] = far;
+                CharacterCounter counter;
+                counter.add(text);
+                const CharacterCounts counts = counter.result();
+                const auto others = static_cast<double>(length - 1);
+                if (length == 1) {
+                    EXPECT_EQ(counts.characters, text);
+                    continue;
+                }
+                EXPECT_EQ(counts.characters, (std::u16string{u'a', far}));
+                EXPECT_EQ(counts.frequencies, (std::vector<double>{others, 1}));
+            }
+        }
+    }
+}
+
 TEST(CharacterCounter, StartsWithNothing) {
     const CharacterCounts counts = CharacterCounter().result();
     EXPECT_TRUE(counts.characters.empty());
