@@ -53,7 +53,6 @@ public:
               PathVisitor visitor) const;
 
 private:
-    std::vector<SegmentEntry> readDirectory();
     bool readStored(const Segment& segment, std::uint64_t first,
                     std::uint64_t last, PathVisitor visitor) const;
 

@@ -155,10 +155,14 @@ void SegmentHead::pack(std::vector<std::uint8_t>& out) const {
     packSum(out, start, 0);
 }
 
-SegmentHead SegmentHead::unpack(std::span<const std::uint8_t> segment) {
-    ByteCursor cursor = summed(segment, segmentHeadBytes - 8, 0);
-    require(std::ranges::equal(cursor.take(segmentTag.size()), segmentTag));
-    SegmentHead head;
+namespace {
+
+std::uint32_t takeUint32(ByteCursor& cursor) {
+    return static_cast<std::uint32_t>(cursor.takeUint(PackedSizeT::Uint32));
+}
+
+// Order of the list and sizes of blocks and pieces.
+void takeLayout(ByteCursor& cursor, SegmentHead& head) {
     const std::uint8_t order = cursor.takeByte();
     require(order <= static_cast<std::uint8_t>(ListOrder::Rearranged));
     head.order = static_cast<ListOrder>(order);
@@ -170,25 +174,39 @@ SegmentHead SegmentHead::unpack(std::span<const std::uint8_t> segment) {
             head.folderBlocksPerHead > 0 && head.pieceShift >= 9 &&
             head.pieceShift <= 12);
     requireZeros(cursor, 3);
-    const auto takeUint32 = [&] {
-        return static_cast<std::uint32_t>(cursor.takeUint(PackedSizeT::Uint32));
-    };
-    head.folders = takeUint32();
+}
+
+void takeCounts(ByteCursor& cursor, SegmentHead& head) {
+    head.folders = takeUint32(cursor);
     head.paths = cursor.takeUint(PackedSizeT::Uint64);
     head.textBytes = cursor.takeUint(PackedSizeT::Uint64);
-    head.maxNameBytes = takeUint32();
-    head.maxFolderBytes = takeUint32();
+    head.maxNameBytes = takeUint32(cursor);
+    head.maxFolderBytes = takeUint32(cursor);
     require(head.paths > 0 && head.paths <= maxPathsPerSegment &&
             head.folders > 0 && head.folders <= head.paths &&
             head.maxNameBytes <= maxComponentBytes &&
             head.maxFolderBytes <= maxComponentBytes);
-    const std::uint64_t bytes = cursor.takeUint(PackedSizeT::Uint64);
+}
+
+void takeSections(ByteCursor& cursor, SegmentHead& head) {
     for (std::uint64_t& section : head.sectionBytes) {
         section = cursor.takeUint(PackedSizeT::Uint64);
         require(section <= maxSectionBytes);
     }
     require(head.sectionBytes[14] == 0 && head.sectionBytes[15] == 0);
     requireZeros(cursor, 64);
+}
+
+}  // namespace
+
+SegmentHead SegmentHead::unpack(std::span<const std::uint8_t> segment) {
+    ByteCursor cursor = summed(segment, segmentHeadBytes - 8, 0);
+    require(std::ranges::equal(cursor.take(segmentTag.size()), segmentTag));
+    SegmentHead head;
+    takeLayout(cursor, head);
+    takeCounts(cursor, head);
+    const std::uint64_t bytes = cursor.takeUint(PackedSizeT::Uint64);
+    takeSections(cursor, head);
     head.topSum = cursor.takeUint(PackedSizeT::Uint64);
     require(head.segmentBytes() == bytes);
     return head;

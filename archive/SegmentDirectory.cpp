@@ -1,5 +1,7 @@
 #include "archive/SegmentDirectory.hpp"
 
+#include <algorithm>
+
 #include "archive/ArchiveExceptions.hpp"
 #include "packing/ByteCursor.hpp"
 
@@ -7,8 +9,29 @@ namespace tessel::archive {
 
 namespace {
 
-void require(bool holds) {
-    if (!holds) throw DamagedFormException();
+using Bytes = std::span<const std::uint8_t>;
+
+FileHeader headerOf(Bytes file) {
+    try {
+        return FileHeader::unpack(file);
+    } catch (const DamagedFormException&) {
+        throw DamagedArchiveException(
+            0, "This is no archive, or its header is damaged.");
+    }
+}
+
+std::uint64_t placeOf(std::uint64_t index, const FileHeader& header) {
+    return header.directoryOffset + index * segmentEntryBytes;
+}
+
+SegmentEntry entryAt(Bytes file, const FileHeader& header,
+                     std::uint64_t index) {
+    const std::uint64_t at = placeOf(index, header);
+    try {
+        return SegmentEntry::unpack(file.subspan(at, segmentEntryBytes), index);
+    } catch (const DamagedFormException&) {
+        throw DamagedArchiveException(at, "The segment directory is damaged.");
+    }
 }
 
 }  // namespace
@@ -37,29 +60,37 @@ FileHeader SegmentDirectory::pack(std::vector<std::uint8_t>& out) const {
     return header;
 }
 
+// Whether the entry follows the last one without a gap, in bytes and numbers.
+bool SegmentDirectory::isNext(const SegmentEntry& entry) const noexcept {
+    return entry.offset == end() && entry.firstNumber == paths() &&
+           entry.paths > 0 && entry.paths <= maxPathsPerSegment;
+}
+
 SegmentDirectory SegmentDirectory::unpack(std::span<const std::uint8_t> file) {
-    std::uint64_t at = 0;
-    try {
-        const FileHeader header = FileHeader::unpack(file);
-        if (header.version > formatVersion)
-            throw UnsupportedArchiveVersionException(header.version);
-        require(header.fileBytes == file.size());
-        SegmentDirectory directory;
-        for (std::uint64_t i = 0; i < header.segments; ++i) {
-            at = header.directoryOffset + i * segmentEntryBytes;
-            const auto entry = SegmentEntry::unpack(file.subspan(at), i);
-            require(entry.offset == directory.end() && entry.paths > 0 &&
-                    entry.firstNumber == directory.paths() &&
-                    entry.bytes <= header.directoryOffset - entry.offset);
-            directory.entries_.push_back(entry);
-        }
-        require(directory.end() == header.directoryOffset &&
-                directory.paths() == header.paths);
-        return directory;
-    } catch (const DamagedFormException&) {
+    const FileHeader header = headerOf(file);
+    if (header.version > formatVersion)
+        throw UnsupportedArchiveVersionException(header.version);
+    if (header.fileBytes != file.size())
         throw DamagedArchiveException(
-            at, "The header or the directory of segments is damaged.");
+            std::min<std::uint64_t>(header.fileBytes, file.size()),
+            "The archive was cut or lengthened.");
+    SegmentDirectory directory;
+    directory.version_ = header.version;
+    for (std::uint64_t i = 0; i < header.segments; ++i) {
+        const SegmentEntry entry = entryAt(file, header, i);
+        if (!directory.isNext(entry) ||
+            entry.bytes > header.directoryOffset - entry.offset)
+            throw DamagedArchiveException(
+                placeOf(i, header),
+                "The segment directory contradicts itself.");
+        directory.entries_.push_back(entry);
     }
+    if (directory.end() != header.directoryOffset ||
+        directory.paths() != header.paths)
+        throw DamagedArchiveException(
+            header.directoryOffset,
+            "The segment directory does not match the header.");
+    return directory;
 }
 
 }  // namespace tessel::archive

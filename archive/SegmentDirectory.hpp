@@ -27,7 +27,15 @@ public:
     // UnsupportedArchiveVersionException. The segments are not looked at.
     static SegmentDirectory unpack(std::span<const std::uint8_t> file);
 
+    std::uint32_t version() const noexcept { return version_; }
+    const std::vector<SegmentEntry>& entries() const noexcept {
+        return entries_;
+    }
+
 private:
+    bool isNext(const SegmentEntry& entry) const noexcept;
+
+    std::uint32_t version_ = formatVersion;
     std::vector<SegmentEntry> entries_;
 };
 

@@ -1,7 +1,10 @@
 #include "archive/SegmentRules.hpp"
 
 #include <algorithm>
+#include <functional>
+#include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "archive/FolderDecoder.hpp"
@@ -101,6 +104,30 @@ void SegmentRules::checkFolders(std::uint32_t begin, std::uint32_t end) const {
                                 ? segment_.bytesOf(Section::Folders)
                                 : segment_.folderBlock(block + 1).begin),
               "There is a gap between two blocks.");
+    }
+}
+
+// By their hashes, so that no text is kept but that of equal hashes.
+void SegmentRules::checkFoldersDiffer() const {
+    PathBuffer buffer(segment_.head().maxFolderBytes + FolderDecoder::slack);
+    FolderDecoder folders(segment_, buffer.data());
+    std::vector<std::pair<std::size_t, std::uint32_t>> hashes;
+    for (std::uint32_t f = 0; f < segment_.head().folders; ++f)
+        hashes.emplace_back(std::hash<std::string_view>()(folders.at(f)), f);
+    std::ranges::sort(hashes);
+    std::set<std::string, std::less<>> texts;  // of one hash
+    for (std::size_t i = 1; i < hashes.size(); ++i) {
+        const auto& [last, lastFolder] = hashes[i - 1];
+        const auto& [hash, folder] = hashes[i];
+        if (hash != last) {
+            texts.clear();
+            continue;
+        }
+        if (texts.empty()) texts.emplace(folders.at(lastFolder));
+        const std::uint32_t block = folder / segment_.head().foldersPerBlock;
+        require(Section::Folders, segment_.folderBlock(block).begin,
+                texts.emplace(folders.at(folder)).second,
+                "A folder comes twice.");
     }
 }
 

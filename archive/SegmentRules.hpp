@@ -29,6 +29,9 @@ public:
     // end with '/', and are without 0.
     void checkFolders(std::uint32_t begin, std::uint32_t end) const;
 
+    // No folder comes twice.
+    void checkFoldersDiffer() const;
+
     // The folder heads are the folders, and the blocks, that they should be.
     void checkFolderHeads() const;
 

@@ -58,6 +58,7 @@ private:
                 return Findings{{}, rules.checkNames(begin, end)};
             });
         });
+        addRule(segment, [rules] { rules.checkFoldersDiffer(); });
         addRule(segment, [rules] { rules.checkFolderHeads(); });
         addRule(segment, [rules] { rules.checkOrder(); });
         add(segment, Task::Kind::End, [] { return Findings(); });
