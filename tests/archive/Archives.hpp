@@ -79,6 +79,16 @@ inline Paths inFolderRuns(std::size_t count) {
     return paths;
 }
 
+// Each path in another folder than the one before, so that even a short list is
+// rearranged.
+inline Paths scatteredPaths(std::size_t count) {
+    Paths paths;
+    for (std::size_t i = 0; i < count; ++i)
+        paths.push_back("usr/lib" + std::to_string(i * 7 % 5) + "/file" +
+                        std::to_string(i * 11 % count) + ".txt");
+    return paths;
+}
+
 // What is hard about paths, in one list.
 inline Paths nastyPaths() {
     Paths paths = {"/",   "//",   "a", "a/", "a//", "a//b",          "a/b",
