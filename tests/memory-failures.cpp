@@ -143,6 +143,27 @@ TEST(MemoryFailures, ABatchLeavesTheFoldersBeforeTheFailureAdded) {
     });
 }
 
+// A folder that was there appends one position to its track once its files are
+// in the tree: that must not fail any more.
+TEST(MemoryFailures, FilesOfAFolderThatWasThereAreNumberedOrNotAdded) {
+    for (const std::size_t depth : {1U, 2U, 4U, 8U}) {
+        forEachAllocation([&](std::size_t n) {
+            const CoderPtr coder = support::fourLetterCoder();
+            const Texts folder(depth, u"a");
+            support::addBatch(*coder, folder, {u"b"});
+            std::vector<Texts> batch = {folder};
+            std::vector<Texts> files = {{u"c", u"d"}};
+            const bool added = succeedsWith(n, [&] {
+                coder->generateCodeAsyncAndAddPaths(batch, files, 1);
+            });
+            EXPECT_EQ(coder->pathCount, added ? 3U : 1U);
+            EXPECT_EQ(support::iterated(*coder).size(), coder->pathCount);
+            EXPECT_EQ(support::brokenInvariant(*coder), "");
+            return added;
+        });
+    }
+}
+
 TEST(MemoryFailures, ABatchOnWorkersIsRefusedOrAddedInPart) {
     forEachAllocation([&](std::size_t n) {
         const CoderPtr coder = filledCoder();

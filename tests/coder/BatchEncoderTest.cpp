@@ -114,11 +114,15 @@ TEST(BatchEncoder, OneWorkersBodyFillsItsRangeOnly) {
     coder->generateCodeForPath(0, 0);
     coder->generateCodeForPath(2, 2);
     coder->addPathToBTreeFromAsyncData();
+    // Before a pass, whose beginning would clear them, too.
+    EXPECT_TRUE(coder->asyncFolders.empty());
+    EXPECT_TRUE(coder->asyncFiles.empty());
+    EXPECT_TRUE(coder->encodedFolders.empty());
+    EXPECT_TRUE(coder->encodedFiles.empty());
+    EXPECT_EQ(coder->memoryUsage().batch, 0U);
     EXPECT_EQ(
         support::iterated(*coder),
         (std::vector<Texts>{{u"a", u"a"}, {u"a", u"b"}, {u"b", u"c"}, {u"c"}}));
-    EXPECT_TRUE(coder->asyncFolders.empty());
-    EXPECT_TRUE(coder->encodedFiles.empty());
 }
 
 // ---- Refused batches ----

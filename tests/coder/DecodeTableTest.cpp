@@ -87,6 +87,7 @@ TEST(DecodeTable, ATreeOfOneLeafOrNoneGivesNoTable) {
     EXPECT_EQ(table.memoryBytes(), 16384U);
     table.build({leaf(0, u'a')}, 0);
     EXPECT_TRUE(table.empty());
+    EXPECT_EQ(table.memoryBytes(), 0U);
     table.build(threeLeaves(), -1);
     EXPECT_TRUE(table.empty());
     table.build(threeLeaves(), 5);

@@ -337,6 +337,15 @@ TEST(CoderForm, EachWidthFollowsTheMaximumOfItsGroup) {
               tail);
 }
 
+TEST(CoderForm, TracksThatWereReadTakeNoSlack) {
+    const CoderPtr coder = fourLetterCoder();
+    for (int i = 0; i < 100; ++i) addBatch(*coder, {u"a", u"b"}, {u"c"});
+    const CoderPtr back = restoredFrom(formOf(*coder, false), false, *coder);
+    ASSERT_EQ(back->partitionTracks.size(), 100U);
+    const tessel::PathTracks exact = back->partitionTracks;
+    EXPECT_EQ(back->partitionTracks.memoryBytes(), exact.memoryBytes());
+}
+
 TEST(CoderForm, AnInsertionAfterReadingGoesOn) {
     const CoderPtr coder = fourLetterCoder();
     addBatch(*coder, {u"a"}, {u"b", u"c"});

@@ -130,4 +130,23 @@ TEST(HuffmanPathTree, ACopysMembersAreItsOwn) {
     EXPECT_EQ(&copy.pathCount, &copy.numbering().pathCount);
 }
 
+// ---- What insertion remembers ----
+
+TEST(HuffmanPathTree, ABatchOfManyFoldersReleasesWhatItSearchedWith) {
+    const CoderPtr coder = fourLetterCoder();
+    std::vector<support::Texts> folders;
+    for (std::size_t i = 1; i <= 50; ++i)
+        folders.push_back({std::u16string(i, u'a')});
+    support::addBatches(*coder, folders, {50, support::Texts{u"b"}});
+    EXPECT_EQ(coder->pathTree->memoryUsage().childIndex, 0U);
+}
+
+TEST(HuffmanPathTree, ABatchOfFewFoldersKeepsALargeIndexForTheNext) {
+    const CoderPtr coder = fourLetterCoder();
+    for (std::size_t i = 1; i <= 50; ++i)
+        support::addWhole(*coder, {std::u16string(i, u'a'), u"b"});
+    support::addBatch(*coder, {u"c"}, {u"b"});
+    EXPECT_GT(coder->pathTree->memoryUsage().childIndex, 50 * 8U);
+}
+
 }  // namespace

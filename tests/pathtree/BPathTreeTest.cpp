@@ -415,6 +415,21 @@ TEST(PathTreeInsertion, ResetReleasesWhatInsertionRemembered) {
     EXPECT_EQ(addWhole(tree, {"d57", "f"}), (WholeAdded{true, {57, 0}}));
 }
 
+TEST(PathTreeInsertion, ComponentsThatBecameNodesKeepNoMemory) {
+    const std::string text(100, 'x');
+    BPathTree tree;
+    Components folder = components({text + "1", text + "2"});
+    Components files = components({text + "f", text + "g"});
+    PathTrack track;
+    std::uint64_t first = 0;
+    tree.addPath(folder, files, track, first);
+    Components whole = components({text + "3", text + "4"});
+    tree.addPath(whole, track);
+    for (const Components* list : {&folder, &files, &whole})
+        for (const tessel::Component& value : *list)
+            EXPECT_EQ(value.capacity(), 0U);
+}
+
 TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
     BPathTree tree;
     addWhole(tree, {"a", "b"});

@@ -4,6 +4,8 @@
 #include <malloc.h>
 
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/NodePool.hpp"
+#include "pathtree/NodeSlab.hpp"
 #include "tests/support/Trees.hpp"
 
 namespace {
@@ -44,5 +46,16 @@ TEST_P(NameLengths, TakeWhatTheTreeSays) {
 INSTANTIATE_TEST_SUITE_P(Bytes, NameLengths,
                          ::testing::Values(100, 1000, 1025, 3000, 4060, 4100,
                                            5000, 9000, 16000, 16400, 40000));
+
+TEST(NodePoolMemory, APoolLeavesNoSlabBehind) {
+    const auto used = [] { return mallinfo2().uordblks; };
+    const std::size_t before = used();
+    constexpr std::size_t pools = 1000;
+    for (std::size_t i = 0; i < pools; ++i) {
+        tessel::NodePool pool;
+        tessel::BNodePtr::adopt(pool.make({}, tessel::NodePool::Kind::leaf));
+    }
+    EXPECT_LT(used() - before, pools * tessel::NodeSlab::minBytes / 10);
+}
 
 }  // namespace

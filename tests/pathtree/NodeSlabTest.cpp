@@ -5,6 +5,7 @@
 #include <thread>
 
 #include "pathtree/BPathTree.hpp"
+#include "pathtree/NodePool.hpp"
 #include "pathtree/NodeSlab.hpp"
 #include "tests/support/Trees.hpp"
 
@@ -48,6 +49,22 @@ TEST(NodeSlab, KeepsStoresOfSeveralNodes) {
     slab->forgetChildStore(a);
     slab->forgetChildStore(b);
     for (int i = 0; i < 3; ++i) slab->release();
+}
+
+TEST(NodeSlab, ForgetsTheStoreOfANodeThatIsReleased) {
+    tessel::NodePool pool;
+    const auto leaf = [&pool] {
+        return tessel::BNodePtr::adopt(
+            pool.make({}, tessel::NodePool::Kind::leaf));
+    };
+    const tessel::BNodePtr keeper = leaf();
+    NodeSlab* slab = NodeSlab::of(keeper.get());
+    tessel::BNodePtr late = leaf();
+    ASSERT_EQ(NodeSlab::of(late.get()), slab);
+    pool.add(*late, {}, tessel::NodePool::Kind::leaf);
+    const std::size_t before = slab->memoryBytes();
+    late = {};
+    EXPECT_EQ(slab->memoryBytes(), before - 32);
 }
 
 // A tree that was loaded anew shares no node with its former copy, but its
