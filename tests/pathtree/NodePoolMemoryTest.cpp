@@ -48,14 +48,19 @@ INSTANTIATE_TEST_SUITE_P(Bytes, NameLengths,
                                            5000, 9000, 16000, 16400, 40000));
 
 TEST(NodePoolMemory, APoolLeavesNoSlabBehind) {
-    const auto used = [] { return mallinfo2().uordblks; };
-    const std::size_t before = used();
-    constexpr std::size_t pools = 1000;
-    for (std::size_t i = 0; i < pools; ++i) {
-        tessel::NodePool pool;
-        tessel::BNodePtr::adopt(pool.make({}, tessel::NodePool::Kind::leaf));
+    constexpr std::size_t pools = 100;
+    const tessel::Component value(62, 1);
+    for (const std::size_t nodes : {1U, 200U}) {
+        const std::size_t before = mallinfo2().uordblks;
+        for (std::size_t i = 0; i < pools; ++i) {
+            tessel::NodePool pool;
+            for (std::size_t k = 0; k < nodes; ++k)
+                tessel::BNodePtr::adopt(
+                    pool.make(value, tessel::NodePool::Kind::leaf));
+        }
+        EXPECT_LT(mallinfo2().uordblks - before,
+                  pools * tessel::NodeSlab::minBytes / 10);
     }
-    EXPECT_LT(used() - before, pools * tessel::NodeSlab::minBytes / 10);
 }
 
 }  // namespace
