@@ -48,7 +48,7 @@ INSTANTIATE_TEST_SUITE_P(Bytes, NameLengths,
                                            5000, 9000, 16000, 16400, 40000));
 
 TEST(NodePoolMemory, APoolLeavesNoSlabBehind) {
-    constexpr std::size_t pools = 100;
+    constexpr std::size_t pools = 1000;
     const tessel::Component value(62, 1);
     for (const std::size_t nodes : {1U, 200U}) {
         const std::size_t before = mallinfo2().uordblks;
@@ -58,8 +58,9 @@ TEST(NodePoolMemory, APoolLeavesNoSlabBehind) {
                 tessel::BNodePtr::adopt(
                     pool.make(value, tessel::NodePool::Kind::leaf));
         }
-        EXPECT_LT(mallinfo2().uordblks - before,
-                  pools * tessel::NodeSlab::minBytes / 10);
+        // The allocator keeps a few freed pieces for itself.
+        EXPECT_LT(mallinfo2().uordblks,
+                  before + pools * tessel::NodeSlab::minBytes / 10);
     }
 }
 
