@@ -85,7 +85,7 @@ TEST(HashIndex, AHashIsTheSameWithinAProcess) {
     std::set<std::uint32_t> hashes;
     for (std::size_t length = 0; length < 600; ++length) {
         const Name name(length, 0x5A);
-        const Name copy = name;
+        const Name copy(length, 0x5A);
         EXPECT_EQ(HashIndex::hashOf(name), HashIndex::hashOf(copy));
         hashes.insert(HashIndex::hashOf(name));
     }
