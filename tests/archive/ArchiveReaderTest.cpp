@@ -36,7 +36,7 @@ TEST(ArchiveReader, FindsTheSegmentOfANumber) {
 
 TEST(ArchiveReader, ReadsSinglePathsOfAllSegments) {
     for (const Paths& list : lists()) {
-        const OpenArchive archive(list, archives::segmentsOf(20));
+        const OpenArchive archive(list, archives::segmentsOf(30));
         std::string path = "overwritten";
         for (std::uint64_t i = 0; i < list.size(); ++i) {
             archive.reader().read(i, path);
@@ -46,9 +46,9 @@ TEST(ArchiveReader, ReadsSinglePathsOfAllSegments) {
 }
 
 TEST(ArchiveReader, ReadsNumbersAcrossSegmentsAsAsked) {
-    const Numbers numbers = {0, 49, 19, 20, 21, 20, 5, 5, 40, 39};
+    const Numbers numbers = {0, 49, 29, 30, 31, 30, 5, 5, 40, 39};
     for (const Paths& list : lists()) {
-        const OpenArchive archive(list, archives::segmentsOf(20));
+        const OpenArchive archive(list, archives::segmentsOf(30));
         Numbers shown;
         EXPECT_TRUE(archive.reader().read(
             numbers, [&](std::uint64_t number, std::string_view path) {
@@ -61,7 +61,7 @@ TEST(ArchiveReader, ReadsNumbersAcrossSegmentsAsAsked) {
 
 TEST(ArchiveReader, ReadsRangesAcrossSegments) {
     for (const Paths& list : lists()) {
-        const OpenArchive archive(list, archives::segmentsOf(20));
+        const OpenArchive archive(list, archives::segmentsOf(30));
         std::uint64_t next = 15;
         EXPECT_TRUE(archive.reader().read(
             15, 45, [&](std::uint64_t number, std::string_view path) {
@@ -74,16 +74,16 @@ TEST(ArchiveReader, ReadsRangesAcrossSegments) {
 
 TEST(ArchiveReader, EndsAVisitWhenAsked) {
     for (const Paths& list : lists()) {
-        const OpenArchive archive(list, archives::segmentsOf(20));
+        const OpenArchive archive(list, archives::segmentsOf(30));
         unsigned shown = 0;
         const auto stopAtThird = [&](std::uint64_t, std::string_view) {
             return ++shown < 3;
         };
-        EXPECT_FALSE(archive.reader().read(18, 45, stopAtThird));
+        EXPECT_FALSE(archive.reader().read(28, 45, stopAtThird));
         EXPECT_EQ(shown, 3U);
         shown = 0;
         EXPECT_FALSE(
-            archive.reader().read(Numbers{30, 2, 1, 0, 7}, stopAtThird));
+            archive.reader().read(Numbers{30, 2, 31, 0, 7}, stopAtThird));
         EXPECT_EQ(shown, 3U);
     }
 }
