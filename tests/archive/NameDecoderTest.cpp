@@ -83,7 +83,7 @@ TEST(NameDecoder, StartsAtAnyBlock) {
         names->start(archive.segment().nameBlock(block));
         for (std::size_t i = 0; i < 16; ++i) {
             names->next();
-            EXPECT_EQ(names->name(), nameOf(list[16 * block + i]));
+            EXPECT_EQ(names->name(), nameOf(list[std::size_t{16} * block + i]));
         }
         EXPECT_TRUE(names->isAtEnd());
     }
@@ -117,7 +117,7 @@ TEST(NameDecoder, StaysWithinItsBoundsOnAnyBits) {
             const archives::ChangedSegment changed(
                 archive, archives::flip(Section::Names, at,
                                         static_cast<std::uint8_t>(bits)));
-            refused += isRefused(Segment(changed.bytes(), changed.entry()));
+            if (isRefused(Segment(changed.bytes(), changed.entry()))) ++refused;
         }
     EXPECT_GT(refused, 0U);
 }

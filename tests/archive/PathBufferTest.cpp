@@ -11,7 +11,7 @@ namespace {
 
 bool isWithin(PathBuffer& buffer) {
     const auto* const object = reinterpret_cast<const char*>(&buffer);
-    const std::less<const char*> isLess;
+    const std::less<> isLess;
     return !isLess(buffer.data(), object) &&
            isLess(buffer.data(), object + sizeof buffer);
 }

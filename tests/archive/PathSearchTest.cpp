@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <functional>
 #include <stdexcept>
@@ -34,9 +35,9 @@ Numbers numbersThat(const Paths& list,
 
 Numbers numbersWith(const Paths& list, const Texts& texts) {
     return numbersThat(list, [&](const std::string& path) {
-        for (const std::string_view text : texts)
-            if (path.find(text) == std::string::npos) return false;
-        return true;
+        return std::ranges::all_of(texts, [&](std::string_view text) {
+            return path.find(text) != std::string::npos;
+        });
     });
 }
 
