@@ -6,13 +6,7 @@ namespace tessel::archive {
 
 using sixpacks::ByteCursor;
 
-namespace {
-
-void require(bool holds) {
-    if (!holds) throw DamagedFormException();
-}
-
-}  // namespace
+namespace {}  // namespace
 
 // ---- LengthTable ----
 

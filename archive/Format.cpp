@@ -16,10 +16,6 @@ namespace {
 
 constexpr std::uint64_t maxSectionBytes = std::uint64_t{1} << 40;
 
-void require(bool holds) {
-    if (!holds) throw DamagedFormException();
-}
-
 void requireZeros(ByteCursor& cursor, std::size_t count) {
     require(std::ranges::all_of(cursor.take(count),
                                 [](std::uint8_t byte) { return byte == 0; }));
@@ -41,6 +37,10 @@ void packSum(std::vector<std::uint8_t>& out, std::size_t start,
 }
 
 }  // namespace
+
+void require(bool holds) {
+    if (!holds) throw DamagedFormException();
+}
 
 void packUint32(std::uint32_t value, std::vector<std::uint8_t>& out) {
     for (unsigned shift = 0; shift < 32; shift += 8)

@@ -11,6 +11,9 @@
 // decide how stored bits are read. Never change one without a new version.
 namespace tessel::archive {
 
+// Throws DamagedFormException unless this holds of the bytes being read.
+void require(bool holds);
+
 // ---- File ----
 
 inline constexpr std::array<std::uint8_t, 8> fileMagic = {

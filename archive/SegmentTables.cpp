@@ -5,16 +5,13 @@
 
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/CodeTables.hpp"
+#include "archive/Format.hpp"
 #include "packing/ByteCursor.hpp"
 
 namespace tessel::archive {
 namespace {
 
 using sixpacks::ByteCursor;
-
-void require(bool holds) {
-    if (!holds) throw DamagedFormException();
-}
 
 // Reads a count table whose symbols are the next entries of the token list.
 CodePlaces takeCode(ByteCursor& cursor, std::uint32_t& entries,
@@ -53,22 +50,20 @@ SegmentTables::SegmentTables(const SegmentHead& head,
                              std::span<const std::uint8_t> body)
     : tokens_{bytesOf(Section::TokenEntries, head, body),
               bytesOf(Section::TokenText, head, body)} {
-    using Bytes = std::span<const std::uint8_t>;
     const auto in = [&](Section section, auto unpack) {
         inSection(section, head, body, unpack);
     };
     std::uint32_t entries = 0;
-    in(Section::TokenEntries, [&](Bytes) { tokens_.validate(); });
+    in(Section::TokenEntries, [&](auto) { tokens_.validate(); });
     in(Section::TokenCodes,
-       [&](Bytes bytes) { unpackTokenCodes(bytes, entries); });
+       [&](auto bytes) { unpackTokenCodes(bytes, entries); });
     in(Section::FirstTokenCodes,
-       [&](Bytes bytes) { unpackFirstTokenCodes(bytes, entries); });
+       [&](auto bytes) { unpackFirstTokenCodes(bytes, entries); });
     in(Section::TokenEntries,
-       [&](Bytes) { require(entries == tokens_.size()); });
-    in(Section::ReplacedCodes,
-       [&](Bytes bytes) { unpackReplacedCodes(bytes); });
+       [&](auto) { require(entries == tokens_.size()); });
+    in(Section::ReplacedCodes, [&](auto bytes) { unpackReplacedCodes(bytes); });
     in(Section::OperationCodes,
-       [&](Bytes bytes) { unpackOperationCodes(bytes); });
+       [&](auto bytes) { unpackOperationCodes(bytes); });
 }
 
 void SegmentTables::unpackTokenCodes(std::span<const std::uint8_t> section,

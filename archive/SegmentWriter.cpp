@@ -22,16 +22,17 @@ namespace tessel::archive {
 
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
+using ByteVector = std::vector<std::uint8_t>;
 
-Bytes packTables(std::span<const SymbolCode> codes) {
-    Bytes out;
+ByteVector packTables(std::span<const SymbolCode> codes) {
+    ByteVector out;
     for (const SymbolCode& code : codes) code.table().pack(out);
     return out;
 }
 
 // Numbers of so many bits each.
-Bytes packNumbers(const std::vector<std::uint32_t>& numbers, unsigned bits) {
+ByteVector packNumbers(const std::vector<std::uint32_t>& numbers,
+                       unsigned bits) {
     BitWriter out;
     for (const std::uint32_t number : numbers) out.put(number, bits);
     return out.take();
@@ -51,7 +52,7 @@ public:
                    Workers& workers)
         : list_(list), options_(options), workers_(workers) {}
 
-    Bytes build();
+    ByteVector build();
 
 private:
     void report(double share) const {
@@ -62,8 +63,8 @@ private:
     void writeBlocks(const FrontCoder& coder, const FrontCodes& codes,
                      const TokenCoder& tokens, const ParsedList& parsed);
     void addOrder(const FrontCoder& coder);
-    Bytes folderHeads(const FrontCoder& coder,
-                      const std::vector<Blocks>& names) const;
+    ByteVector folderHeads(const FrontCoder& coder,
+                           const std::vector<Blocks>& names) const;
 
     const SegmentList& list_;
     const SegmentOptions& options_;
@@ -72,7 +73,7 @@ private:
     SegmentBody body_;
 };
 
-Bytes SegmentBuilder::build() {
+ByteVector SegmentBuilder::build() {
     const FrontCoder coder(list_, arrange(list_, workers_), workers_);
     head_.order = coder.arrangement().order;
     head_.namesPerBlock = FrontCoder::namesPerBlock;
@@ -95,7 +96,7 @@ Bytes SegmentBuilder::build() {
         body_.add(Section::OperationCodes, packTables(codes.operations));
         body_.add(Section::TokenEntries, tokens.entries());
         body_.add(Section::TokenText,
-                  Bytes(tokens.text().begin(), tokens.text().end()));
+                  ByteVector(tokens.text().begin(), tokens.text().end()));
         report(0.87);
         writeBlocks(coder, codes, tokens, trained.parsed);
     }
@@ -144,12 +145,12 @@ void SegmentBuilder::addOrder(const FrontCoder& coder) {
                   packNumbers(arrangeSorted(list_, workers_).numbers, bits));
 }
 
-Bytes SegmentBuilder::folderHeads(const FrontCoder& coder,
-                                  const std::vector<Blocks>& names) const {
+ByteVector SegmentBuilder::folderHeads(const FrontCoder& coder,
+                                       const std::vector<Blocks>& names) const {
     const std::uint32_t step =
         std::uint32_t{head_.foldersPerBlock} * head_.folderBlocksPerHead;
-    Bytes table;
-    Bytes text;
+    ByteVector table;
+    ByteVector text;
     std::uint32_t head = 0;  // the folder of the next head
     std::uint32_t seen = 0;
     std::uint32_t block = 0;

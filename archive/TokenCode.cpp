@@ -9,10 +9,6 @@ namespace {
 
 constexpr std::size_t maxEntries = std::size_t{1} << 24;
 
-void require(bool holds) {
-    if (!holds) throw DamagedFormException();
-}
-
 }  // namespace
 
 void TokenList::validate() const {

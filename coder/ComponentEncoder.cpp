@@ -9,17 +9,15 @@ namespace tessel {
 
 namespace {
 
-constexpr unsigned bitsPerByte = 8;
-
-// Size of the bit block that holds this many bits.
-std::size_t bitBlockBytes(std::size_t bits) {
-    return bits == 0 ? 0 : bits / bitsPerByte + 2;
-}
-
 // Writes bits to bytes, least significant first. May write seven bytes more
 // than the bits need.
 class BitWriter {
 public:
+    // Size of the block that holds this many bits.
+    static std::size_t blockBytes(std::size_t bits) noexcept {
+        return bits == 0 ? 0 : bits / bitsPerByte + 2;
+    }
+
     explicit BitWriter(std::uint8_t* to) noexcept : out_(to) {}
 
     // Appends the `count` (at most CodeTable::longestInline) low bits; all
@@ -37,6 +35,8 @@ public:
     }
 
 private:
+    static constexpr unsigned bitsPerByte = 8;
+
     void flush() noexcept {
         static_assert(std::endian::native == std::endian::little);
         std::memcpy(out_, &held_, sizeof held_);
@@ -62,7 +62,7 @@ std::size_t ComponentEncoder::bytesFor(const std::u16string& text) const {
         if (!entry.exists()) throw CodeNotFoundException();
         bits += entry.isLong ? code_.codeOf(character).size() : entry.length;
     }
-    return bitBlockBytes(bits);
+    return BitWriter::blockBytes(bits);
 }
 
 void ComponentEncoder::write(const std::u16string& text,

@@ -10,7 +10,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description diffDescription = {
     "diff", "Tell which paths are only in A (-) and only in B (+)",
     "  tessel diff yesterday.tessel today.tessel\n"
     "  tessel diff a.tessel b.tessel | grep -c '^+'"};
@@ -43,7 +43,7 @@ bool writeDifferences(PathSet& before, PathSet& after, ProgressBar& bar,
 
 }  // namespace
 
-DiffCommand::DiffCommand() : Command(description) {
+DiffCommand::DiffCommand() : Command(diffDescription) {
     line().argument("A", before_, CommandLine::Need::Required,
                     "An archive, or - for standard input");
     line().argument("B", after_, CommandLine::Need::Required,

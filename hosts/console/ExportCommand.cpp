@@ -13,7 +13,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description exportDescription = {
     "export", "Write an archive's paths as a store, which can grow",
     "  tessel export files.tessel -o files.store\n"
     "  tessel pack files.store -o files.tessel   the way back"};
@@ -55,7 +55,7 @@ struct CountedPaths {
 
 }  // namespace
 
-ExportCommand::ExportCommand() : Command(description) {
+ExportCommand::ExportCommand() : Command(exportDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().value("-o", "STORE", store_, CommandLine::Need::Required,

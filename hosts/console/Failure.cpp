@@ -14,7 +14,7 @@ namespace tessel::console {
 namespace {
 
 // A sentence as part of a line: without its full stop.
-std::string asPart(std::string sentence) {
+std::string withoutFullStop(std::string sentence) {
     while (!sentence.empty() &&
            (sentence.back() == '.' || sentence.back() == '\n'))
         sentence.pop_back();
@@ -29,14 +29,14 @@ Failure describeCurrentException() {
     try {
         throw;
     } catch (const ConsoleException& failure) {
-        return {failure.status(), asPart(failure.what())};
+        return {failure.status(), withoutFullStop(failure.what())};
     } catch (const std::system_error& failure) {
-        return {ExitStatus::System, asPart(failure.what())};
+        return {ExitStatus::System, withoutFullStop(failure.what())};
     } catch (const std::bad_alloc&) {
         return {ExitStatus::System,
                 "memory is used up; close other programs or raise the limit"};
     } catch (const std::exception& failure) {
-        return {ExitStatus::System, asPart(failure.what())};
+        return {ExitStatus::System, withoutFullStop(failure.what())};
     }
 }
 
@@ -48,7 +48,7 @@ void rethrowNaming(const std::string& file) {
             ExitStatus::Damaged,
             fmt::format("{}: {}; `tessel verify` lists the damage, `tessel "
                         "list --salvage` reads what is left",
-                        file, asPart(damage.what())));
+                        file, withoutFullStop(damage.what())));
     } catch (const UnsupportedArchiveVersionException& newer) {
         throw ConsoleException(
             ExitStatus::BadInput,

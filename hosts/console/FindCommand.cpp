@@ -11,7 +11,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description findDescription = {
     "find", "Write the paths that contain every TEXT",
     "  tessel find files.tessel stdio.h\n"
     "  tessel find files.tessel python3 test --count\n"
@@ -30,7 +30,7 @@ std::vector<std::string_view> viewsOf(const std::vector<std::string>& texts) {
 
 }  // namespace
 
-FindCommand::FindCommand() : Command(description) {
+FindCommand::FindCommand() : Command(findDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().arguments("TEXT", patterns_, CommandLine::Need::Required,

@@ -15,7 +15,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description getDescription = {
     "get", "Write the paths with these numbers, in the order asked",
     "  tessel get files.tessel 0           the first path\n"
     "  tessel get files.tessel -1          the last one\n"
@@ -34,7 +34,7 @@ std::string outOfRange(const std::string& where, std::uint64_t size) {
 
 }  // namespace
 
-GetCommand::GetCommand() : Command(description) {
+GetCommand::GetCommand() : Command(getDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().arguments("N", words_, CommandLine::Need::Optional,

@@ -10,7 +10,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description infoDescription = {
     "info", "Tell what is in an archive and what takes how many bytes",
     "  tessel info files.tessel\n"
     "  tessel info files.tessel --json | jq .bytesPerPath\n"
@@ -18,7 +18,7 @@ constexpr Command::Description description = {
 
 }  // namespace
 
-InfoCommand::InfoCommand() : Command(description) {
+InfoCommand::InfoCommand() : Command(infoDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().flag("--json", json_, "Write JSON instead of a table");

@@ -11,7 +11,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description listDescription = {
     "list", "Write all paths of an archive, in the order of their numbers",
     "  tessel list files.tessel | less\n"
     "  tessel list files.tessel --folder usr/share/doc\n"
@@ -40,7 +40,7 @@ std::string lossText(const SalvageReport& report) {
 
 }  // namespace
 
-ListCommand::ListCommand() : Command(description) {
+ListCommand::ListCommand() : Command(listDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().flag("-0", nul_, "End each path with NUL instead of newline");

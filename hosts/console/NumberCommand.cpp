@@ -12,7 +12,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description numberDescription = {
     "number", "Write the number of each path, or ? if it is not there",
     "  tessel number files.tessel usr/bin/env\n"
     "  tessel number files.tessel - < some-paths.txt\n"
@@ -20,7 +20,7 @@ constexpr Command::Description description = {
 
 }  // namespace
 
-NumberCommand::NumberCommand() : Command(description) {
+NumberCommand::NumberCommand() : Command(numberDescription) {
     line().argument("FILE", file_, CommandLine::Need::Required,
                     "The archive, or - for standard input");
     line().arguments("PATH", paths_, CommandLine::Need::Required,

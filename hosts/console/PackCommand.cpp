@@ -18,7 +18,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description packDescription = {
     "pack", "Pack a list of paths into an archive",
     "  find /usr | tessel pack -o usr.tessel\n"
     "  find . -print0 | tessel pack -0 -o here.tessel\n"
@@ -125,7 +125,7 @@ private:
     ArchiveWriter writer_;
 };
 
-PackCommand::PackCommand() : Command(description) {
+PackCommand::PackCommand() : Command(packDescription) {
     line().argument("LIST", list_, CommandLine::Need::Optional,
                     "The list, - for standard input (default); paths end with "
                     "newline. A saved store or an archive is a list, too");

@@ -13,7 +13,7 @@ namespace tessel::console {
 
 namespace {
 
-constexpr Command::Description description = {
+constexpr Command::Description verifyDescription = {
     "verify", "Read archives completely and tell what is damaged",
     "  tessel verify files.tessel\n"
     "  tessel verify -q *.tessel && echo all are intact"};
@@ -27,7 +27,7 @@ std::string textOf(const ArchiveDamage& damage) {
 
 }  // namespace
 
-VerifyCommand::VerifyCommand() : Command(description) {
+VerifyCommand::VerifyCommand() : Command(verifyDescription) {
     line().arguments("FILE", files_, CommandLine::Need::Required,
                      "Archives, or - for standard input");
     addThreads();

@@ -17,14 +17,9 @@ namespace archives {
 using Paths = std::vector<std::string>;
 using Bytes = std::vector<std::uint8_t>;
 
-inline Bytes archiveOf(const Paths& paths,
-                       const tessel::ArchiveOptions& options = {}) {
-    Bytes bytes;
-    tessel::ArchiveWriter writer(bytes, options);
-    writer.addAll(paths);
-    writer.finish();
-    return bytes;
-}
+// The bytes of a list's archive. A list that comes again with the same options
+// is not packed again: many tests share theirs.
+Bytes archiveOf(const Paths& paths, const tessel::ArchiveOptions& options = {});
 
 // Options for segments of so many paths, on one thread.
 inline tessel::ArchiveOptions segmentsOf(std::uint64_t paths) {

@@ -17,24 +17,24 @@ std::uint64_t bitByBit(const std::uint8_t* stream, unsigned bit,
     return value;
 }
 
-constexpr std::array<std::uint8_t, 12> bytes = {
+constexpr std::array<std::uint8_t, 12> sampleBytes = {
     0x12, 0x34, 0x56, 0x78, 0x9A, 0xBC, 0xDE, 0xF0, 0x0F, 0xED, 0xCB, 0xA9};
 
 TEST(BitLoad, LittleEndianAtAnyAddress) {
-    EXPECT_EQ(loadLittle<std::uint16_t>(&bytes[1]), 0x5634);
-    EXPECT_EQ(loadLittle<std::uint32_t>(&bytes[3]), 0xDEBC9A78U);
-    EXPECT_EQ(loadLittle<std::uint64_t>(&bytes[1]), 0x0FF0DEBC9A785634U);
+    EXPECT_EQ(loadLittle<std::uint16_t>(&sampleBytes[1]), 0x5634);
+    EXPECT_EQ(loadLittle<std::uint32_t>(&sampleBytes[3]), 0xDEBC9A78U);
+    EXPECT_EQ(loadLittle<std::uint64_t>(&sampleBytes[1]), 0x0FF0DEBC9A785634U);
 }
 
 TEST(BitLoad, StartsWithTheWantedBit) {
     for (unsigned bit = 0; bit < 32; ++bit)
-        EXPECT_EQ(loadBits(bytes.data(), bit) >> (64 - bitsPerLoad),
-                  bitByBit(bytes.data(), bit, bitsPerLoad))
+        EXPECT_EQ(loadBits(sampleBytes.data(), bit) >> (64 - bitsPerLoad),
+                  bitByBit(sampleBytes.data(), bit, bitsPerLoad))
             << bit;
 }
 
 TEST(BitLoad, FillsUpWithZeros) {
-    EXPECT_EQ(loadBits(bytes.data(), 7) & 0x7F, 0U);
+    EXPECT_EQ(loadBits(sampleBytes.data(), 7) & 0x7F, 0U);
 }
 
 }  // namespace

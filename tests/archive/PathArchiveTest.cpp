@@ -26,9 +26,10 @@ static_assert(std::ranges::input_range<PathArchive>);
 
 // ---- A list and its archive ----
 
+// Names are all that is made of the cases where tests are only listed.
 struct Case {
     std::string name;
-    Paths paths;
+    Paths (*paths)();
     ArchiveOptions options;
 };
 
@@ -40,38 +41,52 @@ ArchiveOptions withIndex(ArchiveOptions options) {
 // Lets a failure show the list's name instead of its bytes.
 void PrintTo(const Case& list, std::ostream* out) { *out << list.name; }
 
-std::vector<Case> cases() {
-    using archives::segmentsOf;
-    const Paths sorted = archives::sortedPaths(3000);
-    Paths reversed(sorted.rbegin(), sorted.rend());
-    Paths one_folder;
+Paths sorted() { return archives::sortedPaths(3000); }
+
+Paths nastyShuffled() { return archives::shuffled(archives::nastyPaths()); }
+
+Paths reversed() {
+    Paths paths = sorted();
+    std::ranges::reverse(paths);
+    return paths;
+}
+
+Paths shuffled() { return archives::shuffled(sorted()); }
+
+Paths oneFolder() {
+    Paths paths;
     for (unsigned i = 0; i < 2000; ++i)
-        one_folder.push_back("one/" + std::to_string(i * 7919 % 2000));
+        paths.push_back("one/" + std::to_string(i * 7919 % 2000));
+    return paths;
+}
+
+std::vector<Case> cases() {
+    using archives::nastyPaths;
+    using archives::segmentsOf;
     return {
-        {"Empty", {}, segmentsOf(100)},
-        {"OnePath", {"a/b"}, segmentsOf(100)},
-        {"Equal", Paths(1000, "the/same"), segmentsOf(8000)},
+        {"Empty", [] { return Paths(); }, segmentsOf(100)},
+        {"OnePath", [] { return Paths{"a/b"}; }, segmentsOf(100)},
+        {"Equal", [] { return Paths(1000, "the/same"); }, segmentsOf(8000)},
         {"Sorted", sorted, segmentsOf(8000)},
         {"SortedSegments", sorted, segmentsOf(700)},
         {"Reversed", reversed, segmentsOf(8000)},
-        {"Shuffled", archives::shuffled(sorted), segmentsOf(8000)},
-        {"ShuffledIndex", archives::shuffled(sorted),
-         withIndex(segmentsOf(8000))},
-        {"ShuffledSegments", archives::shuffled(sorted), segmentsOf(501)},
-        {"FolderRuns", archives::inFolderRuns(3000), segmentsOf(8000)},
-        {"OneFolder", one_folder, segmentsOf(8000)},
-        {"Nasty", archives::nastyPaths(), segmentsOf(8000)},
-        {"NastySegments", archives::nastyPaths(), segmentsOf(64)},
-        {"NastyShuffled", archives::shuffled(archives::nastyPaths()),
-         withIndex(segmentsOf(300))},
+        {"Shuffled", shuffled, segmentsOf(8000)},
+        {"ShuffledIndex", shuffled, withIndex(segmentsOf(8000))},
+        {"ShuffledSegments", shuffled, segmentsOf(501)},
+        {"FolderRuns", [] { return archives::inFolderRuns(3000); },
+         segmentsOf(8000)},
+        {"OneFolder", oneFolder, segmentsOf(8000)},
+        {"Nasty", nastyPaths, segmentsOf(8000)},
+        {"NastySegments", nastyPaths, segmentsOf(64)},
+        {"NastyShuffled", nastyShuffled, withIndex(segmentsOf(300))},
     };
 }
 
 class PathArchiveOf : public testing::TestWithParam<Case> {
 protected:
-    const Paths& paths_ = GetParam().paths;
+    const Paths paths_ = GetParam().paths();
     PathArchive archive_ =
-        PathArchive::own(archiveOf(GetParam().paths, GetParam().options));
+        PathArchive::own(archiveOf(paths_, GetParam().options));
 
     // Numbers of the paths for which `holds`.
     template <class Predicate>

@@ -7,7 +7,7 @@
 namespace tessel::archive {
 namespace {
 
-SegmentList listOf(const std::vector<std::string>& paths) {
+SegmentList segmentListOf(const std::vector<std::string>& paths) {
     SegmentList list;
     for (const std::string& path : paths) list.add(SplitPath::of(path));
     return list;
@@ -32,7 +32,7 @@ TEST(SegmentListTest, SplitPathsCompareLikeWholeOnes) {
 }
 
 TEST(SegmentListTest, KeepsFoldersOnceAndNamesInOrder) {
-    const SegmentList list = listOf({"a/x", "a/yy", "b", "a/", "a/x"});
+    const SegmentList list = segmentListOf({"a/x", "a/yy", "b", "a/", "a/x"});
     ASSERT_EQ(list.size(), 5U);
     EXPECT_EQ(list.folders().size(), 2U);
     std::string all;
@@ -47,15 +47,15 @@ TEST(SegmentListTest, KeepsFoldersOnceAndNamesInOrder) {
 }
 
 TEST(SegmentListTest, KnowsWhetherItIsSorted) {
-    EXPECT_TRUE(listOf({}).sorted());
-    EXPECT_TRUE(listOf({"a", "a", "a/b", "a/b", "a0"}).sorted());
-    EXPECT_FALSE(listOf({"a/b", "a/a"}).sorted());
-    EXPECT_FALSE(listOf({"a/b", "a"}).sorted());
-    EXPECT_FALSE(listOf({"a0", "a/b", "b"}).sorted());
+    EXPECT_TRUE(segmentListOf({}).sorted());
+    EXPECT_TRUE(segmentListOf({"a", "a", "a/b", "a/b", "a0"}).sorted());
+    EXPECT_FALSE(segmentListOf({"a/b", "a/a"}).sorted());
+    EXPECT_FALSE(segmentListOf({"a/b", "a"}).sorted());
+    EXPECT_FALSE(segmentListOf({"a0", "a/b", "b"}).sorted());
 }
 
 TEST(SegmentListTest, ClearStartsAnew) {
-    SegmentList list = listOf({"b/x", "a/x"});
+    SegmentList list = segmentListOf({"b/x", "a/x"});
     list.clear();
     EXPECT_EQ(list.size(), 0U);
     EXPECT_EQ(list.textBytes(), 0U);

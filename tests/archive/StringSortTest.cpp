@@ -10,7 +10,7 @@
 namespace tessel::archive {
 namespace {
 
-void expectSorted(const std::vector<std::string>& texts) {
+void expectTextsSorted(const std::vector<std::string>& texts) {
     std::vector<StringItem> items(texts.size());
     for (std::uint32_t i = 0; i < items.size(); ++i)
         items[i] = {texts[i], 0, i};
@@ -26,9 +26,9 @@ void expectSorted(const std::vector<std::string>& texts) {
 }
 
 TEST(StringSortTest, SortsFewStrings) {
-    expectSorted({});
-    expectSorted({"one"});
-    expectSorted({"b", "a", "", "b", "ab", "\xFF", "\x01"});
+    expectTextsSorted({});
+    expectTextsSorted({"one"});
+    expectTextsSorted({"b", "a", "", "b", "ab", "\xFF", "\x01"});
 }
 
 TEST(StringSortTest, SortsManyWithSharedPrefixes) {
@@ -40,20 +40,21 @@ TEST(StringSortTest, SortsManyWithSharedPrefixes) {
         for (std::size_t i = random() % 12; i > 0; --i)
             text += static_cast<char>(random() % 2 == 0 ? 'a' : 0xE9);
     }
-    expectSorted(texts);
+    expectTextsSorted(texts);
 }
 
 TEST(StringSortTest, EqualStringsStayInOrder) {
-    expectSorted(std::vector<std::string>(1000, "the same, longer than eight"));
-    expectSorted(std::vector<std::string>(1000, "eight by"));
-    expectSorted(std::vector<std::string>(1000, ""));
+    expectTextsSorted(
+        std::vector<std::string>(1000, "the same, longer than eight"));
+    expectTextsSorted(std::vector<std::string>(1000, "eight by"));
+    expectTextsSorted(std::vector<std::string>(1000, ""));
 }
 
 TEST(StringSortTest, LongStringsNeedNoStack) {
     std::vector<std::string> texts(40, std::string(1 << 16, 'z'));
     for (std::size_t i = 0; i < texts.size(); ++i)
         texts[i] += std::to_string(i * 7 % 40);
-    expectSorted(texts);
+    expectTextsSorted(texts);
 }
 
 }  // namespace

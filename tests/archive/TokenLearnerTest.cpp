@@ -8,10 +8,10 @@
 namespace tessel::archive {
 namespace {
 
-using Texts = std::vector<std::string>;
+using Strings = std::vector<std::string>;
 
 // Pieces of names; a zero byte follows each text by itself.
-std::vector<Piece> piecesOf(const Texts& texts) {
+std::vector<Piece> piecesOf(const Strings& texts) {
     std::vector<Piece> pieces;
     for (const std::string& text : texts)
         pieces.push_back({text.c_str(),
@@ -20,7 +20,7 @@ std::vector<Piece> piecesOf(const Texts& texts) {
     return pieces;
 }
 
-LearnedTokens learned(const Texts& texts, unsigned threads = 1) {
+LearnedTokens learned(const Strings& texts, unsigned threads = 1) {
     Workers workers(threads, {});
     return learnTokens(piecesOf(texts), 3, workers);
 }
@@ -29,8 +29,8 @@ bool contains(const LearnedTokens& learned, const std::string& token) {
     return std::ranges::find(learned.tokens, token) != learned.tokens.end();
 }
 
-Texts manyNames() {
-    Texts texts;
+Strings manyNames() {
+    Strings texts;
     for (int i = 0; i < 300; ++i)
         texts.push_back("report-" + std::to_string(i) + ".html");
     return texts;
@@ -51,8 +51,8 @@ TEST(TokenLearnerTest, FrequentStringsBecomeTokens) {
 }
 
 TEST(TokenLearnerTest, TokensAreDistinctAndShort) {
-    const LearnedTokens result = learned(Texts(50, std::string(500, 'a')));
-    Texts sorted = result.tokens;
+    const LearnedTokens result = learned(Strings(50, std::string(500, 'a')));
+    Strings sorted = result.tokens;
     std::ranges::sort(sorted);
     EXPECT_EQ(std::ranges::adjacent_find(sorted), sorted.end());
     for (const std::string& token : sorted)
@@ -61,7 +61,7 @@ TEST(TokenLearnerTest, TokensAreDistinctAndShort) {
 
 // The learner's own cut covers every byte of the sample.
 TEST(TokenLearnerTest, UsesCoverTheSample) {
-    const Texts texts = manyNames();
+    const Strings texts = manyNames();
     const LearnedTokens result = learned(texts);
     std::size_t bytes = 0;
     for (std::size_t t = 0; t < result.tokens.size(); ++t)
@@ -84,7 +84,7 @@ TEST(TokenLearnerTest, UsesKnowTheContext) {
 
 // Large enough for both stages, on one thread and on several.
 TEST(TokenLearnerTest, ThreadsDoNotChangeTheResult) {
-    Texts texts;
+    Strings texts;
     for (int i = 0; i < 60'000; ++i)
         texts.push_back("file-" + std::to_string(i * 37 % 1000) + "-of-" +
                         std::to_string(i % 77) + ".cpp");

@@ -6,16 +6,12 @@
 #include <vector>
 
 #include "paths/Batches.hpp"
+#include "tests/paths/Lists.hpp"
 
 namespace {
 
+using support::listOf;
 using namespace tessel::paths;
-
-PathList listOf(const std::vector<std::string>& paths) {
-    PathList list;
-    for (const std::string& path : paths) list.append(path);
-    return list;
-}
 
 TEST(Batches, ConsecutiveFilesOfAFolderAreOneEntry) {
     const PathList list =

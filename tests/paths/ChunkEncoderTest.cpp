@@ -8,20 +8,16 @@
 #include "coder/HuffmanPathTree.hpp"
 #include "paths/CharacterCounter.hpp"
 #include "paths/ChunkEncoder.hpp"
+#include "tests/paths/Lists.hpp"
 
 namespace {
 
+using support::listOf;
 using namespace tessel::paths;
 using tessel::ComponentList;
 using tessel::ComponentView;
 using tessel::HuffmanPathTree;
 using Texts = std::vector<std::vector<std::u16string>>;
-
-PathList listOf(const std::vector<std::string>& paths) {
-    PathList list;
-    for (const std::string& path : paths) list.append(path);
-    return list;
-}
 
 // A coder for all characters of the paths.
 std::unique_ptr<HuffmanPathTree> coderOf(const PathList& paths) {

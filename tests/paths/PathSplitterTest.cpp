@@ -15,20 +15,16 @@
 #include "paths/Batches.hpp"
 #include "paths/PathSplitter.hpp"
 #include "paths/PathText.hpp"
+#include "tests/paths/Lists.hpp"
 
 namespace {
 
+using support::listOf;
 using namespace tessel::paths;
 using tessel::Component;
 using tessel::Components;
 using tessel::HuffmanPathTree;
 using Strings = std::vector<std::string>;
-
-PathList listOf(const Strings& paths) {
-    PathList list;
-    for (const std::string& path : paths) list.append(path);
-    return list;
-}
 
 // The components of each path of the list, file last, with '|' between them
 // and '.' for the root of a path that has none.

@@ -12,7 +12,7 @@ namespace {
 using namespace tessel::paths;
 
 // The segments of a path, the file's last, with '|' between them.
-std::string cutOf(std::string_view path) {
+std::string segmentsOf(std::string_view path) {
     const std::size_t cut = fileStartOf(path);
     std::string all;
     forEachSegment(path.substr(0, cut), [&](std::string_view segment) {
@@ -22,14 +22,14 @@ std::string cutOf(std::string_view path) {
 }
 
 TEST(Segments, FoldersKeepTheirSlashes) {
-    EXPECT_EQ(cutOf("/a/b"), "/|a/|b");
-    EXPECT_EQ(cutOf("a/b/c"), "a/|b/|c");
-    EXPECT_EQ(cutOf("a//b"), "a//|b");
-    EXPECT_EQ(cutOf("///a"), "///|a");
-    EXPECT_EQ(cutOf("a/"), "a/|");
-    EXPECT_EQ(cutOf("a//"), "a//|");
-    EXPECT_EQ(cutOf("/"), "/|");
-    EXPECT_EQ(cutOf("name"), "name");
+    EXPECT_EQ(segmentsOf("/a/b"), "/|a/|b");
+    EXPECT_EQ(segmentsOf("a/b/c"), "a/|b/|c");
+    EXPECT_EQ(segmentsOf("a//b"), "a//|b");
+    EXPECT_EQ(segmentsOf("///a"), "///|a");
+    EXPECT_EQ(segmentsOf("a/"), "a/|");
+    EXPECT_EQ(segmentsOf("a//"), "a//|");
+    EXPECT_EQ(segmentsOf("/"), "/|");
+    EXPECT_EQ(segmentsOf("name"), "name");
 }
 
 TEST(Segments, NamesThatAreNotThereAddNothing) {

@@ -19,8 +19,6 @@ using tessel::PathTrack;
 using Names = std::vector<std::string>;
 using Positions = std::vector<std::uint64_t>;
 
-constexpr std::uint64_t allOnes = BPathTree::allOnes;
-
 Names follow(const BPathTree& tree, const PathTrack& track) {
     Components out;
     tree.traversePath(track, out);
@@ -94,8 +92,8 @@ TEST(PathTreeLookup, ATrackThatLeadsOutsideIsOutOfRange) {
     addWhole(tree, {"a", "b"});
     Components out = components({"before"});
     for (const PathTrack& track :
-         {PathTrack{1}, PathTrack{0, 1}, PathTrack{0, 0, 0}, PathTrack{allOnes},
-          PathTrack{0, allOnes}})
+         {PathTrack{1}, PathTrack{0, 1}, PathTrack{0, 0, 0},
+          PathTrack{BPathTree::allOnes}, PathTrack{0, BPathTree::allOnes}})
         EXPECT_THROW(tree.traversePath(track, out), std::out_of_range);
     EXPECT_EQ(textsOf(out), Names{"before"});
 }
@@ -210,13 +208,13 @@ TEST(PathTreeLookup, PositionsThatLeadOutsideAreOutOfRange) {
     addBatch(tree, {"a"}, {"f", "g"});
     const PathTrack folder = {0};
     expectRefused(tree, {1}, {folder}, {{1}});
-    expectRefused(tree, {allOnes}, {folder}, {{1}});
+    expectRefused(tree, {BPathTree::allOnes}, {folder}, {{1}});
     expectRefused(tree, {0}, {{1}}, {{}});
     expectRefused(tree, {0}, {{0, 2}}, {{}});
     expectRefused(tree, {0}, {{0, 0, 0}}, {{}});
     expectRefused(tree, {0}, {folder}, {{0}});
     expectRefused(tree, {0}, {folder}, {{3}});
-    expectRefused(tree, {0}, {folder}, {{allOnes}});
+    expectRefused(tree, {0}, {folder}, {{BPathTree::allOnes}});
     expectRefused(tree, {0, 0}, {folder}, {{1}, {1, 3}});
     expectRefused(tree, {0, 0}, {folder}, {{1}});
     expectRefused(BPathTree(), {0}, {{}}, {{}});

@@ -24,18 +24,18 @@ namespace {
 
 using support::littleEndian;
 using tessel::HashIndex;
-using Name = support::Bytes;
-using Names = std::vector<Name>;
+using ByteName = support::Bytes;
+using ByteNames = std::vector<ByteName>;
 
-std::size_t findName(const HashIndex& index, const Names& names,
-                     const Name& name) {
+std::size_t findName(const HashIndex& index, const ByteNames& names,
+                     const ByteName& name) {
     return index.find(HashIndex::hashOf(name), [&](std::size_t position) {
         return tessel::sameComponent(names[position], name);
     });
 }
 
 TEST(HashIndex, FindsWhatWasInsertedAndNothingElse) {
-    Names names;
+    ByteNames names;
     HashIndex index;
     EXPECT_EQ(findName(index, names, {1}), HashIndex::notFound);
     for (std::size_t i = 0; i < 1000; ++i) {
@@ -84,8 +84,8 @@ TEST(HashIndex, RoomThatWasReservedIsUsed) {
 TEST(HashIndex, AHashIsTheSameWithinAProcess) {
     std::set<std::uint32_t> hashes;
     for (std::size_t length = 0; length < 600; ++length) {
-        const Name name(length, 0x5A);
-        const Name copy(length, 0x5A);
+        const ByteName name(length, 0x5A);
+        const ByteName copy(length, 0x5A);
         EXPECT_EQ(HashIndex::hashOf(name), HashIndex::hashOf(copy));
         hashes.insert(HashIndex::hashOf(name));
     }
@@ -136,7 +136,7 @@ std::uint64_t undoShiftXor(std::uint64_t value, unsigned shift) {
 
 // The standard library's hash is MurmurHash64A with a fixed seed, whose steps
 // can be undone: the second word of a name takes back the first.
-Name collidingByMurmur(std::uint64_t number) {
+ByteName collidingByMurmur(std::uint64_t number) {
     constexpr std::uint64_t factor = 0xC6A4A7935BD1E995;
     constexpr std::uint64_t start = 0xC70F6907 ^ (16 * factor);
     std::uint64_t mixed = number * factor;
@@ -149,7 +149,7 @@ Name collidingByMurmur(std::uint64_t number) {
 
 // XXH3 without a seed, for names of eight bytes: what mixes them can be
 // undone, too, and starts from a hash whose low half is always 0.
-Name collidingByXxh3(std::uint64_t number) {
+ByteName collidingByXxh3(std::uint64_t number) {
     constexpr std::uint64_t factor = 0x9FB21C651E98DF25;
     constexpr std::uint64_t secret = 0x1CAD21F72C81017C ^ 0xDB979083E96DD4DE;
     std::uint64_t hash = undoShiftXor(number << 32, 28) * inverseOf(factor);
@@ -188,10 +188,10 @@ public:
             }
         }
     }
-    Name operator()(std::uint64_t number) const {
-        Name name;
+    ByteName operator()(std::uint64_t number) const {
+        ByteName name;
         for (const auto& pair : pairs_) {
-            const Name block =
+            const ByteName block =
                 littleEndian(number % 2 == 0 ? pair.first : pair.second, 4);
             name.insert(name.end(), block.begin(), block.end());
             number /= 2;
@@ -204,7 +204,7 @@ private:
 };
 
 // A random name for comparison.
-Name randomName(std::uint64_t number) {
+ByteName randomName(std::uint64_t number) {
     return littleEndian((number + 1) * 0x9E3779B97F4A7C15, 8);
 }
 
@@ -237,7 +237,7 @@ TEST(HashIndex, NamesThatCollideUnderTheStandardLibrarysHash) {
     std::set<std::size_t> hashes;
     std::set<std::string> names;
     for (std::uint64_t i = 0; i < 1000; ++i) {
-        const Name name = collidingByMurmur(i);
+        const ByteName name = collidingByMurmur(i);
         hashes.insert(std::hash<std::string_view>{}(
             {reinterpret_cast<const char*>(name.data()), name.size()}));
         names.insert(std::string(name.begin(), name.end()));
@@ -252,7 +252,7 @@ TEST(HashIndex, NamesThatCollideUnderFnv) {
     std::set<std::uint32_t> hashes;
     std::set<std::string> names;
     for (std::uint64_t i = 0; i < 1000; ++i) {
-        const Name name = nameOf(i * 131);
+        const ByteName name = nameOf(i * 131);
         std::uint64_t hash = 0xCBF29CE484222325;
         for (const std::uint8_t byte : name)
             hash = (hash ^ byte) * 0x100000001B3;
@@ -268,7 +268,7 @@ TEST(HashIndex, NamesThatCollideUnderXxh3WithoutASeed) {
     std::set<std::uint32_t> hashes;
     std::set<std::string> names;
     for (std::uint64_t i = 0; i < 1000; ++i) {
-        const Name name = collidingByXxh3(i);
+        const ByteName name = collidingByXxh3(i);
         hashes.insert(
             static_cast<std::uint32_t>(XXH3_64bits(name.data(), name.size())));
         names.insert(std::string(name.begin(), name.end()));

@@ -10,11 +10,11 @@ namespace tessel::embedded {
 
 namespace {
 
-using Texts = InlineArray<char16_t>;
+using TextArray = InlineArray<char16_t>;
 using Numbers = ContainerArray<std::vector<double>>;
 
-Texts* textOf(std::u16string_view text) {
-    return Texts::make(ValueClass::Char, Shape(1, text.size()), text);
+TextArray* textOf(std::u16string_view text) {
+    return TextArray::make(ValueClass::Char, Shape(1, text.size()), text);
 }
 
 // Counts how many of its kind there are.
@@ -58,7 +58,7 @@ TEST(ShapeTest, CountsThatOverflowAreRefused) {
 }
 
 TEST(ArrayTest, NewArrayHasOneReference) {
-    const Texts* const array = textOf(u"abc");
+    const TextArray* const array = textOf(u"abc");
     EXPECT_TRUE(array->isUnique());
     array->addReference();
     EXPECT_FALSE(array->isUnique());
@@ -83,7 +83,7 @@ TEST(ArrayTest, LastReferenceDestroysTheElements) {
 }
 
 TEST(ArrayTest, CloneIsEqualAndSeparate) {
-    Texts* const array = textOf(u"abc");
+    TextArray* const array = textOf(u"abc");
     Array* const copy = array->clone();
     EXPECT_TRUE(array->hasElementsOf(*copy));
     EXPECT_EQ(copy->shape(), array->shape());
@@ -105,12 +105,13 @@ TEST(ArrayTest, ContainerIsClonedWithItsContent) {
 }
 
 TEST(ArrayTest, MoreThanCanBeAddressedIsRefused) {
-    EXPECT_THROW(Texts::make(ValueClass::Char, Shape(std::size_t{1} << 47U, 1)),
-                 std::bad_alloc);
+    EXPECT_THROW(
+        TextArray::make(ValueClass::Char, Shape(std::size_t{1} << 47U, 1)),
+        std::bad_alloc);
 }
 
 TEST(ArrayTest, ReferencesAreCountedOnManyThreads) {
-    Texts* const array = textOf(u"abc");
+    TextArray* const array = textOf(u"abc");
     const auto share = [array] {
         for (int i = 0; i < 10'000; ++i) {
             array->addReference();
