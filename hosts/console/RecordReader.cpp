@@ -25,8 +25,8 @@ std::optional<std::string_view> RecordReader::next() {
         if (end != std::string::npos) {
             ++line_;
             scanned_ = end + 1;
-            return std::string_view(block_).substr(
-                std::exchange(start_, scanned_), end - start_);
+            const std::size_t begin = std::exchange(start_, scanned_);
+            return std::string_view(block_).substr(begin, end - begin);
         }
         scanned_ = block_.size();
         if (scanned_ - start_ > maxRecord) failTooLong();
