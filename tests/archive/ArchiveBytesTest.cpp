@@ -15,28 +15,28 @@ namespace {
 
 using Bytes = std::vector<std::uint8_t>;
 
-const Bytes sample = {1, 0, 255, 7};
+const Bytes fileSample = {1, 0, 255, 7};
 
 Bytes copyOf(const ArchiveBytes& bytes) {
     return {bytes.bytes().begin(), bytes.bytes().end()};
 }
 
 TEST(ArchiveBytes, KeepsOwnedBytes) {
-    Bytes given = sample;
+    Bytes given = fileSample;
     const ArchiveBytes first{std::move(given)};
-    EXPECT_EQ(copyOf(first), sample);
+    EXPECT_EQ(copyOf(first), fileSample);
 }
 
 TEST(ArchiveBytes, StaysValidWhenMoved) {
-    ArchiveBytes first{Bytes(sample)};
+    ArchiveBytes first{Bytes(fileSample)};
     const ArchiveBytes second(std::move(first));
-    EXPECT_EQ(copyOf(second), sample);
+    EXPECT_EQ(copyOf(second), fileSample);
 }
 
 TEST(ArchiveBytes, BorrowsWithoutACopy) {
-    const ArchiveBytes bytes{std::span(sample)};
-    EXPECT_EQ(bytes.bytes().data(), sample.data());
-    EXPECT_EQ(bytes.bytes().size(), sample.size());
+    const ArchiveBytes bytes{std::span(fileSample)};
+    EXPECT_EQ(bytes.bytes().data(), fileSample.data());
+    EXPECT_EQ(bytes.bytes().size(), fileSample.size());
 }
 
 TEST(ArchiveBytes, ShowsAMappedFile) {

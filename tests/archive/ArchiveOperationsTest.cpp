@@ -15,10 +15,12 @@
 #include "archive/ArchiveWriter.hpp"
 #include "archive/PathArchive.hpp"
 #include "tests/archive/ArchiveLists.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace {
 
 using support::Paths;
+using support::shareOf;
 using tessel::ArchiveIndex;
 using tessel::ArchiveLevel;
 using tessel::ArchiveOptions;
@@ -223,7 +225,7 @@ TEST(ArchiveOperations, AnswerTheSameOnEveryLevel) {
 
 TEST(ArchiveOperations, AnswerAsAPlainVectorDoesOnRandomLists) {
     std::mt19937 random(20260101);
-    for (int round = 0; round < 60; ++round) {
+    for (std::size_t round = 0; round < shareOf(60); ++round) {
         SCOPED_TRACE(round);
         const Paths paths = support::randomList(random, 400);
         ArchiveOptions options;
@@ -235,9 +237,9 @@ TEST(ArchiveOperations, AnswerAsAPlainVectorDoesOnRandomLists) {
 }
 
 TEST(ArchiveOperations, BytesDoNotDependOnThreads) {
-    const Paths paths = support::fileList(60'000, 5);
+    const Paths paths = support::fileList(shareOf(60'000), 5);
     ArchiveOptions options;
-    options.pathsPerSegment = 25'000;
+    options.pathsPerSegment = shareOf(25'000);
     options.threads = 1;
     const auto expected = support::archiveOf(paths, options);
     for (const unsigned threads : {2U, 3U, 7U, 0U}) {
@@ -248,7 +250,7 @@ TEST(ArchiveOperations, BytesDoNotDependOnThreads) {
 
 TEST(ArchiveOperations, AppendingInSlicesGivesTheSamePaths) {
     std::mt19937 random(3);
-    for (int round = 0; round < 20; ++round) {
+    for (std::size_t round = 0; round < shareOf(20); ++round) {
         SCOPED_TRACE(round);
         Paths paths;
         std::vector<std::uint8_t> bytes = support::archiveOf({});

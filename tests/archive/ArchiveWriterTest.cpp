@@ -10,11 +10,13 @@
 #include "archive/ArchiveReader.hpp"
 #include "archive/ArchiveWriter.hpp"
 #include "archive/Format.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace tessel {
 namespace {
 
 namespace fs = std::filesystem;
+using support::shareOf;
 using Bytes = std::vector<std::uint8_t>;
 using Paths = std::vector<std::string>;
 
@@ -255,7 +257,8 @@ TEST(ArchiveWriterTest, AppendRefusesWhatIsNoArchive) {
 
 TEST(ArchiveWriterTest, BytesDoNotDependOnThreads) {
     for (const Paths& paths :
-         {treeList(70'000), shuffled(treeList(70'000)), randomList(30'000, 1)})
+         {treeList(shareOf(70'000)), shuffled(treeList(shareOf(70'000))),
+          randomList(shareOf(30'000), 1)})
         for (const auto level :
              {ArchiveLevel::Fast, ArchiveLevel::Normal, ArchiveLevel::Best}) {
             ArchiveOptions options;

@@ -32,9 +32,9 @@ Paths pathsIn(Paths folders) {
     return folders;
 }
 
-class Decoder {
+class FolderReader {
 public:
-    explicit Decoder(const Segment& segment)
+    explicit FolderReader(const Segment& segment)
         : buffer_(segment.head().maxFolderBytes + FolderDecoder::slack),
           folders_(segment, buffer_.data()) {}
 
@@ -50,7 +50,7 @@ TEST(FolderDecoder, DecodesFoldersInAnyOrder) {
     const Paths expected = someFolders();
     const OpenArchive archive(pathsIn(expected));
     ASSERT_EQ(archive.segment().head().folders, expected.size());
-    Decoder folders(archive.segment());
+    FolderReader folders(archive.segment());
     for (const std::uint32_t step : {1U, 3U, 27U})
         for (std::uint32_t i = 0; i < expected.size(); ++i) {
             const std::uint32_t f = i * step % 28;
@@ -62,7 +62,7 @@ TEST(FolderDecoder, DecodesFoldersInAnyOrder) {
 
 TEST(FolderDecoder, KnowsTheEndOfABlock) {
     const OpenArchive archive(pathsIn(someFolders()));
-    Decoder folders(archive.segment());
+    FolderReader folders(archive.segment());
     for (std::uint32_t f = 0; f < 28; ++f) {
         folders->at(f);
         EXPECT_EQ(folders->isAtEnd(), f % 8 == 7 || f == 27) << f;
@@ -71,7 +71,7 @@ TEST(FolderDecoder, KnowsTheEndOfABlock) {
 
 TEST(FolderDecoder, RefusesAFolderThatIsNotThere) {
     const OpenArchive archive(pathsIn(someFolders()));
-    Decoder folders(archive.segment());
+    FolderReader folders(archive.segment());
     EXPECT_THROW(folders->at(28), DamagedArchiveException);
     EXPECT_THROW(folders->at(0xFFFFFFFE), DamagedArchiveException);
     EXPECT_EQ(folders->at(1), someFolders()[1]);
@@ -87,7 +87,7 @@ TEST(FolderDecoder, StaysWithinItsBoundsOnAnyBits) {
         const archives::ChangedSegment changed(
             archive, archives::flip(Section::Folders, at, 0xFF));
         const Segment segment(changed.bytes(), changed.entry());
-        Decoder folders(segment);
+        FolderReader folders(segment);
         for (std::uint32_t f = 0; f < 28; ++f) try {
                 EXPECT_LE(folders->at(f).size(), segment.head().maxFolderBytes);
             } catch (const DamagedArchiveException&) {

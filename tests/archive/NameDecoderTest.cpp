@@ -16,9 +16,9 @@ namespace {
 using archives::OpenArchive;
 using archives::Paths;
 
-class Decoder {
+class NameReader {
 public:
-    explicit Decoder(const Segment& segment)
+    explicit NameReader(const Segment& segment)
         : buffer_(segment.head().maxNameBytes + NameDecoder::slack),
           names_(segment, buffer_.data()) {}
 
@@ -59,7 +59,7 @@ TEST(NameDecoder, DecodesEveryOperation) {
     const Paths list = allOperations();
     const OpenArchive archive(list);
     ASSERT_EQ(archive.segment().head().order, ListOrder::AsGiven);
-    Decoder names(archive.segment());
+    NameReader names(archive.segment());
     names->start(archive.segment().nameBlock(0));
     constexpr std::uint32_t folders[] = {0, 0, 0, 0, 0, 1, 0, 2,
                                          2, 2, 2, 1, 1, 0, 0};
@@ -78,7 +78,7 @@ TEST(NameDecoder, DecodesEveryOperation) {
 TEST(NameDecoder, StartsAtAnyBlock) {
     const Paths list = archives::sortedPaths(80);
     const OpenArchive archive(list);
-    Decoder names(archive.segment());
+    NameReader names(archive.segment());
     for (const std::uint32_t block : {4U, 0U, 2U, 2U, 3U}) {
         names->start(archive.segment().nameBlock(block));
         for (std::size_t i = 0; i < 16; ++i) {
@@ -92,7 +92,7 @@ TEST(NameDecoder, StartsAtAnyBlock) {
 // Decodes all blocks as far as they go. Returns whether some name is damaged.
 bool isRefused(const Segment& segment) {
     bool refused = false;
-    Decoder names(segment);
+    NameReader names(segment);
     for (std::uint32_t block = 0; block < segment.nameBlocks(); ++block) try {
             names->start(segment.nameBlock(block));
             for (unsigned i = 0; i < segment.head().namesPerBlock; ++i) {

@@ -19,7 +19,7 @@ using archives::Paths;
 using Numbers = std::vector<std::uint64_t>;
 using Texts = std::vector<std::string_view>;
 
-FindOptions onThreads(unsigned threads) {
+FindOptions findOnThreads(unsigned threads) {
     FindOptions options;
     options.threads = threads;
     return options;
@@ -42,7 +42,7 @@ Numbers numbersWith(const Paths& list, const Texts& texts) {
 }
 
 // In two segments, each stored in another order.
-std::vector<Paths> lists() {
+std::vector<Paths> searchedLists() {
     return {archives::sortedPaths(60), archives::scatteredPaths(60),
             archives::inFolderRuns(60)};
 }
@@ -51,11 +51,11 @@ TEST(PathSearch, FindsPathsThatHoldAllTexts) {
     const std::vector<Texts> questions = {
         {},         {""},       {"s"},           {"usr/"},   {"e/x"},
         {"x/file"}, {"i", "1"}, {"usr", ".txt"}, {"/", "-"}, {"nothing"}};
-    for (const Paths& list : lists()) {
+    for (const Paths& list : searchedLists()) {
         const OpenArchive archive(list, archives::segmentsOf(35));
         for (const Texts& texts : questions)
             for (const unsigned threads : {1U, 2U})
-                EXPECT_EQ(find(archive.reader(), texts, onThreads(threads)),
+                EXPECT_EQ(find(archive.reader(), texts, findOnThreads(threads)),
                           numbersWith(list, texts));
     }
 }
@@ -64,17 +64,17 @@ TEST(PathSearch, FindsWhatAPredicateTakes) {
     const auto isOdd = [](std::string_view path) {
         return path.size() % 2 == 1;
     };
-    for (const Paths& list : lists()) {
+    for (const Paths& list : searchedLists()) {
         const OpenArchive archive(list, archives::segmentsOf(35));
-        EXPECT_EQ(find(archive.reader(), isOdd, onThreads(2)),
+        EXPECT_EQ(find(archive.reader(), isOdd, findOnThreads(2)),
                   numbersThat(list, isOdd));
     }
 }
 
 TEST(PathSearch, KeepsWithinAFolder) {
-    for (const Paths& list : lists()) {
+    for (const Paths& list : searchedLists()) {
         const OpenArchive archive(list, archives::segmentsOf(35));
-        FindOptions options = onThreads(1);
+        FindOptions options = findOnThreads(1);
         for (const std::string folder : {"usr", "home/", "usr/lib1", "no"}) {
             options.folder = folder;
             const std::string prefix =
@@ -92,7 +92,7 @@ TEST(PathSearch, KeepsWithinAFolder) {
 }
 
 TEST(PathSearch, ShowsPathsInAscendingOrderUntilAsked) {
-    for (const Paths& list : lists()) {
+    for (const Paths& list : searchedLists()) {
         const OpenArchive archive(list, archives::segmentsOf(35));
         const Numbers all = numbersWith(list, {"e"});
         ASSERT_GT(all.size(), 5U);
@@ -102,7 +102,7 @@ TEST(PathSearch, ShowsPathsInAscendingOrderUntilAsked) {
             shown.push_back(number);
             return shown.size() < 5;
         };
-        findEach(archive.reader(), Texts{"e"}, keep, onThreads(2));
+        findEach(archive.reader(), Texts{"e"}, keep, findOnThreads(2));
         EXPECT_EQ(shown, Numbers(all.begin(), all.begin() + 5));
     }
 }
@@ -113,7 +113,7 @@ TEST(PathSearch, HandsOnWhatAPredicateThrows) {
         throw std::domain_error("mine");
     };
     for (const unsigned threads : {1U, 2U})
-        EXPECT_THROW(find(archive.reader(), fail, onThreads(threads)),
+        EXPECT_THROW(find(archive.reader(), fail, findOnThreads(threads)),
                      std::domain_error);
 }
 

@@ -8,7 +8,7 @@
 namespace tessel::archive {
 namespace {
 
-SegmentList someList() {
+SegmentList trainingList() {
     SegmentList list;
     for (int i = 0; i < 3000; ++i) {
         std::string path = "share/doc/package-";
@@ -23,7 +23,7 @@ SegmentList someList() {
 
 // Steps that the list is cut into at this level.
 std::size_t stepsAt(ArchiveLevel level, std::vector<double>* shares = nullptr) {
-    const SegmentList list = someList();
+    const SegmentList list = trainingList();
     Workers workers(2, {});
     const FrontCoder coder(list, arrange(list, workers), workers);
     const TrainedParse trained =
@@ -49,7 +49,7 @@ TEST(TokenTrainingTest, ProgressEndsWithAll) {
 }
 
 TEST(TokenTrainingTest, WhatProgressThrowsEndsIt) {
-    const SegmentList list = someList();
+    const SegmentList list = trainingList();
     Workers workers(2, {});
     const FrontCoder coder(list, arrange(list, workers), workers);
     EXPECT_THROW(trainAndParse(coder, ArchiveLevel::Normal, workers,

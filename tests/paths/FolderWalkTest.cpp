@@ -12,22 +12,18 @@
 #include <vector>
 
 #include "paths/PathList.hpp"
+#include "tests/paths/Lists.hpp"
 
 namespace {
 
 namespace fs = std::filesystem;
+using support::stringsOf;
 using tessel::paths::listFolder;
 using tessel::paths::PathList;
 using tessel::paths::walkFolder;
 using tessel::paths::WalkFolders;
 using tessel::paths::WalkReport;
 using Strings = std::vector<std::string>;
-
-Strings stringsOf(const PathList& list) {
-    Strings strings;
-    for (std::size_t i = 0; i < list.size(); ++i) strings.emplace_back(list[i]);
-    return strings;
-}
 
 // A folder of its own, removed at the end.
 class FolderWalk : public testing::Test {

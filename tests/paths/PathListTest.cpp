@@ -11,10 +11,12 @@
 #include <vector>
 
 #include "paths/PathList.hpp"
+#include "tests/paths/Lists.hpp"
 
 namespace {
 
 namespace fs = std::filesystem;
+using support::stringsOf;
 using namespace std::string_literals;
 using tessel::paths::listFolder;
 using tessel::paths::PathList;
@@ -23,12 +25,6 @@ using tessel::paths::readListFile;
 using tessel::paths::readPaths;
 using tessel::paths::WalkReport;
 using Strings = std::vector<std::string>;
-
-Strings stringsOf(const PathList& list) {
-    Strings strings;
-    for (std::size_t i = 0; i < list.size(); ++i) strings.emplace_back(list[i]);
-    return strings;
-}
 
 Strings fromText(const std::string& text) {
     return stringsOf(PathList::fromText(text, "list"));

@@ -56,11 +56,12 @@ TEST(StoreReader, ReadsEveryRange) {
     for (std::size_t first = 0; first <= samplePaths().size(); ++first)
         for (std::size_t last = first; last <= samplePaths().size(); ++last) {
             std::size_t next = first;
-            tessel::paths::readPaths(*coder, first, last,
-                      [&](std::size_t number, std::string_view path) {
-                          EXPECT_EQ(number, next++);
-                          EXPECT_EQ(path, samplePaths()[number]);
-                      });
+            tessel::paths::readPaths(
+                *coder, first, last,
+                [&](std::size_t number, std::string_view path) {
+                    EXPECT_EQ(number, next++);
+                    EXPECT_EQ(path, samplePaths()[number]);
+                });
             EXPECT_EQ(next, last);
         }
 }
@@ -71,9 +72,9 @@ TEST(StoreReader, ReadsEveryPairOfNumbers) {
         for (std::size_t b = 0; b < samplePaths().size(); ++b) {
             Strings met;
             tessel::paths::readPaths(*coder, Numbers{a, b},
-                      [&](std::size_t, std::string_view path) {
-                          met.emplace_back(path);
-                      });
+                                     [&](std::size_t, std::string_view path) {
+                                         met.emplace_back(path);
+                                     });
             EXPECT_EQ(met, (Strings{samplePaths()[a], samplePaths()[b]}));
         }
 }
@@ -122,12 +123,15 @@ TEST(StoreReader, WhatIsNoPathIsRefused) {
     const std::u16string lone(1, 0xD800);
     const std::u16string none(1, 0xDC00);
     const auto never = [](std::size_t, std::string_view) { FAIL(); };
-    EXPECT_THROW(tessel::paths::readPaths(*coderWith({{lone}}, {{u"a"}}), 0, 1, never),
-                 DamagedFormException);
-    EXPECT_THROW(tessel::paths::readPaths(*coderWith({{u"a"}}, {{lone}}), 0, 1, never),
-                 DamagedFormException);
-    EXPECT_THROW(tessel::paths::readPaths(*coderWith({{none}}, {{none}}), 0, 1, never),
-                 DamagedFormException)
+    EXPECT_THROW(
+        tessel::paths::readPaths(*coderWith({{lone}}, {{u"a"}}), 0, 1, never),
+        DamagedFormException);
+    EXPECT_THROW(
+        tessel::paths::readPaths(*coderWith({{u"a"}}, {{lone}}), 0, 1, never),
+        DamagedFormException);
+    EXPECT_THROW(
+        tessel::paths::readPaths(*coderWith({{none}}, {{none}}), 0, 1, never),
+        DamagedFormException)
         << "an empty path";
 }
 
@@ -136,9 +140,11 @@ TEST(StoreReader, NumbersThatLeadNowhereAreDamage) {
     coder->partitionEnds.back() += 2;
     std::size_t visited = 0;
     const auto count = [&](std::size_t, std::string_view) { ++visited; };
-    EXPECT_THROW(tessel::paths::readPaths(*coder, 0, 11, count), DamagedFormException);
+    EXPECT_THROW(tessel::paths::readPaths(*coder, 0, 11, count),
+                 DamagedFormException);
     EXPECT_EQ(visited, 9U);
-    EXPECT_THROW(tessel::paths::readPaths(*coder, Numbers{20}, count), DamagedFormException);
+    EXPECT_THROW(tessel::paths::readPaths(*coder, Numbers{20}, count),
+                 DamagedFormException);
 }
 
 }  // namespace
