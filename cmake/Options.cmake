@@ -21,6 +21,11 @@ target_compile_definitions(
   qztessel_options
   INTERFACE $<$<NOT:$<CONFIG:Release,MinSizeRel>>:_GLIBCXX_ASSERTIONS>)
 
+if(CMAKE_UNITY_BUILD AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  # A source that is included looks like a header to this warning.
+  target_compile_options(qztessel_options INTERFACE -Wno-subobject-linkage)
+endif()
+
 if(QZTESSEL_SANITIZE)
   set(sanitizers -fsanitize=${QZTESSEL_SANITIZE} -fno-sanitize-recover=all)
   if(QZTESSEL_SANITIZE MATCHES "undefined")

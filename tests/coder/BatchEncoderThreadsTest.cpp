@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <system_error>
 
+#include "coder/BatchEncoder.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {
