@@ -122,7 +122,6 @@ std::optional<std::vector<std::string>> firstPaths(const PathArchive& archive) {
     try {
         archive.forEach([&](std::uint64_t number, std::string_view path) {
             fuzz::require(number == paths.size(), "numbers are ascending");
-            fuzz::require(!path.empty(), "no path is empty");
             paths.emplace_back(path);
             text += path.size();
             return paths.size() < maxShownPaths && text < maxTextShown;
@@ -146,12 +145,21 @@ void compareWithPaths(const PathArchive& archive,
     const std::size_t step = 1 + paths.size() / 40;
     for (std::size_t i = 0; i < paths.size(); i += step) {
         fuzz::require(archive[i] == paths[i], "a path is the same by number");
-        attempt([&] {
-            const auto found = archive.numberOf(paths[i]);
-            fuzz::require(!found || *found >= archive.size() ||
-                              archive[*found] == paths[i],
-                          "the number of a path is that path's");
-        });
+        attempt([&] { static_cast<void>(archive.numberOf(paths[i])); });
+    }
+}
+
+// Opening does not check each path, nor the orders that searches rely on. What
+// breaks them is damage that a verification finds.
+void expectSoundPaths(const PathArchive& archive,
+                      const std::vector<std::string>& paths) {
+    if (paths.size() != archive.size() || !archive.findDamage().empty()) return;
+    for (const std::string& path : paths) {
+        const auto first = static_cast<std::uint64_t>(
+            std::ranges::find(paths, path) - paths.begin());
+        fuzz::require(!path.empty(), "no path is empty");
+        fuzz::require(archive.numberOf(path) == first,
+                      "the number of a path is its first");
     }
 }
 
@@ -188,7 +196,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
     try {
         const PathArchive archive = PathArchive::over(bytes);
         if (const auto paths = firstPaths(archive))
-            attempt([&] { compareWithPaths(archive, *paths); });
+            attempt([&] {
+                compareWithPaths(archive, *paths);
+                expectSoundPaths(archive, *paths);
+            });
         searchEverywhere(archive);
         if (archive.size() <= maxShownPaths) attempt([&] { archive.verify(); });
     } catch (const DamagedArchiveException&) {
