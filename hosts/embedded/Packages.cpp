@@ -8,13 +8,19 @@ Package* Package::find(std::string_view name) {
 }
 
 Package& Package::add(std::string_view dottedName) {
-    const std::size_t dot = dottedName.find('.');
-    const std::string name(dottedName.substr(0, dot));
-    const std::string prefix = fullName_.empty() ? "" : fullName_ + ".";
-    std::unique_ptr<Package>& package = inner_[name];
-    if (!package) package = std::make_unique<Package>(prefix + name);
-    if (dot == std::string_view::npos) return *package;
-    return package->add(dottedName.substr(dot + 1));
+    Package* outer = this;
+    for (;;) {
+        const std::size_t dot = dottedName.find('.');
+        const std::string name(dottedName.substr(0, dot));
+        std::unique_ptr<Package>& package = outer->inner_[name];
+        if (!package)
+            package = std::make_unique<Package>(
+                outer->fullName_.empty() ? name
+                                         : outer->fullName_ + "." + name);
+        if (dot == std::string_view::npos) return *package;
+        outer = package.get();
+        dottedName.remove_prefix(dot + 1);
+    }
 }
 
 }  // namespace tessel::embedded

@@ -250,8 +250,9 @@ void* Value::ownNumericData() {
 // ---- Values as a plug-in sees them ----
 
 HostArray* Value::release() {
-    if (array_ == nullptr) return clone().release();
-    return std::exchange(array_, nullptr);
+    if (array_ != nullptr) return std::exchange(array_, nullptr);
+    Value copy = clone();
+    return std::exchange(copy.array_, nullptr);
 }
 
 Value Value::adopt(HostArray* array) noexcept {
