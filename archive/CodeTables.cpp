@@ -6,8 +6,6 @@ namespace tessel::archive {
 
 using sixpacks::ByteCursor;
 
-namespace {}  // namespace
-
 // ---- LengthTable ----
 
 void LengthTable::pack(std::vector<std::uint8_t>& out) const {

@@ -46,10 +46,11 @@ class SequentialReader;
 //   at the same time, on one object or on copies.
 // Trust: the bytes may be hostile. Each piece of them is checked against its
 //   checksum when it is first touched, so any member may throw
-//   DamagedArchiveException; a wrong path never comes out. Bytes that break
-//   the format's rules under right checksums are read without crash, hang or
-//   large allocation: they throw the same where reading meets them, and
-//   `verify` finds them all, but a search may be misled by them.
+//   DamagedArchiveException; damage never gives a wrong path. A forged
+//   archive, which breaks the format's rules under right checksums, causes no
+//   crash, hang or large allocation: the member that meets a broken rule
+//   throws the same, and `verify` finds them all. Until then, a search in it
+//   may miss a path or give a wrong number.
 // Limit: a file that is cut while it is mapped raises SIGBUS in whoever reads
 //   it. Replace archives by renaming, as ArchiveWriter does, or read the file
 //   into memory and use own().

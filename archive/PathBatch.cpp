@@ -88,8 +88,10 @@ bool PathBatch::decode(std::span<const std::uint32_t> places) {
     return true;
 }
 
-// A batch that is too long is halved, one with damage becomes a single path.
-// Both stay small: what made them so is likely to come again.
+// If the texts of a batch are too long together, half as many paths are tried.
+// If one of them is damaged, only the first is tried, so that all paths before
+// the damage are still shown. Later batches are not larger, since the cause is
+// likely to come again.
 void PathBatch::fill(std::span<const std::uint32_t> places) {
     room_ = std::min(room_, places.size());
     for (;;) {

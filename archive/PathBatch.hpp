@@ -17,7 +17,8 @@ namespace tessel::archive {
 // decoding of their blocks and the processor finds the next bytes in its
 // cache, and keeps their texts until they are asked for.
 //
-// Batches grow: those who want only a few paths do not pay for many.
+// Each batch is larger than the one before, so that a caller who wants only a
+// few paths does not pay for many.
 //
 // Ownership: borrows the segment.
 // Threads: one thread at a time.

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "archive/ArchiveReader.hpp"
+
 namespace tessel::archive {
 namespace {
 
@@ -16,7 +18,7 @@ ScatteredReader::ScatteredReader(const Segment& segment)
       paths_(segment),
       batch_(segment),
       perBlock_(segment.head().namesPerBlock),
-      inPlace_(segment.head().order != ListOrder::Rearranged) {}
+      inPlace_(isInPlace(segment)) {}
 
 // Puts the places of the first `count` numbers into places_.
 template <class NumberAt>

@@ -107,7 +107,8 @@ void SegmentRules::checkFolders(std::uint32_t begin, std::uint32_t end) const {
     }
 }
 
-// By their hashes, so that no text is kept but that of equal hashes.
+// Compares hashes, so that the texts need not be kept. Only where two hashes
+// are equal, the texts are kept and compared.
 void SegmentRules::checkFoldersDiffer() const {
     PathBuffer buffer(segment_.head().maxFolderBytes + FolderDecoder::slack);
     FolderDecoder folders(segment_, buffer.data());

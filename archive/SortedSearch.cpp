@@ -78,10 +78,13 @@ std::uint32_t SortedSearch::lastHeadBefore(const Target& target) {
     });
 }
 
-// The last folder of a block that starts before the target, from `folder` on,
-// of which that is known. What a later folder tells holds for those before it,
-// so the first names of folders that the target is in are looked at only if no
-// other folder tells.
+// The last folder of a block whose first path is less than the target; at
+// least `folder`, the block's first one.
+//
+// If a folder's first path is less, so are those of all folders before it. For
+// a folder that the target is in, at any depth, the folder's text does not
+// decide: the name of its first path has to be read, which is slow. So that is
+// done only for folders after which no other folder has decided.
 std::uint32_t SortedSearch::lastOfBlockBefore(const Target& target,
                                               std::uint32_t head,
                                               std::uint32_t folder) {
@@ -145,8 +148,8 @@ std::uint32_t SortedSearch::lastBlockBefore(const Target& target,
     });
 }
 
-// The block before whose second path the target belongs, at the earliest, and
-// at the latest before the first path of the next block.
+// The last block whose first path is less than the target, or the first block
+// if there is none. The target's place is in it or at the start of the next.
 std::uint32_t SortedSearch::search(const Target& target) {
     ownFolder_ = unknown;
     const std::uint32_t head = lastHeadBefore(target);

@@ -34,10 +34,11 @@ file(
 qztesselAddCheck(documents documents.py --run
                  $<TARGET_FILE_DIR:qztessel_console> ${pages})
 
-# clang-tidy, in two passes. Most of the time of the plain checks goes into the
-# headers of libraries, so that they read a room's files as few units. The static
-# analyzer looks into main files only, so that it reads each file by itself; it
-# gives a function up after 60,000 steps, where findings have long ended.
+# clang-tidy, in two passes. The plain checks spend most of their time in the
+# headers of libraries, so the source files of a folder are joined into a few
+# units for them. The static analyzer finds faults only in the main file of a
+# unit, so it is run on each source file alone. It stops at a function after
+# 60,000 steps instead of 225,000, which takes a third to a half of the time.
 set(plainChecks --config-file=${PROJECT_SOURCE_DIR}/.clang-tidy
                 --checks=-clang-analyzer-*)
 set(analyzerChecks --checks=-*,clang-analyzer-*)

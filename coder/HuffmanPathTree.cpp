@@ -276,8 +276,7 @@ bool HuffmanPathTree::appendToPathIfLeaf(std::int32_t& position,
 }
 
 bool HuffmanPathTree::hasNextPathFromBTree() const {
-    return numbering_->hasDuplicate(numbering_->nextPathNumber + 1) ||
-           pathTree->hasNextPath();
+    return PathIteration(*pathTree, *numbering_).hasNext();
 }
 
 void HuffmanPathTree::getNextPathFromBTree(Components& components) {

@@ -82,15 +82,6 @@ Paths numbersAsNames() {
 
 }  // namespace
 
-std::vector<std::uint8_t> archiveOf(const Paths& paths,
-                                    tessel::ArchiveOptions options) {
-    std::vector<std::uint8_t> bytes;
-    tessel::ArchiveWriter writer(bytes, std::move(options));
-    writer.addAll(paths);
-    writer.finish();
-    return bytes;
-}
-
 Paths pathsOf(const tessel::PathArchive& archive) {
     Paths paths;
     archive.forEach([&](std::uint64_t, std::string_view path) {

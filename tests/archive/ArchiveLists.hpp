@@ -7,17 +7,14 @@
 #include <string_view>
 #include <vector>
 
-#include "archive/ArchiveOptions.hpp"
 #include "archive/PathArchive.hpp"
+#include "tests/archive/Archives.hpp"
 
 // Lists of paths for tests of whole archives.
 namespace support {
 
-using Paths = std::vector<std::string>;
-
-// The archive of a list, as bytes.
-std::vector<std::uint8_t> archiveOf(const Paths& paths,
-                                    tessel::ArchiveOptions options = {});
+using archives::archiveOf;
+using archives::Paths;
 
 // All paths of an archive, read from the first number to the last.
 Paths pathsOf(const tessel::PathArchive& archive);

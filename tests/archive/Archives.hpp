@@ -10,6 +10,7 @@
 
 #include "archive/ArchiveReader.hpp"
 #include "archive/ArchiveWriter.hpp"
+#include "archive/NumberRange.hpp"
 
 // Lists of paths and archives of them, for tests.
 namespace archives {
@@ -50,6 +51,16 @@ inline Paths sortedPaths(std::size_t count) {
     }
     std::sort(paths.begin(), paths.end());
     return paths;
+}
+
+// The numbers of the paths that start with the prefix.
+inline std::vector<tessel::NumberRange> rangesBelow(const Paths& paths,
+                                                    const std::string& prefix) {
+    std::vector<tessel::NumberRange> ranges;
+    for (std::uint64_t i = 0; i < paths.size(); ++i)
+        if (paths[i].starts_with(prefix))
+            tessel::archive::appendRange(ranges, {i, i + 1});
+    return ranges;
 }
 
 inline Paths shuffled(Paths paths) {

@@ -22,14 +22,6 @@ std::optional<std::uint64_t> expectedNumber(const Paths& list,
     return static_cast<std::uint64_t>(found - list.begin());
 }
 
-std::vector<NumberRange> numbersBelow(const Paths& list,
-                                      const std::string& prefix) {
-    std::vector<NumberRange> ranges;
-    for (std::uint64_t i = 0; i < list.size(); ++i)
-        if (list[i].starts_with(prefix)) appendRange(ranges, {i, i + 1});
-    return ranges;
-}
-
 // Asks for what is there, what is not and every folder.
 void expectRightNumbers(const Paths& list, const ArchiveOptions& options) {
     const OpenArchive archive(list, options);
@@ -43,7 +35,7 @@ void expectRightNumbers(const Paths& list, const ArchiveOptions& options) {
     }
     for (const std::string& folder : folders)
         EXPECT_EQ(numbersBelow(archive.reader(), folder),
-                  numbersBelow(list, prefixOf(folder)))
+                  archives::rangesBelow(list, prefixOf(folder)))
             << folder;
 }
 
