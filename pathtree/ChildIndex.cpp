@@ -11,10 +11,6 @@ namespace {
 // large costs a look at each child, too small a table for little folders.
 constexpr std::size_t maxSearched = 8;
 
-// A power of two. An entry takes 24 bytes: the cache stays in 1.5 KiB, which
-// the processor's first cache keeps. A deep path needs one slot per level.
-constexpr std::size_t cacheEntries = 64;
-
 std::size_t searchFromFront(const ChildList& children, ComponentView value) {
     const std::size_t count = children.size();
     for (std::size_t i = 0; i < count; ++i)
@@ -45,20 +41,9 @@ std::size_t ChildIndex::Table::find(const ChildList& children,
     });
 }
 
-ChildIndex::CacheEntry& ChildIndex::cacheEntryOf(const BNode& parent) noexcept {
-    const auto address = reinterpret_cast<std::uintptr_t>(&parent);
-    return cache_[(address ^ (address >> 9)) / 4 & (cacheEntries - 1)];
-}
-
 ChildIndex::Found ChildIndex::find(BNode& parent, ComponentView value) {
-    if (cache_.empty()) cache_.resize(cacheEntries);
-    CacheEntry& last = cacheEntryOf(parent);
-    if (last.parent == &parent &&
-        sameComponent(last.found.child->value(), value))
-        return last.found;
     const ChildList children = parent.children();
     const std::size_t count = children.size();
-    if (count == 0) return {};
     std::size_t position = notFound;
     if (count <= maxSearched) {
         position = searchFromFront(children, value);
@@ -68,19 +53,10 @@ ChildIndex::Found ChildIndex::find(BNode& parent, ComponentView value) {
         position = table.find(children, value, HashIndex::hashOf(value));
     }
     if (position == notFound) return {};
-    last = {&parent, {&children[position], position}};
-    return last.found;
-}
-
-void ChildIndex::noteAppended(BNode& parent) noexcept {
-    const ChildList children = parent.children();
-    if (!cache_.empty())
-        cacheEntryOf(parent) = {&parent,
-                                {&children.back(), children.size() - 1}};
+    return {&children[position], position};
 }
 
 void ChildIndex::clear() noexcept {
-    releaseContents(cache_);
     releaseContents(tables_);
     indexedChildren_ = 0;
 }
@@ -88,8 +64,7 @@ void ChildIndex::clear() noexcept {
 std::size_t ChildIndex::memoryBytes() const noexcept {
     constexpr std::size_t mapNode =
         sizeof(std::pair<const BNode* const, Table>) + 2 * sizeof(void*);
-    std::size_t bytes =
-        cache_.capacity() * sizeof(CacheEntry) + tables_.size() * mapNode;
+    std::size_t bytes = tables_.size() * mapNode;
     if (!tables_.empty()) bytes += tables_.bucket_count() * sizeof(void*);
     for (const auto& [parent, table] : tables_) bytes += table.memoryBytes();
     return bytes;

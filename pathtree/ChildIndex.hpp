@@ -3,7 +3,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <unordered_map>
-#include <vector>
 
 #include "pathtree/BNode.hpp"
 #include "pathtree/HashIndex.hpp"
@@ -13,16 +12,13 @@ namespace tessel {
 // Finds the first child with a given value, as a search from the front
 // would, without looking at every child of a wide folder.
 //
-//   asked first  | a cache of 64 children found last, one per slot: a sorted
-//                | list of paths asks for the same ones again and again
-//   then         | up to 8 children: a search from the front
-//                | more: a hash table from value to first position, one per
-//                | folder, made when the folder is first searched
+//   up to 8 children | a search from the front
+//   more             | a hash table from value to first position, one per
+//                    | folder, made when the folder is first searched
 //
-// Children are only appended and never change, so neither cache nor table
-// can become wrong; a table takes in the children that came since its last
-// use, whoever appended them. Clear the index before nodes that it has seen
-// are released.
+// Children are only appended and never change, so a table cannot become
+// wrong; it takes in the children that came since its last use, whoever
+// appended them. Clear the index before nodes that it has seen are released.
 //
 // Ownership: borrows the nodes.
 // Threads: none; one thread at a time.
@@ -39,10 +35,6 @@ public:
 
     // The first child of parent that equals value.
     Found find(BNode& parent, ComponentView value);
-
-    // Notes the last child of parent, which was appended because find did
-    // not find its value.
-    void noteAppended(BNode& parent) noexcept;
 
     // Children in all tables.
     std::size_t indexedChildren() const noexcept { return indexedChildren_; }
@@ -70,14 +62,6 @@ private:
         std::size_t size_ = 0;  // children [0, size_) are in
     };
 
-    struct CacheEntry {
-        const BNode* parent = nullptr;
-        Found found;
-    };
-
-    CacheEntry& cacheEntryOf(const BNode& parent) noexcept;
-
-    std::vector<CacheEntry> cache_;
     std::unordered_map<const BNode*, Table> tables_;
     std::size_t indexedChildren_ = 0;
 };

@@ -8,9 +8,7 @@ std::uint64_t Insertion::make(ComponentView value, NodePool::Kind kind) {
         firstChanged_ = node_;
         childrenBefore_ = position;
     }
-    BNode& made = pool_.add(*node_, value, kind);
-    index_.noteAppended(*node_);
-    node_ = &made;
+    node_ = &pool_.add(*node_, value, kind);
     return position;
 }
 
