@@ -109,15 +109,15 @@ private:
     at.bit += byteBits;
     char* out = name_ + prefix;
     if (byte == 0) return out;
-    const auto* const first = tables().firstToken(byte);
+    const auto* const first = tables().firstCode(byte);
     if (first == nullptr) [[unlikely]]
         fail(at, "A name goes on with a byte that has no code.");
-    const Token token = first->code.decode(bits << byteBits);
+    const Token token = first->decode(bits << byteBits);
     at.bit += token.codeBits();
     unsigned next = token.context();
     if (token.isEscape()) {
-        *out++ = static_cast<char>(first->byte);
-        next = nameContexts[first->byte];
+        *out++ = static_cast<char>(byte);
+        next = nameContexts[byte];
     } else {
         out = append(token, out);
     }

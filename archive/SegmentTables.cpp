@@ -66,6 +66,14 @@ SegmentTables::SegmentTables(const SegmentHead& head,
        [&](auto bytes) { unpackOperationCodes(bytes); });
 }
 
+static_assert(sizeof(SegmentTables) +
+                      FolderStart * sizeof(SegmentTables::NameCode) +
+                      (tokenContextCount - FolderStart) *
+                          sizeof(SegmentTables::FolderCode) +
+                      255 * sizeof(SegmentTables::FirstCode) <=
+                  300'000,
+              "The tables of a segment take more than 0.3 MB.");
+
 void SegmentTables::unpackTokenCodes(std::span<const std::uint8_t> section,
                                      std::uint32_t& entries) {
     ByteCursor cursor(section);
@@ -89,15 +97,13 @@ void SegmentTables::unpackFirstTokenCodes(std::span<const std::uint8_t> section,
     std::size_t count = 0;
     for (const std::uint8_t bits : present)
         count += static_cast<unsigned>(std::popcount(bits));
-    firstTokens_.reserve(count);  // pointers to its elements are kept
+    firstCodes_.reserve(count);  // pointers to its elements are kept
     for (unsigned c = 0; c < 256; ++c) {
         if ((present[c / 8] >> (c % 8) & 1U) == 0) continue;
         const std::uint32_t first = entries;
         const CodePlaces places = takeCode(cursor, entries, tokens_);
-        firstTokens_.push_back(
-            {static_cast<std::uint8_t>(c),
-             TokenCode<firstLookupBits>(places, first, tokens_, nameContexts)});
-        firstTokenOf_[c] = &firstTokens_.back();
+        firstCodeOf_[c] = &firstCodes_.emplace_back(places, first, tokens_,
+                                                    nameContexts);
     }
     require(cursor.empty());
 }

@@ -17,7 +17,8 @@ namespace tessel::archive {
 //
 // Ownership: borrows the token entries and the token text.
 // Threads: const members from any number of threads.
-// Cost: 200 to 330 KB, depending on how many different bytes names have.
+// Cost: 200 to 300 KB, more the more bytes names go on with after a prefix
+//   that they share.
 class SegmentTables {
 public:
     // Bits of a code that one lookup decodes. Measured on a million paths: a
@@ -26,18 +27,13 @@ public:
     // faster and spends 24 KB more.
     static constexpr unsigned nameLookupBits = 12;
     static constexpr unsigned folderLookupBits = 12;
-    static constexpr unsigned firstLookupBits = 6;
+    static constexpr unsigned firstLookupBits = 5;
 
     using NameCode = TokenCode<nameLookupBits>;
     using FolderCode = TokenCode<folderLookupBits>;
+    using FirstCode = TokenCode<firstLookupBits>;
     using OperationTable = SymbolTable<maxOperationCodeBits>;
     using ReplacedTable = SymbolTable<maxReplacedCodeBits>;
-
-    // The first token of names that share a prefix and go on with `byte`.
-    struct FirstToken {
-        std::uint8_t byte = 0;
-        TokenCode<firstLookupBits> code;
-    };
 
     // body: the whole body of the segment, with sound bytes in the sections up
     // to TokenText. Throws DamagedArchiveException, whose offset is that of
@@ -66,9 +62,10 @@ public:
     const ReplacedTable& replacedCode(unsigned context) const noexcept {
         return replacedCodes_[context];
     }
-    // The first-token code of a byte, or nullptr.
-    const FirstToken* firstToken(unsigned byte) const noexcept {
-        return byte < 256 ? firstTokenOf_[byte] : nullptr;
+    // The code of the first token of names that share a prefix and go on with
+    // this byte, or nullptr.
+    const FirstCode* firstCode(unsigned byte) const noexcept {
+        return byte < 256 ? firstCodeOf_[byte] : nullptr;
     }
 
 private:
@@ -82,8 +79,8 @@ private:
     TokenList tokens_;
     std::vector<NameCode> nameCodes_;
     std::vector<FolderCode> folderCodes_;
-    std::vector<FirstToken> firstTokens_;
-    std::array<const FirstToken*, 256> firstTokenOf_{};
+    std::vector<FirstCode> firstCodes_;
+    std::array<const FirstCode*, 256> firstCodeOf_{};
     std::array<ReplacedTable, replacedContextCount> replacedCodes_;
     std::array<OperationTable, operationCodeCount> operationCodes_;
 };
