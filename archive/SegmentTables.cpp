@@ -102,8 +102,8 @@ void SegmentTables::unpackFirstTokenCodes(std::span<const std::uint8_t> section,
         if ((present[c / 8] >> (c % 8) & 1U) == 0) continue;
         const std::uint32_t first = entries;
         const CodePlaces places = takeCode(cursor, entries, tokens_);
-        firstCodeOf_[c] = &firstCodes_.emplace_back(places, first, tokens_,
-                                                    nameContexts);
+        firstCodeOf_[c] =
+            &firstCodes_.emplace_back(places, first, tokens_, nameContexts);
     }
     require(cursor.empty());
 }
