@@ -5,6 +5,8 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "archive/SumTree.hpp"
+
 namespace tessel::archive {
 namespace {
 
@@ -35,6 +37,13 @@ void add(const Segment& segment, ArchiveInfo& info) {
         info.sections[i].bytes += head.sectionBytes[i];
 }
 
+// Takes the head of one more segment into the sum.
+std::uint64_t sumWith(const ArchiveReader& archive, const Segment& segment,
+                      std::uint64_t sum) {
+    return sumOf(
+        archive.data().subspan(segment.entry().offset, segmentHeadBytes), sum);
+}
+
 }  // namespace
 
 ArchiveInfo infoOf(const ArchiveReader& archive) {
@@ -50,6 +59,7 @@ ArchiveInfo infoOf(const ArchiveReader& archive) {
     for (std::size_t i = 0; i < archive.segmentCount(); ++i) {
         add(archive.segment(i), info);
         checksums += archive.segment(i).head().sumTreeBytes();
+        info.sum = sumWith(archive, archive.segment(i), info.sum);
     }
     for (const auto& section : info.sections) rest -= section.bytes;
     info.sections.push_back({"checksums", checksums});

@@ -31,6 +31,10 @@ public:
     std::uint64_t size() const noexcept { return size_; }
     std::uint32_t version() const noexcept { return version_; }
     std::uint64_t bytes() const noexcept { return bytes_.bytes().size(); }
+    // The archive as it is stored, sound or not. Valid as long as this object.
+    std::span<const std::uint8_t> data() const noexcept {
+        return bytes_.bytes();
+    }
 
     std::size_t segmentCount() const noexcept { return segments_.size(); }
     const Segment& segment(std::size_t index) const noexcept {

@@ -45,6 +45,11 @@ struct ArchiveInfo {
     std::uint64_t longestName = 0;    // bytes after the last '/'
     std::uint64_t longestFolder = 0;  // bytes up to and with the last '/'
     std::vector<Section> sections;    // added up over the segments
+
+    // Over the segments' heads, and so, through the checksums in them, over
+    // everything stored: equal archives have equal sums. Different ones differ
+    // but for one chance in 2^64.
+    std::uint64_t sum = 0;
 };
 
 }  // namespace tessel

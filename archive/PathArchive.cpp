@@ -165,6 +165,10 @@ SalvageReport PathArchive::salvage(std::span<const std::uint8_t> bytes,
 
 ArchiveInfo PathArchive::info() const { return archive::infoOf(*reader_); }
 
+std::span<const std::uint8_t> PathArchive::bytes() const noexcept {
+    return reader_->data();
+}
+
 // ---- Iterator ----
 
 PathArchive::Iterator::Iterator(std::shared_ptr<const ArchiveReader> reader)

@@ -189,6 +189,10 @@ public:
     // Counts and sizes. Costs nothing but the answer.
     ArchiveInfo info() const;
 
+    // The archive's bytes as they are stored, unchecked: what a copy of it
+    // has to hold. Valid as long as this archive or a copy of it.
+    std::span<const std::uint8_t> bytes() const noexcept;
+
 private:
     explicit PathArchive(
         std::shared_ptr<const archive::ArchiveReader> reader) noexcept;

@@ -70,13 +70,19 @@ function(qztesselTidyRoom room)
     set(unit ${PROJECT_BINARY_DIR}/tidy/${room}/unit-${number}.cpp)
     file(CONFIGURE OUTPUT ${unit} CONTENT "${text}" @ONLY)
     qztesselAddTidyTest(${room}-${number} ${plainChecks} ${unit} --
-                        -std=c++20 -I${PROJECT_SOURCE_DIR})
+                        -std=c++20 -I${PROJECT_SOURCE_DIR} ${systemIncludes})
     math(EXPR number "${number} + 1")
   endwhile()
 endfunction()
 
 set(rooms packing pathtree coder paths archive binding hosts/embedded
           hosts/console)
+set(systemIncludes)
+if(TARGET qztessel_python)
+  list(APPEND rooms hosts/python)
+  list(TRANSFORM QZTESSEL_PYTHON_INCLUDE_DIRS PREPEND -isystem
+       OUTPUT_VARIABLE systemIncludes)
+endif()
 foreach(room IN LISTS rooms)
   qztesselTidyRoom(${room})
 endforeach()

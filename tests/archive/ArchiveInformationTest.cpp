@@ -60,5 +60,20 @@ TEST(ArchiveInformation, OfAnEmptyArchiveIsItsHeader) {
     EXPECT_EQ(bytesOfAll(info), info.fileBytes);
 }
 
+TEST(ArchiveInformation, SumIsThatOfTheContents) {
+    const auto sumOfList = [](const archives::Paths& list,
+                              std::uint64_t perSegment) {
+        const archives::OpenArchive archive(list,
+                                            archives::segmentsOf(perSegment));
+        return infoOf(archive.reader()).sum;
+    };
+    const auto sum = sumOfList({"a/b", "a/c", "d"}, 2);
+    EXPECT_EQ(sumOfList({"a/b", "a/c", "d"}, 2), sum);
+    EXPECT_NE(sumOfList({"a/b", "a/c", "e"}, 2), sum);
+    EXPECT_NE(sumOfList({"a/b", "a/d", "d"}, 2), sum);
+    EXPECT_NE(sumOfList({"d", "a/b", "a/c"}, 2), sum);
+    EXPECT_NE(sumOfList({"a/b", "a/c", "d"}, 3), sum);
+}
+
 }  // namespace
 }  // namespace tessel::archive

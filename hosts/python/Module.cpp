@@ -1,0 +1,260 @@
+// The module qztessel._core: what of the library Python's part of the package
+// builds on. Its functions take checked arguments and are no public interface;
+// qztessel/_core.pyi has their types.
+#include <pybind11/numpy.h>
+#include <pybind11/pybind11.h>
+#include <pybind11/stl.h>
+
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <stop_token>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "hosts/python/Errors.hpp"
+#include "hosts/python/Interruptible.hpp"
+#include "hosts/python/Packer.hpp"
+#include "hosts/python/PathObjects.hpp"
+#include "hosts/python/PathSequence.hpp"
+#include "hosts/python/StoredList.hpp"
+
+namespace tessel::python {
+
+namespace {
+
+namespace py = pybind11;
+
+using IndexArray = py::array_t<std::int64_t, py::array::c_style>;
+
+PathKind kindOf(bool asBytes) noexcept {
+    return asBytes ? PathKind::Bytes : PathKind::Text;
+}
+
+// ---- Archives ----
+
+// Python holds no pointers to const. All members are const.
+std::shared_ptr<StoredList> shared(StoredList::Pointer list) {
+    return std::const_pointer_cast<StoredList>(std::move(list));
+}
+
+// Keeps an object's buffer; releases it under the interpreter's lock.
+std::shared_ptr<const void> keeping(py::buffer_info info) {
+    const auto release = [](py::buffer_info* kept) {
+        const py::gil_scoped_acquire held;
+        const std::unique_ptr<py::buffer_info> owner(kept);
+    };
+    return std::shared_ptr<py::buffer_info>(
+        std::make_unique<py::buffer_info>(std::move(info)).release(), release);
+}
+
+// Copies bytes that somebody could change.
+std::shared_ptr<StoredList> listOver(const py::buffer& buffer) {
+    py::buffer_info info = buffer.request();
+    const auto* const data = static_cast<const std::uint8_t*>(info.ptr);
+    const auto size = static_cast<std::size_t>(info.size * info.itemsize);
+    const std::span<const std::uint8_t> bytes(data, size);
+    if (!info.readonly)
+        return shared(StoredList::own({bytes.begin(), bytes.end()}));
+    return shared(StoredList::over(bytes, keeping(std::move(info))));
+}
+
+py::buffer_info bufferOf(const StoredList& list) {
+    // Python takes a pointer to changeable bytes, and a flag that they are not.
+    return {const_cast<std::uint8_t*>(list.bytes().data()),
+            static_cast<py::ssize_t>(list.bytes().size()), true};
+}
+
+void bindStoredList(py::module_& module) {
+    py::class_<StoredList, std::shared_ptr<StoredList>>(module, "StoredList",
+                                                        py::buffer_protocol())
+        .def_buffer(&bufferOf)
+        .def_property_readonly(
+            "file",
+            [](const StoredList& list) { return py::bytes(list.file()); })
+        .def_property_readonly(
+            "nbytes",
+            [](const StoredList& list) { return list.bytes().size(); })
+        .def_property_readonly("sum", [](const StoredList& list) {
+            return list.archive().info().sum;
+        });
+    module.def("open", [](const std::string& file) {
+        return shared(StoredList::open(file));
+    });
+    module.def("over", &listOver);
+}
+
+// ---- Lists ----
+
+py::object pathAt(const PathSequence& paths, const py::object& number,
+                  bool asBytes) {
+    const auto size = static_cast<std::int64_t>(paths.size());
+    const std::int64_t index =
+        PyNumber_AsSsize_t(number.ptr(), PyExc_IndexError);
+    if (index == -1 && PyErr_Occurred() != nullptr)
+        throw py::error_already_set();
+    if (index < -size || index >= size)
+        throw py::index_error("list index " + std::to_string(index) +
+                              " is out of range for " + std::to_string(size) +
+                              " paths");
+    const auto at =
+        static_cast<std::uint64_t>(index < 0 ? index + size : index);
+    return toObject(paths[at], kindOf(asBytes));
+}
+
+py::list blockOf(const PathSequence& paths, std::uint64_t first,
+                 std::uint64_t last, bool asBytes) {
+    paths::PathList texts;
+    {
+        const py::gil_scoped_release released;
+        paths.read(first, last,
+                   [&](std::string_view path) { texts.append(path); });
+    }
+    py::list list;
+    appendObjects(texts, kindOf(asBytes), list);
+    return list;
+}
+
+std::vector<std::uint64_t> indicesOf(const PathSequence& paths,
+                                     py::object path) {
+    const std::string text(PathBytes(std::move(path)).view());
+    std::vector<std::uint64_t> indices;
+    std::stop_source stop;
+    runInterruptibly(
+        stop, [&] { indices = paths.indicesOf(text); }, [] {});
+    return indices;
+}
+
+bool contains(const PathSequence& paths, py::object path) {
+    const std::string text(PathBytes(std::move(path)).view());
+    const py::gil_scoped_release released;
+    return paths.contains(text);
+}
+
+bool areEqual(const PathSequence& left, const PathSequence& right) {
+    if (left.size() != right.size()) return false;
+    bool equal = false;
+    std::stop_source stop;
+    runInterruptibly(
+        stop, [&] { equal = left == right; }, [] {});
+    return equal;
+}
+
+PathSequence selected(const PathSequence& paths, const IndexArray& indices) {
+    const auto size = static_cast<std::int64_t>(paths.size());
+    auto chosen = std::make_shared<std::vector<std::uint64_t>>();
+    chosen->reserve(static_cast<std::size_t>(indices.size()));
+    const std::span<const std::int64_t> given(
+        indices.data(), static_cast<std::size_t>(indices.size()));
+    for (const std::int64_t index : given) {
+        if (index < -size || index >= size)
+            throw py::index_error("list index " + std::to_string(index) +
+                                  " is out of range for " +
+                                  std::to_string(size) + " paths");
+        chosen->push_back(
+            static_cast<std::uint64_t>(index < 0 ? index + size : index));
+    }
+    return {paths.stored(), paths.view().selected(std::move(chosen))};
+}
+
+// ---- Views ----
+
+py::tuple stepObject(const View::Slice& slice, std::uint64_t size) {
+    return py::make_tuple("slice", slice.first, slice.step, size);
+}
+
+py::tuple stepObject(const KeyedPermutation& order, std::uint64_t) {
+    return py::make_tuple("shuffled", order.key());
+}
+
+py::tuple stepObject(const View::Selection& selection, std::uint64_t size) {
+    IndexArray numbers(static_cast<py::ssize_t>(size));
+    for (std::size_t i = 0; i < selection->size(); ++i)
+        numbers.mutable_at(static_cast<py::ssize_t>(i)) =
+            static_cast<std::int64_t>((*selection)[i]);
+    return py::make_tuple("select", numbers);
+}
+
+py::list stepsOf(const PathSequence& paths) {
+    py::list list;
+    for (const View::Step& step : paths.view().steps())
+        list.append(std::visit(
+            [&](const auto& map) { return stepObject(map, step.size); },
+            step.map));
+    return list;
+}
+
+PathSequence sliced(const PathSequence& paths, std::uint64_t first,
+                    std::int64_t step, std::uint64_t count) {
+    const std::uint64_t size = paths.size();
+    const std::uint64_t last =
+        first + (count - 1) * static_cast<std::uint64_t>(step);
+    if (count > 0 && (first >= size || last >= size || count > size))
+        throw py::index_error("the slice is not within the list");
+    return {paths.stored(), paths.view().sliced(first, step, count)};
+}
+
+void bindPathSequence(py::module_& module) {
+    py::class_<PathSequence>(module, "PathSequence")
+        .def(py::init([](const std::shared_ptr<StoredList>& stored) {
+            return PathSequence(stored);
+        }))
+        .def("__len__", &PathSequence::size)
+        .def("at", &pathAt)
+        .def("block", &blockOf)
+        .def("indices_of", &indicesOf)
+        .def("contains", &contains)
+        .def("equals", &areEqual)
+        .def("slice", &sliced)
+        .def("shuffled",
+             [](const PathSequence& paths, std::uint64_t seed) {
+                 return PathSequence(paths.stored(),
+                                     paths.view().shuffled(seed));
+             })
+        .def("select", &selected)
+        .def("steps", &stepsOf)
+        .def_property_readonly(
+            "is_whole",
+            [](const PathSequence& paths) { return paths.view().isWhole(); })
+        .def_property_readonly(
+            "heap_bytes",
+            [](const PathSequence& paths) { return paths.view().heapBytes(); })
+        .def_property_readonly("stored", [](const PathSequence& paths) {
+            return shared(paths.stored());
+        });
+}
+
+// ---- Packing ----
+
+void bindPacker(py::module_& module) {
+    py::enum_<ArchiveLevel>(module, "Level")
+        .value("fast", ArchiveLevel::Fast)
+        .value("normal", ArchiveLevel::Normal)
+        .value("best", ArchiveLevel::Best);
+    py::class_<Packer>(module, "Packer")
+        .def(py::init<std::string, ArchiveLevel, py::object>())
+        .def_static("append_to", &Packer::appendTo)
+        .def("add_iterable", &Packer::addIterable)
+        .def("add_sequence", &Packer::addSequence)
+        .def("add_list_file", &Packer::addListFile)
+        .def("add_folder",
+             [](Packer& packer, const std::string& folder) {
+                 const auto report = packer.addFolder(folder);
+                 return py::make_tuple(report.foldersSkipped,
+                                       py::bytes(report.firstSkipped),
+                                       report.firstReason);
+             })
+        .def("finish", [](Packer& packer) { return shared(packer.finish()); });
+}
+
+}  // namespace
+
+PYBIND11_MODULE(_core, module) {
+    registerErrors(module);
+    bindStoredList(module);
+    bindPathSequence(module);
+    bindPacker(module);
+}
+
+}  // namespace tessel::python

@@ -1,0 +1,111 @@
+#include "hosts/python/PathSequence.hpp"
+
+#include <algorithm>
+#include <numeric>
+
+#include "hosts/python/Errors.hpp"
+#include "paths/PathList.hpp"
+
+namespace tessel::python {
+
+namespace {
+
+// The folder that a path is in, as FindOptions takes it.
+std::string folderOf(std::string_view path) {
+    const std::size_t slash = path.rfind('/');
+    return std::string(
+        path.substr(0, slash == std::string_view::npos ? 0 : slash + 1));
+}
+
+// Paths of a list that are compared at a time: a few hundred kilobytes.
+constexpr std::uint64_t comparedPaths = 4096;
+
+bool equalInRange(const PathSequence& left, const PathSequence& right,
+                  std::uint64_t first, std::uint64_t last) {
+    paths::PathList texts;
+    left.read(first, last, [&](std::string_view path) { texts.append(path); });
+    std::size_t i = 0;
+    bool equal = true;
+    right.read(first, last, [&](std::string_view path) {
+        equal = equal && texts[i++] == path;
+    });
+    return equal;
+}
+
+}  // namespace
+
+// ---- Reading ----
+
+std::string PathSequence::operator[](std::uint64_t index) const {
+    return namingArchive(stored_->file(),
+                         [&] { return archive()[view_[index]]; });
+}
+
+void PathSequence::read(std::uint64_t first, std::uint64_t last,
+                        Visitor visitor) const {
+    const auto start = view_.start();
+    if (!start) {
+        std::vector<std::uint64_t> indices(last - first);
+        std::iota(indices.begin(), indices.end(), first);
+        return read(std::move(indices), visitor);
+    }
+    namingArchive(stored_->file(), [&] {
+        archive().forEach(
+            *start + first, *start + last,
+            [&](std::uint64_t, std::string_view path) { visitor(path); });
+    });
+}
+
+void PathSequence::read(std::vector<std::uint64_t> indices,
+                        Visitor visitor) const {
+    view_.toNumbers(indices);
+    namingArchive(stored_->file(), [&] {
+        archive().read(indices, [&](std::uint64_t, std::string_view path) {
+            visitor(path);
+        });
+    });
+}
+
+// ---- Indices by path ----
+
+std::vector<std::uint64_t> PathSequence::numbersOf(
+    std::string_view path) const {
+    if (path.empty() || !archive().contains(path)) return {};
+    std::vector<std::uint64_t> numbers;
+    const std::string_view texts[] = {path};
+    FindOptions options;
+    options.folder = folderOf(path);
+    archive().findEach(
+        texts,
+        [&](std::uint64_t number, std::string_view found) {
+            if (found == path) numbers.push_back(number);
+        },
+        options);
+    return numbers;
+}
+
+std::vector<std::uint64_t> PathSequence::indicesOf(
+    std::string_view path) const {
+    return namingArchive(stored_->file(),
+                         [&] { return view_.indicesOf(numbersOf(path)); });
+}
+
+bool PathSequence::contains(std::string_view path) const {
+    if (!view_.isWhole()) return !indicesOf(path).empty();
+    return namingArchive(stored_->file(), [&] {
+        return !path.empty() && archive().contains(path);
+    });
+}
+
+// ---- Comparison ----
+
+bool operator==(const PathSequence& left, const PathSequence& right) {
+    if (left.size() != right.size()) return false;
+    for (std::uint64_t first = 0; first < left.size(); first += comparedPaths)
+        if (!equalInRange(left, right, first,
+                          std::min(first + comparedPaths, left.size())))
+            return false;
+    return true;
+}
+
+}  // namespace tessel::python
