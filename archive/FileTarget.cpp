@@ -25,10 +25,37 @@ constexpr std::size_t maxNameInPrefix = 200;
     throw std::system_error(errno, std::generic_category(), file);
 }
 
-// The file that is to be replaced: the target, or what it links to.
+void requireRegular(const std::string& file) {
+    struct stat status {};
+    if (::stat(file.c_str(), &status) != 0 || S_ISREG(status.st_mode)) return;
+    if (!S_ISDIR(status.st_mode))
+        throw std::system_error(EINVAL, std::generic_category(),
+                                file + ": not a regular file");
+    errno = EISDIR;
+    fail(file);
+}
+
+// The file that is to be replaced: the target, or what it links to, which need
+// not exist.
 std::string replacedFile(const std::string& file) {
-    if (!fs::is_symlink(fs::symlink_status(file))) return file;
-    return fs::weakly_canonical(file).string();
+    constexpr int maxLinks = 40;  // as Linux has it
+    fs::path path(file);
+    std::error_code none;
+    for (int links = 0; fs::is_symlink(fs::symlink_status(path, none));
+         ++links) {
+        if (links == maxLinks) {
+            errno = ELOOP;
+            fail(file);
+        }
+        path = path.parent_path() / fs::read_symlink(path);
+    }
+    return path.string();
+}
+
+std::string hiddenPrefix(std::string_view name) {
+    std::string prefix(1, '.');
+    prefix.append(name.substr(0, maxNameInPrefix));
+    return prefix.append(".tessel-");
 }
 
 std::string randomName() {
@@ -66,19 +93,23 @@ void removeLeftovers(const std::string& folder, std::string_view prefix) {
 
 }  // namespace
 
-FileTarget::FileTarget(const std::string& file) : file_(replacedFile(file)) {
-    struct stat status {};
-    if (::stat(file_.c_str(), &status) == 0 && !S_ISREG(status.st_mode)) {
-        errno = S_ISDIR(status.st_mode) ? EISDIR : EINVAL;
-        fail(file_);
-    }
+FileTarget::FileTarget(const std::string& file) {
+    requireRegular(file);
+    file_ = replacedFile(file);
     const std::size_t nameAt = file_.rfind('/') + 1;
     folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
-    prefix_ = '.';
-    prefix_ += file_.substr(nameAt, maxNameInPrefix);
-    prefix_ += ".tessel-";
+    prefix_ = hiddenPrefix(std::string_view(file_).substr(nameAt));
     removeLeftovers(folder_, prefix_);
     createTemporary();
+}
+
+bool FileTarget::isHiddenFile(const std::string& target,
+                              std::string_view path) {
+    // Nearly no other path gets as far as a look at the target.
+    if (!path.ends_with(suffix)) return false;
+    const fs::path name = fs::path(replacedFile(target)).filename();
+    return isHiddenName(path.substr(path.rfind('/') + 1),
+                        hiddenPrefix(name.native()));
 }
 
 FileTarget::~FileTarget() {
@@ -108,7 +139,7 @@ bool FileTarget::tryCreate() {
                          O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
     if (descriptor_ < 0) {
         if (errno == EEXIST) return false;
-        fail(temporary_);
+        fail(file_);
     }
     struct stat status {};
     if (::flock(descriptor_, LOCK_EX | LOCK_NB) == 0 &&
@@ -122,7 +153,7 @@ bool FileTarget::tryCreate() {
 void FileTarget::takePermissions() const {
     struct stat old {};
     if (::stat(file_.c_str(), &old) != 0) return;
-    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0) fail(temporary_);
+    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0) fail(file_);
 }
 
 void FileTarget::append(Bytes bytes) {
@@ -139,7 +170,7 @@ void FileTarget::write(Bytes bytes, std::uint64_t offset) const {
                      static_cast<off_t>(offset));
         if (written < 0) {
             if (errno == EINTR) continue;
-            fail(temporary_);
+            fail(file_);
         }
         bytes = bytes.subspan(static_cast<std::size_t>(written));
         offset += static_cast<std::uint64_t>(written);
@@ -147,7 +178,7 @@ void FileTarget::write(Bytes bytes, std::uint64_t offset) const {
 }
 
 void FileTarget::commit() {
-    if (::fsync(descriptor_) != 0) fail(temporary_);
+    if (::fsync(descriptor_) != 0) fail(file_);
     if (::rename(temporary_.c_str(), file_.c_str()) != 0) fail(file_);
     temporary_.clear();
     flushFolder();

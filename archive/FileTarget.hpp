@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <string>
+#include <string_view>
 
 #include "archive/ArchiveTarget.hpp"
 
@@ -17,7 +18,7 @@ namespace tessel::archive {
 // it.
 //
 // The new file has the permissions of the old one, if there was one. If the
-// target is a symbolic link, what it points to is replaced.
+// target is a symbolic link, what it points to is replaced, or made.
 //
 // All members throw std::system_error, which names the file.
 class FileTarget final : public ArchiveTarget {
@@ -30,6 +31,10 @@ public:
     void append(Bytes bytes) override;
     void rewriteStart(Bytes bytes) override;
     void commit() override;
+
+    // Whether a path names a hidden file of a writer of this target, so that
+    // whoever lists the target's folder can leave it out.
+    static bool isHiddenFile(const std::string& target, std::string_view path);
 
 private:
     void createTemporary();

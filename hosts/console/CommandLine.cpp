@@ -4,7 +4,9 @@
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
+#include <charconv>
 #include <sstream>
+#include <system_error>
 #include <utility>
 
 #include "hosts/console/ConsoleException.hpp"
@@ -14,24 +16,51 @@ namespace tessel::console {
 namespace {
 
 // Marks words that the parser would not take as they are: "[ab]" would be a
-// list of values, "" nothing. No user types this character.
+// list of values, "" nothing. A word that starts with this character is marked
+// as well, so that it keeps its own when the mark is taken away.
 constexpr char protection = '\x1f';
 
-std::string protect(const std::string& word) {
-    return word.empty() || word.front() == '[' ? protection + word : word;
+bool needsProtection(std::string_view word) noexcept {
+    return word.empty() || word.front() == '[' || word.front() == protection;
 }
 
-// Empty if the word is a number, otherwise what is wrong with it. The parser
-// by itself takes "-1" for a very large number.
-std::string problemOfNumber(const std::string& word) {
-    const bool isNumber =
-        !word.empty() &&
-        word.find_first_not_of("0123456789") == std::string::npos;
-    return isNumber ? "" : fmt::format("'{}' is no number from 0 on", word);
+std::string protect(const std::string& word) {
+    return needsProtection(word) ? protection + word : word;
+}
+
+// The same for the value in "--name=value".
+std::string protectFlag(std::string word) {
+    const std::size_t value = word.find('=') + 1;
+    if (word.starts_with("--") && value > 0 &&
+        needsProtection(std::string_view(word).substr(value)))
+        word.insert(value, 1, protection);
+    return word;
 }
 
 void unprotect(std::string& word) {
     if (word.starts_with(protection)) word.erase(0, 1);
+}
+
+// The words as the parser takes them: from the back, with marks.
+std::vector<std::string> wordsForParser(std::span<const std::string> words) {
+    std::vector<std::string> reversed;
+    bool flagsEnded = false;
+    for (const std::string& word : words) {
+        reversed.push_back(protect(flagsEnded ? word : protectFlag(word)));
+        flagsEnded |= word == "--";
+    }
+    std::ranges::reverse(reversed);
+    return reversed;
+}
+
+// Empty if the word is a number, otherwise what is wrong with it. The parser
+// by itself takes "-1" and numbers from 2^64 on for the largest number.
+std::string problemOfNumber(const std::string& word) {
+    std::uint64_t number = 0;
+    const char* end = word.data() + word.size();
+    const auto read = std::from_chars(word.data(), end, number);
+    if (read.ec == std::errc() && read.ptr == end) return "";
+    return fmt::format("'{}' is no number from 0 to 2^64 - 1", word);
 }
 
 constexpr std::size_t helpColumn = 24;
@@ -56,6 +85,9 @@ std::string wrappedHelp(const std::string& help) {
 }
 
 CLI::Option* described(CLI::Option* option, const std::string& kind) {
+    // As elsewhere, the last one counts, so that scripts and aliases can give
+    // values that a user overrides.
+    if (!option->get_positional()) option->take_last();
     return option->type_name(kind)->description(
         wrappedHelp(option->get_description()));
 }
@@ -127,10 +159,14 @@ void CommandLine::choice(const std::string& names,
 }
 
 void CommandLine::argument(const std::string& name, std::string& target,
-                           Need need, const std::string& help) {
-    words_.push_back(&target);
-    described(app_->add_option(name, target, help), "")
-        ->required(need == Need::Required);
+                           const std::string& help) {
+    value(name, "", target, Need::Required, help);
+}
+
+void CommandLine::argument(const std::string& name,
+                           std::optional<std::string>& target,
+                           const std::string& help) {
+    value(name, "", target, help);
 }
 
 void CommandLine::arguments(const std::string& name,
@@ -142,12 +178,8 @@ void CommandLine::arguments(const std::string& name,
 }
 
 CommandLine::Request CommandLine::parse(std::span<const std::string> words) {
-    // The parser takes the words from the back.
-    std::vector<std::string> reversed;
-    for (auto word = words.rbegin(); word != words.rend(); ++word)
-        reversed.push_back(protect(*word));
     try {
-        app_->parse(std::move(reversed));
+        app_->parse(wordsForParser(words));
     } catch (const CLI::CallForHelp&) {
         return Request::Help;
     } catch (const CLI::ParseError& error) {

@@ -53,7 +53,9 @@ public:
 
     // ---- Arguments, in the order in which they are described ----
 
-    void argument(const std::string& name, std::string& target, Need need,
+    void argument(const std::string& name, std::string& target,
+                  const std::string& help);
+    void argument(const std::string& name, std::optional<std::string>& target,
                   const std::string& help);
     void arguments(const std::string& name, std::vector<std::string>& target,
                    Need need, const std::string& help);

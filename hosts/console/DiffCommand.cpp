@@ -44,10 +44,8 @@ bool writeDifferences(PathSet& before, PathSet& after, ProgressBar& bar,
 }  // namespace
 
 DiffCommand::DiffCommand() : Command(diffDescription) {
-    line().argument("A", before_, CommandLine::Need::Required,
-                    "An archive, or - for standard input");
-    line().argument("B", after_, CommandLine::Need::Required,
-                    "An archive, or - for standard input");
+    line().argument("A", before_, "An archive, or - for standard input");
+    line().argument("B", after_, "An archive, or - for standard input");
     line().flag("-0", nul_, "End each path with NUL instead of newline");
 }
 

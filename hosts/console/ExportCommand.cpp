@@ -56,8 +56,7 @@ struct CountedPaths {
 }  // namespace
 
 ExportCommand::ExportCommand() : Command(exportDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().value("-o", "STORE", store_, CommandLine::Need::Required,
                  "The store to write, or - for standard output");
     line().flag("-f", force_, "Replace STORE if it exists");

@@ -31,8 +31,7 @@ std::vector<std::string_view> viewsOf(const std::vector<std::string>& texts) {
 }  // namespace
 
 FindCommand::FindCommand() : Command(findDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().arguments("TEXT", patterns_, CommandLine::Need::Required,
                      "What paths have to contain, or a pattern");
     line().flag("--glob", glob_, "Each TEXT is a shell pattern");

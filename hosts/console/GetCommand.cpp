@@ -35,8 +35,7 @@ std::string outOfRange(const std::string& where, std::uint64_t size) {
 }  // namespace
 
 GetCommand::GetCommand() : Command(getDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().arguments("N", words_, CommandLine::Need::Optional,
                      "Numbers from 0, negative ones from the end; N-M is a "
                      "range with both ends; - reads one of these per line "

@@ -19,8 +19,7 @@ constexpr Command::Description infoDescription = {
 }  // namespace
 
 InfoCommand::InfoCommand() : Command(infoDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().flag("--json", json_, "Write JSON instead of a table");
     line().value("--plot", "OUT.svg", plot_,
                  "Draw how the file's bytes divide, and the lengths of paths; "

@@ -41,8 +41,7 @@ std::string lossText(const SalvageReport& report) {
 }  // namespace
 
 ListCommand::ListCommand() : Command(listDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().flag("-0", nul_, "End each path with NUL instead of newline");
     line().flag("--numbers", numbers_,
                 "Write each path's number and a tab before it");
@@ -85,9 +84,17 @@ ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {
     };
     InputFile input(file_, session.interrupts);
     const SalvageReport report = inFile(input.name(), [&] {
-        return input.isRegular() && file_ != "-"
-                   ? PathArchive::salvage(file_, write)
-                   : PathArchive::salvage(input.readAll(), write);
+        try {
+            return input.isRegular() && file_ != "-"
+                       ? PathArchive::salvage(file_, write)
+                       : PathArchive::salvage(input.readAll(), write);
+        } catch (const DamagedArchiveException& damage) {
+            // Nothing was found, so that no other command finds more.
+            throw ConsoleException(
+                ExitStatus::Damaged,
+                fmt::format("{}: {}; nothing can be read from it", input.name(),
+                            damage.what()));
+        }
     });
     session.output.flush();
     if (report.lost.empty() && report.complete && report.damages.empty()) {

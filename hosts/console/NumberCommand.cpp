@@ -21,8 +21,7 @@ constexpr Command::Description numberDescription = {
 }  // namespace
 
 NumberCommand::NumberCommand() : Command(numberDescription) {
-    line().argument("FILE", file_, CommandLine::Need::Required,
-                    "The archive, or - for standard input");
+    line().argument("FILE", file_, "The archive, or - for standard input");
     line().arguments("PATH", paths_, CommandLine::Need::Required,
                      "Paths; - reads one per line from standard input. Of a "
                      "path that is there more than once, the first number is "

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "archive/ArchiveWriter.hpp"
+#include "archive/FileTarget.hpp"
 #include "archive/PathArchive.hpp"
 #include "hosts/console/ArchiveFile.hpp"
 #include "hosts/console/Failure.hpp"
@@ -126,7 +127,7 @@ private:
 };
 
 PackCommand::PackCommand() : Command(packDescription) {
-    line().argument("LIST", list_, CommandLine::Need::Optional,
+    line().argument("LIST", list_,
                     "The list, - for standard input (default); paths end with "
                     "newline. A saved store or an archive is a list, too");
     line().value("-o", "FILE", file_, CommandLine::Need::Required,
@@ -178,10 +179,9 @@ ExitStatus PackCommand::run(Session& session) {
 void PackCommand::checkWords(const Session& session) const {
     if (append_ && force_) line().fail("--append and -f exclude each other");
     if (append_ && file_ == "-") line().fail("--append needs a file");
-    if (folder_ && !list_.empty())
-        line().fail("give either a list or --walk FOLDER");
+    if (folder_ && list_) line().fail("give either a list or --walk FOLDER");
     if (showFolders_ && !folder_) line().fail("--folders needs --walk");
-    if (!folder_ && list_.empty() && isTerminal(0))
+    if (!folder_ && !list_ && isTerminal(0))
         line().fail("no list given; name a file, use a pipe, or - to type it");
     checkNoTerminal(file_, session);
     checkOverwrite(file_,
@@ -191,9 +191,12 @@ void PackCommand::checkWords(const Session& session) const {
 void PackCommand::readInput(ListInput& input,
                             const ListInput::Sink& sink) const {
     if (folder_)
-        input.walk(*folder_, showFolders_, sink);
+        input.walk(*folder_, showFolders_, [&](std::string_view path) {
+            // The archive may be written below the folder that is walked.
+            if (!archive::FileTarget::isHiddenFile(file_, path)) sink(path);
+        });
     else
-        input.readList(list_.empty() ? "-" : list_, sink);
+        input.readList(list_.value_or("-"), sink);
 }
 
 }  // namespace tessel::console

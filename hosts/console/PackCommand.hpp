@@ -20,7 +20,7 @@ private:
     void checkWords(const Session& session) const;
     void readInput(ListInput& input, const ListInput::Sink& sink) const;
 
-    std::string list_;
+    std::optional<std::string> list_;
     std::string file_;
     std::optional<std::string> folder_;
     bool showFolders_ = false;

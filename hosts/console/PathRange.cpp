@@ -1,17 +1,25 @@
 #include "hosts/console/PathRange.hpp"
 
 #include <charconv>
+#include <limits>
+#include <system_error>
 
 namespace tessel::console {
 
 namespace {
 
-// Reads a number at the start of the text and removes it.
+using limits = std::numeric_limits<std::int64_t>;
+
+// Reads a number at the start of the text and removes it. One that does not
+// fit becomes the nearest that does; no list is so long.
 std::optional<std::int64_t> takeNumber(std::string_view& text) noexcept {
     std::int64_t number = 0;
     const auto [end, error] =
         std::from_chars(text.data(), text.data() + text.size(), number);
-    if (error != std::errc()) return std::nullopt;
+    if (error == std::errc::result_out_of_range)
+        number = text.front() == '-' ? limits::min() : limits::max();
+    else if (error != std::errc())
+        return std::nullopt;
     text.remove_prefix(static_cast<std::size_t>(end - text.data()));
     return number;
 }

@@ -17,7 +17,8 @@ struct PathRange {
     friend bool operator==(const PathRange&, const PathRange&) = default;
 };
 
-// Reads a number or a range; nothing if the text is none or beyond 2^63.
+// Reads a number or a range; nothing if the text is none. Numbers beyond 2^63
+// become the nearest that fits, which no list has.
 std::optional<PathRange> parsePathRange(std::string_view text) noexcept;
 
 // The numbers of a list of so many paths that a range means; nothing if one of

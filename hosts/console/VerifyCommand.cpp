@@ -69,9 +69,9 @@ void VerifyCommand::verify(Session& session, const std::string& file) {
     if (!damages.empty())
         throw ConsoleException(
             ExitStatus::Damaged,
-            fmt::format("{}: damaged in {} places; `tessel list --salvage` "
-                        "reads what is left",
-                        file, damages.size()));
+            fmt::format("{}: damaged in {} place{}; `tessel list "
+                        "--salvage` reads what is left",
+                        file, damages.size(), damages.size() == 1 ? "" : "s"));
     if (!isQuiet())
         session.output.write(
             fmt::format("{}: intact, {} paths\n", file, archive.size()));

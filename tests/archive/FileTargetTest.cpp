@@ -92,6 +92,32 @@ TEST_F(FileTargetTest, ReplacesWhatALinkPointsTo) {
     EXPECT_EQ(get("elsewhere/list"), "abc");
 }
 
+TEST_F(FileTargetTest, MakesWhatALinkPointsTo) {
+    fs::create_symlink("second", at("first"));
+    fs::create_symlink(at("list"), at("second"));
+    FileTarget target(at("first"));
+    writeAbc(target);
+    target.commit();
+    EXPECT_TRUE(fs::is_symlink(at("first")));
+    EXPECT_TRUE(fs::is_symlink(at("second")));
+    EXPECT_EQ(get("list"), "abc");
+}
+
+TEST_F(FileTargetTest, KnowsHiddenFilesOfATarget) {
+    fs::create_symlink("list", at("link"));
+    for (const char* target : {"list", "link"}) {
+        const auto isHidden = [&](const char* path) {
+            return FileTarget::isHiddenFile(at(target), path);
+        };
+        EXPECT_TRUE(isHidden(".list.tessel-abc123.tmp"));
+        EXPECT_TRUE(isHidden("a/b/.list.tessel-abc123.tmp"));
+        EXPECT_FALSE(isHidden(".list.tessel-abc123.tmpx"));
+        EXPECT_FALSE(isHidden(".list.tessel-abc1234.tmp"));
+        EXPECT_FALSE(isHidden(".other.tessel-abc123.tmp"));
+        EXPECT_FALSE(isHidden(".list.tessel-abc123.tmp/x"));
+    }
+}
+
 TEST_F(FileTargetTest, RemovesWhatAKilledWriterLeft) {
     put(".list.tessel-abc123.tmp", "left");
     put(".list.tessel-abc123.tmpx", "not ours");
@@ -122,8 +148,10 @@ TEST_F(FileTargetTest, ALongNameIsCutInTheHiddenOne) {
 }
 
 TEST_F(FileTargetTest, ErrorsNameTheFile) {
+    fs::create_symlink("loop", at("loop"));
     for (const auto& [file, code] :
          {std::pair{at("no/such/list"), std::errc::no_such_file_or_directory},
+          {at("loop"), std::errc::too_many_symbolic_link_levels},
           {folder_.string(), std::errc::is_a_directory},
           {std::string("/dev/null"), std::errc::invalid_argument}}) {
         try {
@@ -131,6 +159,8 @@ TEST_F(FileTargetTest, ErrorsNameTheFile) {
             ADD_FAILURE() << file;
         } catch (const std::system_error& error) {
             EXPECT_EQ(error.code(), code) << error.what();
+            EXPECT_TRUE(std::string(error.what()).starts_with(file + ": "))
+                << error.what();
         }
     }
 }

@@ -14,7 +14,7 @@ using Strings = std::vector<std::string>;
 class CommandLineTest : public testing::Test {
 protected:
     CommandLineTest() : line_("tessel try", "Try it", "  tessel try x") {
-        line_.argument("FILE", file_, CommandLine::Need::Required, "A file");
+        line_.argument("FILE", file_, "A file");
         line_.arguments("WORD", words_, CommandLine::Need::Optional, "Words");
         line_.flag("-0", nul_, "A flag");
         line_.value("--folder", "F", folder_, "A value");
@@ -65,6 +65,46 @@ TEST_F(CommandLineTest, TakesWordsAsTheyAre) {
     EXPECT_EQ(folder_, "[c]");
 }
 
+TEST_F(CommandLineTest, TakesBytesThatItUsesItself) {
+    parse({"\x1f", "\x1f[a]", "\x1f\x1f", "--folder", "\x1fx"});
+    EXPECT_EQ(file_, "\x1f");
+    EXPECT_EQ(words_, (Strings{"\x1f[a]", "\x1f\x1f"}));
+    EXPECT_EQ(folder_, "\x1fx");
+}
+
+TEST_F(CommandLineTest, TakesValuesAfterAnEqualsSign) {
+    for (const std::string value : {"", "[c]", "\x1f", "\x1fx", "a=b", "="}) {
+        parse({"f", "--folder=" + value});
+        EXPECT_EQ(folder_, value);
+    }
+    parse({"f", "--", "--folder=", "--folder=\x1f"});
+    EXPECT_EQ(words_, (Strings{"--folder=", "--folder=\x1f"}));
+}
+
+TEST_F(CommandLineTest, TheLastOfSeveralValuesCounts) {
+    parse({"f", "-j", "2", "--folder", "x", "--level", "high", "-j3",
+           "--folder=y", "--level", "low", "-0", "-0"});
+    EXPECT_EQ(threads_, 3U);
+    EXPECT_EQ(folder_, "y");
+    EXPECT_EQ(level_, "low");
+    EXPECT_TRUE(nul_);
+}
+
+TEST_F(CommandLineTest, TellsAnEmptyArgumentFromNone) {
+    CommandLine line("tessel try", "Try it", "  tessel try x");
+    std::optional<std::string> list;
+    line.argument("LIST", list, "A list");
+    line.parse({});
+    EXPECT_FALSE(list);
+    line.parse(Strings{""});
+    EXPECT_EQ(list, "");
+}
+
+TEST_F(CommandLineTest, TakesNumbersUpToTheirLimit) {
+    parse({"f", "-j", "18446744073709551615"});
+    EXPECT_EQ(threads_, UINT64_MAX);
+}
+
 TEST_F(CommandLineTest, TwoDashesEndTheFlags) {
     parse({"-0", "--", "f", "-0", "--folder"});
     EXPECT_EQ(words_, (Strings{"-0", "--folder"}));
@@ -81,7 +121,8 @@ TEST_F(CommandLineTest, RefusesInOneLineThatPointsToTheHelp) {
     for (const Strings& words :
          {Strings{}, Strings{"f", "--no"}, Strings{"f", "-x"},
           Strings{"f", "--folder"}, Strings{"f", "-j", "x"},
-          Strings{"f", "-j", "-1"}, Strings{"f", "--level", "middle"}}) {
+          Strings{"f", "-j", "-1"}, Strings{"f", "-j", "18446744073709551616"},
+          Strings{"f", "-j", ""}, Strings{"f", "--level", "middle"}}) {
         const std::string line = failureOf(words);
         EXPECT_TRUE(line.ends_with("; see `tessel try --help`"))
             << line << testing::PrintToString(words);

@@ -137,6 +137,10 @@ def test_a_folder_is_walked(tessel):
     assert sorted(tessel.list("b.tessel")) == [
         b"top/b", b"top/b/deep", b"top/b/deep/\xff", b"top/b/x", b"top/empty",
         b"top/link", b"top/z"]
+    # The file that is being written does not see itself.
+    tessel("pack", "--walk", "top", "-o", "top/a.tessel")
+    assert tessel.list("top/a.tessel") == tessel.list()
+    (top / "a.tessel").unlink()
     tessel("pack", "--walk", "none", "-o", "c.tessel", expect=5)
     tessel("pack", "--walk", "top/z", "-o", "c.tessel", expect=5)
     assert not (tessel.folder / "c.tessel").exists()
@@ -195,7 +199,10 @@ def test_wrong_words(tessel, words):
 def test_what_the_system_refuses(tessel):
     tessel("pack", "none", "-o", "a.tessel", expect=5)
     tessel("pack", ".", "-o", "a.tessel", expect=5)
-    tessel("pack", "-o", "none/a.tessel", input=b"a\n", expect=5)
+    refused = tessel("pack", "-o", "none/a.tessel", input=b"a\n", expect=5)
+    assert refused.err.startswith(b"tessel: none/a.tessel: "), refused.err
+    # An empty name, as an unset variable gives it, is not standard input.
+    tessel("pack", "", "-o", "a.tessel", input=b"a\n", expect=5)
     assert tessel.leftovers() == []
     (tessel.folder / "text").write_bytes(b"no archive\n")
     tessel("pack", "-o", "text", "--append", input=b"a\n", expect=4)

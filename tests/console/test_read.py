@@ -59,7 +59,8 @@ def test_get_answers_in_the_order_asked(tessel, paths):
 def test_get_checks_before_it_writes(tessel):
     tessel.pack([b"a", b"b", b"c"])
     for words in [["0", "3"], ["0", "-4"], ["1-3"], ["2-1"], ["0-99999999999"],
-                  ["9223372036854775807"]]:
+                  ["9223372036854775807"], ["99999999999999999999"],
+                  ["-9223372036854775809-1"]]:
         done = tessel("get", "a.tessel", *words, expect=3)
         assert done.out == b"" and b"out of range" in done.err
     for words in [["0", "x"], ["1-"], ["1-2-3"], ["0x1"], [""], []]:
@@ -300,6 +301,13 @@ def test_salvage(tessel):
         lost |= set(range(int(first), int(last or first) + 1))
     assert len(lost) == int(report[2]) > 0
     assert lost | {int(n) for n, _ in kept} == set(range(len(paths)))
+
+
+def test_salvage_of_what_is_no_archive(tessel):
+    (tessel.folder / "text").write_bytes(b"no archive\n")
+    done = tessel("list", "text", "--salvage", expect=4)
+    assert done.err.count(b"\n") == 1
+    assert b"--salvage" not in done.err
 
 
 def test_damage_is_told_everywhere(tessel):
