@@ -7,10 +7,12 @@
 #include "hosts/console/Console.hpp"
 #include "hosts/console/ConsoleException.hpp"
 #include "hosts/console/ExitStatus.hpp"
+#include "hosts/console/StandardStreams.hpp"
 
 int main(int wordCount, char** words) {
     namespace console = tessel::console;
     try {
+        console::takeStandardDescriptors();
         console::Interrupts interrupts;
         console::OutputBuffer output(STDOUT_FILENO, "standard output");
         console::OutputBuffer errors(STDERR_FILENO, "standard error");

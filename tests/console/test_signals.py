@@ -20,6 +20,29 @@ def wait_for_leftover(tessel, run):
         time.sleep(0.001)
 
 
+@pytest.mark.parametrize("closed", [[0], [1], [2], [0, 1], [1, 2], [0, 1, 2]])
+def test_closed_descriptors_are_told(tessel, closed):
+    tessel.pack([b"a/b", b"c/d"])  # eight bytes, which an eventfd would take
+
+    def run(*words):
+        done = tessel.start(*words, stderr=subprocess.PIPE,
+                            stdout=subprocess.PIPE, stdin=subprocess.DEVNULL,
+                            preexec_fn=lambda: [os.close(c) for c in closed])
+        output, errors = done.communicate(timeout=60)
+        return done.returncode, output, errors
+
+    status, _, errors = run("list", "a.tessel")
+    assert status == (5 if 1 in closed else 0)
+    if 1 in closed and 2 not in closed:
+        assert errors == b"tessel: standard output: Bad file descriptor\n"
+    status, _, errors = run("pack", "-", "-o", "b.tessel", "-q")
+    assert status == (5 if 0 in closed else 0)
+    if 0 in closed and 2 not in closed:
+        assert errors == b"tessel: standard input: Bad file descriptor\n"
+    run("pack", "a.tessel", "-o", "c.tessel")
+    assert tessel.list("c.tessel") == [b"a/b", b"c/d"]
+
+
 @pytest.mark.parametrize("number,status", [
     (signal.SIGINT, 130), (signal.SIGTERM, 143), (signal.SIGHUP, 129)])
 @pytest.mark.parametrize("flag", ["-f", "--append"])
