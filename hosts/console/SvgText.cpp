@@ -17,6 +17,12 @@ std::string_view anchorName(TextAnchor anchor) noexcept {
     return anchor == TextAnchor::Middle ? "middle" : "end";
 }
 
+// XML 1.0 has no way to write control characters, U+FFFE and U+FFFF.
+bool isAllowedInXml(std::string_view character) noexcept {
+    return static_cast<unsigned char>(character.front()) >= 0x20 &&
+           character != "\xEF\xBF\xBE" && character != "\xEF\xBF\xBF";
+}
+
 void appendCharacter(std::string_view character, std::string& text) {
     if (character == "<")
         text += "&lt;";
@@ -26,8 +32,7 @@ void appendCharacter(std::string_view character, std::string& text) {
         text += "&amp;";
     else if (character == "\"")
         text += "&quot;";
-    else if (!isUtf8(character) ||
-             static_cast<unsigned char>(character.front()) < 0x20)
+    else if (!isUtf8(character) || !isAllowedInXml(character))
         text += "\xEF\xBF\xBD";
     else
         text += character;

@@ -13,6 +13,8 @@ using tessel::console::xmlText;
 TEST(SvgText, EscapesWhatXmlCannotHold) {
     EXPECT_EQ(xmlText("a<b>&\"c"), "a&lt;b&gt;&amp;&quot;c");
     EXPECT_EQ(xmlText("\xC3\xBC"), "\xC3\xBC");
+    EXPECT_EQ(xmlText("\xEF\xBF\xBE\xEF\xBF\xBF\xEF\xBF\xBC"),
+              "\xEF\xBF\xBD\xEF\xBF\xBD\xEF\xBF\xBC");
     EXPECT_EQ(xmlText("a\xFF\n"), "a\xEF\xBF\xBD\xEF\xBF\xBD");
 }
 
