@@ -29,14 +29,37 @@ OutputBuffer::OutputBuffer(int descriptor, std::string name)
 }
 
 void OutputBuffer::flush() {
+    if (background_) {
+        background_->write(buffer_);
+        return background_->wait();
+    }
     writeAll(buffer_);
     buffer_.clear();
 }
 
 void OutputBuffer::writeLarge(std::string_view bytes) {
-    flush();
-    if (bytes.size() >= capacity) return writeAll(bytes);
+    writeBuffer();
     buffer_.append(bytes);
+    if (bytes.size() >= capacity) flush();
+}
+
+void OutputBuffer::writeBuffer() {
+    if (wroteFirst_ && !background_) startBackground();
+    wroteFirst_ = true;
+    if (!background_) return flush();
+    background_->write(buffer_);
+    buffer_.reserve(capacity);
+}
+
+// Without a second core or a thread, writing goes on in the foreground.
+void OutputBuffer::startBackground() {
+    if (std::thread::hardware_concurrency() < 2) return;
+    try {
+        background_ = std::make_unique<BackgroundWriter>(
+            [this](std::string_view bytes) { writeAll(bytes); });
+    } catch (const std::system_error&) {
+        background_ = nullptr;
+    }
 }
 
 void OutputBuffer::writeAll(std::string_view bytes) {
