@@ -137,9 +137,9 @@ public:
     static PathStore load(std::span<const std::uint8_t> bytes);
 
     // The same with a file. A file of that name is replaced once the new one
-    // is safely on disk, so that there is always a whole one. Throw
-    // std::system_error, whose message has the file's name, besides what save
-    // and load throw.
+    // is safely on disk, so that there is always a whole one; a pipe or a
+    // device is written to. Throw std::system_error, whose message has the
+    // file's name, besides what save and load throw.
     void saveFile(const std::string& file) const;
     static PathStore loadFile(const std::string& file);
 

@@ -66,15 +66,17 @@ std::u16string takeTreeString(ByteCursor& cursor) {
     return text;
 }
 
-// True if every number from 1 to pathCount lies in a partition with a track.
-bool hasSoundNumbers(const HuffmanPathTree& coder) {
+// True if every number from 1 to pathCount lies in a partition with a track,
+// and there are no more of them than there can be paths.
+bool hasSoundNumbers(const HuffmanPathTree& coder, std::uint64_t maxPaths) {
     std::uint64_t last = 0;
     for (const std::uint64_t end : coder.partitionEnds) {
         if (end <= last) return false;
         last = end;
     }
     return coder.partitionTracks.size() == coder.partitionEnds.size() &&
-           coder.duplicates.empty() && last == coder.pathCount;
+           coder.duplicates.empty() && last == coder.pathCount &&
+           last <= maxPaths;
 }
 
 // The coder of a stored form, which may be hostile.
@@ -88,6 +90,8 @@ std::unique_ptr<HuffmanPathTree> coderFrom(std::vector<std::uint8_t> form,
     } catch (const UnknownNodeTypeException&) {
         throw DamagedFormException();
     }
+    // A code of one character would encode every path to come as nothing.
+    if (coder->boolTree.size() == 1) throw DamagedFormException();
     if (!treeString.empty() || !coder->boolTree.empty())
         coder->inflateHuffman(treeString);
     return coder;
@@ -120,7 +124,10 @@ std::unique_ptr<HuffmanPathTree> unpackStore(
     if (!cursor.empty()) throw DamagedFormException();
 
     auto coder = coderFrom({formBytes.begin(), formBytes.end()}, treeString);
-    if (!hasSoundNumbers(*coder)) throw DamagedFormException();
+    // A path takes at least a byte of the payload, whose length comes first.
+    const std::uint64_t maxPaths =
+        ByteCursor(formBytes).takeUint(PackedSizeT::Uint64);
+    if (!hasSoundNumbers(*coder, maxPaths)) throw DamagedFormException();
     return coder;
 }
 

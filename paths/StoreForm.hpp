@@ -30,8 +30,9 @@ std::vector<std::uint8_t> packStore(const HuffmanPathTree& coder);
 // The coder that was packed. Bytes may be hostile: throws
 // DamagedFormException, or UnsupportedStoreVersionException if the version is
 // a later one. What it answers has one track and one end per partition, ends
-// that ascend up to its number of paths, and no duplicates; it may still hold
-// tracks that lead nowhere and names that are no path's.
+// that ascend up to its number of paths, no duplicates, and no code or one of
+// several characters; it may still hold tracks that lead nowhere and names
+// that are no path's.
 std::unique_ptr<HuffmanPathTree> unpackStore(
     std::span<const std::uint8_t> bytes);
 

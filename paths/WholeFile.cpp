@@ -20,6 +20,11 @@ namespace {
                             std::string("Cannot ") + verb + " " + file);
 }
 
+// The system would take what is before a NUL for the name.
+void requireNoNul(const char* verb, const std::string& file) {
+    if (file.find('\0') != std::string::npos) fail(verb, file, EINVAL);
+}
+
 class FileDescriptor {
 public:
     explicit FileDescriptor(int descriptor) : number_(descriptor) {}
@@ -61,6 +66,31 @@ std::string folderOf(const std::string& file) {
     return file.substr(0, slash == 0 ? 1 : slash);
 }
 
+void writeAll(const FileDescriptor& to, std::span<const std::uint8_t> bytes,
+              const std::string& file) {
+    while (!bytes.empty()) {
+        const ssize_t written = ::write(to.get(), bytes.data(), bytes.size());
+        if (written < 0 && errno != EINTR) fail("write", file, errno);
+        if (written > 0)
+            bytes = bytes.subspan(static_cast<std::size_t>(written));
+    }
+}
+
+// True for a pipe or a device: it must not make room for a file.
+bool isSpecial(const std::string& file) noexcept {
+    struct stat about {};
+    return ::stat(file.c_str(), &about) == 0 && !S_ISREG(about.st_mode) &&
+           !S_ISDIR(about.st_mode);
+}
+
+void writeInto(const std::string& file, std::span<const std::uint8_t> bytes) {
+    FileDescriptor target(::open(file.c_str(), O_WRONLY | O_CLOEXEC));
+    if (target.get() < 0) fail("write", file, errno);
+    writeAll(target, bytes, file);
+    if (const int error = target.close(); error != 0)
+        fail("write", file, error);
+}
+
 // A new file beside the target, which is removed unless it takes its place.
 class Replacement {
 public:
@@ -73,13 +103,7 @@ public:
     }
 
     void write(std::span<const std::uint8_t> bytes) const {
-        while (!bytes.empty()) {
-            const ssize_t written =
-                ::write(file_.get(), bytes.data(), bytes.size());
-            if (written < 0 && errno != EINTR) fail("write", target_, errno);
-            if (written > 0)
-                bytes = bytes.subspan(static_cast<std::size_t>(written));
-        }
+        writeAll(file_, bytes, target_);
     }
 
     // Moves it to the target's place once its bytes are on disk.
@@ -99,9 +123,12 @@ public:
 
 private:
     static std::string unusedName(const std::string& target) {
+        // Of a long name the beginning, so that the new one is not too long.
+        constexpr std::size_t maxNameBytes = 200;
         std::random_device random;
         const std::size_t slash = target.rfind('/') + 1;
-        return target.substr(0, slash) + "." + target.substr(slash) + "-" +
+        return target.substr(0, slash) + "." +
+               target.substr(slash, maxNameBytes) + "-" +
                std::to_string(::getpid()) + "-" + std::to_string(random()) +
                ".tmp";
     }
@@ -135,6 +162,7 @@ private:
 }  // namespace
 
 std::string readWholeFile(const std::string& file) {
+    requireNoNul("read", file);
     const FileDescriptor source(::open(file.c_str(), O_RDONLY | O_CLOEXEC));
     if (source.get() < 0) fail("read", file, errno);
     std::string text(expectedBytes(source.get()), '\0');
@@ -152,6 +180,8 @@ std::string readWholeFile(const std::string& file) {
 }
 
 void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes) {
+    requireNoNul("write", file);
+    if (isSpecial(file)) return writeInto(file, bytes);
     Replacement replacement(linkTarget(file));
     replacement.write(bytes);
     replacement.commit();

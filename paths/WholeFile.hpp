@@ -13,7 +13,8 @@ std::string readWholeFile(const std::string& file);
 // Writes a file beside the target, waits until it is on disk, and gives it
 // the target's name, so that the target is at any time whole: the old one, the
 // new one, or none if there was none. A symbolic link is followed, and a
-// target keeps its permissions. Throws std::system_error, whose message has
+// target keeps its permissions. A pipe or a device is not replaced: the bytes
+// are written to it. Throws std::system_error, whose message has
 // the file's name; what was written is removed then.
 void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes);
 

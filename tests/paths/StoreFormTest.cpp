@@ -238,6 +238,32 @@ TEST(StoreForm, NumbersThatLieInNoPartitionAreRefused) {
     EXPECT_THROW(PathStore::load(formOf(emptyBatch)), DamagedFormException);
 }
 
+// Whoever adds to such a store would count past the last number.
+TEST(StoreForm, MorePathsThanTheFormHasBytesAreRefused) {
+    const auto withEnd = [](std::uint64_t end) {
+        return formOf([end](HuffmanPathTree& coder) {
+            HuffmanPathTree::FolderTexts folders = {{u"a"}};
+            HuffmanPathTree::FolderTexts files = {{u"b"}};
+            coder.generateCodeAsyncAndAddPaths(folders, files);
+            coder.partitionEnds.back() = coder.pathCount = end;
+        });
+    };
+    EXPECT_EQ(PathStore::load(withEnd(1)).size(), 1U);
+    EXPECT_THROW(PathStore::load(withEnd(1000)), DamagedFormException);
+    EXPECT_THROW(PathStore::load(withEnd(~std::uint64_t{0})),
+                 DamagedFormException);
+}
+
+// Such a code encodes all texts of its character alike: paths that were added
+// to the store would not come back.
+TEST(StoreForm, ACodeOfOneCharacterIsRefused) {
+    HuffmanPathTree coder;
+    coder.boolTree = {true};
+    Bytes form;
+    coder.serialize(form, true);
+    EXPECT_THROW(PathStore::load(enveloped(u"a", form)), DamagedFormException);
+}
+
 TEST(StoreForm, NamesThatAreNoPathsAreRefusedWhenRead) {
     HuffmanPathTree coder;
     const std::vector<double> weights = {2, 1};

@@ -67,6 +67,20 @@ TEST_F(WholeFile, ReadsAPipeToItsEnd) {
     ::close(ends[0]);
 }
 
+TEST_F(WholeFile, WritesToAPipeInsteadOfReplacingIt) {
+    ASSERT_EQ(::mkfifo(path("pipe").c_str(), S_IRUSR | S_IWUSR), 0);
+    const int reader =
+        ::open(path("pipe").c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    ASSERT_GE(reader, 0);
+    replaceFile(path("pipe"), Bytes{'t', 'e', 'x', 't'});
+    EXPECT_TRUE(fs::is_fifo(path("pipe")));
+    EXPECT_EQ(entries(), 1U);
+    std::string text(8, ' ');
+    EXPECT_EQ(::read(reader, text.data(), text.size()), 4);
+    EXPECT_EQ(text.substr(0, 4), "text");
+    ::close(reader);
+}
+
 TEST_F(WholeFile, KeepsTheTargetsPermissions) {
     std::ofstream(path("a")) << "old";
     fs::permissions(path("a"), fs::perms::owner_read | fs::perms::owner_write);
@@ -90,6 +104,22 @@ TEST_F(WholeFile, AFailedReplacementLeavesNothingBehind) {
     EXPECT_THROW(replaceFile(path("folder"), Bytes{'n'}), std::system_error);
     EXPECT_EQ(entries(), 1U);
     EXPECT_EQ(readWholeFile(path("folder/file")), "kept");
+}
+
+TEST_F(WholeFile, ANameMayBeAsLongAsAnyFiles) {
+    constexpr std::size_t longest = 255;
+    const std::string name = path(std::string(longest, 'n'));
+    replaceFile(name, Bytes{'n'});
+    EXPECT_EQ(readWholeFile(name), "n");
+    EXPECT_EQ(entries(), 1U);
+}
+
+TEST_F(WholeFile, ANameWithANulIsNotCutThere) {
+    const std::string name = path(std::string("a\0b", 3));
+    EXPECT_THROW(replaceFile(name, Bytes{'n'}), std::system_error);
+    EXPECT_EQ(entries(), 0U);
+    std::ofstream(path("a")) << "another";
+    EXPECT_THROW(readWholeFile(name), std::system_error);
 }
 
 TEST_F(WholeFile, ErrorsNameTheFile) {
