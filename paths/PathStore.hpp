@@ -75,14 +75,14 @@ public:
     // forward range, otherwise once, and kept as text until it has been added.
     //
     // Throws std::invalid_argument, whose message names the position in the
-    // range, if a path is empty; std::bad_alloc; std::system_error if a thread
-    // cannot be started; and what the range throws. Whatever is thrown, the
-    // store keeps the paths that it had.
+    // range, if a path is empty; std::bad_alloc; and what the range throws.
+    // Whatever is thrown, the store keeps the paths that it had.
     //
     // Cost: proportional to the paths added, on as many threads as the
-    // hardware runs. If a path has a character that no path before had, all
-    // paths are encoded anew, once per call, and for that time the store takes
-    // twice its memory. So append many paths per call, not one per call.
+    // hardware runs and can be started. If a path has a character that no path
+    // before had, all paths are encoded anew, once per call, and for that time
+    // the store takes twice its memory. So append many paths per call, not one
+    // per call.
     template <PathRange Paths>
     void append(Paths&& paths);
     void append(std::string_view path);

@@ -1,56 +1,20 @@
-// What happens when the platform gives no more threads. This program answers
-// for it: pthread_create fails from the n-th call on.
+// What happens when the platform gives no more threads.
 
-#include <dlfcn.h>
 #include <gtest/gtest.h>
-#include <pthread.h>
 
-#include <atomic>
-#include <cerrno>
 #include <system_error>
 
 #include "coder/BatchEncoder.hpp"
 #include "tests/support/Coders.hpp"
-
-namespace {
-
-// Threads that may still be started.
-std::atomic<int> threadsLeft{1 << 30};
-
-using CreateThread = int (*)(pthread_t*, const pthread_attr_t*,
-                             void* (*)(void*), void*);
-
-}  // namespace
-
-// Sanitizers bring their own, under this name.
-extern "C" __attribute__((weak)) int __interceptor_pthread_create(
-    pthread_t* thread, const pthread_attr_t* attributes, void* (*start)(void*),
-    void* argument);
-
-extern "C" int pthread_create(pthread_t* thread,
-                              const pthread_attr_t* attributes,
-                              void* (*start)(void*), void* argument) {
-    if (threadsLeft.fetch_sub(1) <= 0) return EAGAIN;
-    static const CreateThread real = __interceptor_pthread_create != nullptr
-                                         ? &__interceptor_pthread_create
-                                         : reinterpret_cast<CreateThread>(dlsym(
-                                               RTLD_NEXT, "pthread_create"));
-    return real(thread, attributes, start, argument);
-}
+#include "tests/support/FewThreads.hpp"
 
 namespace {
 
 using support::Bytes;
 using support::CoderPtr;
+using support::FewThreads;
 using support::Texts;
 using tessel::HuffmanPathTree;
-
-// For the lifetime of the object only `count` threads can be started.
-class FewThreads {
-public:
-    explicit FewThreads(int count) { threadsLeft = count; }
-    ~FewThreads() { threadsLeft = 1 << 30; }
-};
 
 std::vector<Texts> folders() { return std::vector<Texts>(8, Texts{u"a"}); }
 std::vector<Texts> files() { return std::vector<Texts>(8, Texts{u"b", u"c"}); }
