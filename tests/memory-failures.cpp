@@ -430,6 +430,17 @@ TEST(MemoryFailures, AFormIsAppendedOrNothingOfIt) {
     }
 }
 
+// The output is as long as the form from the start: it does not grow on the
+// way, which would take the form's memory several times.
+TEST(MemoryFailures, AFormTakesItsMemoryOnce) {
+    const CoderPtr coder = support::fourLetterCoder();
+    support::addBatch(*coder, {u"a"}, Texts(20'000, u"abcdabcd"));
+    Bytes out;
+    const support::AllocationMeter meter;
+    coder->serialize(out, false);
+    EXPECT_LT(meter.total(), 2 * out.size());
+}
+
 // zlib takes its own memory, which no wrapper sees.
 TEST(MemoryFailures, ZlibsLackOfMemoryIsNoDamage) {
     const CoderPtr coder = filledCoder();
