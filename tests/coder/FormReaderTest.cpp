@@ -66,6 +66,19 @@ TEST(FormReader, AppendsPartitionsAndReplacesDuplicates) {
     EXPECT_EQ(reader.numbering.partitionAtOrAfter(0, 3), 0U);
 }
 
+TEST(FormReader, MaximaAreThoseOfTheSectionsThatWereRead) {
+    PathNumbering before;
+    before.maxCodeBytes = 100;
+    before.maxPartitionTrackLength = 100;
+    before.maxDuplicateTrackLength = 100;
+    before.maxDuplicatePathNumber = 100;
+    const FormReader reader = readBack(payload(), before);
+    EXPECT_EQ(reader.numbering.maxCodeBytes, 1U);
+    EXPECT_EQ(reader.numbering.maxPartitionTrackLength, 1U);
+    EXPECT_EQ(reader.numbering.maxDuplicateTrackLength, 2U);
+    EXPECT_EQ(reader.numbering.maxDuplicatePathNumber, 3U);
+}
+
 TEST(FormReader, AnUnknownMarkerEndsTheReading) {
     Bytes bytes = payload();
     const Bytes tail = {0, 0, 0, 3, 2, 0, 1};  // the duplicates

@@ -178,6 +178,23 @@ TEST(PathTreeForm, ReadingReplacesTheTree) {
     EXPECT_EQ(stored(copy).structure, (Bytes{0x01, 0x00}));
 }
 
+// A pass goes on through the nodes that it knows.
+TEST(PathTreeForm, ReadingDoesNotResetThePass) {
+    BPathTree tree;
+    addBatch(tree, {"a"}, {"x", "y"});
+    tree.reset();
+    tessel::Components path;
+    tree.getNextPath(path);
+    read(tree, {0x00}, components({"b"}));
+    EXPECT_EQ(tree.pendingNodes.size(), 1U);
+    EXPECT_EQ(tree.parentNodes.size(), 2U);
+    ASSERT_TRUE(tree.hasNextPath());
+    tree.getNextPath(path);
+    EXPECT_EQ(path, components({"a", "y"}));
+    EXPECT_FALSE(tree.hasNextPath());
+    EXPECT_EQ(allPaths(tree), Paths{"b"});
+}
+
 TEST(PathTreeForm, ALoadedTreeTakesInsertions) {
     BPathTree tree;
     read(tree, {0x03, 0x02, 0x00, 0x00}, components({"A", "a1", "a2", "B"}));
