@@ -1,13 +1,18 @@
 #include "archive/SegmentList.hpp"
 
 #include <algorithm>
+#include <cstring>
 
 namespace tessel::archive {
 
 // ---- SplitPath ----
 
+// The C library's search looks at many bytes per step, rfind at one.
 SplitPath SplitPath::of(std::string_view path) noexcept {
-    const std::size_t nameAt = path.rfind('/') + 1;  // npos + 1 is 0
+    const void* const slash = ::memrchr(path.data(), '/', path.size());
+    if (slash == nullptr) return {{}, path};
+    const auto nameAt = static_cast<std::size_t>(
+        static_cast<const char*>(slash) + 1 - path.data());
     return {path.substr(0, nameAt), path.substr(nameAt)};
 }
 
