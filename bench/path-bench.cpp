@@ -7,6 +7,7 @@
 #include <string_view>
 #include <vector>
 
+#include "bench/ArchiveCosts.hpp"
 #include "bench/Comparison.hpp"
 #include "bench/HostRoute.hpp"
 #include "bench/MainJob.hpp"
@@ -19,6 +20,7 @@ constexpr std::string_view usage =
        path-bench --growth [OPTIONS] LIST
        path-bench --order [OPTIONS] SORTED-LIST SHUFFLED-LIST
        path-bench --shapes [OPTIONS]
+       path-bench --archive [OPTIONS] LIST
 
 LIST is a file of paths, separated by NUL if it has a NUL and otherwise by
 newline, or a folder, of which everything below that is no folder is listed.
@@ -29,6 +31,7 @@ newline, or a folder, of which everything below that is no folder is listed.
   --growth   the same operations on ever longer parts of the list
   --order    the same on a sorted and a shuffled list
   --shapes   lists that are made to be awkward: wide, flat and deep ones
+  --archive  what opening an archive costs, and what a second core gains
 
   --runs N          measure N times and take the medians (5)
   --no-compressors  leave out zstd and xz, which take most of the time
@@ -70,7 +73,8 @@ Arguments parse(std::span<char*> words) {
         } else if (word == "--no-compressors") {
             arguments.options.compressors = false;
         } else if (word == "--rivals" || word == "--growth" ||
-                   word == "--order" || word == "--shapes") {
+                   word == "--order" || word == "--shapes" ||
+                   word == "--archive") {
             if (!arguments.mode.empty()) throw WrongUsage{"two modes"};
             arguments.mode = word;
         } else if (word.starts_with("--")) {
@@ -100,6 +104,8 @@ bool run(const Arguments& arguments) {
         bench::measureGrowth(lists[0], arguments.options);
     } else if (arguments.mode == "--order") {
         bench::compareOrder(lists[0], lists[1], arguments.options);
+    } else if (arguments.mode == "--archive") {
+        bench::measureArchive(lists[0], arguments.options);
     } else {
         bench::measureShapes(arguments.options);
     }
