@@ -79,10 +79,9 @@ ArchiveCosts costsOf(const PathList& list, int runs) {
     std::vector<double> together;
     std::vector<double> opening;
     for (int run = 0; run < runs; ++run) {
-        alone.push_back(secondsOf(
-            [&] { costs.fileBytes = build(list, 1, file.name()); }));
-        together.push_back(
-            secondsOf([&] { build(list, 2, file.name()); }));
+        alone.push_back(
+            secondsOf([&] { costs.fileBytes = build(list, 1, file.name()); }));
+        together.push_back(secondsOf([&] { build(list, 2, file.name()); }));
         const std::size_t before = heapInUse();
         std::optional<PathArchive> archive;
         opening.push_back(
