@@ -16,6 +16,10 @@ constexpr std::size_t runBytes = std::size_t{8} << 20;
 // Paths that a run reads ahead: neighbours share a block of the archive.
 constexpr std::size_t pathsAhead = 256;
 
+// Text that a run reads ahead, so that long paths do not fill the memory. Of
+// usual paths, pathsAhead have less.
+constexpr std::size_t bytesAhead = std::size_t{64} << 10;
+
 bool isInByteOrder(const PathArchive& archive, ProgressBar& bar) {
     std::string last;
     bool inOrder = true;
@@ -55,8 +59,9 @@ void OrderedPaths::Run::readAhead(const PathArchive& archive,
                  [&](std::uint64_t, std::string_view path) {
                      text_.append(path);
                      ends_.push_back(text_.size());
+                     return text_.size() < bytesAhead;
                  });
-    next_ += count;
+    next_ += ends_.size();
 }
 
 // ---- OrderedPaths ----

@@ -4,6 +4,7 @@ import json
 import os
 import random
 import re
+import resource
 import subprocess
 
 import pytest
@@ -350,6 +351,18 @@ def test_diff_of_many_runs(tessel):
     tessel.pack(sorted(paths)[1:] + [b"z"], "b.tessel")
     done = tessel("diff", "a.tessel", "b.tessel", expect=1)
     assert done.lines() == [b"- " + min(paths), b"+ z"]
+
+
+def test_diff_of_many_runs_of_long_paths(tessel):
+    folder = b"folder/" * 2000
+    paths = [folder + b"%08d" % (i * 7919 % 12000) for i in range(12000)]
+    tessel.pack(paths)
+    tessel.pack(sorted(paths)[1:], "b.tessel")
+    # Of 168 MB of text, only some is in memory at a time.
+    limit = 80 << 20
+    done = tessel("diff", "a.tessel", "b.tessel", expect=1, preexec_fn=lambda:
+                  resource.setrlimit(resource.RLIMIT_DATA, (limit, limit)))
+    assert done.out == b"- " + min(paths) + b"\n"
 
 
 # ---- the rest ----
