@@ -1,6 +1,7 @@
 #include "hosts/console/Command.hpp"
 
 #include <fmt/format.h>
+#include <unistd.h>
 
 #include <algorithm>
 
@@ -16,9 +17,11 @@ Command::Command(const Description& description)
 }
 
 ProgressBar::Visibility Command::barVisibility(const Session& session,
-                                               Writes writes) const {
+                                               Writes writes,
+                                               Reads reads) const {
     const bool disturbs =
-        writes == Writes::Paths && isTerminal(session.output.descriptor());
+        (writes == Writes::Paths && isTerminal(session.output.descriptor())) ||
+        (reads == Reads::Input && isTerminal(STDIN_FILENO));
     return quiet_ || disturbs ? ProgressBar::Visibility::Hidden
                               : ProgressBar::Visibility::Shown;
 }

@@ -39,10 +39,13 @@ protected:
     // What a command writes to standard output while it works.
     enum class Writes { Nothing, Paths };
 
-    // Shown unless -q is given, or paths go to a terminal: between them, a bar
-    // would only disturb.
-    ProgressBar::Visibility barVisibility(const Session& session,
-                                          Writes writes) const;
+    // Whether a command is asked something through standard input.
+    enum class Reads { Files, Input };
+
+    // Shown unless -q is given, or paths go to a terminal or questions come
+    // from one: between them, a bar would only disturb.
+    ProgressBar::Visibility barVisibility(const Session& session, Writes writes,
+                                          Reads reads = Reads::Files) const;
     bool isQuiet() const noexcept { return quiet_; }
 
     // -j N, for commands that use several cores.

@@ -60,10 +60,14 @@ ExitStatus GetCommand::run(Session& session) {
     PathOutput output(session.output,
                       nul_ ? Separator::Nul : Separator::Newline,
                       Numbering::None);
-    NumberedPaths paths(archive, output);
+    ProgressBar bar(barVisibility(session, Writes::Paths,
+                                  readsNumbers ? Reads::Input : Reads::Files));
+    NumberedPaths paths(archive, output, bar);
     inFile(file_, [&] {
+        const auto requests = resolvedWords(archive.size());
+        bar.begin("fetching", ProgressUnit::Paths, pathsIn(requests));
         if (sampleSize_) sample(archive, paths);
-        for (const Request& request : resolvedWords(archive.size()))
+        for (const Request& request : requests)
             if (request)
                 paths.add(*request);
             else
@@ -107,6 +111,17 @@ std::vector<GetCommand::Request> GetCommand::resolvedWords(
                 fmt::format("{}: {}", file_, outOfRange(word, size)));
     }
     return requests;
+}
+
+// How many paths are asked for; 0 if that is not known.
+std::uint64_t GetCommand::pathsIn(
+    const std::vector<Request>& requests) const noexcept {
+    std::uint64_t paths = sampleSize_.value_or(0);
+    for (const Request& request : requests) {
+        if (!request) return 0;
+        paths += request->end - request->begin;
+    }
+    return paths;
 }
 
 void GetCommand::answerInput(Session& session, const PathArchive& archive,

@@ -22,6 +22,7 @@ private:
 
     std::vector<PathRange> parsedWords() const;
     std::vector<Request> resolvedWords(std::uint64_t size) const;
+    std::uint64_t pathsIn(const std::vector<Request>& requests) const noexcept;
     void answerInput(Session& session, const PathArchive& archive,
                      NumberedPaths& paths) const;
     void sample(const PathArchive& archive, NumberedPaths& paths) const;

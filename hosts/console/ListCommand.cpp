@@ -78,24 +78,33 @@ ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
     });
 }
 
+SalvageReport ListCommand::salvageFrom(InputFile& input,
+                                       PathVisitor visitor) const {
+    try {
+        return input.isRegular() && file_ != "-"
+                   ? PathArchive::salvage(file_, visitor)
+                   : PathArchive::salvage(input.readAll(), visitor);
+    } catch (const DamagedArchiveException& damage) {
+        // Nothing was found, so that no other command finds more.
+        throw ConsoleException(ExitStatus::Damaged,
+                               fmt::format("{}: {}; nothing can be read from "
+                                           "it",
+                                           input.name(), damage.what()));
+    }
+}
+
 ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {
+    ProgressBar bar(barVisibility(session, Writes::Paths));
+    bar.begin("salvaging", ProgressUnit::Paths, 0);
+    std::uint64_t read = 0;
     const auto write = [&](std::uint64_t number, std::string_view path) {
         if (isBelowFolder(path)) paths.write(number, path);
+        if (++read % 4096 == 0) bar.update(read);
     };
     InputFile input(file_, session.interrupts);
-    const SalvageReport report = inFile(input.name(), [&] {
-        try {
-            return input.isRegular() && file_ != "-"
-                       ? PathArchive::salvage(file_, write)
-                       : PathArchive::salvage(input.readAll(), write);
-        } catch (const DamagedArchiveException& damage) {
-            // Nothing was found, so that no other command finds more.
-            throw ConsoleException(
-                ExitStatus::Damaged,
-                fmt::format("{}: {}; nothing can be read from it", input.name(),
-                            damage.what()));
-        }
-    });
+    const SalvageReport report =
+        inFile(input.name(), [&] { return salvageFrom(input, write); });
+    bar.finish();
     session.output.flush();
     if (report.lost.empty() && report.complete && report.damages.empty()) {
         session.errors.write(fmt::format(

@@ -3,7 +3,9 @@
 #include <optional>
 #include <string>
 
+#include "archive/PathArchive.hpp"
 #include "hosts/console/Command.hpp"
+#include "hosts/console/InputFile.hpp"
 #include "hosts/console/PathOutput.hpp"
 
 namespace tessel::console {
@@ -18,6 +20,7 @@ public:
 private:
     ExitStatus list(Session& session, PathOutput& paths) const;
     ExitStatus salvage(Session& session, PathOutput& paths) const;
+    SalvageReport salvageFrom(InputFile& input, PathVisitor visitor) const;
     bool isBelowFolder(std::string_view path) const noexcept;
 
     std::string file_;

@@ -31,13 +31,17 @@ NumberCommand::NumberCommand() : Command(numberDescription) {
 }
 
 ExitStatus NumberCommand::run(Session& session) {
-    if (file_ == "-" && std::ranges::count(paths_, "-") > 0)
+    const bool readsPaths = std::ranges::count(paths_, "-") > 0;
+    if (file_ == "-" && readsPaths)
         line().fail("standard input cannot be both the archive and paths");
     const PathArchive archive = openArchive(file_, session.interrupts);
+    ProgressBar bar(barVisibility(session, Writes::Paths,
+                                  readsPaths ? Reads::Input : Reads::Files));
+    bar.begin("looking up", ProgressUnit::Paths, 0);
     inFile(file_, [&] {
         for (const std::string& path : paths_)
             if (path == "-")
-                answerInput(session, archive);
+                answerInput(session, archive, bar);
             else
                 answer(session, archive, path);
     });
@@ -57,7 +61,8 @@ void NumberCommand::answer(Session& session, const PathArchive& archive,
     session.output.put('\n');
 }
 
-void NumberCommand::answerInput(Session& session, const PathArchive& archive) {
+void NumberCommand::answerInput(Session& session, const PathArchive& archive,
+                                ProgressBar& bar) {
     InputFile input("-", session.interrupts);
     RecordReader records(input, nul_ ? Separator::Nul : Separator::Newline);
     for (;;) {
@@ -66,6 +71,7 @@ void NumberCommand::answerInput(Session& session, const PathArchive& archive) {
         const auto path = records.next();
         if (!path) return;
         answer(session, archive, *path);
+        bar.update(records.line());
     }
 }
 

@@ -17,7 +17,8 @@ public:
 private:
     void answer(Session& session, const PathArchive& archive,
                 std::string_view path);
-    void answerInput(Session& session, const PathArchive& archive);
+    void answerInput(Session& session, const PathArchive& archive,
+                     ProgressBar& bar);
 
     std::string file_;
     std::vector<std::string> paths_;

@@ -2,8 +2,9 @@
 
 namespace tessel::console {
 
-NumberedPaths::NumberedPaths(const PathArchive& archive, PathOutput& output)
-    : archive_(&archive), output_(&output) {
+NumberedPaths::NumberedPaths(const PathArchive& archive, PathOutput& output,
+                             ProgressBar& bar)
+    : archive_(&archive), output_(&output), bar_(&bar) {
     numbers_.reserve(maxNumbers);
 }
 
@@ -22,7 +23,9 @@ void NumberedPaths::flush() {
                    [this](std::uint64_t number, std::string_view path) {
                        output_->write(number, path);
                    });
+    written_ += numbers_.size();
     numbers_.clear();
+    bar_->update(written_);
 }
 
 }  // namespace tessel::console

@@ -6,16 +6,19 @@
 
 #include "archive/PathArchive.hpp"
 #include "hosts/console/PathOutput.hpp"
+#include "hosts/console/ProgressBar.hpp"
 
 namespace tessel::console {
 
 // NumberedPaths writes the paths of numbers, in the order in which they are
 // added. It fetches many at a time, so that neighbours share the decoding.
 //
-// Ownership: borrows archive and output.
+// Ownership: borrows archive, output and bar.
 class NumberedPaths {
 public:
-    NumberedPaths(const PathArchive& archive, PathOutput& output);
+    // bar  is told how many paths are written
+    NumberedPaths(const PathArchive& archive, PathOutput& output,
+                  ProgressBar& bar);
 
     // The number must be in the archive.
     void add(std::uint64_t number);
@@ -31,7 +34,9 @@ private:
 
     const PathArchive* archive_;
     PathOutput* output_;
+    ProgressBar* bar_;
     std::vector<std::uint64_t> numbers_;
+    std::uint64_t written_ = 0;
 };
 
 }  // namespace tessel::console

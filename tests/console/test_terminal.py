@@ -85,6 +85,23 @@ def test_the_bar_comes_and_goes(tessel, terminal):
     assert "reading" not in screen and "packing" not in screen, screen
 
 
+@pytest.mark.parametrize("command,label,question", [
+    ("get", "fetching", b"0\n"), ("number", "looking up", b"path\n")])
+def test_the_bar_of_many_questions(tessel, terminal, command, label, question):
+    tessel.pack([b"path"])
+    os.mkfifo(tessel.folder / "pipe")
+    terminal.type(f"{TESSEL} {command} a.tessel - <pipe >out; echo do''ne")
+    with open(tessel.folder / "pipe", "wb") as pipe:
+        for part in range(8):
+            pipe.write(question * 20000)
+            pipe.flush()
+            time.sleep(0.12)
+        terminal.wait(label)
+    terminal.wait("done")
+    assert label not in terminal.screen()
+    assert (tessel.folder / "out").read_bytes().count(b"\n") == 160000
+
+
 def test_the_bar_is_removed_by_an_interrupt(tessel, terminal):
     os.mkfifo(tessel.folder / "pipe")
     terminal.type(f"{TESSEL} pack pipe -o a.tessel; echo sta''tus $?")
