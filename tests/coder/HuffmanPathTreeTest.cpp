@@ -93,6 +93,24 @@ TEST(HuffmanPathTree, JoiningWaitsForTheThreadsAndForgetsThem) {
     EXPECT_TRUE(coder->genThreads.empty());
 }
 
+TEST(HuffmanPathTree, ResetJoinsWorkers) {
+    const CoderPtr coder = fourLetterCoder();
+    bool done = false;
+    coder->genThreads.emplace_back([&done] { done = true; });
+    coder->resetPathsToBTree();
+    EXPECT_TRUE(coder->genThreads.empty());
+    EXPECT_TRUE(done);
+}
+
+TEST(HuffmanPathTree, ABatchJoinsTheWorkersOfTheOneBefore) {
+    const CoderPtr coder = fourLetterCoder();
+    bool done = false;
+    coder->genThreads.emplace_back([&done] { done = true; });
+    support::addBatch(*coder, {u"a"}, {u"b"});
+    EXPECT_TRUE(coder->genThreads.empty());
+    EXPECT_TRUE(done);
+}
+
 TEST(HuffmanPathTree, TheDestructorJoinsWorkers) {
     bool done = false;
     {

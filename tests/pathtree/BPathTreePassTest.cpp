@@ -117,6 +117,23 @@ TEST(PathTreeIteration, ResetAmidAPassStartsAgain) {
     EXPECT_EQ(allPaths(tree), (Paths{"a/b/f", "a/b/g", "c/h"}));
 }
 
+// The nodes of a pass that was under way stay where they are.
+TEST(PathTreeIteration, ResetOnATreeThatBecameEmptyChangesNothing) {
+    BPathTree tree;
+    addBatch(tree, {"a"}, {"x", "y"});
+    tree.reset();
+    tessel::Components path;
+    tree.getNextPath(path);
+    Bytes structure;
+    tessel::Components values;
+    tree.deserialize(structure, values);
+    tree.reset();
+    EXPECT_EQ(tree.pendingNodes.size(), 1U);
+    EXPECT_EQ(tree.parentNodes.size(), 2U);
+    EXPECT_EQ(tree.currentPrefix.size(), 1U);
+    EXPECT_FALSE(tree.hasNextPath());
+}
+
 TEST(PathTreeIteration, ResetOnAnEmptyTreeLeavesNoPath) {
     BPathTree tree;
     tree.reset();
