@@ -48,9 +48,11 @@ TEST(PathIteration, PastTheEndItThrows) {
     addBatch(*coder, {u"a"}, {u"b"});
     support::iterated(*coder);
     Components path = {{1, 2, 3}};
+    EXPECT_EQ(coder->nextPathNumber, 1U);
     EXPECT_THROW(coder->getNextPathFromBTree(path),
                  tessel::NoMorePathException);
     EXPECT_EQ(path, (Components{{1, 2, 3}}));
+    EXPECT_EQ(coder->nextPathNumber, 2U);  // counted all the same
 }
 
 TEST(PathIteration, ARepeatedWholePathComesBackAtItsOwnNumber) {

@@ -97,6 +97,17 @@ TEST(PathRetrieval, InfinityCountsAsBehindTheLastPartition) {
     EXPECT_EQ(answerFor(*coder, {infinity, nan, 0}), Answer{});
 }
 
+TEST(PathRetrieval, NumbersBeyondSignedOnesAreConvertedAsUnsigned) {
+    const double twoToThe63rd = 9223372036854775808.0;
+    EXPECT_EQ(tessel::PathRetrieval::pathNumberOf(twoToThe63rd),
+              std::uint64_t{1} << 63);
+    EXPECT_EQ(tessel::PathRetrieval::pathNumberOf(1.5 * twoToThe63rd),
+              std::uint64_t{3} << 62);
+    EXPECT_EQ(tessel::PathRetrieval::pathNumberOf(2 * twoToThe63rd),
+              ~std::uint64_t{0});
+    EXPECT_EQ(tessel::PathRetrieval::pathNumberOf(-0.5), 0U);
+}
+
 TEST(PathRetrieval, NumbersAreTruncated) {
     EXPECT_EQ(answerFor(*threePartitions(), {1.9, 4.999999, 5.5}),
               (Answer{{{u"a"}, {u"b"}}, {{u"a"}, {u"a", u"d"}}}));
