@@ -28,6 +28,7 @@ constexpr std::array<const char*, 14> sectionNames = {"token codes",
 void add(const Segment& segment, ArchiveInfo& info) {
     const SegmentHead& head = segment.head();
     info.folders += head.folders;
+    info.sortedSegments += head.order == ListOrder::Sorted ? 1 : 0;
     info.textBytes += head.textBytes;
     info.longestName =
         std::max<std::uint64_t>(info.longestName, head.maxNameBytes);

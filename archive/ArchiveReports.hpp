@@ -40,7 +40,8 @@ struct ArchiveInfo {
     std::uint64_t paths = 0;
     std::uint64_t folders = 0;  // different ones of each segment, added up
     std::uint64_t segments = 0;
-    std::uint64_t textBytes = 0;  // of all paths, without separators
+    std::uint64_t sortedSegments = 0;  // of those, whose paths are in order
+    std::uint64_t textBytes = 0;       // of all paths, without separators
     std::uint64_t fileBytes = 0;
     std::uint64_t longestName = 0;    // bytes after the last '/'
     std::uint64_t longestFolder = 0;  // bytes up to and with the last '/'

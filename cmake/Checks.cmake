@@ -76,7 +76,7 @@ function(qztesselTidyRoom room)
 endfunction()
 
 set(rooms packing pathtree coder paths archive binding hosts/embedded
-          hosts/console)
+          hosts/console hosts/patterns)
 set(systemIncludes)
 if(TARGET qztessel_python)
   list(APPEND rooms hosts/python)

@@ -6,8 +6,13 @@
 #include "hosts/console/Failure.hpp"
 #include "hosts/console/PathOutput.hpp"
 #include "hosts/console/Terminal.hpp"
+#include "hosts/patterns/PatternException.hpp"
 
 namespace tessel::console {
+
+using patterns::LetterCase;
+using patterns::PathMatcher;
+using patterns::PatternKind;
 
 namespace {
 
@@ -46,9 +51,7 @@ FindCommand::FindCommand() : Command(findDescription) {
 }
 
 ExitStatus FindCommand::run(Session& session) {
-    const PathMatcher matcher(
-        patterns_, kind(),
-        ignoreCase_ ? LetterCase::Ignored : LetterCase::Exact);
+    const PathMatcher matcher = this->matcher();
     const PathArchive archive = openArchive(file_, session.interrupts);
     ProgressBar bar(
         barVisibility(session, count_ ? Writes::Nothing : Writes::Paths));
@@ -66,6 +69,15 @@ PatternKind FindCommand::kind() const {
     if (glob_ && regex_) line().fail("--glob and --regex exclude each other");
     if (glob_) return PatternKind::Glob;
     return regex_ ? PatternKind::Expression : PatternKind::Text;
+}
+
+PathMatcher FindCommand::matcher() const {
+    try {
+        return {patterns_, kind(),
+                ignoreCase_ ? LetterCase::Ignored : LetterCase::Exact};
+    } catch (const patterns::PatternException& wrong) {
+        line().fail(wrong.what());
+    }
 }
 
 FindOptions FindCommand::options(ProgressBar& bar) const {

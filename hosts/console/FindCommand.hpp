@@ -6,7 +6,7 @@
 
 #include "archive/PathArchive.hpp"
 #include "hosts/console/Command.hpp"
-#include "hosts/console/PathMatcher.hpp"
+#include "hosts/patterns/PathMatcher.hpp"
 
 namespace tessel::console {
 
@@ -17,16 +17,18 @@ public:
     ExitStatus run(Session& session) override;
 
 private:
-    PatternKind kind() const;
+    patterns::PatternKind kind() const;
+    patterns::PathMatcher matcher() const;
     FindOptions options(ProgressBar& bar) const;
 
     // Whether the archive itself can find the patterns.
     bool isPlain() const noexcept { return !glob_ && !regex_ && !ignoreCase_; }
 
-    std::uint64_t count(const PathArchive& archive, const PathMatcher& matcher,
+    std::uint64_t count(const PathArchive& archive,
+                        const patterns::PathMatcher& matcher,
                         const FindOptions& options) const;
     std::uint64_t write(Session& session, const PathArchive& archive,
-                        const PathMatcher& matcher,
+                        const patterns::PathMatcher& matcher,
                         const FindOptions& options) const;
 
     std::string file_;

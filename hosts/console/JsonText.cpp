@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "hosts/console/Utf8.hpp"
+#include "hosts/patterns/Utf8.hpp"
 
 namespace tessel::console {
 
@@ -25,7 +25,7 @@ std::string base64(std::string_view bytes) {
 }
 
 Json jsonOfBytes(std::string_view bytes) {
-    if (isUtf8(bytes)) return std::string(bytes);
+    if (patterns::isUtf8(bytes)) return std::string(bytes);
     return {{"bytes", base64(bytes)}};
 }
 

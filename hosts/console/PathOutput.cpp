@@ -22,7 +22,7 @@ void PathOutput::writeNumber(std::uint64_t number) {
 
 void PathOutput::writeColoured(std::string_view path) {
     std::size_t at = 0;
-    for (const Span& span : matches_->spans(path)) {
+    for (const patterns::Span& span : matches_->spans(path)) {
         output_->write(path.substr(at, span.begin - at));
         output_->write(colourStart);
         output_->write(path.substr(span.begin, span.end - span.begin));

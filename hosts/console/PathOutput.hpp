@@ -4,8 +4,8 @@
 #include <string_view>
 
 #include "hosts/console/OutputBuffer.hpp"
-#include "hosts/console/PathMatcher.hpp"
 #include "hosts/console/RecordReader.hpp"
+#include "hosts/patterns/PathMatcher.hpp"
 
 namespace tessel::console {
 
@@ -24,7 +24,9 @@ public:
           numbering_(numbering) {}
 
     // Colours what the matcher finds from now on.
-    void colour(const PathMatcher& matches) noexcept { matches_ = &matches; }
+    void colour(const patterns::PathMatcher& matches) noexcept {
+        matches_ = &matches;
+    }
 
     void write(std::uint64_t number, std::string_view path) {
         if (numbering_ == Numbering::Numbers) writeNumber(number);
@@ -42,7 +44,7 @@ private:
     OutputBuffer* output_;
     char separator_;
     Numbering numbering_;
-    const PathMatcher* matches_ = nullptr;
+    const patterns::PathMatcher* matches_ = nullptr;
 };
 
 }  // namespace tessel::console

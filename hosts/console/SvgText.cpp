@@ -5,7 +5,7 @@
 #include <cstddef>
 #include <iterator>
 
-#include "hosts/console/Utf8.hpp"
+#include "hosts/patterns/Utf8.hpp"
 #include "paths/PathText.hpp"
 
 namespace tessel::console {
@@ -32,7 +32,7 @@ void appendCharacter(std::string_view character, std::string& text) {
         text += "&amp;";
     else if (character == "\"")
         text += "&quot;";
-    else if (!isUtf8(character) || !isAllowedInXml(character))
+    else if (!patterns::isUtf8(character) || !isAllowedInXml(character))
         text += "\xEF\xBF\xBD";
     else
         text += character;

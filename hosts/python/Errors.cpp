@@ -2,6 +2,7 @@
 
 #include <exception>
 
+#include "hosts/patterns/PatternException.hpp"
 #include "paths/PathList.hpp"
 
 namespace tessel::python {
@@ -35,6 +36,8 @@ void translate(std::exception_ptr thrown) {
     } catch (const std::system_error& error) {
         setSystemError(error);
     } catch (const paths::PathListError& error) {
+        PyErr_SetString(PyExc_ValueError, error.what());
+    } catch (const patterns::PatternException& error) {
         PyErr_SetString(PyExc_ValueError, error.what());
     }
 }

@@ -5,8 +5,10 @@
 #include <pybind11/pybind11.h>
 #include <pybind11/stl.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <span>
 #include <stop_token>
 #include <string>
@@ -18,7 +20,9 @@
 #include "hosts/python/Packer.hpp"
 #include "hosts/python/PathObjects.hpp"
 #include "hosts/python/PathSequence.hpp"
+#include "hosts/python/Searching.hpp"
 #include "hosts/python/StoredList.hpp"
+#include "hosts/python/Taking.hpp"
 
 namespace tessel::python {
 
@@ -87,6 +91,12 @@ void bindStoredList(py::module_& module) {
 
 // ---- Lists ----
 
+[[noreturn]] void failOutOfRange(std::int64_t index, std::int64_t size) {
+    throw py::index_error("list index " + std::to_string(index) +
+                          " is out of range for " + std::to_string(size) +
+                          " paths");
+}
+
 py::object pathAt(const PathSequence& paths, const py::object& number,
                   bool asBytes) {
     const auto size = static_cast<std::int64_t>(paths.size());
@@ -94,10 +104,7 @@ py::object pathAt(const PathSequence& paths, const py::object& number,
         PyNumber_AsSsize_t(number.ptr(), PyExc_IndexError);
     if (index == -1 && PyErr_Occurred() != nullptr)
         throw py::error_already_set();
-    if (index < -size || index >= size)
-        throw py::index_error("list index " + std::to_string(index) +
-                              " is out of range for " + std::to_string(size) +
-                              " paths");
+    if (index < -size || index >= size) failOutOfRange(index, size);
     const auto at =
         static_cast<std::uint64_t>(index < 0 ? index + size : index);
     return toObject(paths[at], kindOf(asBytes));
@@ -141,21 +148,75 @@ bool areEqual(const PathSequence& left, const PathSequence& right) {
     return equal;
 }
 
-PathSequence selected(const PathSequence& paths, const IndexArray& indices) {
+// Indices that may count from the end, from the start. Throws IndexError.
+std::vector<std::uint64_t> fromStart(const PathSequence& paths,
+                                     const IndexArray& given) {
     const auto size = static_cast<std::int64_t>(paths.size());
-    auto chosen = std::make_shared<std::vector<std::uint64_t>>();
-    chosen->reserve(static_cast<std::size_t>(indices.size()));
-    const std::span<const std::int64_t> given(
-        indices.data(), static_cast<std::size_t>(indices.size()));
-    for (const std::int64_t index : given) {
-        if (index < -size || index >= size)
-            throw py::index_error("list index " + std::to_string(index) +
-                                  " is out of range for " +
-                                  std::to_string(size) + " paths");
-        chosen->push_back(
+    std::vector<std::uint64_t> indices;
+    indices.reserve(static_cast<std::size_t>(given.size()));
+    for (const std::int64_t index :
+         std::span(given.data(), static_cast<std::size_t>(given.size()))) {
+        if (index < -size || index >= size) failOutOfRange(index, size);
+        indices.push_back(
             static_cast<std::uint64_t>(index < 0 ? index + size : index));
     }
-    return {paths.stored(), paths.view().selected(std::move(chosen))};
+    return indices;
+}
+
+PathSequence selected(const PathSequence& paths, const IndexArray& indices) {
+    return {paths.stored(),
+            paths.view().selected(
+                std::make_shared<const std::vector<std::uint64_t>>(
+                    fromStart(paths, indices)))};
+}
+
+// ---- In bulk ----
+
+template <class Number>
+IndexArray arrayOf(const std::vector<Number>& numbers) {
+    IndexArray array(static_cast<py::ssize_t>(numbers.size()));
+    std::ranges::copy(numbers, array.mutable_data());
+    return array;
+}
+
+IndexArray numbersOf(const PathSequence& paths, const py::iterable& asked) {
+    paths::PathList texts;
+    for (const py::handle item : asked) {
+        const PathBytes path(py::reinterpret_borrow<py::object>(item));
+        // NUL is in no list, and no more is the empty path.
+        texts.append(path.view().empty() ? std::string_view("\0", 1)
+                                         : path.view());
+    }
+    return arrayOf(firstIndicesOf(paths, texts));
+}
+
+patterns::PathMatcher matcherOf(const std::string& pattern,
+                                patterns::PatternKind kind, bool ignoreCase) {
+    return {{pattern},
+            kind,
+            ignoreCase ? patterns::LetterCase::Ignored
+                       : patterns::LetterCase::Exact};
+}
+
+// match  nothing, or "glob" or "regex" and the pattern
+IndexArray find(const PathSequence& paths, std::vector<std::string> texts,
+                const std::optional<std::pair<std::string, std::string>>& match,
+                std::optional<std::string> folder, bool ignoreCase) {
+    Query query{std::move(texts), std::nullopt, std::move(folder)};
+    if (match) {
+        const auto kind = match->first == "glob"
+                              ? patterns::PatternKind::Glob
+                              : patterns::PatternKind::Expression;
+        query.matcher = matcherOf(match->second, kind, ignoreCase);
+    }
+    return arrayOf(findPaths(paths, query));
+}
+
+py::list folderList(const PathSequence& paths, bool asBytes) {
+    py::list list;
+    for (const std::string& folder : foldersOf(paths))
+        list.append(toObject(folder, kindOf(asBytes)));
+    return list;
 }
 
 // ---- Views ----
@@ -213,6 +274,21 @@ void bindPathSequence(py::module_& module) {
                                      paths.view().shuffled(seed));
              })
         .def("select", &selected)
+        .def("take_list",
+             [](const PathSequence& paths, const IndexArray& indices,
+                bool asBytes) {
+                 return takeList(paths, fromStart(paths, indices),
+                                 kindOf(asBytes));
+             })
+        .def("take_array",
+             [](const PathSequence& paths, const IndexArray& indices,
+                bool asBytes) {
+                 return takeArray(paths, fromStart(paths, indices),
+                                  kindOf(asBytes));
+             })
+        .def("numbers", &numbersOf)
+        .def("find", &find)
+        .def("folders", &folderList)
         .def("steps", &stepsOf)
         .def_property_readonly(
             "is_whole",

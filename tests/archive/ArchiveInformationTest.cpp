@@ -29,6 +29,7 @@ TEST(ArchiveInformation, CountsPathsFoldersAndText) {
     EXPECT_EQ(info.paths, 4U);
     EXPECT_EQ(info.folders, 3U);
     EXPECT_EQ(info.segments, 1U);
+    EXPECT_EQ(info.sortedSegments, 1U);
     EXPECT_EQ(info.textBytes, 18U);
     EXPECT_EQ(info.longestName, 4U);
     EXPECT_EQ(info.longestFolder, 7U);
@@ -40,6 +41,7 @@ TEST(ArchiveInformation, SectionsAddUpToTheFile) {
     const archives::OpenArchive archive(list, archives::segmentsOf(25));
     const ArchiveInfo info = infoOf(archive.reader());
     EXPECT_EQ(info.segments, 3U);
+    EXPECT_EQ(info.sortedSegments, 0U);
     EXPECT_EQ(bytesOfAll(info), info.fileBytes);
     std::uint64_t names = 0;
     std::uint64_t folders = 0;

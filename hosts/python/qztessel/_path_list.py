@@ -303,6 +303,102 @@ class PathList(Sequence[AnyStr]):
         """
         return self._like(self._paths.select(_integers(indices, len(self))))
 
+    # ---- In bulk ----
+
+    # These use all cores, let other threads run, and end on Ctrl-C.
+
+    @overload
+    def take(self, indices: npt.ArrayLike) -> list[AnyStr]: ...
+    @overload
+    def take(
+        self, indices: npt.ArrayLike, *, as_array: Literal["S", "U", "O"]
+    ) -> npt.NDArray[Any]: ...
+
+    def take(
+        self,
+        indices: npt.ArrayLike,
+        *,
+        as_array: Literal["S", "U", "O"] | None = None,
+    ) -> list[AnyStr] | npt.NDArray[Any]:
+        """Return the paths at these indices, in this order.
+
+        as_array  None for a list; "S" for a NumPy array of bytes, "U" of text,
+                  both as wide as the longest path; "O" of Python's own objects
+
+        Takes less than 1.5 microseconds per path in a list of millions.
+        Raises `IndexError`, and `TypeError` for indices that are no integers.
+
+        >>> paths = PathList.pack(["usr/bin/env", "etc/hosts", "usr/bin/vi"])
+        >>> paths.take([2, 0])
+        ['usr/bin/vi', 'usr/bin/env']
+        >>> paths.take([-1], as_array="S")
+        array([b'usr/bin/vi'], dtype='|S10')
+        """
+        if as_array not in (None, "S", "U", "O"):
+            raise ValueError(f"as_array {as_array!r} is none of 'S', 'U', 'O'")
+        numbers = _integers(indices, len(self))
+        if as_array in ("S", "U"):
+            return self._paths.take_array(numbers, as_array == "S")
+        taken = self._paths.take_list(numbers, self._as_bytes)
+        if as_array is None:
+            return taken
+        array = np.empty(len(taken), dtype=object)
+        array[:] = taken
+        return array
+
+    def numbers(self, paths: Iterable[Path]) -> npt.NDArray[np.int64]:
+        """Return the first index of each path, or -1 if it is not in the list.
+
+        >>> PathList.pack(["a", "b", "a"]).numbers(["b", "a", "c"])
+        array([ 1,  0, -1])
+        """
+        return self._paths.numbers(paths)
+
+    def find(
+        self,
+        *texts: str | bytes,
+        glob: str | bytes | None = None,
+        regex: str | bytes | None = None,
+        folder: Path | None = None,
+        ignore_case: bool = False,
+    ) -> npt.NDArray[np.int64]:
+        """Return the indices of all paths that match everything given.
+
+        texts        each of them is anywhere in the path
+        glob         a shell pattern for the whole path, or for its last
+                     component if the pattern has no '/'; '*' matches '/', too
+        regex        a regular expression of RE2, which is anywhere in the path
+        folder       the path is below this folder, at any depth
+        ignore_case  of glob or regex
+
+        Raises `ValueError` for an expression that is wrong.
+
+        >>> paths = PathList.pack(["usr/bin/env", "etc/hosts", "usr/bin/vi"])
+        >>> paths.find("bin", "v")
+        array([0, 2])
+        >>> paths.take(paths.find(glob="V?", ignore_case=True, folder="usr"))
+        ['usr/bin/vi']
+        >>> paths.find(regex="^etc/|env$")
+        array([0, 1])
+        """
+        return self._paths.find(
+            [os.fsencode(text) for text in texts],
+            _pattern(glob, regex),
+            None if folder is None else os.fsencode(folder),
+            ignore_case,
+        )
+
+    def folders(self) -> list[AnyStr]:
+        """Return the different folders that paths are in, in byte order.
+
+        A path's folder is what is before its last '/': '' without one, and '/'
+        if that is the first character. Reads the whole list.
+
+        >>> PathList.pack(["usr/bin/env", "x", "usr/bin/vi", "/y"]).folders()
+        ['', '/', 'usr/bin']
+        """
+        return self._paths.folders(self._as_bytes)
+
     # ---- Facts ----
 
     @property
@@ -425,6 +521,16 @@ def _integers(numbers: npt.ArrayLike, size: int) -> npt.NDArray[np.int64]:
     if array.dtype.kind == "u" and array.size and array.max() >= size:
         raise IndexError(f"list index {array.max()} is out of range for {size} paths")
     return np.ascontiguousarray(array, dtype=np.int64)
+
+
+def _pattern(
+    glob: str | bytes | None, regex: str | bytes | None
+) -> tuple[str, bytes] | None:
+    if glob is not None and regex is not None:
+        raise ValueError("glob and regex exclude each other")
+    if glob is not None:
+        return "glob", os.fsencode(glob)
+    return None if regex is None else ("regex", os.fsencode(regex))
 
 
 def _described(step: tuple[Any, ...]) -> str:

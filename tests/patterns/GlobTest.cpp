@@ -3,14 +3,14 @@
 
 #include <string>
 
-#include "hosts/console/Glob.hpp"
+#include "hosts/patterns/Glob.hpp"
 
 namespace {
 
-using tessel::console::globToExpression;
-using tessel::console::LetterCase;
-using tessel::console::PatternAlphabet;
-using tessel::console::textToExpression;
+using tessel::patterns::globToExpression;
+using tessel::patterns::LetterCase;
+using tessel::patterns::PatternAlphabet;
+using tessel::patterns::textToExpression;
 
 bool matches(const std::string& glob, const std::string& text,
              LetterCase letterCase = LetterCase::Exact,

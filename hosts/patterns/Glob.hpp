@@ -3,7 +3,7 @@
 #include <string>
 #include <string_view>
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 // How the letters of a pattern are taken.
 enum class LetterCase { Exact, Ignored };
@@ -30,4 +30,4 @@ std::string globToExpression(std::string_view glob, LetterCase letterCase,
 std::string textToExpression(std::string_view text, LetterCase letterCase,
                              PatternAlphabet alphabet);
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

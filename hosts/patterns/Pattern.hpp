@@ -5,13 +5,13 @@
 #include <string_view>
 #include <vector>
 
-#include "hosts/console/PathMatcher.hpp"
+#include "hosts/patterns/PathMatcher.hpp"
 
 namespace re2 {
 class RE2;
 }
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 // One pattern of a PathMatcher, which explains the kinds.
 //
@@ -19,7 +19,7 @@ namespace tessel::console {
 // no byte that is not UTF-8.
 class Pattern {
 public:
-    // Throws ConsoleException if an expression is wrong.
+    // Throws PatternException if an expression is wrong.
     Pattern(const std::string& pattern, PatternKind kind,
             LetterCase letterCase);
     Pattern(const Pattern&) = delete;
@@ -47,4 +47,4 @@ private:
     std::unique_ptr<const re2::RE2> bytes_;
 };
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

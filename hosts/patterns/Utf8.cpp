@@ -1,8 +1,8 @@
-#include "hosts/console/Utf8.hpp"
+#include "hosts/patterns/Utf8.hpp"
 
 #include "paths/PathText.hpp"
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 namespace {
 
@@ -30,4 +30,4 @@ bool isUtf8(std::string_view bytes) noexcept {
     return true;
 }
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

@@ -1,10 +1,10 @@
-#include "hosts/console/Glob.hpp"
+#include "hosts/patterns/Glob.hpp"
 
 #include <fmt/format.h>
 
 #include <cstddef>
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 namespace {
 
@@ -140,4 +140,4 @@ std::string textToExpression(std::string_view text, LetterCase letterCase,
     return wrapped(expression, letterCase, alphabet);
 }
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

@@ -1,10 +1,10 @@
-#include "hosts/console/PathMatcher.hpp"
+#include "hosts/patterns/PathMatcher.hpp"
 
 #include <algorithm>
 
-#include "hosts/console/Pattern.hpp"
+#include "hosts/patterns/Pattern.hpp"
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 namespace {
 
@@ -48,4 +48,4 @@ std::vector<Span> PathMatcher::spans(std::string_view path) const {
     return spans;
 }
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

@@ -3,17 +3,16 @@
 #include <string>
 #include <vector>
 
-#include "hosts/console/ConsoleException.hpp"
-#include "hosts/console/PathMatcher.hpp"
+#include "hosts/patterns/PathMatcher.hpp"
+#include "hosts/patterns/PatternException.hpp"
 
 namespace {
 
-using tessel::console::ConsoleException;
-using tessel::console::ExitStatus;
-using tessel::console::LetterCase;
-using tessel::console::PathMatcher;
-using tessel::console::PatternKind;
-using tessel::console::Span;
+using tessel::patterns::LetterCase;
+using tessel::patterns::PathMatcher;
+using tessel::patterns::PatternException;
+using tessel::patterns::PatternKind;
+using tessel::patterns::Span;
 
 PathMatcher matcherOf(const std::vector<std::string>& patterns,
                       PatternKind kind,
@@ -86,9 +85,8 @@ TEST(PathMatcher, WrongExpressionsAreTold) {
     try {
         matcherOf({"ok", "a("}, PatternKind::Expression);
         FAIL() << "accepted";
-    } catch (const ConsoleException& failure) {
-        EXPECT_EQ(failure.status(), ExitStatus::Usage);
-        EXPECT_NE(std::string(failure.what()).find("a("), std::string::npos);
+    } catch (const PatternException& failure) {
+        EXPECT_STREQ(failure.what(), "pattern 'a(': missing ): a(");
     }
 }
 

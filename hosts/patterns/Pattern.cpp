@@ -1,14 +1,14 @@
-#include "hosts/console/Pattern.hpp"
+#include "hosts/patterns/Pattern.hpp"
 
 #include <fmt/format.h>
 #include <re2/re2.h>
 
 #include <algorithm>
 
-#include "hosts/console/ConsoleException.hpp"
-#include "hosts/console/Utf8.hpp"
+#include "hosts/patterns/PatternException.hpp"
+#include "hosts/patterns/Utf8.hpp"
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 namespace {
 
@@ -73,10 +73,8 @@ void Pattern::compile(const std::string& pattern, LetterCase letterCase,
         expressionOf(pattern, kind_, letterCase, alphabet),
         optionsFor(kind_, letterCase, alphabet));
     if (!target->ok())
-        throw ConsoleException(ExitStatus::Usage,
-                               fmt::format("pattern '{}': {}; see `tessel find "
-                                           "--help`",
-                                           pattern, target->error()));
+        throw PatternException(
+            fmt::format("pattern '{}': {}", pattern, target->error()));
 }
 
 bool Pattern::matches(std::string_view path) const {
@@ -129,4 +127,4 @@ void Pattern::appendExpressionSpans(std::string_view path,
     }
 }
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

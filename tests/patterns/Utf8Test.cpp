@@ -1,10 +1,10 @@
 #include <gtest/gtest.h>
 
-#include "hosts/console/Utf8.hpp"
+#include "hosts/patterns/Utf8.hpp"
 
 namespace {
 
-using tessel::console::isUtf8;
+using tessel::patterns::isUtf8;
 
 TEST(Utf8, IsReadStrictly) {
     EXPECT_TRUE(isUtf8(""));

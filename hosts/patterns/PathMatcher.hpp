@@ -6,9 +6,9 @@
 #include <string_view>
 #include <vector>
 
-#include "hosts/console/Glob.hpp"
+#include "hosts/patterns/Glob.hpp"
 
-namespace tessel::console {
+namespace tessel::patterns {
 
 // What the patterns of a search are.
 enum class PatternKind { Text, Glob, Expression };
@@ -36,7 +36,7 @@ class Pattern;
 // Threads: const members may be called from any number of threads.
 class PathMatcher {
 public:
-    // Throws ConsoleException if an expression is wrong.
+    // Throws PatternException if an expression is wrong.
     PathMatcher(const std::vector<std::string>& patterns, PatternKind kind,
                 LetterCase letterCase);
     PathMatcher(PathMatcher&&) noexcept;
@@ -52,4 +52,4 @@ private:
     std::vector<std::unique_ptr<const Pattern>> patterns_;
 };
 
-}  // namespace tessel::console
+}  // namespace tessel::patterns

@@ -1,0 +1,60 @@
+#pragma once
+
+#include <pybind11/pybind11.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <utility>
+#include <vector>
+
+#include "archive/OrderedScan.hpp"
+
+namespace tessel::python {
+
+// Numbers from begin up to, but without, end: one part of some work.
+struct Chunk {
+    std::uint64_t begin = 0;
+    std::uint64_t end = 0;
+};
+
+// Divides `count` numbers into chunks and works on them on all cores, without
+// the interpreter's lock: `produce` makes a Result of each chunk on any thread.
+// `consume` gets the results in ascending order on the calling thread, under
+// the lock. Between two of them, Python handles signals, so that Ctrl-C ends
+// the work by an exception.
+//
+// The calling thread must hold the interpreter's lock. What either function
+// throws is thrown here, after all threads have ended.
+//
+// perChunk  numbers in a chunk; it should take some 1 to 100 milliseconds
+template <class Result, class Produce, class Consume>
+void inChunks(std::uint64_t count, std::uint64_t perChunk, Produce produce,
+              Consume consume) {
+    const auto chunkAt = [&](std::uint64_t i) {
+        return Chunk{i * perChunk, std::min((i + 1) * perChunk, count)};
+    };
+    const pybind11::gil_scoped_release released;
+    const ScanOptions options;
+    archive::OrderedScan scan((count + perChunk - 1) / perChunk, options);
+    std::vector<Result> results(scan.slots());
+    const auto finish = [&](std::uint64_t i) {
+        const pybind11::gil_scoped_acquire held;
+        if (PyErr_CheckSignals() != 0) throw pybind11::error_already_set();
+        consume(chunkAt(i), std::exchange(results[i % scan.slots()], {}));
+        return true;
+    };
+    scan.run(
+        [&](std::uint64_t i) {
+            results[i % scan.slots()] = produce(chunkAt(i));
+        },
+        finish);
+}
+
+// Paths per chunk for reading: as many as one batch of the archive's reader
+// takes at most, so that scattered paths share the decoding of their blocks;
+// fewer if there are fewer, so that all cores have some.
+inline std::uint64_t pathsPerChunk(std::uint64_t count) noexcept {
+    return std::clamp<std::uint64_t>(count / 8, 1024, 65536);
+}
+
+}  // namespace tessel::python

@@ -1,0 +1,204 @@
+#include "hosts/python/Searching.hpp"
+
+#include <algorithm>
+#include <iterator>
+#include <stop_token>
+#include <unordered_map>
+#include <unordered_set>
+#include <utility>
+
+#include "hosts/python/Chunks.hpp"
+#include "hosts/python/Errors.hpp"
+#include "hosts/python/Interruptible.hpp"
+
+namespace tessel::python {
+
+namespace {
+
+using Indices = std::vector<std::uint64_t>;
+
+// Shows all paths to consume(chunk, produce(chunk)); see inChunks.
+template <class Result, class Produce, class Consume>
+void scanAll(const PathSequence& paths, Produce produce, Consume consume) {
+    inChunks<Result>(paths.size(), pathsPerChunk(paths.size()), produce,
+                     consume);
+}
+
+// ---- Queries ----
+
+bool isBelow(std::string_view path, std::string_view folder) {
+    if (folder.empty()) return true;
+    if (!path.starts_with(folder)) return false;
+    return folder.back() == '/' || path.substr(folder.size()).starts_with('/');
+}
+
+bool matches(const Query& query, std::string_view path) {
+    const auto holds = [&](const std::string& text) {
+        return path.find(text) != std::string_view::npos;
+    };
+    return (!query.folder || isBelow(path, *query.folder)) &&
+           std::ranges::all_of(query.texts, holds) &&
+           (!query.matcher || query.matcher->matches(path));
+}
+
+Indices findByScan(const PathSequence& paths, const Query& query) {
+    Indices found;
+    const auto search = [&](Chunk chunk) {
+        Indices here;
+        std::uint64_t index = chunk.begin;
+        paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
+            if (matches(query, path)) here.push_back(index);
+            ++index;
+        });
+        return here;
+    };
+    scanAll<Indices>(paths, search, [&](Chunk, const Indices& here) {
+        found.insert(found.end(), here.begin(), here.end());
+    });
+    return found;
+}
+
+Indices findInArchive(const PathArchive& archive, const Query& query,
+                      std::stop_token cancel) {
+    FindOptions options;
+    options.folder = query.folder;
+    options.cancel = std::move(cancel);
+    if (query.matcher)
+        return archive.find(
+            [&](std::string_view path) { return matches(query, path); },
+            options);
+    const std::vector<std::string_view> texts(query.texts.begin(),
+                                              query.texts.end());
+    return archive.find(texts, options);
+}
+
+// ---- First indices ----
+
+// Whether each path is found in microseconds, or by a scan of its own.
+bool isQuickToAsk(const PathSequence& paths) {
+    const ArchiveInfo info = paths.archive().info();
+    const auto index =
+        std::ranges::find(info.sections, "index", &ArchiveInfo::Section::name);
+    return info.sortedSegments == info.segments ||
+           (index != info.sections.end() && index->bytes > 0);
+}
+
+// A scan takes some 0.1 microseconds per path of the list. A question takes
+// some 3 microseconds, or 2 nanoseconds per path of the list where it is a
+// scan of its own.
+bool areWorthAScan(const PathSequence& paths, std::uint64_t asked) {
+    if (!paths.view().isWhole()) return true;
+    return isQuickToAsk(paths) ? asked > paths.size() / 16 : asked > 50;
+}
+
+using FirstIndices = std::vector<std::int64_t>;
+
+FirstIndices askEach(const PathSequence& paths, const paths::PathList& asked) {
+    // Few, because one may take milliseconds in a list that is not sorted.
+    constexpr std::uint64_t perChunk = 16;
+    FirstIndices indices;
+    indices.reserve(asked.size());
+    const auto ask = [&](Chunk chunk) {
+        FirstIndices here;
+        for (std::uint64_t i = chunk.begin; i < chunk.end; ++i) {
+            const auto number = paths.archive().numberOf(asked[i]);
+            here.push_back(number ? static_cast<std::int64_t>(*number) : -1);
+        }
+        return here;
+    };
+    inChunks<FirstIndices>(
+        asked.size(), perChunk, ask, [&](Chunk, const FirstIndices& here) {
+            indices.insert(indices.end(), here.begin(), here.end());
+        });
+    return indices;
+}
+
+using IndexByPath = std::unordered_map<std::string_view, std::int64_t>;
+
+// Sets the first index of all paths that are keys, which have -1.
+void scanFor(const PathSequence& paths, IndexByPath& wanted) {
+    using Hits = std::vector<std::pair<std::int64_t*, std::uint64_t>>;
+    const auto search = [&](Chunk chunk) {
+        Hits hits;
+        std::uint64_t index = chunk.begin;
+        paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
+            const auto found = wanted.find(path);
+            if (found != wanted.end()) hits.emplace_back(&found->second, index);
+            ++index;
+        });
+        return hits;
+    };
+    scanAll<Hits>(paths, search, [](Chunk, const Hits& hits) {
+        for (const auto& [first, index] : hits)
+            if (*first < 0) *first = static_cast<std::int64_t>(index);
+    });
+}
+
+FirstIndices askAll(const PathSequence& paths, const paths::PathList& asked) {
+    IndexByPath wanted;
+    wanted.reserve(asked.size());
+    for (std::size_t i = 0; i < asked.size(); ++i) wanted.emplace(asked[i], -1);
+    scanFor(paths, wanted);
+    FirstIndices indices;
+    indices.reserve(asked.size());
+    for (std::size_t i = 0; i < asked.size(); ++i)
+        indices.push_back(wanted.at(asked[i]));
+    return indices;
+}
+
+// ---- Folders ----
+
+std::string_view nameOfFolder(std::string_view path) {
+    const std::size_t slash = path.rfind('/');
+    if (slash == std::string_view::npos) return {};
+    return path.substr(0, std::max<std::size_t>(slash, 1));
+}
+
+using Folders = std::unordered_set<std::string>;
+
+Folders foldersIn(const PathSequence& paths, Chunk chunk) {
+    Folders folders;
+    const std::string* last = nullptr;  // neighbours mostly share a folder
+    paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
+        const std::string_view folder = nameOfFolder(path);
+        if (last == nullptr || *last != folder)
+            last = &*folders.emplace(folder).first;
+    });
+    return folders;
+}
+
+}  // namespace
+
+Indices findPaths(const PathSequence& paths, const Query& query) {
+    if (paths.size() < paths.archive().size() / 4)
+        return findByScan(paths, query);
+    Indices found;
+    std::stop_source stop;
+    const auto search = [&] {
+        found = paths.view().indicesOf(
+            findInArchive(paths.archive(), query, stop.get_token()));
+    };
+    runInterruptibly(
+        stop, [&] { namingArchive(paths.stored()->file(), search); }, [] {});
+    return found;
+}
+
+FirstIndices firstIndicesOf(const PathSequence& paths,
+                            const paths::PathList& asked) {
+    return namingArchive(paths.stored()->file(), [&] {
+        return areWorthAScan(paths, asked.size()) ? askAll(paths, asked)
+                                                  : askEach(paths, asked);
+    });
+}
+
+std::vector<std::string> foldersOf(const PathSequence& paths) {
+    Folders folders;
+    scanAll<Folders>(
+        paths, [&](Chunk chunk) { return foldersIn(paths, chunk); },
+        [&](Chunk, Folders here) { folders.merge(here); });
+    std::vector<std::string> sorted(folders.begin(), folders.end());
+    std::ranges::sort(sorted);
+    return sorted;
+}
+
+}  // namespace tessel::python
