@@ -4,6 +4,7 @@
 Checks what pages of Markdown say against what is there:
 
   - a relative link leads to a file of ours;
+  - the map, docs/architecture.md, names each source file of the core;
   - a block marked cpp is, spaces aside, part of a program of examples/ or of
     hosts/minimal/;
   - with --run, each block marked console is run, in one empty folder per page
@@ -22,6 +23,7 @@ import sys
 import tempfile
 
 LINK = re.compile(r"\]\(([^)#:]+)(?:#[^)]*)?\)")
+MAPPED_ROOMS = ["packing", "pathtree", "coder", "paths", "binding", "qztessel"]
 NUMBER = re.compile(r"[0-9][0-9.,]*[0-9]|[0-9]")
 
 
@@ -36,6 +38,17 @@ def broken_links(page, text):
     for target in LINK.findall(prose):
         if not (page.parent / target).exists():
             yield f"no file {target}"
+
+
+def unmapped_files(page, text):
+    """Source files of the core that the map does not name."""
+    if page.name != "architecture.md":
+        return
+    named = set(re.findall(r"\w+", text))
+    for room in MAPPED_ROOMS:
+        for file in sorted(pathlib.Path(room).glob("*.?pp")):
+            if file.stem not in named:
+                yield f"does not name {file}"
 
 
 def without_spaces(text):
@@ -111,7 +124,11 @@ def main():
     found = False
     for page in arguments.pages:
         text = page.read_text()
-        complaints = [*broken_links(page, text), *strange_code(text, programs)]
+        complaints = [
+            *broken_links(page, text),
+            *unmapped_files(page, text),
+            *strange_code(text, programs),
+        ]
         if arguments.run:
             complaints += wrong_output(text, arguments.run.resolve())
         for complaint in complaints:
