@@ -1,0 +1,118 @@
+// What a store is when memory runs out, at every allocation in turn.
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <new>
+#include <string>
+#include <vector>
+
+#include "paths/PathStore.hpp"
+#include "tests/support/AllocationMeter.hpp"
+
+namespace {
+
+using support::AllocationFailure;
+using tessel::PathStore;
+using Strings = std::vector<std::string>;
+
+// More than any of these operations makes.
+constexpr std::size_t mostAllocations = 5000;
+
+// Calls operate() with 0, 1, 2 and so on allocations to spend, until they are
+// enough, and each time afterwards check(succeeded).
+template <class Prepare, class Operate, class Check>
+void atEachAllocation(Prepare prepare, Operate operate, Check check) {
+    std::size_t n = 0;
+    for (bool enough = false; !enough && n < mostAllocations; ++n) {
+        prepare();
+        bool succeeded = true;
+        {
+            const AllocationFailure failure(n);
+            try {
+                operate();
+            } catch (const std::bad_alloc&) {
+                succeeded = false;
+            }
+            enough = !failure.happened();
+        }
+        check(succeeded);
+    }
+    EXPECT_GT(n, 1U) << "nothing was allocated";
+    EXPECT_LT(n, mostAllocations);
+}
+
+Strings inTurn(const PathStore& store) {
+    Strings paths;
+    for (const std::string_view path : store) paths.emplace_back(path);
+    return paths;
+}
+
+Strings inTreeOrder(const PathStore& store) {
+    Strings paths;
+    store.forEachInTreeOrder(
+        [&paths](std::string_view path) { paths.emplace_back(path); });
+    return paths;
+}
+
+// By every way out, these paths and no others.
+void expectPaths(const PathStore& store, Strings expected) {
+    EXPECT_EQ(inTurn(store), expected);
+    EXPECT_EQ(inTurn(PathStore::load(store.save())), expected);
+    Strings anyOrder = inTreeOrder(store);
+    std::sort(anyOrder.begin(), anyOrder.end());
+    std::sort(expected.begin(), expected.end());
+    EXPECT_EQ(anyOrder, expected);
+}
+
+Strings basePaths() { return {"/a/b", "/a/c", "b/a", "/a/b", "c/", "/b/aa"}; }
+
+// Files of old and new folders, repeats, and a name of many slabs' length.
+Strings morePaths() {
+    Strings paths = {"/a/cc", "b/c/a", "/a/b", "c/a/b/c", "a", "/c/c/c/"};
+    for (std::size_t i = 0; i < 60; ++i)
+        paths.push_back("/a/" + std::string(1 + i % 5, 'a') + "/" +
+                        std::string(1 + i % 7, 'b'));
+    paths.emplace_back(70'000, 'c');
+    return paths;
+}
+
+void expectAppendedOrAsItWas(const Strings& more) {
+    PathStore store;
+    Strings all = basePaths();
+    all.insert(all.end(), more.begin(), more.end());
+    atEachAllocation([&] { store = PathStore::from(basePaths()); },
+                     [&] { store.append(more); },
+                     [&](bool succeeded) {
+                         expectPaths(store, succeeded ? all : basePaths());
+                         if (succeeded) return;
+                         store.append(more);
+                         expectPaths(store, all);
+                     });
+}
+
+TEST(PathStoreMemory, PathsAreAppendedOrTheStoreIsAsItWas) {
+    expectAppendedOrAsItWas(morePaths());
+}
+
+TEST(PathStoreMemory, AStoreThatIsEncodedAnewIsSoOrAsItWas) {
+    Strings more = morePaths();
+    more.emplace_back("/a/another character");
+    expectAppendedOrAsItWas(more);
+}
+
+TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {
+    const PathStore store = PathStore::from(morePaths());
+    const auto bytes = store.save();
+    atEachAllocation([] {}, [&] { EXPECT_EQ(store.save(), bytes); },
+                     [](bool) {});
+    atEachAllocation([] {},
+                     [&] {
+                         const PathStore loaded = PathStore::load(bytes);
+                         EXPECT_EQ(loaded.size(), store.size());
+                     },
+                     [](bool) {});
+    expectPaths(store, morePaths());
+}
+
+}  // namespace
