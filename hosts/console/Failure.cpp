@@ -23,6 +23,17 @@ std::string withoutFullStop(std::string sentence) {
     return sentence;
 }
 
+std::string damageText(const DamagedArchiveException& damage) {
+    // Mostly somebody names a list where an archive belongs.
+    if (damage.offset() == 0)
+        return withoutFullStop(damage.cause()) +
+               "; `tessel pack` makes an archive of a list, `tessel list "
+               "--salvage` reads what is left of a damaged one";
+    return withoutFullStop(damage.what()) +
+           "; `tessel verify` lists the damage, `tessel list --salvage` reads "
+           "what is left";
+}
+
 }  // namespace
 
 Failure describeCurrentException() {
@@ -44,11 +55,8 @@ void rethrowNaming(const std::string& file) {
     try {
         throw;
     } catch (const DamagedArchiveException& damage) {
-        throw ConsoleException(
-            ExitStatus::Damaged,
-            fmt::format("{}: {}; `tessel verify` lists the damage, `tessel "
-                        "list --salvage` reads what is left",
-                        file, withoutFullStop(damage.what())));
+        throw ConsoleException(ExitStatus::Damaged,
+                               fmt::format("{}: {}", file, damageText(damage)));
     } catch (const UnsupportedArchiveVersionException& newer) {
         throw ConsoleException(
             ExitStatus::BadInput,

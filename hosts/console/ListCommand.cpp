@@ -73,8 +73,8 @@ ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
                                 paths.write(number, path);
                                 if (++done % 4096 == 0) bar.update(done);
                             });
-        return folder_ && total == 0 ? ExitStatus::NoMatch
-                                     : ExitStatus::Success;
+        const bool isPart = folder_ && !folder_->empty();
+        return isPart && total == 0 ? ExitStatus::NoMatch : ExitStatus::Success;
     });
 }
 

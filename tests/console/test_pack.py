@@ -32,6 +32,7 @@ def test_the_empty_list(tessel):
     line = tessel.pack([]).out
     assert line.startswith(b"0 paths, 0 bytes of text, ")
     assert tessel.list() == []
+    assert tessel("list", "a.tessel", "--folder", "").out == b""
     assert tessel("find", "a.tessel", "x", expect=1).out == b""
     assert tessel("info", "a.tessel").out.startswith(b"paths")
     tessel("verify", "a.tessel")

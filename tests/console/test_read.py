@@ -309,6 +309,8 @@ def test_salvage_of_what_is_no_archive(tessel):
     done = tessel("list", "text", "--salvage", expect=4)
     assert done.err.count(b"\n") == 1
     assert b"--salvage" not in done.err
+    # A list where an archive belongs is told from damage in the middle.
+    assert b"tessel pack" in tessel("list", "text", expect=4).err
 
 
 def test_damage_is_told_everywhere(tessel):
