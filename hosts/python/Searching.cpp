@@ -83,12 +83,22 @@ bool isQuickToAsk(const PathSequence& paths) {
            (index != info.sections.end() && index->bytes > 0);
 }
 
-// A scan takes some 0.1 microseconds per path of the list. A question takes
-// some 3 microseconds, or 2 nanoseconds per path of the list where it is a
-// scan of its own.
+// Measured on a list of 7 million paths: a scan takes 0.6 microseconds per path
+// of the list, nearly all for looking the path up among a million asked for; a
+// question takes 4 microseconds, or 2 nanoseconds per path of the list where it
+// is a scan of its own. In a view, it searches a folder: milliseconds.
 bool areWorthAScan(const PathSequence& paths, std::uint64_t asked) {
-    if (!paths.view().isWhole()) return true;
-    return isQuickToAsk(paths) ? asked > paths.size() / 16 : asked > 50;
+    if (!paths.view().isWhole()) return asked > 16;
+    return isQuickToAsk(paths) ? asked > paths.size() / 4 : asked > 300;
+}
+
+std::int64_t firstIndexOf(const PathSequence& paths, std::string_view path) {
+    if (paths.view().isWhole()) {
+        const auto number = paths.archive().numberOf(path);
+        return number ? static_cast<std::int64_t>(*number) : -1;
+    }
+    const Indices all = paths.indicesOf(path);
+    return all.empty() ? -1 : static_cast<std::int64_t>(all.front());
 }
 
 using FirstIndices = std::vector<std::int64_t>;
@@ -100,10 +110,8 @@ FirstIndices askEach(const PathSequence& paths, const paths::PathList& asked) {
     indices.reserve(asked.size());
     const auto ask = [&](Chunk chunk) {
         FirstIndices here;
-        for (std::uint64_t i = chunk.begin; i < chunk.end; ++i) {
-            const auto number = paths.archive().numberOf(asked[i]);
-            here.push_back(number ? static_cast<std::int64_t>(*number) : -1);
-        }
+        for (std::uint64_t i = chunk.begin; i < chunk.end; ++i)
+            here.push_back(firstIndexOf(paths, asked[i]));
         return here;
     };
     inChunks<FirstIndices>(
