@@ -1,0 +1,42 @@
+"""The wheel, built from a source distribution, as it is installed."""
+
+import os
+import pathlib
+import shutil
+import subprocess
+import sys
+import zipfile
+
+import qztessel
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+EXAMPLE = """
+import qztessel
+assert qztessel.__file__.startswith({folder!r}), qztessel.__file__
+paths = qztessel.PathList.pack(["a/b", "c"])
+assert list(paths[::-1]) == ["c", "a/b"]
+"""
+
+
+def run(*words, cwd, **environment):
+    subprocess.run(
+        [sys.executable, *words],
+        check=True,
+        cwd=cwd,
+        env={**os.environ, **environment},
+    )
+
+
+def test_wheel(tmp_path):
+    source, wheels, folder = (tmp_path / name for name in ("in", "out", "installed"))
+    left_out = shutil.ignore_patterns(".git", ".cache", "build", "tests", "bench")
+    shutil.copytree(ROOT, source, ignore=left_out)
+    # The module is the one that is tested here: to build it takes minutes.
+    module = pathlib.Path(qztessel.__file__).parents[3]
+    words = ["-m", "build", "--no-isolation", "--outdir", str(wheels)]
+    run(*words, cwd=source, QZTESSEL_PYTHON_BUILD=str(module))
+    (wheel,) = wheels.glob("*.whl")
+    zipfile.ZipFile(wheel).extractall(folder)
+    run("-c", EXAMPLE.format(folder=str(folder)), cwd=tmp_path, PYTHONPATH=str(folder))
+    names = set(os.listdir(folder / "qztessel"))
+    assert {"__init__.py", "_path_list.py", "_core.pyi", "py.typed"} <= names
