@@ -466,6 +466,33 @@ TEST_F(MethodsTest, GetPathsWithSeparatorSkipsFolderWithoutComponents) {
               (Listing{{{}, {u"a"}, {u"b"}}, {{u"cc"}, {u"b"}, {u"c"}}}));
 }
 
+TEST_F(MethodsTest, GetPathsWithoutEndsYieldsFoldersOfPartitions) {
+    // A stored form may have tracks alone.
+    HuffmanPathTree coder;
+    const std::vector<double> equal(3, 1.0);
+    coder.deflateHuffman(equal.data(), u"abc");
+    HuffmanPathTree::FolderTexts folders = {{u"a", u"b"}, {u"b"}};
+    HuffmanPathTree::FolderTexts files = {{u"c", u"cc"}, {u"c"}};
+    coder.generateCodeAsyncAndAddPaths(folders, files);
+    coder.partitionEnds.clear();
+    std::vector<std::uint8_t> bytes;
+    coder.serialize(bytes, true);
+    const Value instance =
+        make(Value::text(u"tree"), Value::text(coder.getTreeString()),
+             Value::byteColumn(bytes), Value::column(equal));
+
+    const Value numbers = Value::column({2, 1});
+    const std::vector<Value> outputs =
+        host_.call(2, instance, "getPaths", numbers);
+    EXPECT_EQ(listsOf(outputs[0]), (std::vector<Texts>{{u"b"}, {u"a", u"b"}}));
+    EXPECT_EQ(outputs[1].dimensions(), (Dimensions{0, 1}));
+    const Value joinedPaths =
+        host_.call(1, instance, "getPaths", numbers, Value::text(u"/"))[0];
+    ASSERT_EQ(joinedPaths.dimensions(), (Dimensions{2, 1}));
+    EXPECT_EQ(joinedPaths.element(0), Value());
+    EXPECT_EQ(joinedPaths.element(1), Value());
+}
+
 TEST_F(MethodsTest, GetPathsLeavesRowsForNumbersBeyondTheEndUnset) {
     const Value instance = filled(smallListing());
     const Value paths =
