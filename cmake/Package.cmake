@@ -3,6 +3,7 @@
 #   tessel            the command, its pages and completions
 #   libqztessel1      the plug-in and its messages
 #   libqztessel-dev   libraries, headers, documents, examples
+#   python3-qztessel  the Python package
 #
 # DEBFULLNAME and DEBEMAIL name the maintainer, as for Debian's own tools.
 set(CPACK_GENERATOR DEB)
@@ -18,6 +19,9 @@ set(CPACK_DEB_COMPONENT_INSTALL ON)
 set(CPACK_COMPONENTS_ALL runtime development)
 if(QZTESSEL_BUILD_COMMAND)
   list(APPEND CPACK_COMPONENTS_ALL command)
+endif()
+if(TARGET qztessel_python)
+  list(APPEND CPACK_COMPONENTS_ALL python)
 endif()
 set(CPACK_COMPONENTS_GROUPING IGNORE)
 
@@ -66,6 +70,16 @@ archive that is mapped and answers in less than a microsecond.
 .
 This package has the static libraries, their headers, the CMake package and
 the files for pkg-config.")
+
+set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-qztessel)
+set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
+set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
+    "python3 (>= 3.11~), python3 (<< 3.12), python3-numpy")
+set(CPACK_COMPONENT_PYTHON_DESCRIPTION
+    "very large lists of paths that Python's processes share
+Keeps millions of file paths in an archive that is mapped, and shows them as a
+sequence: slices, shuffles and shards without copying, and searches on all
+cores. Worker processes share one copy of the list.")
 
 # ---- What only a Debian package has ----
 

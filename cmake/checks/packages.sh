@@ -26,7 +26,7 @@ names=$(for package in "${packages[@]}"; do
     dpkg-deb -f "$package" Package
     dpkg-deb -x "$package" "$root"
 done | sort | xargs)
-[[ $names == "libqztessel-dev libqztessel1 tessel" ]] ||
+[[ $names == "libqztessel-dev libqztessel1 python3-qztessel tessel" ]] ||
     fail "these were made: $names"
 
 "$cmake" --install "$build" --prefix "$work/all/usr" >/dev/null
@@ -75,6 +75,16 @@ for file in man/man1/tessel{,-pack}.1.gz bash-completion/completions/tessel \
     qztessel/messages/VELOX/datastoreio/huffmanpaths.messages; do
     [[ -f $root/usr/share/$file ]] || fail "no package has $file"
 done
+
+# ---- The Python package, where it was put ----
+
+PYTHONDONTWRITEBYTECODE=1 PYTHONPATH=$root/usr/lib/python3/dist-packages \
+    /usr/bin/python3 -c '
+import sys
+from qztessel import PathList
+with open(sys.argv[1]) as lines:
+    assert list(PathList.open(sys.argv[2])) == lines.read().split("\n")[:-1]
+' "$work/list" "$work/list.tessel" || fail "the Python package does not work"
 
 # ---- In and out again ----
 
