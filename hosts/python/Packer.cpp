@@ -1,9 +1,12 @@
 #include "hosts/python/Packer.hpp"
 
 #include <algorithm>
+#include <array>
+#include <fstream>
 #include <stdexcept>
 #include <utility>
 
+#include "archive/Format.hpp"
 #include "hosts/python/Errors.hpp"
 #include "hosts/python/Interruptible.hpp"
 #include "hosts/python/PathObjects.hpp"
@@ -25,6 +28,15 @@ namespace {
     py::raise_from(error, PyExc_TypeError,
                    (text + ": give str, bytes or os.PathLike").c_str());
     throw py::error_already_set();
+}
+
+// Whether a file begins as an archive does.
+bool isArchive(const std::string& file) {
+    std::array<char, archive::fileMagic.size()> start{};
+    std::ifstream(file, std::ios::binary).read(start.data(), start.size());
+    return std::ranges::equal(start, archive::fileMagic, {}, [](char c) {
+        return static_cast<std::uint8_t>(c);
+    });
 }
 
 PathBytes bytesAt(const py::handle& item, std::uint64_t position) {
@@ -130,6 +142,8 @@ void Packer::addSequence(const PathSequence& paths) {
 }
 
 void Packer::addListFile(const std::string& file) {
+    if (isArchive(file))
+        return addSequence(PathSequence(StoredList::open(file)));
     run([&] {
         const paths::PathList list = paths::readListFile(file);
         for (std::size_t i = 0; i < list.size(); ++i) addPath(list[i]);

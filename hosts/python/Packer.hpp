@@ -45,7 +45,8 @@ public:
     void addIterable(const pybind11::iterable& paths);
     void addSequence(const PathSequence& paths);
 
-    // Adds the lines of a file, or its records if it holds a NUL.
+    // Adds the lines of a file, or its records if it holds a NUL; of an
+    // archive, its paths.
     void addListFile(const std::string& file);
 
     // Adds all files below a folder, as walkFolder shows them. Returns what
@@ -56,8 +57,9 @@ public:
     StoredList::Pointer finish();
 
 private:
-    // A stage of packing that looks at no signals for longer than this many
-    // paths would not answer Ctrl-C in time.
+    // Paths that are taken from Python, or read from a list, at a time: a few
+    // milliseconds, so that Ctrl-C is answered, and some hundred times what it
+    // costs to start a thread.
     static constexpr std::uint64_t pathsPerBatch = 16384;
 
     Packer(std::string file, pybind11::object progress)

@@ -42,6 +42,11 @@ def test_list_files(tmp_path):
         PathList.pack(tmp_path / "gap")
 
 
+def test_an_archive_as_a_list_file(plain, tmp_path):
+    PathList.pack(plain, tmp_path / "x.tessel")
+    assert list(PathList.pack(tmp_path / "x.tessel", as_bytes=True)) == plain
+
+
 def test_folder(tmp_path):
     top = tmp_path / "top"
     for name in ("b/x", "b/a/y", "c"):

@@ -123,8 +123,8 @@ class PathList(Sequence[AnyStr]):
         """Pack paths into an archive and open it.
 
         source    paths; or the name of a list file with one path per line (or
-                  separated by NUL); or the name of a folder, for all files
-                  below it
+                  separated by NUL), or of an archive; or the name of a folder,
+                  for all files below it
         file      the archive to write, which is replaced as a whole at the
                   end; without it, the archive is in memory
         level     "fast" takes two thirds of the time, and 6 % more room;
