@@ -28,7 +28,7 @@ public:
         std::size_t firstPath = 0;
         coder.partitionTracks.forEach([&](const tessel::PathTrack& track) {
             positions_.insert(positions_.end(), track.begin(), track.end());
-            // A folder that was new has no position of a file behind its own.
+            // A folder that was new has no position of a file after its own.
             if (track.size() == folderDepth(splitter, firstPath)) {
                 positions_.push_back(0);
             }

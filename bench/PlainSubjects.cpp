@@ -185,7 +185,7 @@ private:
     std::vector<Text> texts_;
 };
 
-// All texts one behind the other, and where each ends.
+// All texts one after the other, and where each ends.
 template <class Offset>
 class TextBuffer {
 public:

@@ -1,6 +1,6 @@
 // An archive with any content under right checksums. The input is an archive
 // whose checksums are mended before it is opened, so that the engine reaches
-// the readers behind them. Every operation answers or throws
+// the readers that follow. Every operation answers or throws
 // DamagedArchiveException, and the operations agree with each other.
 #include <algorithm>
 #include <cstdint>

@@ -20,7 +20,7 @@ bool isByteSurrogate(char16_t unit) noexcept {
 
 // The bytes that a character takes whose first byte this is, 0 if none can
 // begin so.
-std::size_t lengthBehind(unsigned char first) noexcept {
+std::size_t sequenceLength(unsigned char first) noexcept {
     if (first >= 0xC2 && first <= 0xDF) return 2;
     if (first >= 0xE0 && first <= 0xEF) return 3;
     if (first >= 0xF0 && first <= 0xF4) return 4;
@@ -41,7 +41,7 @@ bool isScalar(char32_t value) noexcept {
 // returns their number, or 0 if they are not UTF-8.
 std::size_t readMultibyte(std::string_view bytes, char32_t& value) noexcept {
     const auto first = static_cast<unsigned char>(bytes.front());
-    const std::size_t length = lengthBehind(first);
+    const std::size_t length = sequenceLength(first);
     if (length == 0 || length > bytes.size()) return 0;
     value = first & (0x7FU >> length);
     for (std::size_t i = 1; i < length; ++i) {

@@ -367,7 +367,7 @@ TEST_P(HostileForm, WithEveryByteBeforeCompressionChanged) {
     }
 }
 
-TEST_P(HostileForm, WithBytesBehindIt) {
+TEST_P(HostileForm, WithBytesAfterIt) {
     Judge judge(false);
     for (unsigned first = 0; first < 256; ++first) {
         for (const Bytes& rest : {Bytes{}, Bytes{0, 0, 0}, Bytes(40, 0xFF)}) {

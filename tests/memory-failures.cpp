@@ -1,4 +1,4 @@
-// What is left behind when memory runs out, at every allocation in turn.
+// What is left when memory runs out, at every allocation in turn.
 
 #include <gtest/gtest.h>
 #include <zlib.h>

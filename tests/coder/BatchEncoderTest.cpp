@@ -255,7 +255,7 @@ TEST(BatchEncoder, ARefusedSingleFolderInsertsNothing) {
 }
 
 TEST(BatchEncoder, WhatARefusedBatchLeavesDoesNotDependOnTheThreads) {
-    // Long components before and behind the failure.
+    // Long components before and after the failure.
     for (std::size_t tall = 0; tall < 8; ++tall) {
         Batch batch;
         batch.files[tall] = {std::u16string(2000, u'a')};
@@ -318,7 +318,7 @@ TEST(BatchEncoder, ALopsidedBatchIsInsertedInOrderOnAnyNumberOfThreads) {
 
 // The second worker meets a long name in its own folders, runs out of them
 // and then meets the failure among the first worker's.
-TEST(BatchEncoder, ALongNameBehindTheFailureDoesNotCount) {
+TEST(BatchEncoder, ALongNameAfterTheFailureDoesNotCount) {
     Batch batch = lopsidedBatch();
     const std::size_t half = batch.folders.size() / 2;
     batch.files[batch.files.size() - 1] = {std::u16string(2000, u'a')};

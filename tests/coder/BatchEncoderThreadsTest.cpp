@@ -97,7 +97,7 @@ TEST(ThreadCreation, AFailureBeforeTheMissingThreadsFoldersComesFirst) {
     EXPECT_EQ(coder->pathCount, 0U);
 }
 
-TEST(ThreadCreation, AFailureBehindTheMissingThreadsFoldersComesSecond) {
+TEST(ThreadCreation, AFailureAfterTheMissingThreadsFoldersComesSecond) {
     const CoderPtr coder = support::fourLetterCoder();
     auto bad = files();
     bad[7] = {u"x"};  // of the last worker's folders

@@ -228,7 +228,7 @@ TEST(ComponentDecoder, TheTrailerAloneIsTheEmptyText) {
     EXPECT_EQ(HuffmanPathTree().generatePathFrom({0}), u"");
 }
 
-TEST(ComponentDecoder, BitsBehindTheLastWholeCodeAreIgnored) {
+TEST(ComponentDecoder, BitsAfterTheLastWholeCodeAreIgnored) {
     const CoderPtr coder = support::fourLetterCoder();
     EXPECT_EQ(coder->generatePathFrom({0b0111, 3}), u"d");
     EXPECT_EQ(coder->generatePathFrom({0b1, 1}), u"");

@@ -543,7 +543,7 @@ TEST(CoderForm, AnUnknownMarkerEndsReading) {
     }
 }
 
-TEST(CoderForm, AnUnknownMarkerBehindThePartitionsEndsReading) {
+TEST(CoderForm, AnUnknownMarkerAfterThePartitionsEndsReading) {
     for (unsigned marker = 1; marker < 256; ++marker) {
         HuffmanPathTree coder;
         load(coder, plainForm({shapeOfTwo,
@@ -646,7 +646,7 @@ TEST(CoderForm, AShapeThatIsNoFullBinaryTreeIsDamaged) {
         {0b0, 1},        // an inner node alone
         {0b10, 2},       // its right child is missing
         {0b01, 2},       // a second root
-        {0b110, 4},      // a node behind the tree
+        {0b110, 4},      // a node after the tree
         {0b0110, 4},     //
         {0b11, 2},       // two leaves
         {0xFF, 0, 0},    // eight leaves

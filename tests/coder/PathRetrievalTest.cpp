@@ -81,7 +81,7 @@ TEST(PathRetrieval, OneFileOfEachOfTwoPartitions) {
               (Answer{{{u"a"}, {u"b"}}, {{u"a"}, {u"d"}}}));
 }
 
-TEST(PathRetrieval, ANumberBehindTheLastPartitionEndsTheCollection) {
+TEST(PathRetrieval, ANumberAfterTheLastPartitionEndsTheCollection) {
     const CoderPtr coder = threePartitions();
     EXPECT_EQ(answerFor(*coder, {9, 10, 1}), (Answer{{{u"a"}}, {{u"dd"}}}));
     EXPECT_EQ(answerFor(*coder, {10, 1, 2}), Answer{});
@@ -91,7 +91,7 @@ TEST(PathRetrieval, ANumberBehindTheLastPartitionEndsTheCollection) {
     EXPECT_EQ(answerFor(*coder, {9223372036854775808.0}), Answer{});
 }
 
-TEST(PathRetrieval, InfinityCountsAsBehindTheLastPartition) {
+TEST(PathRetrieval, InfinityCountsAsAfterTheLastPartition) {
     const CoderPtr coder = threePartitions();
     EXPECT_EQ(answerFor(*coder, {5, infinity}), (Answer{{{u"b"}}, {{u"d"}}}));
     EXPECT_EQ(answerFor(*coder, {infinity, nan, 0}), Answer{});

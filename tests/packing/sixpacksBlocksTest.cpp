@@ -150,7 +150,7 @@ TEST(PackedBlocks, ALengthThatDoesNotFitIsCutAndTheRestStaysUnread) {
     EXPECT_EQ(it - out.cbegin(), 45);
 }
 
-TEST(PackedBlocks, UnpackedBytesComeBehindThoseAlreadyThere) {
+TEST(PackedBlocks, UnpackedBytesComeAfterThoseAlreadyThere) {
     const Bytes bytes = {2, 5, 6, 0xEE};
     Bytes back = {1};
     auto it = bytes.begin();

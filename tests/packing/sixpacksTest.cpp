@@ -160,7 +160,7 @@ TEST(PackedIntegers, TheCountComesBeforeTheValues) {
     EXPECT_EQ(out, (Bytes{0x02, 0x00, 0x01, 0x02}));
 }
 
-TEST(PackedIntegers, UnpackedValuesComeBehindThoseAlreadyThere) {
+TEST(PackedIntegers, UnpackedValuesComeAfterThoseAlreadyThere) {
     const Bytes bytes = {2, 5, 6, 0xEE};
     Sizes values = {1, 2};
     auto it = bytes.begin();
@@ -191,7 +191,7 @@ TEST(PackedIntegers, TheWidthFourIsRefusedEverywhere) {
     EXPECT_EQ(cursor.remaining(), bytes.size());
 }
 
-TEST(PackedIntegers, ABadWidthOfTheValuesIsSeenBehindTheCount) {
+TEST(PackedIntegers, ABadWidthOfTheValuesIsSeenAfterTheCount) {
     const PackedSizeT four = unknownWidth(4);
     const Bytes bytes = {0, 0, 9};
     Bytes out;

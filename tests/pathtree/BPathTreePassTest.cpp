@@ -160,7 +160,7 @@ TEST(PathTreeIteration, PathsOfOneFolderComeTogetherInInsertionOrder) {
     EXPECT_EQ(allPaths(tree), (Paths{"a/x", "a/z", "b/y"}));
 }
 
-TEST(PathTreeIteration, FilesBetweenFoldersAndBehindThem) {
+TEST(PathTreeIteration, FilesBetweenFoldersAndAfterThem) {
     BPathTree tree;
     addBatch(tree, {"a", "b", "c"}, {"1"});
     addBatch(tree, {"a", "b"}, {"2"});

@@ -64,7 +64,7 @@ TEST(ComponentArena, AArenaIsAsNewAfterItsBuffersWereTaken) {
     EXPECT_EQ(unpacked(second), (Components{{4}}));
 }
 
-TEST(ComponentArena, TheSlackBehindAComponentMayBeWritten) {
+TEST(ComponentArena, TheSlackAfterAComponentMayBeWritten) {
     ComponentArena arena;
     for (std::size_t length = 0; length < 3000; ++length) {
         std::uint8_t* to = arena.extend(length);

@@ -207,7 +207,7 @@ std::string brokenInPartitions(const HuffmanPathTree& coder) {
         return "partition ends fall";
     if (!coder.partitionEnds.empty() &&
         coder.partitionEnds.back() > coder.pathCount)
-        return "a partition ends behind the last path";
+        return "a partition ends after the last path";
     return "";
 }
 
