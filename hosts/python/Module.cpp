@@ -256,25 +256,10 @@ PathSequence sliced(const PathSequence& paths, std::uint64_t first,
     return {paths.stored(), paths.view().sliced(first, step, count)};
 }
 
-void bindPathSequence(py::module_& module) {
-    py::class_<PathSequence>(module, "PathSequence")
-        .def(py::init([](const std::shared_ptr<StoredList>& stored) {
-            return PathSequence(stored);
-        }))
-        .def("__len__", &PathSequence::size)
-        .def("at", &pathAt)
-        .def("block", &blockOf)
-        .def("indices_of", &indicesOf)
-        .def("contains", &contains)
-        .def("equals", &areEqual)
-        .def("slice", &sliced)
-        .def("shuffled",
-             [](const PathSequence& paths, std::uint64_t seed) {
-                 return PathSequence(paths.stored(),
-                                     paths.view().shuffled(seed));
-             })
-        .def("select", &selected)
-        .def("take_list",
+using PathSequenceClass = py::class_<PathSequence>;
+
+void bindBulk(PathSequenceClass& type) {
+    type.def("take_list",
              [](const PathSequence& paths, const IndexArray& indices,
                 bool asBytes) {
                  return takeList(paths, fromStart(paths, indices),
@@ -288,17 +273,42 @@ void bindPathSequence(py::module_& module) {
              })
         .def("numbers", &numbersOf)
         .def("find", &find)
-        .def("folders", &folderList)
+        .def("folders", &folderList);
+}
+
+void bindViews(PathSequenceClass& type) {
+    type.def("slice", &sliced)
+        .def("shuffled",
+             [](const PathSequence& paths, std::uint64_t seed) {
+                 return PathSequence(paths.stored(),
+                                     paths.view().shuffled(seed));
+             })
+        .def("select", &selected)
         .def("steps", &stepsOf)
         .def_property_readonly(
             "is_whole",
             [](const PathSequence& paths) { return paths.view().isWhole(); })
-        .def_property_readonly(
-            "heap_bytes",
-            [](const PathSequence& paths) { return paths.view().heapBytes(); })
+        .def_property_readonly("heap_bytes", [](const PathSequence& paths) {
+            return paths.view().heapBytes();
+        });
+}
+
+void bindPathSequence(py::module_& module) {
+    PathSequenceClass type(module, "PathSequence");
+    type.def(py::init([](const std::shared_ptr<StoredList>& stored) {
+            return PathSequence(stored);
+        }))
+        .def("__len__", &PathSequence::size)
+        .def("at", &pathAt)
+        .def("block", &blockOf)
+        .def("indices_of", &indicesOf)
+        .def("contains", &contains)
+        .def("equals", &areEqual)
         .def_property_readonly("stored", [](const PathSequence& paths) {
             return shared(paths.stored());
         });
+    bindViews(type);
+    bindBulk(type);
 }
 
 // ---- Packing ----
