@@ -8,7 +8,7 @@ namespace tessel::console {
 
 namespace {
 
-using limits = std::numeric_limits<std::int64_t>;
+using Limits = std::numeric_limits<std::int64_t>;
 
 // Reads a number at the start of the text and removes it. One that does not
 // fit becomes the nearest that does; no list is so long.
@@ -17,7 +17,7 @@ std::optional<std::int64_t> takeNumber(std::string_view& text) noexcept {
     const auto [end, error] =
         std::from_chars(text.data(), text.data() + text.size(), number);
     if (error == std::errc::result_out_of_range)
-        number = text.front() == '-' ? limits::min() : limits::max();
+        number = text.front() == '-' ? Limits::min() : Limits::max();
     else if (error != std::errc())
         return std::nullopt;
     text.remove_prefix(static_cast<std::size_t>(end - text.data()));
