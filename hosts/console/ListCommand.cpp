@@ -6,6 +6,7 @@
 #include "hosts/console/ConsoleException.hpp"
 #include "hosts/console/Failure.hpp"
 #include "hosts/console/InputFile.hpp"
+#include "hosts/console/ListReader.hpp"
 
 namespace tessel::console {
 
@@ -68,11 +69,10 @@ ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
         bar.begin("listing", ProgressUnit::Paths, total);
         std::uint64_t done = 0;
         for (const NumberRange& range : ranges)
-            archive.forEach(range.begin, range.end,
-                            [&](std::uint64_t number, std::string_view path) {
-                                paths.write(number, path);
-                                if (++done % 4096 == 0) bar.update(done);
-                            });
+            if (numbers_)
+                writeNumbered(archive, range, paths, bar, done);
+            else
+                write(archive, range, session.output, bar, done);
         const bool isPart = folder_ && !folder_->empty();
         return isPart && total == 0 ? ExitStatus::NoMatch : ExitStatus::Success;
     });
@@ -91,6 +91,26 @@ SalvageReport ListCommand::salvageFrom(InputFile& input,
                                            "it",
                                            input.name(), damage.what()));
     }
+}
+
+void ListCommand::write(const PathArchive& archive, const NumberRange& range,
+                        OutputBuffer& output, ProgressBar& bar,
+                        std::uint64_t& done) const {
+    const ListReader reader(archive, nul_ ? '\0' : '\n');
+    reader.read(range, [&](std::string_view text, std::uint64_t paths) {
+        output.write(text);
+        bar.update(done += paths);
+    });
+}
+
+void ListCommand::writeNumbered(const PathArchive& archive,
+                                const NumberRange& range, PathOutput& paths,
+                                ProgressBar& bar, std::uint64_t& done) {
+    archive.forEach(range.begin, range.end,
+                    [&](std::uint64_t number, std::string_view path) {
+                        paths.write(number, path);
+                        if (++done % 4096 == 0) bar.update(done);
+                    });
 }
 
 ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {

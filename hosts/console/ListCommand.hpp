@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 
@@ -7,6 +8,7 @@
 #include "hosts/console/Command.hpp"
 #include "hosts/console/InputFile.hpp"
 #include "hosts/console/PathOutput.hpp"
+#include "hosts/console/ProgressBar.hpp"
 
 namespace tessel::console {
 
@@ -19,6 +21,13 @@ public:
 
 private:
     ExitStatus list(Session& session, PathOutput& paths) const;
+    // Both write the paths of a range and count them.
+    void write(const PathArchive& archive, const NumberRange& range,
+               OutputBuffer& output, ProgressBar& bar,
+               std::uint64_t& done) const;
+    static void writeNumbered(const PathArchive& archive,
+                              const NumberRange& range, PathOutput& paths,
+                              ProgressBar& bar, std::uint64_t& done);
     ExitStatus salvage(Session& session, PathOutput& paths) const;
     SalvageReport salvageFrom(InputFile& input, PathVisitor visitor) const;
     bool isBelowFolder(std::string_view path) const noexcept;

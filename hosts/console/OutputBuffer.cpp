@@ -38,9 +38,12 @@ void OutputBuffer::flush() {
 }
 
 void OutputBuffer::writeLarge(std::string_view bytes) {
+    if (bytes.size() >= capacity) {
+        flush();
+        return writeAll(bytes);
+    }
     writeBuffer();
     buffer_.append(bytes);
-    if (bytes.size() >= capacity) flush();
 }
 
 void OutputBuffer::writeBuffer() {
