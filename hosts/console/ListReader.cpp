@@ -10,9 +10,9 @@ namespace tessel::console {
 
 namespace {
 
-// Some milliseconds of work. Shuffled lists are read the faster, the more of
-// them is read at a time.
-constexpr std::uint64_t pathsPerChunk = 16384;
+// About 300 KB of text, which the processor's caches keep until it is written:
+// four times as much makes listing a million paths a tenth slower.
+constexpr std::uint64_t pathsPerChunk = 4096;
 constexpr std::size_t maxChunkText = std::size_t{4} << 20;
 
 }  // namespace

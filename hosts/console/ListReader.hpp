@@ -16,7 +16,7 @@ namespace tessel::console {
 // Ownership: borrows the archive.
 // Errors: what the archive throws, after all paths before the damage have been
 //   shown.
-// Cost: chunks of 16,384 paths, a few per core, are in memory. Of a chunk that
+// Cost: chunks of 4,096 paths, a few per core, are in memory. Of a chunk that
 //   has more than 4 MiB of text, the rest is read path by path.
 class ListReader {
 public:
