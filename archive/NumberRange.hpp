@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <vector>
 
@@ -23,6 +24,19 @@ inline void appendRange(std::vector<NumberRange>& list, NumberRange range) {
         list.back().end = range.end;
     else
         list.push_back(range);
+}
+
+// How many chunks of `size` numbers a range has. The last one may be smaller.
+constexpr std::uint64_t chunkCount(NumberRange range,
+                                   std::uint64_t size) noexcept {
+    return (range.end - range.begin + size - 1) / size;
+}
+
+// The chunk of this index, below chunkCount.
+constexpr NumberRange chunkOf(NumberRange range, std::uint64_t size,
+                              std::uint64_t index) noexcept {
+    const std::uint64_t begin = range.begin + index * size;
+    return {begin, std::min(begin + size, range.end)};
 }
 
 }  // namespace archive

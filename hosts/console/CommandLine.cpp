@@ -15,9 +15,10 @@ namespace tessel::console {
 
 namespace {
 
-// Marks words that the parser would not take as they are: "[ab]" would be a
-// list of values, "" nothing. A word that starts with this character is marked
-// as well, so that it keeps its own when the mark is taken away.
+// The parser would change some words: it reads "[ab]" as a list of values and
+// drops an empty word. This character is put in front of such words before
+// parsing and removed after it. Words that start with the character get it as
+// well, so that removing it leaves them as they were.
 constexpr char protection = '\x1f';
 
 bool needsProtection(std::string_view word) noexcept {

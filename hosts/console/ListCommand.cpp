@@ -2,6 +2,7 @@
 
 #include <fmt/format.h>
 
+#include "archive/NumberLookup.hpp"
 #include "hosts/console/ArchiveFile.hpp"
 #include "hosts/console/ConsoleException.hpp"
 #include "hosts/console/Failure.hpp"
@@ -53,13 +54,20 @@ ListCommand::ListCommand() : Command(listDescription) {
 }
 
 ExitStatus ListCommand::run(Session& session) {
-    PathOutput paths(session.output, nul_ ? Separator::Nul : Separator::Newline,
-                     numbers_ ? Numbering::Numbers : Numbering::None);
-    return salvage_ ? salvage(session, paths) : list(session, paths);
+    return salvage_ ? salvage(session) : list(session);
 }
 
-ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
+Separator ListCommand::separator() const noexcept {
+    return nul_ ? Separator::Nul : Separator::Newline;
+}
+
+Numbering ListCommand::numbering() const noexcept {
+    return numbers_ ? Numbering::Numbers : Numbering::None;
+}
+
+ExitStatus ListCommand::list(Session& session) const {
     const PathArchive archive = openArchive(file_, session.interrupts);
+    const ListReader reader(archive, separator(), numbering());
     ProgressBar bar(barVisibility(session, Writes::Paths));
     return inFile(file_, [&] {
         const auto ranges = archive.folder(folder_.value_or(""));
@@ -69,10 +77,10 @@ ExitStatus ListCommand::list(Session& session, PathOutput& paths) const {
         bar.begin("listing", ProgressUnit::Paths, total);
         std::uint64_t done = 0;
         for (const NumberRange& range : ranges)
-            if (numbers_)
-                writeNumbered(archive, range, paths, bar, done);
-            else
-                write(archive, range, session.output, bar, done);
+            reader.read(range, [&](std::string_view text, std::uint64_t paths) {
+                session.output.write(text);
+                bar.update(done += paths);
+            });
         const bool isPart = folder_ && !folder_->empty();
         return isPart && total == 0 ? ExitStatus::NoMatch : ExitStatus::Success;
     });
@@ -93,32 +101,14 @@ SalvageReport ListCommand::salvageFrom(InputFile& input,
     }
 }
 
-void ListCommand::write(const PathArchive& archive, const NumberRange& range,
-                        OutputBuffer& output, ProgressBar& bar,
-                        std::uint64_t& done) const {
-    const ListReader reader(archive, nul_ ? '\0' : '\n');
-    reader.read(range, [&](std::string_view text, std::uint64_t paths) {
-        output.write(text);
-        bar.update(done += paths);
-    });
-}
-
-void ListCommand::writeNumbered(const PathArchive& archive,
-                                const NumberRange& range, PathOutput& paths,
-                                ProgressBar& bar, std::uint64_t& done) {
-    archive.forEach(range.begin, range.end,
-                    [&](std::uint64_t number, std::string_view path) {
-                        paths.write(number, path);
-                        if (++done % 4096 == 0) bar.update(done);
-                    });
-}
-
-ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {
+ExitStatus ListCommand::salvage(Session& session) const {
+    const std::string prefix = archive::prefixOf(folder_.value_or(""));
+    PathOutput paths(session.output, separator(), numbering());
     ProgressBar bar(barVisibility(session, Writes::Paths));
     bar.begin("salvaging", ProgressUnit::Paths, 0);
     std::uint64_t read = 0;
     const auto write = [&](std::uint64_t number, std::string_view path) {
-        if (isBelowFolder(path)) paths.write(number, path);
+        if (path.starts_with(prefix)) paths.write(number, path);
         if (++read % 4096 == 0) bar.update(read);
     };
     InputFile input(file_, session.interrupts);
@@ -135,13 +125,6 @@ ExitStatus ListCommand::salvage(Session& session, PathOutput& paths) const {
     throw ConsoleException(
         ExitStatus::Damaged,
         fmt::format("{}: {}", input.name(), lossText(report)));
-}
-
-bool ListCommand::isBelowFolder(std::string_view path) const noexcept {
-    if (!folder_ || folder_->empty()) return true;
-    if (!path.starts_with(*folder_)) return false;
-    return folder_->ends_with('/') ||
-           path.substr(folder_->size()).starts_with('/');
 }
 
 }  // namespace tessel::console

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <cstdint>
 #include <optional>
 #include <string>
 
@@ -8,7 +7,6 @@
 #include "hosts/console/Command.hpp"
 #include "hosts/console/InputFile.hpp"
 #include "hosts/console/PathOutput.hpp"
-#include "hosts/console/ProgressBar.hpp"
 
 namespace tessel::console {
 
@@ -20,17 +18,11 @@ public:
     ExitStatus run(Session& session) override;
 
 private:
-    ExitStatus list(Session& session, PathOutput& paths) const;
-    // Both write the paths of a range and count them.
-    void write(const PathArchive& archive, const NumberRange& range,
-               OutputBuffer& output, ProgressBar& bar,
-               std::uint64_t& done) const;
-    static void writeNumbered(const PathArchive& archive,
-                              const NumberRange& range, PathOutput& paths,
-                              ProgressBar& bar, std::uint64_t& done);
-    ExitStatus salvage(Session& session, PathOutput& paths) const;
+    Separator separator() const noexcept;
+    Numbering numbering() const noexcept;
+    ExitStatus list(Session& session) const;
+    ExitStatus salvage(Session& session) const;
     SalvageReport salvageFrom(InputFile& input, PathVisitor visitor) const;
-    bool isBelowFolder(std::string_view path) const noexcept;
 
     std::string file_;
     bool nul_ = false;

@@ -1,6 +1,7 @@
 #include "hosts/console/ListReader.hpp"
 
-#include <algorithm>
+#include <fmt/format.h>
+
 #include <cstddef>
 #include <vector>
 
@@ -18,24 +19,32 @@ constexpr std::size_t maxChunkText = std::size_t{4} << 20;
 }  // namespace
 
 void ListReader::read(const NumberRange& range, Show show) const {
-    const std::uint64_t paths = range.end - range.begin;
-    const auto chunkAt = [&](std::uint64_t c) {
-        const std::uint64_t begin = range.begin + c * pathsPerChunk;
-        return NumberRange{begin, std::min(begin + pathsPerChunk, range.end)};
-    };
     const ScanOptions options;
-    archive::OrderedScan scan((paths + pathsPerChunk - 1) / pathsPerChunk,
+    archive::OrderedScan scan(archive::chunkCount(range, pathsPerChunk),
                               options);
     std::vector<Piece> pieces(scan.slots());
+    const auto chunkAt = [&](std::uint64_t c) {
+        return archive::chunkOf(range, pathsPerChunk, c);
+    };
     scan.run(
-        [&](std::uint64_t c) { fill(chunkAt(c), pieces[c % pieces.size()]); },
+        [&](std::uint64_t c) { fill(chunkAt(c), pieces[c % scan.slots()]); },
         [&](std::uint64_t c) {
-            this->show(chunkAt(c), pieces[c % pieces.size()], show);
+            this->show(chunkAt(c), pieces[c % scan.slots()], show);
             return true;
         });
 }
 
-// Damage only ends the piece: it is met again when the rest is shown.
+void ListReader::append(std::uint64_t number, std::string_view path,
+                        std::string& text) const {
+    if (numbering_ == Numbering::Numbers) {
+        const fmt::format_int digits(number);
+        text.append(digits.data(), digits.size()).push_back('\t');
+    }
+    text.append(path).push_back(separator_);
+}
+
+// Damage ends the piece but is not reported yet: `show` reads the rest of the
+// chunk again, after the paths before the damage, and throws there.
 void ListReader::fill(const NumberRange& chunk, Piece& piece) const {
     piece.text.clear();
     piece.end = chunk.begin;
@@ -44,8 +53,7 @@ void ListReader::fill(const NumberRange& chunk, Piece& piece) const {
                           [&](std::uint64_t number, std::string_view path) {
                               if (piece.text.size() > maxChunkText)
                                   return false;
-                              piece.text.append(path);
-                              piece.text.push_back(separator_);
+                              append(number, path, piece.text);
                               piece.end = number + 1;
                               return true;
                           });
@@ -58,10 +66,12 @@ void ListReader::show(const NumberRange& chunk, const Piece& piece,
                       Show show) const {
     show(piece.text, piece.end - chunk.begin);
     if (piece.end == chunk.end) return;
+    std::string record;
     archive_->forEach(piece.end, chunk.end,
-                      [&](std::uint64_t, std::string_view path) {
-                          show(path, 1);
-                          show({&separator_, 1}, 0);
+                      [&](std::uint64_t number, std::string_view path) {
+                          record.clear();
+                          append(number, path, record);
+                          show(record, 1);
                       });
 }
 

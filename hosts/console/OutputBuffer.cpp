@@ -21,48 +21,27 @@ constexpr int pipeCapacity = 1 << 20;
 OutputBuffer::OutputBuffer(int descriptor, std::string name)
     : descriptor_(descriptor), name_(std::move(name)) {
     buffer_.reserve(capacity);
-    // If this is a pipe, a larger buffer lets the process that reads it and
-    // this one work at the same time: listing a million paths takes 60 % of
-    // the time that it takes with the usual 64 KiB. The call fails, without
-    // harm, if this is no pipe or the system's limit is lower.
-    ::fcntl(descriptor_, F_SETPIPE_SZ, pipeCapacity);
 }
 
 void OutputBuffer::flush() {
-    if (background_) {
-        background_->write(buffer_);
-        return background_->wait();
-    }
     writeAll(buffer_);
     buffer_.clear();
 }
 
 void OutputBuffer::writeLarge(std::string_view bytes) {
-    if (bytes.size() >= capacity) {
-        flush();
-        return writeAll(bytes);
-    }
-    writeBuffer();
+    if (!isPipeWide_) widenPipe();
+    flush();
+    if (bytes.size() >= capacity) return writeAll(bytes);
     buffer_.append(bytes);
 }
 
-void OutputBuffer::writeBuffer() {
-    if (wroteFirst_ && !background_) startBackground();
-    wroteFirst_ = true;
-    if (!background_) return flush();
-    background_->write(buffer_);
-    buffer_.reserve(capacity);
-}
-
-// Without a second core or a thread, writing goes on in the foreground.
-void OutputBuffer::startBackground() {
-    if (std::thread::hardware_concurrency() < 2) return;
-    try {
-        background_ = std::make_unique<BackgroundWriter>(
-            [this](std::string_view bytes) { writeAll(bytes); });
-    } catch (const std::system_error&) {
-        background_ = nullptr;
-    }
+// A pipe's reader works at the same time as this process if the pipe has room:
+// listing a million paths takes 60 % of the time that it takes with the usual
+// 64 KiB. The call fails, without harm, if this is no pipe or the system's
+// limit is lower.
+void OutputBuffer::widenPipe() {
+    ::fcntl(descriptor_, F_SETPIPE_SZ, pipeCapacity);
+    isPipeWide_ = true;
 }
 
 void OutputBuffer::writeAll(std::string_view bytes) {

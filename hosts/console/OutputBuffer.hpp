@@ -1,24 +1,20 @@
 #pragma once
 
 #include <cstddef>
-#include <memory>
 #include <string>
 #include <string_view>
-
-#include "hosts/console/BackgroundWriter.hpp"
 
 namespace tessel::console {
 
 // OutputBuffer collects what is written to a descriptor and writes it in large
-// pieces: the first one on the caller's thread, so that a small output starts
-// no other, and all later ones in the background.
+// pieces.
 //
 // Ownership: borrows the descriptor.
 // Threads: one at a time.
 // Errors: every member that writes throws ClosedPipeException if the reader is
 //   gone, and std::system_error, which names the output, if the system
-//   refuses; in the background, at the next piece. SIGPIPE must be ignored. The
-//   destructor starts to write nothing: call flush.
+//   refuses. SIGPIPE must be ignored. The destructor writes nothing: call
+//   flush.
 class OutputBuffer {
 public:
     // name  what errors call the output, such as "standard output"
@@ -40,15 +36,13 @@ private:
     static constexpr std::size_t capacity = std::size_t{256} << 10;
 
     void writeLarge(std::string_view bytes);
-    void writeBuffer();
-    void startBackground();
+    void widenPipe();
     void writeAll(std::string_view bytes);
 
     int descriptor_;
     std::string name_;
     std::string buffer_;
-    bool wroteFirst_ = false;
-    std::unique_ptr<BackgroundWriter> background_;  // last: uses the others
+    bool isPipeWide_ = false;
 };
 
 }  // namespace tessel::console

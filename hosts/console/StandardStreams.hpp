@@ -2,13 +2,14 @@
 
 namespace tessel::console {
 
-// Makes sure that the descriptors 0 to 2 are taken. A caller may have closed
+// Makes sure that the descriptors 0 to 2 are in use. A caller may have closed
 // one of them, as `>&-` does in a shell; the next file that is opened would
 // get its number, and then be read as standard input or be written to as
-// standard output.
+// standard output or standard error.
 //
-// A closed descriptor becomes one of /dev/null that is open for the other
-// direction, so that using it fails as it does without this (EBADF).
+// /dev/null is opened in place of a closed descriptor, standard input only for
+// writing and the others only for reading, so that using it fails with EBADF,
+// as using a closed descriptor does.
 //
 // Threads: call it before any other thread starts and before any file is
 //   opened.

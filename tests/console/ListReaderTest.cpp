@@ -18,6 +18,8 @@ using tessel::ArchiveWriter;
 using tessel::NumberRange;
 using tessel::PathArchive;
 using tessel::console::ListReader;
+using tessel::console::Numbering;
+using tessel::console::Separator;
 
 using Bytes = std::vector<std::uint8_t>;
 
@@ -35,8 +37,8 @@ struct Read {
 };
 
 void readInto(Read& read, const PathArchive& archive, const NumberRange& range,
-              char separator) {
-    ListReader(archive, separator)
+              Separator separator, Numbering numbering = Numbering::None) {
+    ListReader(archive, separator, numbering)
         .read(range, [&](std::string_view text, std::uint64_t paths) {
             read.text.append(text);
             read.paths += paths;
@@ -44,12 +46,16 @@ void readInto(Read& read, const PathArchive& archive, const NumberRange& range,
 }
 
 void expectAll(const std::vector<std::string>& paths, const NumberRange& range,
-               char separator) {
+               Separator separator, Numbering numbering = Numbering::None) {
     std::string expected;
-    for (std::uint64_t i = range.begin; i < range.end; ++i)
-        expected.append(paths[i]).push_back(separator);
+    for (std::uint64_t i = range.begin; i < range.end; ++i) {
+        if (numbering == Numbering::Numbers)
+            expected.append(std::to_string(i)).push_back('\t');
+        expected.append(paths[i]).push_back(static_cast<char>(separator));
+    }
     Read read;
-    readInto(read, PathArchive::own(packed(paths)), range, separator);
+    readInto(read, PathArchive::own(packed(paths)), range, separator,
+             numbering);
     EXPECT_EQ(read.paths, range.end - range.begin);
     EXPECT_TRUE(read.text == expected);
 }
@@ -65,9 +71,10 @@ std::vector<std::string> numbered(std::size_t count) {
 TEST(ListReader, ReadsRangesOfEveryLength) {
     const auto paths = numbered(70000);
     for (const std::uint64_t end : {0U, 1U, 4095U, 4096U, 4097U, 70000U})
-        expectAll(paths, {0, end}, '\n');
-    expectAll(paths, {5, 5}, '\n');
-    expectAll(paths, {4095, 40001}, '\0');
+        expectAll(paths, {0, end}, Separator::Newline);
+    expectAll(paths, {5, 5}, Separator::Newline);
+    expectAll(paths, {4095, 40001}, Separator::Nul);
+    expectAll(paths, {4095, 40001}, Separator::Newline, Numbering::Numbers);
 }
 
 // So that the rest of a chunk is read path by path.
@@ -75,7 +82,8 @@ TEST(ListReader, ReadsLongPaths) {
     std::vector<std::string> paths = numbered(20000);
     for (std::size_t i = 100; i < 200; ++i)
         paths[i] = std::string(100'000, 'a') + '/' + std::to_string(i);
-    expectAll(paths, {0, paths.size()}, '\n');
+    expectAll(paths, {0, paths.size()}, Separator::Newline);
+    expectAll(paths, {0, paths.size()}, Separator::Newline, Numbering::Numbers);
 }
 
 // Nothing is lost that a loop over the paths shows. In a list that is not
@@ -91,7 +99,7 @@ void expectPathsBeforeDamage(const std::vector<std::string>& paths) {
     };
     EXPECT_THROW(archive.forEach(loop), tessel::DamagedArchiveException);
     Read read;
-    EXPECT_THROW(readInto(read, archive, {0, paths.size()}, '\n'),
+    EXPECT_THROW(readInto(read, archive, {0, paths.size()}, Separator::Newline),
                  tessel::DamagedArchiveException);
     EXPECT_GT(expected.paths, 0U);
     EXPECT_GE(read.paths, expected.paths);
