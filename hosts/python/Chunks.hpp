@@ -7,21 +7,16 @@
 #include <utility>
 #include <vector>
 
+#include "archive/NumberRange.hpp"
 #include "archive/OrderedScan.hpp"
 
 namespace tessel::python {
 
-// Numbers from begin up to, but without, end: one part of some work.
-struct Chunk {
-    std::uint64_t begin = 0;
-    std::uint64_t end = 0;
-};
-
-// Divides `count` numbers into chunks and works on them on all cores, without
-// the interpreter's lock: `produce` makes a Result of each chunk on any thread.
-// `consume` gets the results in ascending order on the calling thread, under
-// the lock. Between two of them, Python handles signals, so that Ctrl-C ends
-// the work by an exception.
+// Works on the numbers below `count`, a chunk at a time, on all cores:
+// `produce` makes a Result of each chunk on any thread, without the
+// interpreter's lock. `consume` gets the results in ascending order on the
+// calling thread, under the lock. Before each of its calls, Python handles
+// signals, so that Ctrl-C ends the work by an exception.
 //
 // The calling thread must hold the interpreter's lock. What either function
 // throws is thrown here, after all threads have ended.
@@ -30,12 +25,13 @@ struct Chunk {
 template <class Result, class Produce, class Consume>
 void inChunks(std::uint64_t count, std::uint64_t perChunk, Produce produce,
               Consume consume) {
+    const NumberRange all{0, count};
     const auto chunkAt = [&](std::uint64_t i) {
-        return Chunk{i * perChunk, std::min((i + 1) * perChunk, count)};
+        return archive::chunkOf(all, perChunk, i);
     };
     const pybind11::gil_scoped_release released;
     const ScanOptions options;
-    archive::OrderedScan scan((count + perChunk - 1) / perChunk, options);
+    archive::OrderedScan scan(archive::chunkCount(all, perChunk), options);
     std::vector<Result> results(scan.slots());
     const auto finish = [&](std::uint64_t i) {
         const pybind11::gil_scoped_acquire held;

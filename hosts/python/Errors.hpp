@@ -35,16 +35,17 @@ private:
 // file  where the archive is; empty if it is in memory
 template <class Work>
 decltype(auto) namingArchive(const std::string& file, Work&& work) {
-    const std::string name =
-        file.empty() ? "the archive in memory" : "'" + file + "'";
+    const auto name = [&] {
+        return file.empty() ? "the archive in memory" : "'" + file + "'";
+    };
     try {
         return std::forward<Work>(work)();
     } catch (const DamagedArchiveException& damage) {
         throw DamagedListException(
-            name + " is damaged at byte " + std::to_string(damage.offset()) +
+            name() + " is damaged at byte " + std::to_string(damage.offset()) +
             ": " + damage.cause() + " Take another copy of it.");
     } catch (const UnsupportedArchiveVersionException& newer) {
-        throw std::invalid_argument(name + ": " + newer.what() +
+        throw std::invalid_argument(name() + ": " + newer.what() +
                                     " Install a newer qztessel.");
     } catch (const FileException&) {
         throw;

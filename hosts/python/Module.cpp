@@ -91,23 +91,23 @@ void bindStoredList(py::module_& module) {
 
 // ---- Lists ----
 
-[[noreturn]] void failOutOfRange(std::int64_t index, std::int64_t size) {
-    throw py::index_error("list index " + std::to_string(index) +
-                          " is out of range for " + std::to_string(size) +
-                          " paths");
+// An index that may count from the end, from the start. Throws IndexError.
+std::uint64_t fromStart(const PathSequence& paths, std::int64_t index) {
+    const auto size = static_cast<std::int64_t>(paths.size());
+    if (index < -size || index >= size)
+        throw py::index_error("list index " + std::to_string(index) +
+                              " is out of range for " + std::to_string(size) +
+                              " paths");
+    return static_cast<std::uint64_t>(index < 0 ? index + size : index);
 }
 
 py::object pathAt(const PathSequence& paths, const py::object& number,
                   bool asBytes) {
-    const auto size = static_cast<std::int64_t>(paths.size());
     const std::int64_t index =
         PyNumber_AsSsize_t(number.ptr(), PyExc_IndexError);
     if (index == -1 && PyErr_Occurred() != nullptr)
         throw py::error_already_set();
-    if (index < -size || index >= size) failOutOfRange(index, size);
-    const auto at =
-        static_cast<std::uint64_t>(index < 0 ? index + size : index);
-    return toObject(paths[at], kindOf(asBytes));
+    return toObject(paths[fromStart(paths, index)], kindOf(asBytes));
 }
 
 py::list blockOf(const PathSequence& paths, std::uint64_t first,
@@ -148,18 +148,13 @@ bool areEqual(const PathSequence& left, const PathSequence& right) {
     return equal;
 }
 
-// Indices that may count from the end, from the start. Throws IndexError.
 std::vector<std::uint64_t> fromStart(const PathSequence& paths,
                                      const IndexArray& given) {
-    const auto size = static_cast<std::int64_t>(paths.size());
     std::vector<std::uint64_t> indices;
     indices.reserve(static_cast<std::size_t>(given.size()));
     for (const std::int64_t index :
-         std::span(given.data(), static_cast<std::size_t>(given.size()))) {
-        if (index < -size || index >= size) failOutOfRange(index, size);
-        indices.push_back(
-            static_cast<std::uint64_t>(index < 0 ? index + size : index));
-    }
+         std::span(given.data(), static_cast<std::size_t>(given.size())))
+        indices.push_back(fromStart(paths, index));
     return indices;
 }
 
@@ -229,12 +224,8 @@ py::tuple stepObject(const KeyedPermutation& order, std::uint64_t) {
     return py::make_tuple("shuffled", order.key());
 }
 
-py::tuple stepObject(const View::Selection& selection, std::uint64_t size) {
-    IndexArray numbers(static_cast<py::ssize_t>(size));
-    for (std::size_t i = 0; i < selection->size(); ++i)
-        numbers.mutable_at(static_cast<py::ssize_t>(i)) =
-            static_cast<std::int64_t>((*selection)[i]);
-    return py::make_tuple("select", numbers);
+py::tuple stepObject(const View::Selection& selection, std::uint64_t) {
+    return py::make_tuple("select", arrayOf(*selection));
 }
 
 py::list stepsOf(const PathSequence& paths) {

@@ -5,17 +5,11 @@
 
 #include "hosts/python/Errors.hpp"
 #include "paths/PathList.hpp"
+#include "paths/Segments.hpp"
 
 namespace tessel::python {
 
 namespace {
-
-// The folder that a path is in, as FindOptions takes it.
-std::string folderOf(std::string_view path) {
-    const std::size_t slash = path.rfind('/');
-    return std::string(
-        path.substr(0, slash == std::string_view::npos ? 0 : slash + 1));
-}
 
 // Paths of a list that are compared at a time: a few hundred kilobytes.
 constexpr std::uint64_t comparedPaths = 4096;
@@ -74,7 +68,7 @@ std::vector<std::uint64_t> PathSequence::numbersOf(
     std::vector<std::uint64_t> numbers;
     const std::string_view texts[] = {path};
     FindOptions options;
-    options.folder = folderOf(path);
+    options.folder = path.substr(0, paths::fileStartOf(path));
     archive().findEach(
         texts,
         [&](std::uint64_t number, std::string_view found) {

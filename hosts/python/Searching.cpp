@@ -7,6 +7,7 @@
 #include <unordered_set>
 #include <utility>
 
+#include "archive/NumberLookup.hpp"
 #include "hosts/python/Chunks.hpp"
 #include "hosts/python/Errors.hpp"
 #include "hosts/python/Interruptible.hpp"
@@ -26,33 +27,29 @@ void scanAll(const PathSequence& paths, Produce produce, Consume consume) {
 
 // ---- Queries ----
 
-bool isBelow(std::string_view path, std::string_view folder) {
-    if (folder.empty()) return true;
-    if (!path.starts_with(folder)) return false;
-    return folder.back() == '/' || path.substr(folder.size()).starts_with('/');
-}
-
+// Leaves the folder aside.
 bool matches(const Query& query, std::string_view path) {
     const auto holds = [&](const std::string& text) {
         return path.find(text) != std::string_view::npos;
     };
-    return (!query.folder || isBelow(path, *query.folder)) &&
-           std::ranges::all_of(query.texts, holds) &&
+    return std::ranges::all_of(query.texts, holds) &&
            (!query.matcher || query.matcher->matches(path));
 }
 
 Indices findByScan(const PathSequence& paths, const Query& query) {
     Indices found;
-    const auto search = [&](Chunk chunk) {
+    const std::string prefix = archive::prefixOf(query.folder.value_or(""));
+    const auto search = [&](NumberRange chunk) {
         Indices here;
         std::uint64_t index = chunk.begin;
         paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
-            if (matches(query, path)) here.push_back(index);
+            if (path.starts_with(prefix) && matches(query, path))
+                here.push_back(index);
             ++index;
         });
         return here;
     };
-    scanAll<Indices>(paths, search, [&](Chunk, const Indices& here) {
+    scanAll<Indices>(paths, search, [&](NumberRange, const Indices& here) {
         found.insert(found.end(), here.begin(), here.end());
     });
     return found;
@@ -108,16 +105,17 @@ FirstIndices askEach(const PathSequence& paths, const paths::PathList& asked) {
     constexpr std::uint64_t perChunk = 16;
     FirstIndices indices;
     indices.reserve(asked.size());
-    const auto ask = [&](Chunk chunk) {
+    const auto ask = [&](NumberRange chunk) {
         FirstIndices here;
         for (std::uint64_t i = chunk.begin; i < chunk.end; ++i)
             here.push_back(firstIndexOf(paths, asked[i]));
         return here;
     };
-    inChunks<FirstIndices>(
-        asked.size(), perChunk, ask, [&](Chunk, const FirstIndices& here) {
-            indices.insert(indices.end(), here.begin(), here.end());
-        });
+    inChunks<FirstIndices>(asked.size(), perChunk, ask,
+                           [&](NumberRange, const FirstIndices& here) {
+                               indices.insert(indices.end(), here.begin(),
+                                              here.end());
+                           });
     return indices;
 }
 
@@ -126,7 +124,7 @@ using IndexByPath = std::unordered_map<std::string_view, std::int64_t>;
 // Sets the first index of all paths that are keys, which have -1.
 void scanFor(const PathSequence& paths, IndexByPath& wanted) {
     using Hits = std::vector<std::pair<std::int64_t*, std::uint64_t>>;
-    const auto search = [&](Chunk chunk) {
+    const auto search = [&](NumberRange chunk) {
         Hits hits;
         std::uint64_t index = chunk.begin;
         paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
@@ -136,7 +134,7 @@ void scanFor(const PathSequence& paths, IndexByPath& wanted) {
         });
         return hits;
     };
-    scanAll<Hits>(paths, search, [](Chunk, const Hits& hits) {
+    scanAll<Hits>(paths, search, [](NumberRange, const Hits& hits) {
         for (const auto& [first, index] : hits)
             if (*first < 0) *first = static_cast<std::int64_t>(index);
     });
@@ -164,7 +162,7 @@ std::string_view nameOfFolder(std::string_view path) {
 
 using Folders = std::unordered_set<std::string>;
 
-Folders foldersIn(const PathSequence& paths, Chunk chunk) {
+Folders foldersIn(const PathSequence& paths, NumberRange chunk) {
     Folders folders;
     const std::string* last = nullptr;  // neighbours mostly share a folder
     paths.read(chunk.begin, chunk.end, [&](std::string_view path) {
@@ -202,8 +200,8 @@ FirstIndices firstIndicesOf(const PathSequence& paths,
 std::vector<std::string> foldersOf(const PathSequence& paths) {
     Folders folders;
     scanAll<Folders>(
-        paths, [&](Chunk chunk) { return foldersIn(paths, chunk); },
-        [&](Chunk, Folders here) { folders.merge(here); });
+        paths, [&](NumberRange chunk) { return foldersIn(paths, chunk); },
+        [&](NumberRange, Folders here) { folders.merge(here); });
     std::vector<std::string> sorted(folders.begin(), folders.end());
     std::ranges::sort(sorted);
     return sorted;

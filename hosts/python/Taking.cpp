@@ -23,7 +23,7 @@ using Indices = std::vector<std::uint64_t>;
 template <class Consume>
 void readChunks(const PathSequence& paths, const Indices& indices,
                 Consume consume) {
-    const auto read = [&](Chunk chunk) {
+    const auto read = [&](NumberRange chunk) {
         paths::PathList texts;
         const auto* const begin = indices.data();
         paths.read(Indices(begin + chunk.begin, begin + chunk.end),
@@ -83,19 +83,20 @@ void put(std::string_view path, PathKind kind, char* into) {
 py::list takeList(const PathSequence& paths, const Indices& indices,
                   PathKind kind) {
     py::list list(static_cast<py::ssize_t>(indices.size()));
-    readChunks(paths, indices, [&](Chunk chunk, const paths::PathList& texts) {
-        for (std::size_t i = 0; i < texts.size(); ++i)
-            PyList_SET_ITEM(list.ptr(),
-                            static_cast<py::ssize_t>(chunk.begin + i),
-                            toObject(texts[i], kind).release().ptr());
-    });
+    readChunks(
+        paths, indices, [&](NumberRange chunk, const paths::PathList& texts) {
+            for (std::size_t i = 0; i < texts.size(); ++i)
+                PyList_SET_ITEM(list.ptr(),
+                                static_cast<py::ssize_t>(chunk.begin + i),
+                                toObject(texts[i], kind).release().ptr());
+        });
     return list;
 }
 
 py::array takeArray(const PathSequence& paths, const Indices& indices,
                     PathKind kind) {
     std::vector<paths::PathList> lists;
-    readChunks(paths, indices, [&](Chunk, paths::PathList texts) {
+    readChunks(paths, indices, [&](NumberRange, paths::PathList texts) {
         lists.push_back(std::move(texts));
     });
     const std::size_t width = widthOf(lists, kind);

@@ -31,8 +31,9 @@ std::uint64_t mappedBy(const View::Step& step, std::uint64_t index) {
 
 using Numbers = std::vector<std::uint64_t>;
 
-// ---- The other way: indices, ascending, that a step maps to one of numbers
-// ----
+// ---- The other way ----
+
+// The indices, ascending, that a step maps to one of the numbers.
 
 // Whether a slice has this number, and at which index.
 std::optional<std::uint64_t> indexIn(const View::Slice& slice,
