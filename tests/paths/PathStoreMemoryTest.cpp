@@ -8,10 +8,13 @@
 #include <vector>
 
 #include "paths/PathStore.hpp"
+#include "tests/paths/Stores.hpp"
 #include "tests/support/AllocationMeter.hpp"
 
 namespace {
 
+using stores::inTreeOrder;
+using stores::iterated;
 using support::AllocationFailure;
 using tessel::PathStore;
 using Strings = std::vector<std::string>;
@@ -42,23 +45,10 @@ void atEachAllocation(Prepare prepare, Operate operate, Check check) {
     EXPECT_LT(n, mostAllocations);
 }
 
-Strings inTurn(const PathStore& store) {
-    Strings paths;
-    for (const std::string_view path : store) paths.emplace_back(path);
-    return paths;
-}
-
-Strings inTreeOrder(const PathStore& store) {
-    Strings paths;
-    store.forEachInTreeOrder(
-        [&paths](std::string_view path) { paths.emplace_back(path); });
-    return paths;
-}
-
 // By every way out, these paths and no others.
 void expectPaths(const PathStore& store, Strings expected) {
-    EXPECT_EQ(inTurn(store), expected);
-    EXPECT_EQ(inTurn(PathStore::load(store.save())), expected);
+    EXPECT_EQ(iterated(store), expected);
+    EXPECT_EQ(iterated(PathStore::load(store.save())), expected);
     Strings anyOrder = inTreeOrder(store);
     std::sort(anyOrder.begin(), anyOrder.end());
     std::sort(expected.begin(), expected.end());

@@ -22,9 +22,12 @@
 #include "coder/HuffmanPathTree.hpp"
 #include "paths/IndexedRange.hpp"
 #include "paths/PathStore.hpp"
+#include "tests/paths/Stores.hpp"
 
 namespace {
 
+using stores::inTreeOrder;
+using stores::iterated;
 using tessel::DamagedFormException;
 using tessel::PathStore;
 using tessel::paths::IndexedRange;
@@ -69,19 +72,6 @@ Strings readAll(const PathStore& store) {
         EXPECT_EQ(number, paths.size());
         paths.emplace_back(path);
     });
-    return paths;
-}
-
-Strings iterated(const PathStore& store) {
-    Strings paths;
-    for (const std::string_view path : store) paths.emplace_back(path);
-    return paths;
-}
-
-Strings inTreeOrder(const PathStore& store) {
-    Strings paths;
-    store.forEachInTreeOrder(
-        [&](std::string_view path) { paths.emplace_back(path); });
     return paths;
 }
 
