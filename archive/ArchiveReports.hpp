@@ -47,9 +47,10 @@ struct ArchiveInfo {
     std::uint64_t longestFolder = 0;  // bytes up to and with the last '/'
     std::vector<Section> sections;    // added up over the segments
 
-    // Over the segments' heads, and so, through the checksums in them, over
-    // everything stored: equal archives have equal sums. Different ones differ
-    // but for one chance in 2^64.
+    // A checksum of the segments' heads. They hold checksums of all else, so
+    // it covers everything stored: archives of equal bytes have equal sums. Two
+    // archives that differ by accident have equal sums with a probability of
+    // about 2^-64.
     std::uint64_t sum = 0;
 };
 

@@ -17,8 +17,9 @@ namespace tessel::archive {
 //
 // Ownership: borrows the token entries and the token text.
 // Threads: const members from any number of threads.
-// Cost: 200 to 300 KB, more the more bytes names go on with after a prefix
-//   that they share.
+// Cost: 200 to 300 KB per segment. There is one small table for each different
+//   byte with which a name can go on after a prefix shared with the name
+//   before.
 class SegmentTables {
 public:
     // Bits of a code that one lookup decodes. Measured on a million paths: a

@@ -25,7 +25,7 @@ namespace {
 
 constexpr std::size_t gets = 1000;
 
-// Medians of all runs.
+// Times and ratios are medians of all runs.
 struct ArchiveCosts {
     std::size_t paths = 0;
     std::uint64_t fileBytes = 0;

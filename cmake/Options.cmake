@@ -21,9 +21,11 @@ target_compile_definitions(
   qztessel_options
   INTERFACE $<$<NOT:$<CONFIG:Release,MinSizeRel>>:_GLIBCXX_ASSERTIONS>)
 
-if(CMAKE_UNITY_BUILD AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
-  # A source that is included looks like a header to this warning.
-  target_compile_options(qztessel_options INTERFACE -Wno-subobject-linkage)
+# In a unit of several sources, each of them looks like a header to this warning.
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  target_compile_options(
+    qztessel_options
+    INTERFACE $<$<BOOL:$<TARGET_PROPERTY:UNITY_BUILD>>:-Wno-subobject-linkage>)
 endif()
 
 if(QZTESSEL_SANITIZE)
