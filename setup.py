@@ -1,9 +1,9 @@
-"""Builds the Python package: CMake makes the module, setuptools the wheel.
+"""Builds the Python package: CMake makes the modules, setuptools the wheel.
 
     python3 -m build --no-isolation
 
-QZTESSEL_PYTHON_BUILD may name a CMake build folder whose module is taken as it
-is; otherwise one is built.
+QZTESSEL_PYTHON_BUILD may name a CMake build folder whose modules are taken as
+they are; otherwise they are built.
 """
 
 import os
@@ -17,6 +17,7 @@ from setuptools import Extension, setup
 from setuptools.command.build_ext import build_ext
 
 ROOT = pathlib.Path(__file__).resolve().parent
+PLUGIN = "libqztessel.so"
 OPTIONS = {
     "CMAKE_BUILD_TYPE": "Release",
     "Python_EXECUTABLE": sys.executable,
@@ -30,14 +31,22 @@ OPTIONS = {
 
 
 class CMakeBuild(build_ext):
-    """Takes the module from a build of CMake's."""
+    """Takes the modules, the plug-in and its messages from a build of CMake's."""
+
+    def run(self):
+        folder = os.environ.get("QZTESSEL_PYTHON_BUILD") or self.build_with_cmake()
+        self.built = pathlib.Path(folder, "hosts/python/qztessel")
+        super().run()
+        target = pathlib.Path(self.get_ext_fullpath("qztessel._host")).parent
+        shutil.copyfile(self.built / PLUGIN, target / PLUGIN)
+        shutil.copytree(
+            self.built / "messages", target / "messages", dirs_exist_ok=True
+        )
 
     def build_extension(self, ext):
         target = pathlib.Path(self.get_ext_fullpath(ext.name))
-        folder = os.environ.get("QZTESSEL_PYTHON_BUILD") or self.build_with_cmake()
-        module = pathlib.Path(folder, "hosts/python/qztessel", target.name)
         target.parent.mkdir(parents=True, exist_ok=True)
-        shutil.copyfile(module, target)
+        shutil.copyfile(self.built / target.name, target)
 
     def build_with_cmake(self):
         folder = pathlib.Path(self.build_temp).resolve()
@@ -56,6 +65,8 @@ def version():
 
 setup(
     version=version(),
-    ext_modules=[Extension("qztessel._core", sources=[])],
+    ext_modules=[
+        Extension(f"qztessel.{name}", sources=[]) for name in ("_core", "_host")
+    ],
     cmdclass={"build_ext": CMakeBuild},
 )

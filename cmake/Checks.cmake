@@ -79,7 +79,7 @@ set(rooms packing pathtree coder paths archive binding hosts/embedded
           hosts/console hosts/patterns)
 set(systemIncludes)
 if(TARGET qztessel_python)
-  list(APPEND rooms hosts/python)
+  list(APPEND rooms hosts/python hosts/python/host)
   list(TRANSFORM QZTESSEL_PYTHON_INCLUDE_DIRS PREPEND -isystem
        OUTPUT_VARIABLE systemIncludes)
 endif()

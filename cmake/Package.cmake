@@ -75,6 +75,9 @@ set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-qztessel)
 set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
 set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
     "python3 (>= 3.11~), python3 (<< 3.12), python3-numpy")
+# PathList works without it; HuffmanPaths is its class.
+set(CPACK_DEBIAN_PYTHON_PACKAGE_RECOMMENDS
+    "libqztessel${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION})")
 set(CPACK_COMPONENT_PYTHON_DESCRIPTION
     "very large lists of paths that Python's processes share
 Keeps millions of file paths in an archive that is mapped, and shows them as a

@@ -148,6 +148,8 @@ public:
         std::function<void()> notify;
     };
     std::vector<Listener> listeners;
+    // Whether custom load gave the native object back.
+    bool restored = false;
 
 private:
     ClassRecord* class_;

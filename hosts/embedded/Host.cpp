@@ -310,6 +310,10 @@ Value Host::load(std::string_view className, const Value& saved) {
     return loaded;
 }
 
+bool Host::isRestored(const Value& instance) const {
+    return state_->instanceOf(instance).restored;
+}
+
 void Host::destroy(const Value& instance) {
     state_->instanceOf(instance).destroy();
 }

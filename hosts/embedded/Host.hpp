@@ -135,6 +135,9 @@ public:
     // A new instance from a saved form: custom load first, then the saved
     // properties.
     Value load(std::string_view className, const Value& saved);
+    // Whether custom load restored something into the instance. One that fails
+    // does not.
+    bool isRestored(const Value& instance) const;
 
     // Destroys an instance now; values that refer to it become invalid.
     void destroy(const Value& instance);

@@ -197,8 +197,10 @@ void* Operations::hostNativeObject(const HostArray* instance,
 
 void Operations::hostSetNativeObject(HostArray* instance, const char* className,
                                      void* native) {
-    if (livingInstance(instance, className).native() != native)
+    Instance& object = livingInstance(instance, className);
+    if (object.native() != native)
         errors_.raiseOwn("nativeObjectChanged", {className});
+    object.restored = true;
 }
 
 HostArray* Operations::hostConvert(const HostSavedValue* saved,

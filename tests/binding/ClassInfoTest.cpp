@@ -151,6 +151,7 @@ TEST_F(ClassTest, CustomLoadRestoresNoFrequencies) {
     for (const char* const field : {"StringTree", "PathTree"})
         withoutFrequencies.setField(field, saved.field(field));
     const Value loaded = host_.load(filesetClassName, withoutFrequencies);
+    EXPECT_TRUE(host_.isRestored(loaded));
     EXPECT_TRUE(frequencies(loaded).empty());
     EXPECT_EQ(iterated(loaded), pathsOf(smallListing()));
 }
@@ -187,6 +188,7 @@ TEST_F(ClassTest, LoadOfDamagedPathTreePrintsOneLineAndDoesNotRaise) {
                 {whole.begin(), whole.begin() + static_cast<long>(length)}));
         Value loaded;
         EXPECT_EQ(printedByLoad(damaged, loaded), customLoadLine);
+        EXPECT_FALSE(host_.isRestored(loaded));
         EXPECT_TRUE(iterated(loaded).empty());
     }
 }

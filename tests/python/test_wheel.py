@@ -15,6 +15,14 @@ import qztessel
 assert qztessel.__file__.startswith({folder!r}), qztessel.__file__
 paths = qztessel.PathList.pack(["a/b", "c"])
 assert list(paths[::-1]) == ["c", "a/b"]
+assert qztessel.load_plugin().startswith({folder!r}), qztessel.load_plugin()
+kept = qztessel.HuffmanPaths("files", ["/", ["a"]])
+kept.add_paths([["/"]], [["a"]])
+assert kept.get_paths([1], "/") == ["/a"]
+try:
+    kept.add_paths([], [["a"]])
+except qztessel.HostError as error:
+    assert str(error).startswith("The number of folders "), error
 """
 
 
@@ -31,7 +39,7 @@ def test_wheel(tmp_path):
     source, wheels, folder = (tmp_path / name for name in ("in", "out", "installed"))
     left_out = shutil.ignore_patterns(".git", ".cache", "build", "tests", "bench")
     shutil.copytree(ROOT, source, ignore=left_out)
-    # The module is the one that is tested here: to build it takes minutes.
+    # The modules are those that are tested here: to build them takes minutes.
     module = pathlib.Path(qztessel.__file__).parents[3]
     words = ["-m", "build", "--no-isolation", "--outdir", str(wheels)]
     run(*words, cwd=source, QZTESSEL_PYTHON_BUILD=str(module))
@@ -40,3 +48,4 @@ def test_wheel(tmp_path):
     run("-c", EXAMPLE.format(folder=str(folder)), cwd=tmp_path, PYTHONPATH=str(folder))
     names = set(os.listdir(folder / "qztessel"))
     assert {"__init__.py", "_path_list.py", "_core.pyi", "py.typed"} <= names
+    assert {"_huffman_paths.py", "_plugin.py", "_host.pyi"} <= names

@@ -9,6 +9,14 @@
 """
 
 from ._core import DamagedArchiveError
+from ._huffman_paths import HostError, HuffmanPaths
 from ._path_list import PathList
+from ._plugin import load_plugin
 
-__all__ = ["DamagedArchiveError", "PathList"]
+__all__ = [
+    "DamagedArchiveError",
+    "HostError",
+    "HuffmanPaths",
+    "PathList",
+    "load_plugin",
+]

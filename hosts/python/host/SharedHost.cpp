@@ -1,0 +1,80 @@
+#include "hosts/python/host/SharedHost.hpp"
+
+#include <cxxabi.h>
+#include <dlfcn.h>
+#include <link.h>
+#include <pthread.h>
+#include <unistd.h>
+
+#include <memory>
+#include <stdexcept>
+#include <string>
+
+#include "hosts/embedded/FilesetClass.hpp"
+
+namespace tessel::python {
+
+namespace {
+
+// Python loads modules where nobody else looks for symbols. This shows the
+// symbols of this module, VXHostInterface above all, to what is loaded later.
+void showInterface() {
+    Dl_info own{};
+    const auto here = reinterpret_cast<const void*>(&showInterface);
+    if (dladdr(here, &own) == 0)
+        throw std::runtime_error("The loader does not know this module.");
+    // The handle keeps the module loaded, as Python does in any case.
+    void* const module =
+        dlopen(own.dli_fname, RTLD_NOW | RTLD_NOLOAD | RTLD_GLOBAL);
+    if (module == nullptr) throw std::runtime_error(dlerror());
+    if (dlsym(RTLD_DEFAULT, "VXHostInterface") !=
+        dlsym(module, "VXHostInterface"))
+        throw std::runtime_error(
+            "This process has a host of its own, and cannot have a second.");
+}
+
+}  // namespace
+
+// NOLINTBEGIN(cppcoreguidelines-avoid-non-const-global-variables)
+std::mutex SharedHost::mutex;
+embedded::Host* SharedHost::host = nullptr;
+// NOLINTEND(cppcoreguidelines-avoid-non-const-global-variables)
+
+std::optional<std::filesystem::path> SharedHost::installedPlugin() {
+    showInterface();
+    const auto close = [](void* handle) { dlclose(handle); };
+    const std::unique_ptr<void, decltype(close)> plugin(
+        dlopen(QZTESSEL_SONAME, RTLD_NOW | RTLD_LOCAL), close);
+    if (plugin == nullptr) return std::nullopt;
+    link_map* map = nullptr;
+    if (dlinfo(plugin.get(), RTLD_DI_LINKMAP, &map) != 0)
+        throw std::runtime_error(dlerror());
+    return map->l_name;
+}
+
+void SharedHost::start(const std::filesystem::path& plugin,
+                       const std::filesystem::path& messages) {
+    showInterface();
+    const Turn turn;
+    if (host == nullptr) {
+        embedded::HostOptions options;
+        options.messages = messages;
+        host = std::make_unique<embedded::Host>(options).release();
+        pthread_atfork([] { mutex.lock(); }, [] { mutex.unlock(); },
+                       [] { mutex.unlock(); });
+    }
+    if (!host->hasClass(embedded::filesetClassName)) host->loadModule(plugin);
+}
+
+// Python ends the threads that come back to an ending interpreter, by unwinding
+// them. That would release Python's objects without its lock on the way, so
+// the thread waits here instead for the end of the process.
+void SharedHost::takeInterpreter(PyThreadState* thread) noexcept {
+    try {
+        PyEval_RestoreThread(thread);
+    } catch (const abi::__forced_unwind&) {
+        while (true) pause();
+    }
+}
+
+}  // namespace tessel::python
