@@ -85,6 +85,20 @@ from qztessel import PathList
 with open(sys.argv[1]) as lines:
     assert list(PathList.open(sys.argv[2])) == lines.read().split("\n")[:-1]
 ' "$work/list" "$work/list.tessel" || fail "the Python package does not work"
+plugin=$(find "$root/usr/lib" -name libqztessel.so.1)
+PYTHONDONTWRITEBYTECODE=1 PYTHONPATH=$root/usr/lib/python3/dist-packages \
+    LD_LIBRARY_PATH=${plugin%/*} /usr/bin/python3 -c '
+import os, sys
+from qztessel import HostError, HuffmanPaths, load_plugin
+assert os.path.samefile(load_plugin(), sys.argv[1]), load_plugin()
+paths = HuffmanPaths("files", ["/", ["a"]])
+paths.add_paths([["/"]], [["a"]])
+assert paths.get_paths([1], "/") == ["/a"]
+try:
+    paths.add_paths([], [["a"]])
+except HostError as error:
+    assert str(error).startswith("The number of folders "), error
+' "$plugin" || fail "the Python package does not find the plug-in"
 
 # ---- In and out again ----
 

@@ -3,6 +3,7 @@
 import copy
 import pickle
 import random
+import signal
 import threading
 
 import numpy as np
@@ -539,6 +540,25 @@ def test_list_within_itself():
     folders.append(folders)
     with pytest.raises(RecursionError):
         filled().add_paths(folders, [["x"]])
+
+
+def test_interrupt_ends_a_conversion():
+    class Interrupted(Exception):  # noqa: N818
+        pass
+
+    def interrupt(*_):
+        raise Interrupted
+
+    paths = HuffmanPaths("frequencies", "/a", [1, 1])
+    names = ["a"] * 2_000_000
+    before = signal.signal(signal.SIGALRM, interrupt)
+    try:
+        with pytest.raises(Interrupted):
+            signal.setitimer(signal.ITIMER_REAL, 0.001)
+            paths.add_paths([["/"]], [names])
+    finally:
+        signal.signal(signal.SIGALRM, before)
+    assert all_of(paths) == []
 
 
 def test_million_paths():

@@ -11,6 +11,7 @@
 #include <string>
 
 #include "hosts/embedded/FilesetClass.hpp"
+#include "qztessel/Version.hpp"
 
 namespace tessel::python {
 
@@ -20,7 +21,7 @@ namespace {
 // symbols of this module, VXHostInterface above all, to what is loaded later.
 void showInterface() {
     Dl_info own{};
-    const auto here = reinterpret_cast<const void*>(&showInterface);
+    const auto* const here = reinterpret_cast<const void*>(&showInterface);
     if (dladdr(here, &own) == 0)
         throw std::runtime_error("The loader does not know this module.");
     // The handle keeps the module loaded, as Python does in any case.
@@ -31,6 +32,12 @@ void showInterface() {
         dlsym(module, "VXHostInterface"))
         throw std::runtime_error(
             "This process has a host of its own, and cannot have a second.");
+}
+
+// The name under which the plug-in is installed: libqztessel.so.MAJOR.
+std::string installedName() {
+    const std::string version = versionText;
+    return "libqztessel.so." + version.substr(0, version.find('.'));
 }
 
 }  // namespace
@@ -44,7 +51,7 @@ std::optional<std::filesystem::path> SharedHost::installedPlugin() {
     showInterface();
     const auto close = [](void* handle) { dlclose(handle); };
     const std::unique_ptr<void, decltype(close)> plugin(
-        dlopen(QZTESSEL_SONAME, RTLD_NOW | RTLD_LOCAL), close);
+        dlopen(installedName().c_str(), RTLD_NOW | RTLD_LOCAL), close);
     if (plugin == nullptr) return std::nullopt;
     link_map* map = nullptr;
     if (dlinfo(plugin.get(), RTLD_DI_LINKMAP, &map) != 0)

@@ -6,6 +6,8 @@
 (3, 'etc/hosts')
 >>> list(paths.shuffled(seed=1)[:2])
 ['usr/bin/vi', 'usr/bin/env']
+
+`PathList` is a sequence over an archive; `HuffmanPaths` is the plug-in's class.
 """
 
 from ._core import DamagedArchiveError
