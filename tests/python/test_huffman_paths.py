@@ -1,10 +1,11 @@
 """The plug-in's class: its methods, its errors, and values both ways."""
 
+import concurrent.futures
 import copy
+import itertools
 import pickle
 import random
 import signal
-import threading
 
 import numpy as np
 import pytest
@@ -575,26 +576,33 @@ def test_million_paths():
 # ---- Threads ----
 
 
-def test_threads_share_instances():
-    shared = filled()
-    failures = []
+def in_threads(work):
+    """What four threads that do the same work return."""
+    with concurrent.futures.ThreadPoolExecutor(4) as pool:
+        return [done.result() for done in [pool.submit(work, i) for i in range(4)]]
 
+
+def test_threads_have_instances_of_their_own():
     def work(seed):
-        try:
-            for step in range(20):
-                folders, files = random_listing(100 * seed + step)
-                own = filled(folders, files)
-                assert own.get_paths(range(1, 1 + sum(map(len, files)))) == (
-                    folders,
-                    files,
-                )
-                assert all_of(shared) == PATHS
-        except BaseException as failure:
-            failures.append(failure)
+        for step in range(20):
+            folders, files = random_listing(100 * seed + step)
+            numbers = range(1, 1 + sum(map(len, files)))
+            assert filled(folders, files).get_paths(numbers) == (folders, files)
 
-    threads = [threading.Thread(target=work, args=(seed,)) for seed in range(4)]
-    for thread in threads:
-        thread.start()
-    for thread in threads:
-        thread.join()
-    assert failures == []
+    in_threads(work)
+
+
+def test_threads_share_a_pass():
+    names = [f"{i:06}" for i in range(50_000)]
+    paths = filled([["/"]], [names])
+    paths.reset()
+
+    def work(_):
+        found = []
+        try:
+            while True:
+                found.append(paths.get_next_path()[1])
+        except HostError:
+            return found
+
+    assert sorted(itertools.chain(*in_threads(work))) == names
