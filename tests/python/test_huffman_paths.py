@@ -419,6 +419,17 @@ def test_copy_shares_paths_and_iterates_on_its_own(make):
     assert all_of(copied) == PATHS
 
 
+def test_passes_of_copies_give_what_is_added_later():
+    paths = filled()
+    copied = copy.copy(paths)
+    paths.add_paths([["/"]], [["x"]])
+    copied.add_paths([["/"]], [["vi"]])
+    expected = sorted([*COMPONENTS, ["/", "x"], ["/", "vi"]])
+    assert sorted(iterated(paths)) == sorted(iterated(copied)) == expected
+    assert all_of(paths) == [*PATHS, "/x"]
+    assert all_of(copied) == [*PATHS, "/vi"]
+
+
 class Named(HuffmanPaths):
     """A class of a user's."""
 

@@ -8,6 +8,7 @@ import sys
 
 import pytest
 import qztessel
+from qztessel import _host
 
 PACKAGE = pathlib.Path(qztessel.__file__).parent
 PLUGIN = "libqztessel.so"
@@ -55,6 +56,9 @@ def failure_of(statement):
 # ---- Where it is found ----
 
 
+@pytest.mark.skipif(
+    _host.installed_plugin() is not None, reason="the plug-in is installed"
+)
 def test_package_works_without_the_plugin(bare, tmp_path):
     script = "from qztessel import PathList; print(PathList.pack(['a'])[0])"
     assert run(script, bare) == "a\n"
@@ -114,6 +118,12 @@ def test_second_plugin_is_refused(tmp_path):
     assert qztessel.load_plugin(own) == own
     with pytest.raises(ValueError, match="a process loads only one"):
         qztessel.load_plugin(other)
+
+
+def test_process_with_a_host_of_its_own(tmp_path):
+    other = shutil.copy(next(PACKAGE.glob("_host.*.so")), tmp_path / "host.so")
+    line = run(failure_of("qztessel.HuffmanPaths()"), LD_PRELOAD=str(other))
+    assert line.startswith("RuntimeError This process has a host of its own")
 
 
 def test_messages_are_missing(bare, tmp_path):

@@ -65,10 +65,10 @@ class HuffmanPaths:
     Lists of texts may also be tuples or arrays of objects or of `str`.
     A path must not be the folder of another path, or it is lost.
 
-    `copy.copy` makes a copy that shares all paths with its source, also those
-    added later to either, and that iterates on its own. `pickle` and
-    `copy.deepcopy` save and load: what they make shares nothing and stands
-    before the first path.
+    `copy.copy` makes a copy that shares its paths with its source: passes of
+    both give what is added later to either. Numbers, and the position of a
+    pass, are each one's own. `pickle` and `copy.deepcopy` save and load: what
+    they make shares nothing, and needs `reset` before a pass.
 
     Threads may share instances; their calls wait for each other, while other
     threads run. Ctrl-C ends the conversion of values, but a call of the
