@@ -23,14 +23,13 @@
 #include "hosts/python/Searching.hpp"
 #include "hosts/python/StoredList.hpp"
 #include "hosts/python/Taking.hpp"
+#include "hosts/python/ViewObjects.hpp"
 
 namespace tessel::python {
 
 namespace {
 
 namespace py = pybind11;
-
-using IndexArray = py::array_t<std::int64_t, py::array::c_style>;
 
 PathKind kindOf(bool asBytes) noexcept {
     return asBytes ? PathKind::Bytes : PathKind::Text;
@@ -83,31 +82,18 @@ void bindStoredList(py::module_& module) {
         .def_property_readonly("sum", [](const StoredList& list) {
             return list.archive().info().sum;
         });
-    module.def("open", [](const std::string& file) {
-        return shared(StoredList::open(file));
-    });
+    module.def(
+        "open",
+        [](const std::string& file) { return shared(StoredList::open(file)); },
+        py::call_guard<py::gil_scoped_release>());
     module.def("over", &listOver);
 }
 
 // ---- Lists ----
 
-// An index that may count from the end, from the start. Throws IndexError.
-std::uint64_t fromStart(const PathSequence& paths, std::int64_t index) {
-    const auto size = static_cast<std::int64_t>(paths.size());
-    if (index < -size || index >= size)
-        throw py::index_error("list index " + std::to_string(index) +
-                              " is out of range for " + std::to_string(size) +
-                              " paths");
-    return static_cast<std::uint64_t>(index < 0 ? index + size : index);
-}
-
 py::object pathAt(const PathSequence& paths, const py::object& number,
                   bool asBytes) {
-    const std::int64_t index =
-        PyNumber_AsSsize_t(number.ptr(), PyExc_IndexError);
-    if (index == -1 && PyErr_Occurred() != nullptr)
-        throw py::error_already_set();
-    return toObject(paths[fromStart(paths, index)], kindOf(asBytes));
+    return toObject(paths[fromStart(paths.size(), number)], kindOf(asBytes));
 }
 
 py::list blockOf(const PathSequence& paths, std::uint64_t first,
@@ -148,31 +134,7 @@ bool areEqual(const PathSequence& left, const PathSequence& right) {
     return equal;
 }
 
-std::vector<std::uint64_t> fromStart(const PathSequence& paths,
-                                     const IndexArray& given) {
-    std::vector<std::uint64_t> indices;
-    indices.reserve(static_cast<std::size_t>(given.size()));
-    for (const std::int64_t index :
-         std::span(given.data(), static_cast<std::size_t>(given.size())))
-        indices.push_back(fromStart(paths, index));
-    return indices;
-}
-
-PathSequence selected(const PathSequence& paths, const IndexArray& indices) {
-    return {paths.stored(),
-            paths.view().selected(
-                std::make_shared<const std::vector<std::uint64_t>>(
-                    fromStart(paths, indices)))};
-}
-
 // ---- In bulk ----
-
-template <class Number>
-IndexArray arrayOf(const std::vector<Number>& numbers) {
-    IndexArray array(static_cast<py::ssize_t>(numbers.size()));
-    std::ranges::copy(numbers, array.mutable_data());
-    return array;
-}
 
 IndexArray numbersOf(const PathSequence& paths, const py::iterable& asked) {
     paths::PathList texts;
@@ -214,74 +176,24 @@ py::list folderList(const PathSequence& paths, bool asBytes) {
     return list;
 }
 
-// ---- Views ----
-
-py::tuple stepObject(const View::Slice& slice, std::uint64_t size) {
-    return py::make_tuple("slice", slice.first, slice.step, size);
-}
-
-py::tuple stepObject(const KeyedPermutation& order, std::uint64_t) {
-    return py::make_tuple("shuffled", order.key());
-}
-
-py::tuple stepObject(const View::Selection& selection, std::uint64_t) {
-    return py::make_tuple("select", arrayOf(*selection));
-}
-
-py::list stepsOf(const PathSequence& paths) {
-    py::list list;
-    for (const View::Step& step : paths.view().steps())
-        list.append(std::visit(
-            [&](const auto& map) { return stepObject(map, step.size); },
-            step.map));
-    return list;
-}
-
-PathSequence sliced(const PathSequence& paths, std::uint64_t first,
-                    std::int64_t step, std::uint64_t count) {
-    const std::uint64_t size = paths.size();
-    const std::uint64_t last =
-        first + (count - 1) * static_cast<std::uint64_t>(step);
-    if (count > 0 && (first >= size || last >= size || count > size))
-        throw py::index_error("the slice is not within the list");
-    return {paths.stored(), paths.view().sliced(first, step, count)};
-}
-
 using PathSequenceClass = py::class_<PathSequence>;
 
 void bindBulk(PathSequenceClass& type) {
     type.def("take_list",
              [](const PathSequence& paths, const IndexArray& indices,
                 bool asBytes) {
-                 return takeList(paths, fromStart(paths, indices),
+                 return takeList(paths, fromStart(paths.size(), indices),
                                  kindOf(asBytes));
              })
         .def("take_array",
              [](const PathSequence& paths, const IndexArray& indices,
                 bool asBytes) {
-                 return takeArray(paths, fromStart(paths, indices),
+                 return takeArray(paths, fromStart(paths.size(), indices),
                                   kindOf(asBytes));
              })
         .def("numbers", &numbersOf)
         .def("find", &find)
         .def("folders", &folderList);
-}
-
-void bindViews(PathSequenceClass& type) {
-    type.def("slice", &sliced)
-        .def("shuffled",
-             [](const PathSequence& paths, std::uint64_t seed) {
-                 return PathSequence(paths.stored(),
-                                     paths.view().shuffled(seed));
-             })
-        .def("select", &selected)
-        .def("steps", &stepsOf)
-        .def_property_readonly(
-            "is_whole",
-            [](const PathSequence& paths) { return paths.view().isWhole(); })
-        .def_property_readonly("heap_bytes", [](const PathSequence& paths) {
-            return paths.view().heapBytes();
-        });
 }
 
 void bindPathSequence(py::module_& module) {
@@ -298,7 +210,12 @@ void bindPathSequence(py::module_& module) {
         .def_property_readonly("stored", [](const PathSequence& paths) {
             return shared(paths.stored());
         });
-    bindViews(type);
+    bindViews(
+        type,
+        [](const PathSequence& paths) -> const View& { return paths.view(); },
+        [](const PathSequence& paths, View view) {
+            return PathSequence(paths.stored(), std::move(view));
+        });
     bindBulk(type);
 }
 
@@ -330,6 +247,7 @@ void bindPacker(py::module_& module) {
 PYBIND11_MODULE(_core, module) {
     registerErrors(module);
     bindStoredList(module);
+    bindView(module);
     bindPathSequence(module);
     bindPacker(module);
 }
