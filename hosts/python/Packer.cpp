@@ -142,7 +142,9 @@ void Packer::addSequence(const PathSequence& paths) {
 }
 
 void Packer::addListFile(const std::string& file) {
-    if (isArchive(file))
+    bool isPacked = false;
+    run([&] { isPacked = isArchive(file); });
+    if (isPacked)
         return addSequence(PathSequence(StoredList::open(file)));
     run([&] {
         const paths::PathList list = paths::readListFile(file);

@@ -6,7 +6,7 @@ import os
 import pickle
 import warnings
 from collections.abc import Callable, Iterable, Iterator, Sequence
-from typing import Any, AnyStr, Literal, SupportsIndex, Union, overload
+from typing import Any, AnyStr, Literal, SupportsIndex, TypeVar, Union, overload
 
 import numpy as np
 import numpy.typing as npt
@@ -15,6 +15,7 @@ from . import _core
 
 Path = Union[str, bytes, "os.PathLike[str]", "os.PathLike[bytes]"]
 Progress = Callable[[int, int], object]
+_Viewed = TypeVar("_Viewed", _core.PathSequence, _core.View)
 
 # Paths that iteration fetches at a time: few at first, for those who want only
 # a few. Shuffled lists are read the faster, the more are fetched together.
@@ -432,7 +433,7 @@ class PathList(Sequence[AnyStr]):
             paths.append(repr(self[-1]))
         where = self._origin() + "".join(map(_described, self._paths.steps()))
         number = "1 path" if size == 1 else f"{size} paths"
-        return f"<PathList of {number} from {where}: [{', '.join(paths)}]>"
+        return f"<{type(self).__name__} of {number} from {where}: [{', '.join(paths)}]>"
 
     # ---- Copies ----
 
@@ -491,7 +492,7 @@ def _level(level: str) -> _core.Level:
 
 
 def _add(packer: _core.Packer, source: Path | Iterable[Path]) -> None:
-    if isinstance(source, PathList):
+    if isinstance(source, PathList) and isinstance(source._paths, _core.PathSequence):
         packer.add_sequence(source._paths)
     elif isinstance(source, (str, bytes, os.PathLike)):
         _add_named(packer, os.fsencode(source))
@@ -545,9 +546,8 @@ def _described(step: tuple[Any, ...]) -> str:
     return f"[{bounds}]" if stride == 1 else f"[{bounds}:{stride}]"
 
 
-def _with_steps(
-    core: _core.PathSequence, steps: list[tuple[Any, ...]]
-) -> _core.PathSequence:
+def with_steps(core: _Viewed, steps: list[tuple[Any, ...]]) -> _Viewed:
+    """Take the views that `steps` returned of a core class's object."""
     for kind, *values in steps:
         core = getattr(core, kind)(*values)
     return core
@@ -566,7 +566,7 @@ def _reopened(
             f"{os.fsdecode(file)!r} is not the file that was pickled: "
             "it has other contents; pickle the list again"
         )
-    return cls._over(_with_steps(_core.PathSequence(stored), steps), as_bytes)
+    return cls._over(with_steps(_core.PathSequence(stored), steps), as_bytes)
 
 
 def _rebuilt(
@@ -576,4 +576,4 @@ def _rebuilt(
     as_bytes: bool,
 ) -> PathList[Any]:
     core = _core.PathSequence(_core.over(data))
-    return cls._over(_with_steps(core, steps), as_bytes)
+    return cls._over(with_steps(core, steps), as_bytes)
