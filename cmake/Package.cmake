@@ -78,6 +78,7 @@ set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
 # PathList works without it; HuffmanPaths is its class.
 set(CPACK_DEBIAN_PYTHON_PACKAGE_RECOMMENDS
     "libqztessel${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION})")
+set(CPACK_DEBIAN_PYTHON_PACKAGE_SUGGESTS python3-distributed)
 set(CPACK_COMPONENT_PYTHON_DESCRIPTION
     "very large lists of paths that Python's processes share
 Keeps millions of file paths in an archive that is mapped, and shows them as a

@@ -8,9 +8,9 @@ buildPackages=(
 checkPackages=(
     clang clang-format clang-tidy dpkg-dev file fish libclang-rt-dev
     libgtest-dev liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev
-    lintian llvm mypy pybind11-dev python3-build python3-dev python3-numpy
-    python3-pytest python3-setuptools python3-wheel python3-xxhash tmux valgrind
-    zsh
+    lintian llvm mypy pybind11-dev python3-build python3-dev
+    python3-distributed python3-numpy python3-pytest python3-setuptools
+    python3-wheel python3-xxhash tmux valgrind zsh
 )
 
 # Installs those of the given Debian packages that are missing. Silent when

@@ -49,3 +49,4 @@ def test_wheel(tmp_path):
     names = set(os.listdir(folder / "qztessel"))
     assert {"__init__.py", "_path_list.py", "_core.pyi", "py.typed"} <= names
     assert {"_huffman_paths.py", "_plugin.py", "_host.pyi"} <= names
+    assert {"dask.py", "_shards.py", "_sharded_path_list.py"} <= names

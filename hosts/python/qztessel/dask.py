@@ -68,13 +68,11 @@ def pack_shards(
     os.makedirs(target, exist_ok=True)
     names = [f"{position:05}.tessel" for position in range(len(sources))]
     files = [os.path.join(target, name) for name in names]
-    tasks = client.map(  # type: ignore[no-untyped-call]
-        _pack, sources, files, [level] * len(files), pure=False
-    )
+    tasks = client.map(_pack, sources, files, [level] * len(files), pure=False)
     try:
         facts = _results(tasks, sources, progress)
     except BaseException:
-        client.cancel(tasks)  # type: ignore[no-untyped-call]
+        client.cancel(tasks)
         raise
     manifest = os.path.join(target, _MANIFEST)
     write_manifest(manifest, zip(names, facts))
@@ -87,7 +85,7 @@ def _results(
     """The tasks' results. Raises as soon as one of them fails."""
     positions = {task.key: position for position, task in enumerate(tasks)}
     results: dict[int, Facts] = {}
-    for task in distributed.as_completed(tasks):  # type: ignore[no-untyped-call]
+    for task in distributed.as_completed(tasks):
         position = positions[task.key]
         try:
             results[position] = task.result()
