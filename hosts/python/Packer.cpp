@@ -144,8 +144,7 @@ void Packer::addSequence(const PathSequence& paths) {
 void Packer::addListFile(const std::string& file) {
     bool isPacked = false;
     run([&] { isPacked = isArchive(file); });
-    if (isPacked)
-        return addSequence(PathSequence(StoredList::open(file)));
+    if (isPacked) return addSequence(PathSequence(StoredList::open(file)));
     run([&] {
         const paths::PathList list = paths::readListFile(file);
         for (std::size_t i = 0; i < list.size(); ++i) addPath(list[i]);
