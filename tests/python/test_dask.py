@@ -13,7 +13,7 @@ from qztessel import dask as packing
 
 distributed = pytest.importorskip("distributed")
 
-LISTINGS = [lists.tree(500, 1), lists.NASTY[:10], [], lists.shuffled(lists.tree(700, 2))]
+LISTINGS = [lists.tree(500, 1), lists.NASTY[:10], [], lists.shuffled(lists.tree(700))]
 
 
 @pytest.fixture(scope="module")
@@ -63,7 +63,8 @@ def test_shards_are_the_listings(client, listings, wanted, tmp_path):
     assert list(paths) == wanted
     assert ready == [(i + 1, 4) for i in range(4)]
     assert paths.file == str(folder / "manifest.json")
-    names = [shard["shard"] for shard in json.loads(pathlib.Path(paths.file).read_text())["shards"]]
+    manifest = json.loads(pathlib.Path(paths.file).read_text())
+    names = [shard["shard"] for shard in manifest["shards"]]
     assert names == [f"0000{i}.tessel" for i in range(4)]
     assert list(ShardedPathList.open(paths.file, as_bytes=True)) == wanted
     assert not list(folder.glob("*.tmp")) and not list(folder.glob(".*"))
@@ -191,7 +192,8 @@ def test_searching_on_the_cluster(client, listings, wanted, tmp_path):
     here = PathList.pack(wanted, as_bytes=True)
     there = paths.on(client)
     asked = [*wanted[::50], b"none"]
-    for view in (lambda p: p, lambda p: p[9:-9], lambda p: p.shuffled(1), lambda p: p[::7]):
+    views = (lambda p: p, lambda p: p[9:-9], lambda p: p.shuffled(1), lambda p: p[::7])
+    for view in views:
         assert view(there).find("lib").tolist() == view(here).find("lib").tolist()
         assert view(there).numbers(asked).tolist() == view(here).numbers(asked).tolist()
         assert view(there).folders() == view(here).folders()

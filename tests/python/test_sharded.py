@@ -41,7 +41,8 @@ def random_sizes(choose, total):
 def both(request, plain, tmp_path):
     """The same paths in shards, and in one archive."""
     sizes = random_sizes(random.Random(request.param), len(plain))
-    return join(plain, tmp_path, sizes, as_bytes=True), PathList.pack(plain, as_bytes=True)
+    sharded = join(plain, tmp_path, sizes, as_bytes=True)
+    return sharded, PathList.pack(plain, as_bytes=True)
 
 
 def views(paths, choose):
@@ -195,7 +196,8 @@ def test_facts(tmp_path):
     assert paths.nbytes == sum(sizes)
     assert sys.getsizeof(paths.shuffled(1)) < 1000
     assert sys.getsizeof(paths.select([0] * 10000)) > 80000
-    assert repr(paths[1:]) == f"<ShardedPathList of 2 paths from {file!r}[1:3]: ['b', 'c']>"
+    shown = f"<ShardedPathList of 2 paths from {file!r}[1:3]: ['b', 'c']>"
+    assert repr(paths[1:]) == shown
 
 
 def test_what_shards_cannot(tmp_path):
@@ -228,7 +230,8 @@ def test_shards_are_opened_when_needed(tmp_path):
         lambda: "a" in paths,
         lambda: paths == PathList.pack(list("abcdef")),
     ):
-        with pytest.raises(FileNotFoundError, match="A shard is missing.*0.tessel'") as raised:
+        message = "A shard is missing; pack the shards again: '.*0.tessel'"
+        with pytest.raises(FileNotFoundError, match=message) as raised:
             read()
         assert "\n" not in str(raised.value)
     (tmp_path / "0.tessel.away").rename(tmp_path / "0.tessel")
@@ -242,9 +245,10 @@ def test_a_changed_shard(changed, tmp_path):
     paths = ShardedPathList.open(tmp_path / "all.json")
     assert paths[2] == "c"
     for read in (lambda: paths[0], lambda: paths.find("a")):
-        with pytest.raises(ValueError, match="shard '.*0.tessel' is not the one of the man") as e:
+        message = "shard '.*0.tessel' is not the one of the manifest"
+        with pytest.raises(ValueError, match=message) as raised:
             read()
-        assert "\n" not in str(e.value)
+        assert "\n" not in str(raised.value)
 
 
 def test_a_cut_shard(tmp_path):
@@ -291,9 +295,10 @@ def test_a_wrong_manifest(kind, tmp_path):
     manifest = json.loads(file.read_text())
     change(manifest)
     file.write_text(json.dumps(manifest))
-    with pytest.raises(ValueError, match="all.json' is no manifest of shards.*" + message) as e:
+    message = "all.json' is no manifest of shards.*" + message
+    with pytest.raises(ValueError, match=message) as raised:
         ShardedPathList.open(file)
-    assert "\n" not in str(e.value)
+    assert "\n" not in str(raised.value)
 
 
 def test_a_manifest_cut_anywhere(tmp_path):
@@ -324,8 +329,9 @@ def test_pickle_of_another_manifest(tmp_path):
 def test_a_manifest_is_replaced_as_a_whole(tmp_path):
     join(list("ab"), tmp_path, [1, 1])
     before = sorted(os.listdir(tmp_path))
+    files = [tmp_path / "0.tessel", tmp_path / "none"]
     with pytest.raises(FileNotFoundError):
-        ShardedPathList.join([tmp_path / "0.tessel", tmp_path / "none"], tmp_path / "all.json")
+        ShardedPathList.join(files, tmp_path / "all.json")
     assert list(ShardedPathList.open(tmp_path / "all.json")) == ["a", "b"]
     assert sorted(os.listdir(tmp_path)) == before
 

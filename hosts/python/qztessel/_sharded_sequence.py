@@ -219,7 +219,10 @@ class ShardedSequence:
 
     def folders(self, as_bytes: bool) -> list[Any]:
         folders: set[bytes] = set().union(*self._ask("folders", True))
-        return [folder if as_bytes else os.fsdecode(folder) for folder in sorted(folders)]
+        ordered = sorted(folders)
+        if as_bytes:
+            return ordered
+        return [os.fsdecode(folder) for folder in ordered]
 
     def _ask(self, method: str, *arguments: Any) -> Iterator[Any]:
         """The answers of all parts, in the order of their shards."""

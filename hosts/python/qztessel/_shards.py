@@ -39,7 +39,13 @@ _MAPPED = 1024
 
 _FORMAT = "qztessel shards"
 _VERSION = 1
-_FIELDS: dict[str, type] = {"shard": str, "first": int, "count": int, "bytes": int, "sum": str}
+_FIELDS: dict[str, type] = {
+    "shard": str,
+    "first": int,
+    "count": int,
+    "bytes": int,
+    "sum": str,
+}
 
 
 @dataclass(frozen=True)
