@@ -35,6 +35,7 @@ public:
     std::span<const std::uint8_t> data() const noexcept {
         return bytes_.bytes();
     }
+    void releasePages() const noexcept { bytes_.releasePages(); }
 
     std::size_t segmentCount() const noexcept { return segments_.size(); }
     const Segment& segment(std::size_t index) const noexcept {

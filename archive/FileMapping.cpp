@@ -58,6 +58,10 @@ FileMapping::~FileMapping() {
     if (start_ != nullptr) ::munmap(start_, size_);
 }
 
+void FileMapping::releasePages() const noexcept {
+    if (start_ != nullptr) ::madvise(start_, size_, MADV_DONTNEED);
+}
+
 FileMapping::FileMapping(FileMapping&& other) noexcept
     : start_(std::exchange(other.start_, nullptr)),
       size_(std::exchange(other.size_, 0)) {}

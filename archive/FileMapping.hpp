@@ -31,6 +31,10 @@ public:
         return {static_cast<const std::uint8_t*>(start_), size_};
     }
 
+    // Takes the file's pages out of this process's memory. Touching them
+    // brings them back, mostly from the system's page cache.
+    void releasePages() const noexcept;
+
 private:
     void* start_ = nullptr;
     std::size_t size_ = 0;

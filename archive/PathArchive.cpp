@@ -169,6 +169,8 @@ std::span<const std::uint8_t> PathArchive::bytes() const noexcept {
     return reader_->data();
 }
 
+void PathArchive::releasePages() const noexcept { reader_->releasePages(); }
+
 // ---- Iterator ----
 
 PathArchive::Iterator::Iterator(std::shared_ptr<const ArchiveReader> reader)

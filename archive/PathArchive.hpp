@@ -193,6 +193,14 @@ public:
     // has to hold. Valid as long as this archive or a copy of it.
     std::span<const std::uint8_t> bytes() const noexcept;
 
+    // Takes the pages of a mapped file out of this process's memory; of an
+    // archive in memory, nothing. The system goes on caching them, so that
+    // the next reads map them again without reading the disk. For processes
+    // that wait for long or are counted by the memory that they have mapped.
+    // Cost: measured on a file of 33 MB, 30 microseconds, and 100 to 200 for
+    //   mapping all of it again.
+    void releasePages() const noexcept;
+
 private:
     explicit PathArchive(
         std::shared_ptr<const archive::ArchiveReader> reader) noexcept;

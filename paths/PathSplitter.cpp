@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstdint>
 
+#include "paths/PathHash.hpp"
 #include "paths/PathText.hpp"
 #include "pathtree/HashIndex.hpp"
 
@@ -15,7 +16,7 @@ class FolderSet {
 public:
     // Returns false if it was there before.
     bool insert(std::string_view folder) {
-        const std::uint32_t hash = hashOf(folder);
+        const std::uint32_t hash = PathHash()(folder);
         if (find(folder, hash) != HashIndex::notFound) return false;
         folders_.push_back(folder);
         index_.insert(hash, folders_.size() - 1);
@@ -23,16 +24,10 @@ public:
     }
 
     bool contains(std::string_view folder) const {
-        return find(folder, hashOf(folder)) != HashIndex::notFound;
+        return find(folder, PathHash()(folder)) != HashIndex::notFound;
     }
 
 private:
-    static std::uint32_t hashOf(std::string_view folder) noexcept {
-        return HashIndex::hashOf(
-            {reinterpret_cast<const std::uint8_t*>(folder.data()),
-             folder.size()});
-    }
-
     std::size_t find(std::string_view folder, std::uint32_t hash) const {
         return index_.find(
             hash, [&](std::size_t i) { return folders_[i] == folder; });

@@ -103,6 +103,7 @@ py::list blockOf(const PathSequence& paths, std::uint64_t first,
         const py::gil_scoped_release released;
         paths.read(first, last,
                    [&](std::string_view path) { texts.append(path); });
+        paths.endReading(last - first);
     }
     py::list list;
     appendObjects(texts, kindOf(asBytes), list);
@@ -131,6 +132,8 @@ bool areEqual(const PathSequence& left, const PathSequence& right) {
     std::stop_source stop;
     runInterruptibly(
         stop, [&] { equal = left == right; }, [] {});
+    left.endReading(left.size());
+    right.endReading(right.size());
     return equal;
 }
 
@@ -227,7 +230,13 @@ void bindPacker(py::module_& module) {
         .value("normal", ArchiveLevel::Normal)
         .value("best", ArchiveLevel::Best);
     py::class_<Packer>(module, "Packer")
-        .def(py::init<std::string, ArchiveLevel, py::object>())
+        .def(py::init([](std::string file, ArchiveLevel level, bool index,
+                         py::object progress) {
+            return std::make_unique<Packer>(
+                std::move(file), level,
+                index ? ArchiveIndex::WhereNeeded : ArchiveIndex::None,
+                std::move(progress));
+        }))
         .def_static("append_to", &Packer::appendTo)
         .def("add_iterable", &Packer::addIterable)
         .def("add_sequence", &Packer::addSequence)

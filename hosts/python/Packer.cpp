@@ -51,13 +51,14 @@ PathBytes bytesAt(const py::handle& item, std::uint64_t position) {
 
 // ---- Opening ----
 
-Packer::Packer(std::string file, ArchiveLevel level, py::object progress)
+Packer::Packer(std::string file, ArchiveLevel level, ArchiveIndex index,
+               py::object progress)
     : Packer(std::move(file), std::move(progress)) {
     namingArchive(file_, [&] {
         if (file_.empty())
-            writer_.emplace(bytes_, options(level));
+            writer_.emplace(bytes_, options(level, index));
         else
-            writer_.emplace(file_, options(level));
+            writer_.emplace(file_, options(level, index));
     });
 }
 
@@ -67,7 +68,9 @@ std::unique_ptr<Packer> Packer::appendTo(const StoredList& list,
     std::unique_ptr<Packer> packer(
         new Packer(list.file(), std::move(progress)));
     namingArchive(list.file(), [&] {
-        const ArchiveOptions options = packer->options(ArchiveLevel::Normal);
+        const ArchiveOptions options = packer->options(
+            ArchiveLevel::Normal,
+            list.hasIndex() ? ArchiveIndex::WhereNeeded : ArchiveIndex::None);
         if (list.isInMemory()) {
             packer->bytes_.assign(list.bytes().begin(), list.bytes().end());
             packer->writer_ = ArchiveWriter::append(packer->bytes_, options);
@@ -78,9 +81,10 @@ std::unique_ptr<Packer> Packer::appendTo(const StoredList& list,
     return packer;
 }
 
-ArchiveOptions Packer::options(ArchiveLevel level) {
+ArchiveOptions Packer::options(ArchiveLevel level, ArchiveIndex index) {
     ArchiveOptions options;
     options.level = level;
+    options.index = index;
     options.cancel = stop_.get_token();
     options.progress = [this](const ArchiveProgress& now) {
         const auto open =

@@ -30,10 +30,12 @@ class Packer {
 public:
     // file      the archive to write; empty: in memory
     // progress  None, or called with paths packed and paths added
-    Packer(std::string file, ArchiveLevel level, pybind11::object progress);
+    Packer(std::string file, ArchiveLevel level, ArchiveIndex index,
+           pybind11::object progress);
 
     // Starts with the paths of a list, whose bytes are kept: those of the file
-    // if that is where it is, otherwise in memory.
+    // if that is where it is, otherwise in memory. What is added gets an index
+    // if the list has one.
     static std::unique_ptr<Packer> appendTo(const StoredList& list,
                                             pybind11::object progress);
 
@@ -65,7 +67,7 @@ private:
     Packer(std::string file, pybind11::object progress)
         : file_(std::move(file)), progress_(std::move(progress)) {}
 
-    ArchiveOptions options(ArchiveLevel level);
+    ArchiveOptions options(ArchiveLevel level, ArchiveIndex index);
     void run(FunctionRef<void()> work);
     void report();
     void addPath(std::string_view path);

@@ -1,6 +1,7 @@
 #include "hosts/python/Searching.hpp"
 
 #include <algorithm>
+#include <functional>
 #include <iterator>
 #include <stop_token>
 #include <unordered_map>
@@ -11,6 +12,7 @@
 #include "hosts/python/Chunks.hpp"
 #include "hosts/python/Errors.hpp"
 #include "hosts/python/Interruptible.hpp"
+#include "paths/PathHash.hpp"
 
 namespace tessel::python {
 
@@ -23,6 +25,7 @@ template <class Result, class Produce, class Consume>
 void scanAll(const PathSequence& paths, Produce produce, Consume consume) {
     inChunks<Result>(paths.size(), pathsPerChunk(paths.size()), produce,
                      consume);
+    paths.endReading(paths.size());
 }
 
 // ---- Queries ----
@@ -74,10 +77,7 @@ Indices findInArchive(const PathArchive& archive, const Query& query,
 // Whether each path is found in microseconds, or by a scan of its own.
 bool isQuickToAsk(const PathSequence& paths) {
     const ArchiveInfo info = paths.archive().info();
-    const auto index =
-        std::ranges::find(info.sections, "index", &ArchiveInfo::Section::name);
-    return info.sortedSegments == info.segments ||
-           (index != info.sections.end() && index->bytes > 0);
+    return info.sortedSegments == info.segments || paths.stored()->hasIndex();
 }
 
 // Measured on a list of 7 million paths: a scan takes 0.6 microseconds per path
@@ -119,7 +119,8 @@ FirstIndices askEach(const PathSequence& paths, const paths::PathList& asked) {
     return indices;
 }
 
-using IndexByPath = std::unordered_map<std::string_view, std::int64_t>;
+using IndexByPath =
+    std::unordered_map<std::string_view, std::int64_t, paths::PathHash>;
 
 // Sets the first index of all paths that are keys, which have -1.
 void scanFor(const PathSequence& paths, IndexByPath& wanted) {
@@ -160,7 +161,8 @@ std::string_view nameOfFolder(std::string_view path) {
     return path.substr(0, std::max<std::size_t>(slash, 1));
 }
 
-using Folders = std::unordered_set<std::string>;
+using Folders =
+    std::unordered_set<std::string, paths::PathHash, std::equal_to<>>;
 
 Folders foldersIn(const PathSequence& paths, NumberRange chunk) {
     Folders folders;
@@ -186,6 +188,7 @@ Indices findPaths(const PathSequence& paths, const Query& query) {
     };
     runInterruptibly(
         stop, [&] { namingArchive(paths.stored()->file(), search); }, [] {});
+    paths.endReading(paths.archive().size());
     return found;
 }
 

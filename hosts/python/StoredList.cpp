@@ -1,5 +1,6 @@
 #include "hosts/python/StoredList.hpp"
 
+#include <algorithm>
 #include <utility>
 
 #include "hosts/python/Errors.hpp"
@@ -26,6 +27,13 @@ StoredList::Pointer StoredList::over(std::span<const std::uint8_t> bytes,
         return std::make_shared<const StoredList>("", PathArchive::over(bytes),
                                                   std::move(keeper));
     });
+}
+
+bool StoredList::hasIndex() const {
+    const ArchiveInfo info = archive_.info();
+    const auto index =
+        std::ranges::find(info.sections, "index", &ArchiveInfo::Section::name);
+    return index != info.sections.end() && index->bytes > 0;
 }
 
 }  // namespace tessel::python

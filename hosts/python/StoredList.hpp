@@ -43,6 +43,8 @@ public:
     std::span<const std::uint8_t> bytes() const noexcept {
         return archive_.bytes();
     }
+    // Whether paths of segments that are not sorted are found by an index.
+    bool hasIndex() const;
 
 private:
     std::string file_;

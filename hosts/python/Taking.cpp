@@ -19,19 +19,22 @@ namespace py = pybind11;
 
 using Indices = std::vector<std::uint64_t>;
 
-// Shows the paths of each chunk of indices to consume(chunk, texts).
-template <class Consume>
+paths::PathList textsAt(const PathSequence& paths, const Indices& indices,
+                        NumberRange chunk) {
+    paths::PathList texts;
+    const auto* const begin = indices.data();
+    paths.read(Indices(begin + chunk.begin, begin + chunk.end),
+               [&](std::string_view path) { texts.append(path); });
+    return texts;
+}
+
+// Shows each chunk of indices to consume(chunk, produce(chunk)).
+template <class Result, class Produce, class Consume>
 void readChunks(const PathSequence& paths, const Indices& indices,
-                Consume consume) {
-    const auto read = [&](NumberRange chunk) {
-        paths::PathList texts;
-        const auto* const begin = indices.data();
-        paths.read(Indices(begin + chunk.begin, begin + chunk.end),
-                   [&](std::string_view path) { texts.append(path); });
-        return texts;
-    };
-    inChunks<paths::PathList>(indices.size(), pathsPerChunk(indices.size()),
-                              read, consume);
+                Produce produce, Consume consume) {
+    inChunks<Result>(indices.size(), pathsPerChunk(indices.size()), produce,
+                     consume);
+    paths.endReading(indices.size());
 }
 
 // ---- Arrays of fixed width ----
@@ -59,12 +62,17 @@ std::size_t widthOf(std::string_view path, PathKind kind) {
     return width;
 }
 
-std::size_t widthOf(const std::vector<paths::PathList>& lists, PathKind kind) {
+// The paths of a chunk, and the width of the longest.
+struct Column {
+    paths::PathList texts;
     std::size_t width = 1;  // NumPy has no narrower one
-    for (const auto& texts : lists)
-        for (std::size_t i = 0; i < texts.size(); ++i)
-            width = std::max(width, widthOf(texts[i], kind));
-    return width;
+};
+
+Column columnOf(paths::PathList texts, PathKind kind) {
+    Column column{std::move(texts)};
+    for (std::size_t i = 0; i < column.texts.size(); ++i)
+        column.width = std::max(column.width, widthOf(column.texts[i], kind));
+    return column;
 }
 
 void put(std::string_view path, PathKind kind, char* into) {
@@ -78,13 +86,36 @@ void put(std::string_view path, PathKind kind, char* into) {
     });
 }
 
+// Writes the paths of all columns into an array of zeros, which has an item
+// for each.
+void fill(py::array array, const std::vector<Column>& columns, PathKind kind) {
+    const auto itemBytes = static_cast<std::size_t>(array.itemsize());
+    auto* const items = static_cast<char*>(array.mutable_data());
+    std::vector<std::size_t> starts;  // of each column
+    std::size_t size = 0;
+    for (const Column& column : columns) {
+        starts.push_back(size);
+        size += column.texts.size();
+    }
+    const auto write = [&](NumberRange chunk) {
+        const paths::PathList& texts = columns[chunk.begin].texts;
+        char* into = items + starts[chunk.begin] * itemBytes;
+        for (std::size_t i = 0; i < texts.size(); ++i, into += itemBytes)
+            put(texts[i], kind, into);
+        return 0;
+    };
+    inChunks<int>(columns.size(), 1, write, [](NumberRange, int) {});
+}
+
 }  // namespace
 
 py::list takeList(const PathSequence& paths, const Indices& indices,
                   PathKind kind) {
     py::list list(static_cast<py::ssize_t>(indices.size()));
-    readChunks(
-        paths, indices, [&](NumberRange chunk, const paths::PathList& texts) {
+    readChunks<paths::PathList>(
+        paths, indices,
+        [&](NumberRange chunk) { return textsAt(paths, indices, chunk); },
+        [&](NumberRange chunk, const paths::PathList& texts) {
             for (std::size_t i = 0; i < texts.size(); ++i)
                 PyList_SET_ITEM(list.ptr(),
                                 static_cast<py::ssize_t>(chunk.begin + i),
@@ -95,21 +126,21 @@ py::list takeList(const PathSequence& paths, const Indices& indices,
 
 py::array takeArray(const PathSequence& paths, const Indices& indices,
                     PathKind kind) {
-    std::vector<paths::PathList> lists;
-    readChunks(paths, indices, [&](NumberRange, paths::PathList texts) {
-        lists.push_back(std::move(texts));
-    });
-    const std::size_t width = widthOf(lists, kind);
+    std::vector<Column> columns;
+    std::size_t width = 1;
+    readChunks<Column>(
+        paths, indices,
+        [&](NumberRange chunk) {
+            return columnOf(textsAt(paths, indices, chunk), kind);
+        },
+        [&](NumberRange, Column column) {
+            width = std::max(width, column.width);
+            columns.push_back(std::move(column));
+        });
     const char* const letter = kind == PathKind::Bytes ? "S" : "U";
-    py::array array(py::dtype(letter + std::to_string(width)),
-                    static_cast<py::ssize_t>(indices.size()));
-    const auto itemBytes = static_cast<std::size_t>(array.itemsize());
-    auto* into = static_cast<char*>(array.mutable_data());
-    const py::gil_scoped_release released;
-    std::memset(into, 0, itemBytes * indices.size());
-    for (const auto& texts : lists)
-        for (std::size_t i = 0; i < texts.size(); ++i, into += itemBytes)
-            put(texts[i], kind, into);
+    const py::array array = py::module_::import("numpy").attr("zeros")(
+        indices.size(), letter + std::to_string(width));
+    fill(array, columns, kind);
     return array;
 }
 

@@ -77,6 +77,7 @@ class Packer:
         self,
         file: bytes,
         level: Level,
+        index: bool,
         progress: Callable[[int, int], object] | None,
     ) -> None: ...
     @staticmethod
