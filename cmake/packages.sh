@@ -9,7 +9,8 @@ checkPackages=(
     clang clang-format clang-tidy dpkg-dev file fish libclang-rt-dev
     libgtest-dev liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev
     lintian llvm mypy pybind11-dev python3-build python3-dev
-    python3-distributed python3-numpy python3-pytest python3-setuptools
+    python3-distributed python3-fsspec python3-h5py python3-numpy
+    python3-pandas python3-pytest python3-setuptools python3-torch
     python3-wheel python3-xxhash tmux valgrind zsh
 )
 
