@@ -70,6 +70,15 @@ TEST(FileMapping, MovingTakesTheBytesAlong) {
     EXPECT_EQ(textOf(third), "abc");
 }
 
+TEST(FileMapping, ReleasedPagesComeBack) {
+    const TemporaryFile file(std::string(100'000, 'a') + "b");
+    const FileMapping mapping(file.path());
+    mapping.releasePages();
+    EXPECT_EQ(textOf(mapping), std::string(100'000, 'a') + "b");
+    const TemporaryFile empty("");
+    FileMapping(empty.path()).releasePages();
+}
+
 TEST(FileMapping, OutlivesTheFilesName) {
     const auto file = std::make_unique<TemporaryFile>("abc");
     const FileMapping mapping(file->path());

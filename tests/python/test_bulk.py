@@ -198,6 +198,40 @@ def test_interrupt_ends_bulk_calls(call):
     assert len(packed.take([0, -1])) == 2  # and the list still works
 
 
+def mapped_bytes(file):
+    """How much of a file is in this process's memory."""
+    with open("/proc/self/smaps") as lines:
+        for line in lines:
+            if line.rstrip().endswith(file):
+                next(lines), next(lines), next(lines)
+                return 1024 * int(next(lines).split()[1])
+    raise FileNotFoundError(file)
+
+
+def test_bulk_calls_give_pages_back(tmp_path):
+    choose = random.Random(5)
+    plain = [f"{i // 100}/{choose.getrandbits(64):016x}" for i in range(200_000)]
+    packed = PathList.open(PathList.pack(plain, tmp_path / "x.tessel").file)
+    some = list(range(0, len(plain), 500))
+    for read in (
+        lambda: packed.take(some),
+        lambda: packed.take(some, as_array="S"),
+        lambda: sum(1 for _ in packed),
+        lambda: packed.numbers(plain[:100_000]),
+        lambda: packed.find("no such text"),
+        lambda: packed[:1000].find("x"),
+        packed.folders,
+        lambda: packed == packed[:],
+    ):
+        for i in some:
+            packed[i]
+        before = mapped_bytes(packed.file)
+        assert before > packed.nbytes / 4
+        read()
+        assert mapped_bytes(packed.file) < before / 4
+    assert packed.take(some) == [plain[i] for i in some]  # and come again
+
+
 def test_other_threads_run_meanwhile():
     packed = PathList.pack(lists.tree(100_000)).shuffled(1)
     turns = 0

@@ -113,6 +113,28 @@ def test_files_that_cannot_be_written(tmp_path):
         PathList.pack(["a"], tmp_path)
 
 
+def test_an_index(plain, tmp_path):
+    packed = PathList.pack(plain, index=True, as_bytes=True)
+    assert list(packed) == plain
+    first = {path: i for i, path in reversed(list(enumerate(plain)))}
+    assert all(packed.index(path) == i for path, i in first.items())
+    assert all(path in packed for path in plain)
+    assert packed.numbers([*plain, b"x/y/z"]).tolist() == [*map(first.get, plain), -1]
+    assert list(packed.save(tmp_path / "x.tessel", index=True)) == plain
+
+
+def test_what_is_appended_to_an_index_has_one():
+    paths = lists.shuffled(lists.tree(5000))
+    sizes = {}
+    for index in (False, True):
+        packed = PathList.pack(paths[:2500], index=index, as_bytes=True)
+        longer = packed.append(paths[2500:])
+        assert list(longer) == paths
+        sizes[index] = longer.nbytes
+    # 13 bits number 5000 paths.
+    assert sizes[True] - sizes[False] >= 5000 * 12 / 8
+
+
 def test_levels(plain):
     for level in ("fast", "normal", "best"):
         assert list(PathList.pack(plain, level=level, as_bytes=True)) == plain
