@@ -64,7 +64,7 @@ def packed(file: pathlib.Path, folder: pathlib.Path) -> Any:
     archive = folder / "list.tessel"
     code = "import sys; from qztessel import PathList; PathList.pack(*sys.argv[1:])"
     caching = {k: v for k, v in os.environ.items() if k != "PYTHONDONTWRITEBYTECODE"}
-    words = [sys.executable, "-c", code, file, archive]
+    words: list[str | pathlib.Path] = [sys.executable, "-c", code, file, archive]
     subprocess.run(words, check=True, env=caching)
 
     from qztessel import PathList
