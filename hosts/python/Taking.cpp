@@ -138,7 +138,7 @@ py::array takeArray(const PathSequence& paths, const Indices& indices,
             columns.push_back(std::move(column));
         });
     const char* const letter = kind == PathKind::Bytes ? "S" : "U";
-    const py::array array = py::module_::import("numpy").attr("zeros")(
+    py::array array = py::module_::import("numpy").attr("zeros")(
         indices.size(), letter + std::to_string(width));
     fill(array, columns, kind);
     return array;
