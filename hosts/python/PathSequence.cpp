@@ -106,10 +106,12 @@ void PathSequence::endReading(std::uint64_t paths) const noexcept {
 
 // ---- Comparison ----
 
-bool operator==(const PathSequence& left, const PathSequence& right) {
+bool areEqual(const PathSequence& left, const PathSequence& right,
+              const std::stop_token& stop) {
     if (left.size() != right.size()) return false;
     for (std::uint64_t first = 0; first < left.size(); first += comparedPaths)
-        if (!equalInRange(left, right, first,
+        if (stop.stop_requested() ||
+            !equalInRange(left, right, first,
                           std::min(first + comparedPaths, left.size())))
             return false;
     return true;

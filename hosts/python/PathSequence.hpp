@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <span>
+#include <stop_token>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -63,7 +64,9 @@ private:
     View view_;
 };
 
-// Whether two lists have the same paths in the same order.
-bool operator==(const PathSequence& left, const PathSequence& right);
+// Whether two lists have the same paths in the same order. Gives up soon after
+// a request to stop; the answer then means nothing.
+bool areEqual(const PathSequence& left, const PathSequence& right,
+              const std::stop_token& stop);
 
 }  // namespace tessel::python

@@ -122,6 +122,17 @@ FirstIndices askEach(const PathSequence& paths, const paths::PathList& asked) {
 using IndexByPath =
     std::unordered_map<std::string_view, std::int64_t, paths::PathHash>;
 
+// Visits all paths, unless Python's signals end that by an exception.
+template <class Visit>
+void forEachInterruptibly(const paths::PathList& texts, Visit visit) {
+    std::stop_source stop;
+    const auto visitAll = [&] {
+        for (std::size_t i = 0; i < texts.size() && !stop.stop_requested(); ++i)
+            visit(texts[i]);
+    };
+    runInterruptibly(stop, visitAll, [] {});
+}
+
 // Sets the first index of all paths that are keys, which have -1.
 void scanFor(const PathSequence& paths, IndexByPath& wanted) {
     using Hits = std::vector<std::pair<std::int64_t*, std::uint64_t>>;
@@ -143,13 +154,14 @@ void scanFor(const PathSequence& paths, IndexByPath& wanted) {
 
 FirstIndices askAll(const PathSequence& paths, const paths::PathList& asked) {
     IndexByPath wanted;
-    wanted.reserve(asked.size());
-    for (std::size_t i = 0; i < asked.size(); ++i) wanted.emplace(asked[i], -1);
+    forEachInterruptibly(
+        asked, [&](std::string_view path) { wanted.emplace(path, -1); });
     scanFor(paths, wanted);
     FirstIndices indices;
     indices.reserve(asked.size());
-    for (std::size_t i = 0; i < asked.size(); ++i)
-        indices.push_back(wanted.at(asked[i]));
+    forEachInterruptibly(asked, [&](std::string_view path) {
+        indices.push_back(wanted.at(path));
+    });
     return indices;
 }
 
@@ -184,7 +196,8 @@ Indices findPaths(const PathSequence& paths, const Query& query) {
     std::stop_source stop;
     const auto search = [&] {
         found = paths.view().indicesOf(
-            findInArchive(paths.archive(), query, stop.get_token()));
+            findInArchive(paths.archive(), query, stop.get_token()),
+            stop.get_token());
     };
     runInterruptibly(
         stop, [&] { namingArchive(paths.stored()->file(), search); }, [] {});

@@ -33,7 +33,8 @@ using Numbers = std::vector<std::uint64_t>;
 
 // ---- The other way ----
 
-// The indices, ascending, that a step maps to one of the numbers.
+// The indices, ascending, that a step maps to one of the numbers; any numbers
+// after a request to stop.
 
 // Whether a slice has this number, and at which index.
 std::optional<std::uint64_t> indexIn(const View::Slice& slice,
@@ -51,7 +52,7 @@ std::optional<std::uint64_t> indexIn(const View::Slice& slice,
 }
 
 Numbers unmapped(const View::Slice& slice, std::uint64_t size,
-                 const Numbers& numbers) {
+                 const Numbers& numbers, const std::stop_token&) {
     Numbers indices;
     for (const std::uint64_t number : numbers)
         if (const auto index = indexIn(slice, size, number))
@@ -60,19 +61,24 @@ Numbers unmapped(const View::Slice& slice, std::uint64_t size,
     return indices;
 }
 
-Numbers unmapped(const KeyedPermutation& order, std::uint64_t,
-                 Numbers numbers) {
-    for (std::uint64_t& number : numbers) number = order.indexOf(number);
+Numbers unmapped(const KeyedPermutation& order, std::uint64_t, Numbers numbers,
+                 const std::stop_token& stop) {
+    for (std::uint64_t& number : numbers) {
+        if (stop.stop_requested()) return {};
+        number = order.indexOf(number);
+    }
     std::ranges::sort(numbers);
     return numbers;
 }
 
 Numbers unmapped(const View::Selection& selection, std::uint64_t,
-                 const Numbers& numbers) {
+                 const Numbers& numbers, const std::stop_token& stop) {
     Numbers indices;
-    for (std::uint64_t i = 0; i < selection->size(); ++i)
+    for (std::uint64_t i = 0; i < selection->size(); ++i) {
+        if (stop.stop_requested()) return {};
         if (std::ranges::binary_search(numbers, (*selection)[i]))
             indices.push_back(i);
+    }
     return indices;
 }
 
@@ -136,10 +142,13 @@ void View::toNumbers(std::span<std::uint64_t> indices) const {
     for (std::uint64_t& index : indices) index = (*this)[index];
 }
 
-std::vector<std::uint64_t> View::indicesOf(Numbers numbers) const {
+std::vector<std::uint64_t> View::indicesOf(Numbers numbers,
+                                           const std::stop_token& stop) const {
     for (const Step& step : steps_)
         numbers = std::visit(
-            [&](const auto& map) { return unmapped(map, step.size, numbers); },
+            [&](const auto& map) {
+                return unmapped(map, step.size, numbers, stop);
+            },
             step.map);
     return numbers;
 }

@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <span>
+#include <stop_token>
 #include <variant>
 #include <vector>
 
@@ -63,8 +64,10 @@ public:
     // The indices, ascending, that have one of these numbers.
     //
     // numbers  ascending, none twice
+    // stop     a request ends the call soon; its answer then means nothing
     std::vector<std::uint64_t> indicesOf(
-        std::vector<std::uint64_t> numbers) const;
+        std::vector<std::uint64_t> numbers,
+        const std::stop_token& stop = {}) const;
 
     // Bytes on the heap, shared selections included.
     std::size_t heapBytes() const noexcept;

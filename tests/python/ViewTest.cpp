@@ -5,6 +5,7 @@
 #include <memory>
 #include <random>
 #include <stdexcept>
+#include <stop_token>
 #include <vector>
 
 #include "hosts/python/View.hpp"
@@ -76,6 +77,20 @@ TEST(View, SelectionsMayRepeatAndAreChecked) {
     EXPECT_EQ(view.indicesOf({4}), (Numbers{0, 2}));
     EXPECT_GE(view.heapBytes(), 3 * sizeof(std::uint64_t));
     EXPECT_THROW(selected(View(5), {5}), std::out_of_range);
+}
+
+TEST(View, AStopEndsTheInverse) {
+    std::stop_source stop;
+    const auto indices = [&](const View& view) {
+        return view.indicesOf({0, 1, 2}, stop.get_token()).size();
+    };
+    const View order = View(3).shuffled(1);
+    const View selection = selected(View(3), {2, 1});
+    EXPECT_EQ(indices(order), 3);
+    EXPECT_EQ(indices(selection), 2);
+    stop.request_stop();
+    EXPECT_EQ(indices(order), 0);
+    EXPECT_EQ(indices(selection), 0);
 }
 
 TEST(View, RandomStepsHaveAnInverse) {

@@ -55,6 +55,15 @@ def test_bytes_are_borrowed_and_what_can_change_is_copied():
     assert sys.getrefcount(data) == 2
 
 
+def test_bytes_with_gaps_are_refused():
+    data = bytes(memoryview(PathList.pack(["a"])._paths.stored))
+    apart = bytes(byte for value in data for byte in (value, 0))
+    for view in memoryview(apart)[::2], memoryview(data[::-1])[::-1]:
+        assert bytes(view) == data
+        with pytest.raises(ValueError, match="has gaps"):
+            _core.over(view)
+
+
 def test_a_file_is_a_buffer_of_its_bytes(tmp_path):
     file = tmp_path / "x.tessel"
     data = memoryview(PathList.pack(["a"], file)._paths.stored)
