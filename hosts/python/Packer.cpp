@@ -18,13 +18,15 @@ namespace py = pybind11;
 namespace {
 
 // The path's position, where Python says what is wrong with its type or text.
+// Whatever else is raised, such as Ctrl-C in a path's own code, stays as it is.
 [[noreturn]] void raiseAt(py::error_already_set& error,
                           std::uint64_t position) {
     const std::string text = "path " + std::to_string(position) + " is no path";
-    if (!error.matches(PyExc_TypeError)) {
+    if (error.matches(PyExc_UnicodeError)) {
         py::raise_from(error, PyExc_ValueError, text.c_str());
         throw py::error_already_set();
     }
+    if (!error.matches(PyExc_TypeError)) throw;
     py::raise_from(error, PyExc_TypeError,
                    (text + ": give str, bytes or os.PathLike").c_str());
     throw py::error_already_set();
@@ -37,6 +39,18 @@ bool isArchive(const std::string& file) {
     return std::ranges::equal(start, archive::fileMagic, {}, [](char c) {
         return static_cast<std::uint8_t>(c);
     });
+}
+
+// Throws if the file of a list has other contents than the list.
+void refuseIfChanged(const StoredList& list) {
+    const StoredList::Pointer now = StoredList::open(list.file());
+    if (now->bytes().size() == list.bytes().size() &&
+        now->archive().info().sum == list.archive().info().sum)
+        return;
+    throw std::invalid_argument(
+        "'" + list.file() +
+        "' has changed since this list was opened; open it again and append to "
+        "that");
 }
 
 PathBytes bytesAt(const py::handle& item, std::uint64_t position) {
@@ -75,6 +89,7 @@ std::unique_ptr<Packer> Packer::appendTo(const StoredList& list,
             packer->bytes_.assign(list.bytes().begin(), list.bytes().end());
             packer->writer_ = ArchiveWriter::append(packer->bytes_, options);
         } else {
+            refuseIfChanged(list);
             packer->writer_ = ArchiveWriter::append(list.file(), options);
         }
     });

@@ -35,7 +35,8 @@ public:
 
     // Starts with the paths of a list, whose bytes are kept: those of the file
     // if that is where it is, otherwise in memory. What is added gets an index
-    // if the list has one.
+    // if the list has one. Throws std::invalid_argument if the file has
+    // changed since the list was opened.
     static std::unique_ptr<Packer> appendTo(const StoredList& list,
                                             pybind11::object progress);
 

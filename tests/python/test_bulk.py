@@ -83,6 +83,15 @@ def test_numbers(view):
         assert found.tolist() == [first.get(path, -1) for path in asked]
 
 
+def test_numbers_of_one_path():
+    packed = PathList.pack(["a/b"])
+    for one in "a/b", b"a/b", pathlib.Path("a/b"):
+        with pytest.raises(TypeError, match="put the one into a list"):
+            packed.numbers(one)
+    with pytest.raises(TypeError, match="^'int' object is not iterable$"):
+        packed.numbers(5)
+
+
 def test_numbers_of_any_kind():
     packed = PathList.pack(["a/ä", b"\xff"])
     asked = ("a/ä", pathlib.Path("a/ä"), b"\xff", "\udcff", "b")

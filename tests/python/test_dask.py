@@ -79,6 +79,15 @@ def test_one_name_is_no_list_of_names(client, tmp_path):
         packing.pack_shards("listing", tmp_path, client)
 
 
+def test_a_listing_that_is_a_shard_to_be(client, tmp_path):
+    for name, paths in ("00000.tessel", ["a"]), ("00001.tessel", ["b"]):
+        PathList.pack(paths, tmp_path / name)
+    kept = {file: file.read_bytes() for file in tmp_path.iterdir()}
+    with pytest.raises(ValueError, match="0000..tessel' would be replaced"):
+        packing.pack_shards(sorted(kept, reverse=True), tmp_path, client)
+    assert {file: file.read_bytes() for file in tmp_path.iterdir()} == kept
+
+
 def test_folders_and_archives(client, tmp_path, monkeypatch):
     monkeypatch.chdir(tmp_path)
     (tmp_path / "tree/a").mkdir(parents=True)

@@ -91,8 +91,31 @@ def test_what_is_no_path(paths, error, message, tmp_path):
 
 
 def test_no_iterable():
-    with pytest.raises(TypeError):
-        PathList.pack(5)
+    for use in PathList.pack, PathList.pack([]).append:
+        with pytest.raises(TypeError, match="^'int' object is not iterable$"):
+            use(5)
+
+
+@pytest.mark.parametrize("error", [KeyboardInterrupt, MemoryError, OSError])
+def test_errors_of_a_path_come_through(error, tmp_path):
+    class Failing:
+        def __fspath__(self):
+            raise error
+
+    with pytest.raises(error):
+        PathList.pack(["a", Failing()], tmp_path / "x.tessel")
+    assert os.listdir(tmp_path) == []
+
+
+def test_names_of_files_with_nul(tmp_path):
+    PathList.pack(["a"], tmp_path / "x")
+    wrong = f"{tmp_path}/x\0y"
+    for use in PathList.open, PathList.pack(["b"]).save, PathList.pack:
+        with pytest.raises(ValueError, match="null byte|holds a NUL"):
+            use(wrong)
+    with pytest.raises(ValueError, match="holds a NUL"):
+        PathList.pack(["b"], wrong)
+    assert list(PathList.open(tmp_path / "x")) == ["a"]
 
 
 def test_errors_of_the_iterable_come_through(tmp_path):
@@ -149,6 +172,15 @@ def test_progress_ends_with_everything(plain):
     assert all(done <= total for done, total in told)
 
 
+def test_progress_that_cannot_be_called(tmp_path):
+    PathList.pack(["old"], tmp_path / "x.tessel")
+    old = PathList.open(tmp_path / "x.tessel")
+    for use in old.append, lambda paths, **options: old[:0].save(old.file, **options):
+        with pytest.raises(TypeError, match="progress 5 cannot be called"):
+            use(["new"], progress=5)
+    assert list(PathList.open(tmp_path / "x.tessel")) == ["old"]
+
+
 def test_progress_can_end_the_packing(tmp_path):
     class Enough(Exception):
         pass
@@ -175,6 +207,23 @@ def test_save_and_append(plain, packed, tmp_path):
     with pytest.raises(ValueError, match=f"path {len(longer) + 1} is empty"):
         longer.append(["z", ""])
     assert longer == PathList.open(file, as_bytes=True)
+
+
+@pytest.mark.parametrize("change", ["append", "replace", "remove"])
+def test_append_to_a_file_that_changed(change, tmp_path):
+    file = tmp_path / "x.tessel"
+    old = PathList.pack(["a", "b"], file)
+    if change == "append":
+        old.append(["c"])
+    elif change == "replace":
+        PathList.pack(["b", "a"], file)
+    else:
+        file.unlink()
+    kept = file.read_bytes() if file.exists() else None
+    with pytest.raises((ValueError, FileNotFoundError), match="x.tessel"):
+        old.append(["d"])
+    assert list(old) == ["a", "b"]
+    assert (file.read_bytes() if file.exists() else None) == kept
 
 
 def test_append_in_memory(plain):

@@ -145,3 +145,9 @@ def test_sizes(tmp_path):
     assert sys.getsizeof(file.select(range(10000))) > 80000
     assert file.file == str(tmp_path / "x.tessel") and memory.file is None
     assert not file.as_bytes
+
+
+def test_lists_are_opened_or_packed():
+    for wrong in (), (["a"],):
+        with pytest.raises(TypeError, match="PathList.open or PathList.pack"):
+            PathList(*wrong)

@@ -209,6 +209,11 @@ def test_what_shards_cannot(tmp_path):
     (tmp_path / "other").mkdir()
     with pytest.raises(ValueError, match="is not in the folder of"):
         ShardedPathList.join([tmp_path / "0.tessel"], tmp_path / "other/all.json")
+    with pytest.raises(ValueError, match="would be replaced by the manifest"):
+        ShardedPathList.join([tmp_path / "0.tessel"], tmp_path / "0.tessel")
+    assert len(PathList.open(tmp_path / "0.tessel")) == 2
+    with pytest.raises(TypeError, match="put the one into a list"):
+        ShardedPathList.join(str(tmp_path / "0.tessel"), tmp_path / "all.json")
 
 
 def test_shards_are_opened_when_needed(tmp_path):

@@ -139,3 +139,9 @@ def test_views_of_views(seed, plain, packed):
             i = choose.randrange(-len(plain), len(plain))
             assert packed[i] == plain[i]
             assert packed.index(plain[i]) == plain.index(plain[i])
+
+
+@pytest.mark.parametrize("seed", [1.0, "1", None])
+def test_seeds_that_are_no_integers(seed):
+    with pytest.raises(TypeError, match="^'.*' object cannot be interpreted as an int"):
+        PathList.pack(["a"]).shuffled(seed)

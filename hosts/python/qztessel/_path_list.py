@@ -2,6 +2,7 @@
 
 from __future__ import annotations
 
+import operator
 import os
 import pickle
 import warnings
@@ -64,6 +65,9 @@ class PathList(Sequence[AnyStr]):
 
     # ---- Making lists ----
 
+    def __init__(self, *source: object) -> None:
+        raise TypeError(f"use {type(self).__name__}.open or PathList.pack")
+
     @overload
     @classmethod
     def open(cls, file: Path, *, as_bytes: Literal[False] = ...) -> PathList[str]: ...
@@ -85,7 +89,7 @@ class PathList(Sequence[AnyStr]):
         Traceback (most recent call last):
         FileNotFoundError: [Errno 2] No such file or directory: ...
         """
-        stored = _core.open(os.path.abspath(os.fsencode(file)))
+        stored = _core.open(full_name(file))
         return cls._over(_core.PathSequence(stored), as_bytes)
 
     @overload
@@ -149,18 +153,22 @@ class PathList(Sequence[AnyStr]):
                   that is not sorted, too, instead of a scan; takes 2 to 3 bytes
                   per path there, and nothing in a sorted list
         progress  called with the paths packed and the paths read so far,
-                  some twenty times per second
+                  some twenty times per second, and at last when the archive is
+                  in its place
 
         Takes 0.6 to 1.2 microseconds per path on one core and uses all cores.
         Raises `ValueError`, with the position, for a path that is empty, holds
         a NUL or has a name or folder of over 1 MiB; `TypeError` for what is no
-        path. After an exception, `file` is as it was.
+        path. After an exception, `file` is as it was; only what `progress` raises
+        at its last call comes too late.
 
         >>> PathList.pack(["a", ""])
         Traceback (most recent call last):
         ValueError: path 1 is empty
         """
-        packer = _core.Packer(_target(file), _level(level), index, progress)
+        packer = _core.Packer(
+            _target(file), _level(level), index, _callable(progress)
+        )
         _add(packer, source)
         return cls._over(_core.PathSequence(packer.finish()), as_bytes)
 
@@ -181,7 +189,9 @@ class PathList(Sequence[AnyStr]):
         >>> list(PathList.open(folder / "ab.tessel")) == list(paths)
         True
         """
-        packer = _core.Packer(_target(file), _level(level), index, progress)
+        packer = _core.Packer(
+            _target(file), _level(level), index, _callable(progress)
+        )
         packer.add_sequence(self._paths)
         return self._like(_core.PathSequence(packer.finish()))
 
@@ -191,9 +201,12 @@ class PathList(Sequence[AnyStr]):
         """Add paths to the archive, and return the longer list.
 
         This list stays what it is. If its archive is in a file, that file is
-        replaced by a longer one; lists that are open keep the old one. What is
+        replaced by a longer one; lists that are open keep the old one, and can
+        no longer be appended to: go on with the list that is returned. What is
         added gets an index if the list has one. Only whole lists can be
         appended to: save a slice or other view first.
+
+        Raises `ValueError` if the file has other contents than this list.
 
         >>> paths = PathList.pack(["a", "b"])
         >>> longer = paths.append(["c"])
@@ -202,7 +215,7 @@ class PathList(Sequence[AnyStr]):
         """
         if not self._paths.is_whole:
             raise ValueError("cannot append to a view; save() it and append to that")
-        packer = _core.Packer.append_to(self._paths.stored, progress)
+        packer = _core.Packer.append_to(self._paths.stored, _callable(progress))
         _add(packer, paths)
         return self._like(_core.PathSequence(packer.finish()))
 
@@ -290,9 +303,10 @@ class PathList(Sequence[AnyStr]):
         >>> list(PathList.pack(list("abcdef")).shuffled(2))
         ['d', 'f', 'b', 'a', 'e', 'c']
         """
-        if not 0 <= seed < 2**64:
+        key = operator.index(seed)
+        if not 0 <= key < 2**64:
             raise ValueError(f"seed {seed} is not from 0 to 2**64 - 1")
-        return self._like(self._paths.shuffled(seed))
+        return self._like(self._paths.shuffled(key))
 
     def split(self, shards: int) -> list[PathList[AnyStr]]:
         """Divide the list into consecutive lists of nearly equal length.
@@ -379,7 +393,9 @@ class PathList(Sequence[AnyStr]):
         >>> PathList.pack(["a", "b", "a"]).numbers(["b", "a", "c"])
         array([ 1,  0, -1])
         """
-        return self._paths.numbers(paths)
+        if isinstance(paths, (str, bytes, os.PathLike)):
+            raise TypeError("expected many paths; put the one into a list")
+        return self._paths.numbers(iter(paths))
 
     def find(
         self,
@@ -513,7 +529,21 @@ class PathList(Sequence[AnyStr]):
 
 
 def _target(file: Path | None) -> bytes:
-    return b"" if file is None else os.path.abspath(os.fsencode(file))
+    return b"" if file is None else full_name(file)
+
+
+def full_name(file: Path) -> bytes:
+    """A file's absolute name; the system would take one with NUL as a shorter."""
+    name = os.fsencode(file)
+    if b"\0" in name:
+        raise ValueError(f"the file name {file!r} holds a NUL")
+    return os.path.abspath(name)
+
+
+def _callable(progress: Progress | None) -> Progress | None:
+    if progress is not None and not callable(progress):
+        raise TypeError(f"progress {progress!r} cannot be called")
+    return progress
 
 
 def _level(level: str) -> _core.Level:
@@ -529,7 +559,7 @@ def _add(packer: _core.Packer, source: Path | Iterable[Path]) -> None:
     elif isinstance(source, (str, bytes, os.PathLike)):
         _add_named(packer, os.fsencode(source))
     else:
-        packer.add_iterable(source)
+        packer.add_iterable(iter(source))
 
 
 def _add_named(packer: _core.Packer, name: bytes) -> None:

@@ -7,7 +7,7 @@ from collections.abc import Iterable
 from typing import Any, AnyStr, Literal, NoReturn, SupportsIndex, overload
 
 from . import _core
-from ._path_list import Path, PathList, with_steps
+from ._path_list import Path, PathList, full_name, with_steps
 from ._sharded_sequence import ShardedSequence
 from ._shards import Facts, Shards, write_manifest
 
@@ -68,13 +68,17 @@ class ShardedPathList(PathList[AnyStr]):
 
         Opens each of them to read how many paths it has.
         """
+        if isinstance(shards, (str, bytes, os.PathLike)):
+            raise TypeError("expected many shards; put the one into a list")
         file = os.path.abspath(os.fsdecode(manifest))
         facts = []
         for shard in shards:
             folder, name = os.path.split(os.path.abspath(os.fsdecode(shard)))
             if folder != os.path.dirname(file):
                 raise ValueError(f"{shard!r} is not in the folder of {file!r}")
-            paths = _core.PathSequence(_core.open(os.fsencode(shard)))
+            if name == os.path.basename(file):
+                raise ValueError(f"{shard!r} would be replaced by the manifest")
+            paths = _core.PathSequence(_core.open(full_name(shard)))
             facts.append((name, Facts.of(paths)))
         write_manifest(file, facts)
         return cls.open(file, as_bytes=as_bytes)

@@ -59,15 +59,20 @@ def pack_shards(
     has not begun is cancelled; workers end the shards that they are at. There
     is then no manifest, or that of an earlier call, none of whose shards has
     changed. Raises what `PathList.pack` raises, with the listing's name, and
-    `RuntimeError` if workers are lost again and again.
+    `RuntimeError` if workers are lost again and again. A listing must not be
+    one of the shards to be written: that is a `ValueError`.
     """
     if isinstance(listings, (str, bytes, os.PathLike)):
         raise TypeError("expected many listings; put the one into a list")
     sources = [os.path.abspath(os.fsdecode(listing)) for listing in listings]
     target = os.path.abspath(os.fsdecode(folder))
-    os.makedirs(target, exist_ok=True)
     names = [f"{position:05}.tessel" for position in range(len(sources))]
     files = [os.path.join(target, name) for name in names]
+    replaced = set(map(os.path.realpath, files))
+    for source in sources:
+        if os.path.realpath(source) in replaced:
+            raise ValueError(f"{source!r} would be replaced while it is read")
+    os.makedirs(target, exist_ok=True)
     tasks = client.map(_pack, sources, files, [level] * len(files), pure=False)
     try:
         facts = _results(tasks, sources, progress)
