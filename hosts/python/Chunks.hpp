@@ -9,6 +9,7 @@
 
 #include "archive/NumberRange.hpp"
 #include "archive/OrderedScan.hpp"
+#include "hosts/python/InterpreterLock.hpp"
 
 namespace tessel::python {
 
@@ -29,12 +30,12 @@ void inChunks(std::uint64_t count, std::uint64_t perChunk, Produce produce,
     const auto chunkAt = [&](std::uint64_t i) {
         return archive::chunkOf(all, perChunk, i);
     };
-    const pybind11::gil_scoped_release released;
+    const InterpreterReleased released;
     const ScanOptions options;
     archive::OrderedScan scan(archive::chunkCount(all, perChunk), options);
     std::vector<Result> results(scan.slots());
     const auto finish = [&](std::uint64_t i) {
-        const pybind11::gil_scoped_acquire held;
+        const InterpreterHeld held;
         if (PyErr_CheckSignals() != 0) throw pybind11::error_already_set();
         consume(chunkAt(i), std::exchange(results[i % scan.slots()], {}));
         return true;

@@ -7,6 +7,8 @@
 #include <future>
 #include <system_error>
 
+#include "hosts/python/InterpreterLock.hpp"
+
 namespace tessel::python {
 
 namespace {
@@ -25,7 +27,7 @@ std::future<void> started(FunctionRef<void()> work) {
 
 // Lets Python handle signals. Returns what it or `tick` raised.
 std::exception_ptr tickOnce(FunctionRef<void()> tick) {
-    const py::gil_scoped_acquire held;
+    const InterpreterHeld held;
     try {
         if (PyErr_CheckSignals() != 0) throw py::error_already_set();
         tick();
@@ -39,7 +41,7 @@ std::exception_ptr tickOnce(FunctionRef<void()> tick) {
 
 void runInterruptibly(std::stop_source& stop, FunctionRef<void()> work,
                       FunctionRef<void()> tick) {
-    const py::gil_scoped_release released;
+    const InterpreterReleased released;
     std::future<void> ending = started(work);
     while (ending.wait_for(betweenTicks) == std::future_status::timeout) {
         const std::exception_ptr raised = tickOnce(tick);

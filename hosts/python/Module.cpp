@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "hosts/python/Errors.hpp"
+#include "hosts/python/InterpreterLock.hpp"
 #include "hosts/python/Interruptible.hpp"
 #include "hosts/python/Packer.hpp"
 #include "hosts/python/PathObjects.hpp"
@@ -45,7 +46,7 @@ std::shared_ptr<StoredList> shared(StoredList::Pointer list) {
 // Keeps an object's buffer; releases it under the interpreter's lock.
 std::shared_ptr<const void> keeping(py::buffer_info info) {
     const auto release = [](py::buffer_info* kept) {
-        const py::gil_scoped_acquire held;
+        const InterpreterHeld held;
         const std::unique_ptr<py::buffer_info> owner(kept);
     };
     return std::shared_ptr<py::buffer_info>(
@@ -87,7 +88,7 @@ void bindStoredList(py::module_& module) {
     module.def(
         "open",
         [](const std::string& file) { return shared(StoredList::open(file)); },
-        py::call_guard<py::gil_scoped_release>());
+        py::call_guard<InterpreterReleased>());
     module.def("over", &listOver);
 }
 
@@ -102,7 +103,7 @@ py::list blockOf(const PathSequence& paths, std::uint64_t first,
                  std::uint64_t last, bool asBytes) {
     paths::PathList texts;
     {
-        const py::gil_scoped_release released;
+        const InterpreterReleased released;
         paths.read(first, last,
                    [&](std::string_view path) { texts.append(path); });
         paths.endReading(last - first);
@@ -124,7 +125,7 @@ std::vector<std::uint64_t> indicesOf(const PathSequence& paths,
 
 bool contains(const PathSequence& paths, py::object path) {
     const std::string text(PathBytes(std::move(path)).view());
-    const py::gil_scoped_release released;
+    const InterpreterReleased released;
     return paths.contains(text);
 }
 

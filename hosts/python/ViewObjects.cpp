@@ -6,6 +6,8 @@
 #include <span>
 #include <variant>
 
+#include "hosts/python/InterpreterLock.hpp"
+
 namespace tessel::python {
 
 namespace py = pybind11;
@@ -92,7 +94,7 @@ namespace {
 IndexArray numbersOf(const View& view, const IndexArray& indices) {
     std::vector<std::uint64_t> numbers = fromStart(view.size(), indices);
     {
-        const py::gil_scoped_release released;
+        const InterpreterReleased released;
         view.toNumbers(numbers);
     }
     return arrayOf(numbers);
@@ -101,7 +103,7 @@ IndexArray numbersOf(const View& view, const IndexArray& indices) {
 IndexArray indicesOf(const View& view, std::vector<std::uint64_t> numbers) {
     std::vector<std::uint64_t> indices;
     {
-        const py::gil_scoped_release released;
+        const InterpreterReleased released;
         indices = view.indicesOf(std::move(numbers));
     }
     return arrayOf(indices);

@@ -4,6 +4,7 @@ import concurrent.futures
 import copy
 import multiprocessing
 import pickle
+import subprocess
 import sys
 
 import lists
@@ -119,3 +120,30 @@ def test_threads():
 
     with concurrent.futures.ThreadPoolExecutor(4) as threads:
         list(threads.map(work, range(8)))
+
+
+@pytest.mark.parametrize(
+    "call",
+    [
+        "paths.take(everything)",
+        "paths.find(regex='9.*8')",
+        "paths == paths.shuffled(1).shuffled(2)",
+        "paths.shuffled(1) == paths.shuffled(1)",
+        "list(paths)",
+        "PathList.pack(paths)",
+    ],
+)
+def test_the_interpreter_ends_during_calls(call):
+    program = f"""
+import threading, time
+from qztessel import PathList
+paths = PathList.pack(f"a/{{i % 97}}/{{i}}" for i in range(100_000))
+everything = range(len(paths))
+def work():
+    while True:
+        {call}
+for i in range(4):
+    threading.Thread(target=work, daemon=True).start()
+time.sleep(0.2)
+"""
+    subprocess.run([sys.executable, "-c", program], check=True)

@@ -1,10 +1,8 @@
 #include "hosts/python/host/SharedHost.hpp"
 
-#include <cxxabi.h>
 #include <dlfcn.h>
 #include <link.h>
 #include <pthread.h>
-#include <unistd.h>
 
 #include <memory>
 #include <stdexcept>
@@ -71,17 +69,6 @@ void SharedHost::start(const std::filesystem::path& plugin,
                        [] { mutex.unlock(); });
     }
     if (!host->hasClass(embedded::filesetClassName)) host->loadModule(plugin);
-}
-
-// Python ends the threads that come back to an ending interpreter, by unwinding
-// them. That would release Python's objects without its lock on the way, so
-// the thread waits here instead for the end of the process.
-void SharedHost::takeInterpreter(PyThreadState* thread) noexcept {
-    try {
-        PyEval_RestoreThread(thread);
-    } catch (const abi::__forced_unwind&) {
-        while (true) pause();
-    }
 }
 
 }  // namespace tessel::python

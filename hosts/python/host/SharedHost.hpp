@@ -7,6 +7,7 @@
 #include <optional>
 
 #include "hosts/embedded/Host.hpp"
+#include "hosts/python/InterpreterLock.hpp"
 
 namespace tessel::python {
 
@@ -47,21 +48,14 @@ private:
     // and taken last.
     class Turn {
     public:
-        Turn() : thread_(PyEval_SaveThread()) { mutex.lock(); }
+        Turn() { mutex.lock(); }
         Turn(const Turn&) = delete;
         Turn& operator=(const Turn&) = delete;
-        ~Turn() {
-            mutex.unlock();
-            takeInterpreter(thread_);
-        }
+        ~Turn() { mutex.unlock(); }
 
     private:
-        PyThreadState* thread_;
+        InterpreterReleased released_;
     };
-
-    // Takes the interpreter's lock again. Does not return if the interpreter
-    // ends meanwhile.
-    static void takeInterpreter(PyThreadState* thread) noexcept;
 
     // NOLINTBEGIN(cppcoreguidelines-avoid-non-const-global-variables)
     static std::mutex mutex;
