@@ -68,7 +68,7 @@ def pack_shards(
     target = os.path.abspath(os.fsdecode(folder))
     names = [f"{position:05}.tessel" for position in range(len(sources))]
     files = [os.path.join(target, name) for name in names]
-    replaced = set(map(os.path.realpath, files))
+    replaced = {os.path.realpath(file) for file in files}
     for source in sources:
         if os.path.realpath(source) in replaced:
             raise ValueError(f"{source!r} would be replaced while it is read")
