@@ -71,7 +71,7 @@ void BatchInserter::insertFolder(const ComponentList& components,
         const auto positions = cache_.trackOf(*cached);
         track_.assign(positions.begin(), positions.end());
         const std::uint64_t first =
-            tree_.inserter().addFiles(*cached->node, fileNames);
+            tree_.inserter().addFiles(cached->node, fileNames);
         numbering_.notePartition(track_, true, first, fileNames.size());
         return;
     }

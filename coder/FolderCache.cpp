@@ -24,12 +24,12 @@ void FolderCache::reserveFor(std::size_t depth) {
 
 // What a failed step leaves behind is not reached from the index.
 void FolderCache::add(const ComponentList& components, std::uint32_t hash,
-                      BNode& node, const PathTrack& track) {
+                      BNode node, const PathTrack& track) {
     // More folders than the index can tell apart are not cached.
     if (folders_.size() > HashIndex::maxPosition) return;
     const std::size_t start = positions_.size();
     positions_.insert(positions_.end(), track.begin(), track.end());
-    folders_.push_back({components.bytes(), &node, start, track.size()});
+    folders_.push_back({components.bytes(), node, start, track.size()});
     index_.insert(hash, folders_.size() - 1);
 }
 
@@ -50,7 +50,7 @@ void FolderCache::prefetchFolder(std::uint32_t hash) const noexcept {
 void FolderCache::prefetchNode(std::uint32_t hash) const noexcept {
     const Folder* folder = inHomeSlot(hash);
     if (folder == nullptr) return;
-    __builtin_prefetch(folder->node);
+    folder->node.prefetch();
     __builtin_prefetch(folder->bytes.data());
     __builtin_prefetch(positions_.data() + folder->trackStart);
 }

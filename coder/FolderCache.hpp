@@ -23,7 +23,7 @@ class FolderCache {
 public:
     struct Folder {
         ComponentView bytes;  // of its packed components
-        BNode* node = nullptr;
+        BNode node;
         std::size_t trackStart = 0;
         std::size_t trackLength = 0;
     };
@@ -41,7 +41,7 @@ public:
 
     // Adds a folder that find did not find. If it throws (std::bad_alloc),
     // nothing changes.
-    void add(const ComponentList& components, std::uint32_t hash, BNode& node,
+    void add(const ComponentList& components, std::uint32_t hash, BNode node,
              const PathTrack& track);
 
     // Prefetch what a later find will touch, one dependent step each: call

@@ -15,12 +15,11 @@ FormWriter::TreeStats FormWriter::TreeStats::collect(const BPathTree& tree) {
     TreeStats stats;
     stats.maxChildren = tree.root->children().size();
     for (NodeWalk walk(*tree.root); walk.next();) {
-        const BNode& node = walk.node();
-        const std::size_t length = node.value().size();
+        const std::size_t length = walk.node().value().size();
         ++stats.nodes;
         stats.valueBytes += length;
         stats.maxValueBytes = std::max(stats.maxValueBytes, length);
-        stats.maxChildren = std::max(stats.maxChildren, node.children().size());
+        stats.maxChildren = std::max(stats.maxChildren, walk.childCount());
     }
     return stats;
 }

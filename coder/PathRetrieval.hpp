@@ -151,7 +151,7 @@ void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
         const auto left = static_cast<std::uint64_t>(last - next);
         visitor.beginFolder(
             static_cast<std::size_t>(std::min(left, ends[k] - number + 1)));
-        const BatchFiles files =
+        BatchFiles files =
             TrackLookup(*tree_.root)
                 .openBatch(
                     reader.read(numbering_.partitionTracks, k),

@@ -6,7 +6,8 @@
 
 namespace tessel {
 
-// Shared ownership of one node: 8 bytes; the count is in the node.
+// Shared ownership of one node: 16 bytes; the count is in the folder's node.
+// A handle to a file keeps the file's folder alive.
 //
 // Threads: counts are atomic, so handles to one node may be copied and
 // released on different threads. Releasing the last handle releases what the
@@ -15,39 +16,44 @@ class BNodePtr {
 public:
     BNodePtr() noexcept = default;
     // Takes a new share.
-    explicit BNodePtr(BNode* target) noexcept : node_(target) {
-        if (node_ != nullptr) node_->share();
-    }
-    BNodePtr(const BNodePtr& other) noexcept : BNodePtr(other.node_) {}
+    explicit BNodePtr(BNode target) noexcept : node_(target) { share(); }
+    BNodePtr(const BNodePtr& other) noexcept : node_(other.node_) { share(); }
     BNodePtr(BNodePtr&& other) noexcept
-        : node_(std::exchange(other.node_, nullptr)) {}
+        : node_(std::exchange(other.node_, BNode())) {}
     BNodePtr& operator=(BNodePtr other) noexcept {
         std::swap(node_, other.node_);
         return *this;
     }
     ~BNodePtr() {
-        if (node_ != nullptr && node_->unshare()) BNode::destroy(node_);
+        if (node_.place_ != nullptr) node_.place_->release();
     }
 
     // The handle that takes over a share which the caller owns.
-    static BNodePtr adopt(BNode* owned) noexcept {
+    static BNodePtr adopt(FolderNode* owned) noexcept {
         BNodePtr handle;
-        handle.node_ = owned;
+        handle.node_.place_ = owned;
         return handle;
     }
-    // Hands the share over to the caller and leaves the handle empty.
-    BNode* release() noexcept { return std::exchange(node_, nullptr); }
+    // Hands the share of a folder over to the caller and leaves the handle
+    // empty.
+    FolderNode* release() noexcept {
+        return std::exchange(node_, BNode()).place_;
+    }
 
-    BNode* get() const noexcept { return node_; }
-    BNode& operator*() const noexcept { return *node_; }
-    BNode* operator->() const noexcept { return node_; }
-    explicit operator bool() const noexcept { return node_ != nullptr; }
+    const BNode& operator*() const noexcept { return node_; }
+    const BNode* operator->() const noexcept { return &node_; }
+    explicit operator bool() const noexcept { return node_.place_ != nullptr; }
     friend bool operator==(const BNodePtr& a, const BNodePtr& b) noexcept {
+        if (!a || !b) return !a && !b;
         return a.node_ == b.node_;
     }
 
 private:
-    BNode* node_ = nullptr;
+    void share() noexcept {
+        if (node_.place_ != nullptr) node_.place_->share();
+    }
+
+    BNode node_;
 };
 
 }  // namespace tessel

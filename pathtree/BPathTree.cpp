@@ -6,6 +6,7 @@
 #include <unordered_set>
 #include <utility>
 
+#include "pathtree/ComponentArena.hpp"
 #include "pathtree/NodeSlab.hpp"
 #include "pathtree/NodeWalk.hpp"
 #include "pathtree/TrackLookup.hpp"
@@ -28,6 +29,18 @@ void assignCopy(ComponentView value, Component& out) {
 void appendAll(Components& out, Components& more) {
     reserveGently(out, more.size());
     std::move(more.begin(), more.end(), std::back_inserter(out));
+}
+
+// The components as a packed list, valid as long as the arena.
+ComponentList packedBy(ComponentArena& arena, const Components& components) {
+    for (const Component& component : components) arena.append(component);
+    return arena.finish();
+}
+
+// Empties the components from position `first` on: they are nodes now.
+void releaseFrom(Components& components, std::size_t first) noexcept {
+    for (std::size_t i = first; i < components.size(); ++i)
+        releaseContents(components[i]);
 }
 
 std::size_t componentBytes(const Components& components) {
@@ -56,9 +69,9 @@ BPathTree::~BPathTree() = default;
 
 std::uint64_t BPathTree::findNode(const Component& value,
                                   const ChildList& nodes) const {
-    const std::size_t count = nodes.size();
-    for (std::size_t i = 0; i < count; ++i)
-        if (sameComponent(nodes[i].value(), value)) return i;
+    ChildReader reader = nodes.reader();
+    for (std::uint64_t i = 0; !reader.atEnd(); ++i)
+        if (sameComponent(reader.next().value(), value)) return i;
     return allOnes;
 }
 
@@ -70,19 +83,29 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
     const std::uint64_t found = findNode(value, nodes);
     existed = found != allOnes;
     if (existed) return found;
-    inserter_->add(nodes.node(), value, NodePool::Kind::leaf);
+    inserter_->add(nodes.node(), value);
     releaseContents(value);
     return nodes.size() - 1;
 }
 
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
-    return inserter_->addPath(*root, components, pathTrack);
+    ComponentArena arena;
+    const std::size_t before = pathTrack.size();
+    const bool existed = inserter_->addPath(*root, packedBy(arena, components),
+                                            pathTrack);
+    releaseFrom(components, pathTrack.size() - before);
+    return existed;
 }
 
 bool BPathTree::addPath(Components& folderComponents, Components& fileNames,
                         PathTrack& pathTrack, std::uint64_t& firstFileIndex) {
+    ComponentArena arena;
+    const ComponentList folder = packedBy(arena, folderComponents);
+    const ComponentList files = packedBy(arena, fileNames);
     const TreeInserter::AddedBatch added =
-        inserter_->addBatch(*root, folderComponents, fileNames, pathTrack);
+        inserter_->addBatch(*root, folder, files, pathTrack);
+    releaseFrom(folderComponents, added.storedComponents);
+    releaseFrom(fileNames, 0);
     firstFileIndex = added.existed ? added.firstFile : allOnes;
     return added.existed;
 }
@@ -105,7 +128,7 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node,
                                     const NodeStack& parents) const noexcept {
     if (parents.empty()) return false;
     const ChildList siblings = parents.top().children();
-    return !siblings.empty() && &siblings.back() == node.get();
+    return !siblings.empty() && siblings.back() == *node;
 }
 
 bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
@@ -115,6 +138,7 @@ bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {
 void BPathTree::reset() {
     inserter_->releaseIndex();
     if (root->isLeaf()) return;
+    inserter_->trim(*root);
     // Room first, so that it changes nothing if memory runs out.
     pendingNodes.reserve(1);
     parentNodes.reserve(1);
@@ -130,12 +154,14 @@ bool BPathTree::hasNextPath() const noexcept {
     return !root->isLeaf() && !pendingNodes.empty();
 }
 
-// Enters folders until a leaf is on top of the pending nodes; returns it.
-// Each folder is entered as a whole or, if memory runs out, not at all.
-const BNode& BPathTree::enterFolders() {
+// Enters folders until a file is on top of the pending nodes; returns its
+// name. Each folder is entered as a whole or, if memory runs out, not at all.
+ComponentView BPathTree::enterFolders() {
     if (!hasNextPath()) throw NoMorePathException();
-    while (!pendingNodes.top().isLeaf()) {
-        const BNodePtr folder(&pendingNodes.top());
+    for (;;) {
+        const Child top = pendingNodes.topChild();
+        if (top.folder == nullptr) return top.name;
+        const BNodePtr folder{BNode(*top.folder)};
         pendingNodes.reserve(1);
         parentNodes.reserve(1);
         reserveGently(currentPrefix, 1);
@@ -144,12 +170,11 @@ const BNode& BPathTree::enterFolders() {
         pushAllChildren(folder);
         parentNodes.push(folder);
     }
-    return pendingNodes.top();
 }
 
-// Takes the leaf on top off, and the folders that end with it.
+// Takes the file on top off, and the folders that end with it.
 void BPathTree::leavePath() noexcept {
-    const BNodePtr leaf(&pendingNodes.top());
+    const BNodePtr leaf(pendingNodes.top());
     pendingNodes.pop();
     if (isNodeAtEndOfParent(leaf)) closeFinishedFolders();
     unchangedFolders_ = currentPrefix.size();
@@ -157,7 +182,7 @@ void BPathTree::leavePath() noexcept {
 
 void BPathTree::closeFinishedFolders() noexcept {
     while (!parentNodes.empty()) {
-        const BNodePtr folder(&parentNodes.top());
+        const BNodePtr folder(parentNodes.top());
         parentNodes.pop();
         if (!currentPrefix.empty()) currentPrefix.pop_back();
         if (!isNodeAtEndOfParent(folder)) return;
@@ -220,18 +245,23 @@ BPathTree::MemoryUsage BPathTree::memoryUsage() const {
     MemoryUsage usage;
     std::unordered_set<NodeSlab*> slabs;
     NodeSlab* latest = nullptr;
-    const auto account = [&](const BNode& node) {
-        usage.names += node.value().size();
-        usage.nodes += node.ownValueBytes();
-        usage.childLists += node.childListBytes();
+    const auto account = [&](const FolderNode& node) {
+        std::size_t fileNames = 0;
+        for (ChildReader files(node.children()); !files.atEnd();)
+            fileNames += files.next().name.size();
+        const std::size_t ownBlock = node.ownChildBytes();
+        usage.names += node.value().size() + fileNames;
+        usage.nodes += node.ownValueBytes() - node.value().size();
+        usage.nodes -= ownBlock > 0 ? 0 : fileNames;
+        usage.childLists += ownBlock > 0 ? ownBlock - fileNames : 0;
         NodeSlab* slab = NodeSlab::of(&node);
         if (slab == latest) return;
         latest = slab;
         if (slabs.insert(slab).second) usage.nodes += slab->memoryBytes();
     };
-    account(*root);
-    for (NodeWalk walk(*root); walk.next();) account(walk.node());
-    usage.nodes -= usage.names;
+    account(*root->folder());
+    for (NodeWalk walk(*root); walk.next();)
+        if (walk.node().folder != nullptr) account(*walk.node().folder);
     usage.childIndex = inserter_->indexBytes();
     usage.iteration = pendingNodes.memoryBytes() + parentNodes.memoryBytes() +
                       componentBytes(currentPrefix);

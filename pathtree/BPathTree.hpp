@@ -27,10 +27,10 @@ class TreeInserter;
 //   separate. Releasing a tree does not recurse.
 // Threads: no locks. Use a tree and its copies from one thread at a time;
 //   releasing them on different threads is safe.
-// Cost: a file takes its encoded name, 5 to 8 bytes (13 to 16 for a name of
-//   63 bytes or more, see NodePool), and 8 to 10 bytes in its folder's child
-//   list; a folder takes 8 bytes more, and about 20 for the list if it has
-//   more than one child. Finding a child takes constant time on average.
+// Cost: a file takes its encoded name and a byte in its folder's ChildBlock
+//   (nine for a name of 253 bytes or more), and at most half a byte for its
+//   position; a folder takes some 22 bytes, and 24 more if its block is on
+//   the heap. Finding a child takes constant time on average.
 class BPathTree {
 public:
     // No position: what a search answers that finds nothing.
@@ -104,7 +104,7 @@ public:
     // Cost: the folders that are entered and left; no copy of the path.
     template <class Visit>
     void visitNextPath(Visit&& visit) {
-        const ComponentView name = enterFolders().value();
+        const ComponentView name = enterFolders();
         visit(PathView{currentPrefix, name, unchangedFolders_});
         leavePath();
     }
@@ -186,7 +186,7 @@ public:
     bool spareFlag = false;    // copied, otherwise unused
 
 private:
-    const BNode& enterFolders();
+    ComponentView enterFolders();
     void leavePath() noexcept;
     void closeFinishedFolders() noexcept;
 

@@ -23,7 +23,7 @@ std::size_t BPathTree::serialize(std::vector<std::uint8_t>& structure,
         const ComponentView value = walk.node().value();
         values.emplace_back(value.begin(), value.end());
         structure.push_back(nodecode::of(walk));
-        maxChildren = std::max(maxChildren, walk.node().children().size());
+        maxChildren = std::max(maxChildren, walk.childCount());
     }
     return maxChildren;
 }

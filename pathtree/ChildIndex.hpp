@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <unordered_map>
 
-#include "pathtree/BNode.hpp"
+#include "pathtree/FolderNode.hpp"
 #include "pathtree/HashIndex.hpp"
 
 namespace tessel {
@@ -16,7 +16,7 @@ namespace tessel {
 //   more             | a hash table from value to first position, one per
 //                    | folder, made when the folder is first searched
 //
-// Children are only appended and never change, so a table cannot become
+// Children are only appended and keep their names, so a table cannot become
 // wrong; it takes in the children that came since its last use, whoever
 // appended them. Clear the index before nodes that it has seen are released.
 //
@@ -28,13 +28,9 @@ class ChildIndex {
 public:
     static constexpr std::size_t notFound = HashIndex::notFound;
 
-    struct Found {
-        BNode* child = nullptr;
-        std::size_t position = notFound;
-    };
-
-    // The first child of parent that equals value.
-    Found find(BNode& parent, ComponentView value);
+    // The position of the first child of parent that equals value, or
+    // notFound.
+    std::size_t find(FolderNode& parent, ComponentView value);
 
     // Children in all tables.
     std::size_t indexedChildren() const noexcept { return indexedChildren_; }
@@ -50,8 +46,8 @@ private:
     class Table {
     public:
         // Takes in the children that it does not hold yet; returns how many.
-        std::size_t indexNewChildren(const ChildList& children);
-        std::size_t find(const ChildList& children, ComponentView value,
+        std::size_t indexNewChildren(const FolderNode& parent);
+        std::size_t find(const FolderNode& parent, ComponentView value,
                          std::uint32_t hash) const;
         std::size_t memoryBytes() const noexcept {
             return positions_.memoryBytes();
@@ -62,7 +58,7 @@ private:
         std::size_t size_ = 0;  // children [0, size_) are in
     };
 
-    std::unordered_map<const BNode*, Table> tables_;
+    std::unordered_map<const FolderNode*, Table> tables_;
     std::size_t indexedChildren_ = 0;
 };
 

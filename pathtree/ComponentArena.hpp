@@ -31,20 +31,13 @@ public:
     // must write it at the address returned before it uses the arena again,
     // and may write up to `slack` bytes more.
     std::uint8_t* extend(std::size_t length) {
-        const bool isLong = length >= ComponentList::longMark;
-        const std::size_t mark = 1 + (isLong ? sizeof(std::uint64_t) : 0);
-        if (mark + length + slack > capacity_ - used_)
-            moveOn(mark + length + slack);
+        const std::size_t header = packed::headerBytes(length);
+        if (header + length + slack > capacity_ - used_)
+            moveOn(header + length + slack);
         std::uint8_t* at = buffers_.back().get() + used_;
-        *at = isLong ? ComponentList::longMark
-                     : static_cast<std::uint8_t>(length);
-        if (isLong) {
-            const std::uint64_t stored = length;
-            std::memcpy(at + 1, &stored, sizeof stored);
-        }
-        used_ += mark + length;
+        used_ += header + length;
         ++count_;
-        return at + mark;
+        return packed::writeHeader(at, length);
     }
 
     // Appends a copy of the component to the current list.

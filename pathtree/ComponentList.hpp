@@ -2,16 +2,15 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <cstring>
 
-#include "pathtree/Component.hpp"
+#include "pathtree/PackedComponent.hpp"
 
 namespace tessel {
 
 // A list of encoded components, one after the other in a buffer: a batch is
 // handed to the path tree without an allocation per component or per folder.
 //
-//   | length, 1 byte, or 0xFF and 8 bytes | the component's bytes | ...
+// How each stands there is said in PackedComponent.hpp.
 //
 // Ownership: a view. The ComponentBuffers that its ComponentArena filled must
 //   outlive it.
@@ -22,10 +21,11 @@ public:
         explicit Iterator(const std::uint8_t* position) noexcept
             : at_(position) {}
         ComponentView operator*() const noexcept {
-            if (*at_ != longMark) return {at_ + 1, *at_};
-            std::uint64_t length = 0;
-            std::memcpy(&length, at_ + 1, sizeof length);
-            return {at_ + 1 + sizeof length, static_cast<std::size_t>(length)};
+            return packed::readComponent(at_);
+        }
+        // The component as it stands in the buffer.
+        ComponentView packedBytes() const noexcept {
+            return {at_, (**this).data() + (**this).size()};
         }
         Iterator& operator++() noexcept {
             const ComponentView here = **this;
@@ -53,8 +53,6 @@ public:
 
 private:
     friend class ComponentArena;
-
-    static constexpr std::uint8_t longMark = 0xFF;
 
     ComponentList(const std::uint8_t* start, std::size_t length,
                   std::size_t components) noexcept

@@ -6,7 +6,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "pathtree/BNode.hpp"
+#include "pathtree/Component.hpp"
 
 namespace tessel {
 

@@ -3,10 +3,8 @@
 #include <atomic>
 #include <cstddef>
 #include <cstdint>
-#include <mutex>
-#include <unordered_map>
 
-#include "pathtree/BNode.hpp"
+#include "pathtree/FolderNode.hpp"
 
 namespace tessel {
 
@@ -33,7 +31,7 @@ public:
     // A slab of so many bytes, held once. Throws std::bad_alloc.
     static NodeSlab* create(std::size_t bytes);
 
-    static NodeSlab* of(const BNode* node) noexcept {
+    static NodeSlab* of(const FolderNode* node) noexcept {
         const auto address = reinterpret_cast<std::uintptr_t>(node);
         return reinterpret_cast<NodeSlab*>(address & ~(alignment - 1));
     }
@@ -41,13 +39,13 @@ public:
     NodeSlab(const NodeSlab&) = delete;
     NodeSlab& operator=(const NodeSlab&) = delete;
 
-    // The address of a new node, which has `before` bytes before it and
-    // `bytes` from it on; nullptr if no room is left. The node holds the slab.
-    void* allocate(std::size_t before, std::size_t bytes) noexcept {
+    // The address of a new node of so many bytes; nullptr if no room is left.
+    // The node holds the slab.
+    void* allocate(std::size_t bytes) noexcept {
         constexpr std::size_t unit = nodeAlignment;
-        const std::size_t total = (before + bytes + unit - 1) / unit * unit;
+        const std::size_t total = (bytes + unit - 1) / unit * unit;
         if (total > size_ - used_) return nullptr;
-        char* at = reinterpret_cast<char*>(this) + used_ + before;
+        char* at = reinterpret_cast<char*>(this) + used_;
         used_ += total;
         // Relaxed: the pool's own hold keeps the slab alive meanwhile.
         holds_.fetch_add(1, std::memory_order_relaxed);
@@ -60,33 +58,18 @@ public:
         if (holds_.fetch_sub(1, std::memory_order_acq_rel) == 1) free();
     }
 
-    // ---- Children of nodes that were made as leaves ----
-
-    // Nodes that got a store, forgotten when they are released.
-    ChildStore childStore(const BNode* node) const noexcept;
-    // Throws std::bad_alloc, with nothing changed, on a node's first store.
-    void setChildStore(const BNode* node, ChildStore kept);
-    void forgetChildStore(const BNode* node) noexcept;
-
-    // Heap bytes of the slab and its table of stores.
+    // Heap bytes of the slab.
     std::size_t memoryBytes() noexcept;
 
 private:
-    struct StoreTable {
-        std::mutex access;  // guards stores
-        std::unordered_map<const BNode*, ChildStore> stores;
-    };
-
     explicit NodeSlab(std::size_t bytes) noexcept : size_(bytes) {}
-    ~NodeSlab();
+    ~NodeSlab() = default;
 
-    StoreTable& madeStoreTable();
     void free() noexcept;
 
     std::atomic<std::size_t> holds_{1};  // nodes, and 1 while a pool fills it
     std::size_t size_;
     std::size_t used_ = sizeof(NodeSlab);  // only the pool reads or changes it
-    std::atomic<StoreTable*> storeTable_{nullptr};  // few slabs have one
 };
 
 }  // namespace tessel

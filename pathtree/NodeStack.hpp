@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <vector>
 
 #include "pathtree/BNodePtr.hpp"
@@ -26,24 +27,27 @@ public:
     }
 
     // The node on top; the stack must not be empty.
-    BNode& top() const noexcept {
+    BNode top() const noexcept {
         const Range& range = ranges_.back();
-        return range.isNode ? *range.node : range.node->children()[range.next];
+        if (range.isNode) return *range.node;
+        const Child child = topChild();
+        return child.folder != nullptr
+                   ? BNode(*child.folder)
+                   : BNode(*range.node->folder(), range.next);
     }
+    // What it is, without a search for its position.
+    Child topChild() const noexcept;
 
-    void push(const BNodePtr& node) { ranges_.push_back({node, 0, 1, true}); }
+    void push(const BNodePtr& node) {
+        ranges_.push_back({node, 0, 0, 1, true, false});
+    }
 
     // Pushes the node's present children from the last to the first, so that
     // the first is on top. Children appended later are not on the stack.
-    void pushChildren(const BNodePtr& node) {
-        const std::size_t count = node->children().size();
-        if (count > 0) ranges_.push_back({node, 0, count, false});
-    }
+    void pushChildren(const BNodePtr& node);
 
     // Takes the top off; the stack must not be empty.
-    void pop() noexcept {
-        if (++ranges_.back().next == ranges_.back().end) ranges_.pop_back();
-    }
+    void pop() noexcept;
 
     void clear() noexcept { ranges_.clear(); }
 
@@ -62,11 +66,15 @@ private:
     // that of the push: the node may have more children by now.
     struct Range {
         BNodePtr node;
-        std::size_t next;
-        std::size_t end;
+        std::uint64_t offset;  // of the entry of child `next`
+        std::uint32_t next;
+        std::uint32_t end;
         bool isNode;
+        bool isPadded;  // the layout of the block that the offset is for
     };
 
+    // Where the offset of the top is right, whatever was inserted since.
+    const std::uint8_t* topEntry() const noexcept;
     void grow(std::size_t more);
 
     std::vector<Range> ranges_;

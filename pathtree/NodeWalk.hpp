@@ -11,48 +11,48 @@ namespace tessel {
 // One pass over all nodes below a root, depth first, parents before their
 // children and siblings in order, without recursion:
 //
-//   for (NodeWalk walk(root); walk.next();) use(walk.node());
+//   for (NodeWalk walk(root); walk.next();) use(walk.node().value());
 //
 // Ownership: borrows the tree, which must not change during the walk.
 class NodeWalk {
 public:
-    explicit NodeWalk(const BNode& root) { open_.push_back({&root, 0}); }
+    explicit NodeWalk(BNode root) {
+        open_.push_back(root.children().reader());
+    }
 
     // Moves to the next node; false when there is none.
     bool next() {
-        if (current_ != nullptr && hasChildren_) open_.push_back({current_, 0});
+        if (current_.folder != nullptr)
+            open_.emplace_back(current_.folder->children());
         while (!open_.empty()) {
-            Folder& folder = open_.back();
-            const ChildList children = folder.node->children();
-            if (folder.next < children.size()) {
-                current_ = &children[folder.next++];
-                last_ = folder.next == children.size();
-                hasChildren_ = !current_->isLeaf();
+            ChildReader& siblings = open_.back();
+            if (!siblings.atEnd()) {
+                current_ = siblings.next();
                 return true;
             }
             open_.pop_back();
         }
+        current_ = {};
         return false;
     }
 
     // The node that next() moved to.
-    const BNode& node() const noexcept { return *current_; }
-    bool isLeaf() const noexcept { return !hasChildren_; }
+    const Child& node() const noexcept { return current_; }
+    bool isLeaf() const noexcept { return childCount() == 0; }
+    std::size_t childCount() const noexcept {
+        return current_.folder == nullptr
+                   ? 0
+                   : static_cast<std::size_t>(
+                         current_.folder->children().count());
+    }
     // The folders that it is in, the root not counted.
     std::size_t depth() const noexcept { return open_.size() - 1; }
     // True when it is its parent's last child.
-    bool isLastChild() const noexcept { return last_; }
+    bool isLastChild() const noexcept { return open_.back().atEnd(); }
 
 private:
-    struct Folder {
-        const BNode* node;
-        std::size_t next;  // position of the child to visit next
-    };
-
-    std::vector<Folder> open_;
-    const BNode* current_ = nullptr;
-    bool hasChildren_ = false;
-    bool last_ = false;
+    std::vector<ChildReader> open_;
+    Child current_;
 };
 
 }  // namespace tessel

@@ -19,19 +19,20 @@ class TrackLookup {
 public:
     using Track = std::span<const std::uint64_t>;
 
-    explicit TrackLookup(const BNode& root) noexcept : root_(root) {}
+    explicit TrackLookup(BNode root) noexcept : root_(*root.folder()) {}
 
     // Calls visit(ComponentView) with each component along the track. Throws
     // NoTreeToTraverseException on a tree without paths, otherwise
     // EmptyPathForTraverseException on an empty track.
     template <class Visit>
     void visitTrack(Track track, Visit&& visit) const {
-        if (root_.isLeaf()) throw NoTreeToTraverseException();
+        if (root_.children().count() == 0) throw NoTreeToTraverseException();
         if (track.empty()) throw EmptyPathForTraverseException();
-        const BNode* node = &root_;
+        const FolderNode* folder = &root_;
         for (const std::uint64_t position : track) {
-            node = &BatchFiles::childAt(*node, position);
-            visit(node->value());
+            const Child child = BatchFiles::childAt(folder, position);
+            visit(child.value());
+            folder = child.folder;
         }
     }
 
@@ -49,15 +50,16 @@ public:
     template <class VisitFolder>
     BatchFiles openBatch(Track track, VisitFolder&& visitFolder) const {
         if (track.empty()) return BatchFiles::ofRoot(root_);
-        const BNode* folder = &root_;
+        const FolderNode* folder = &root_;
         for (const std::uint64_t position : track.first(track.size() - 1)) {
-            folder = &BatchFiles::childAt(*folder, position);
-            visitFolder(folder->value());
+            const Child child = BatchFiles::childAt(folder, position);
+            visitFolder(child.value());
+            folder = child.folder;
         }
-        const BNode& end = BatchFiles::childAt(*folder, track.back());
-        if (end.isLeaf()) return {*folder, track.back()};
+        const Child end = BatchFiles::childAt(folder, track.back());
+        if (end.folder == nullptr) return {*folder, track.back()};
         visitFolder(end.value());
-        return {end, 0};
+        return {*end.folder, 0};
     }
 
     // The same, and then visitFile(ComponentView) with the files at these
@@ -65,12 +67,12 @@ public:
     template <class VisitFolder, class VisitFile>
     void visitBatch(Track track, std::span<const std::uint64_t> offsets,
                     VisitFolder&& visitFolder, VisitFile&& visitFile) const {
-        const BatchFiles files = openBatch(track, visitFolder);
+        BatchFiles files = openBatch(track, visitFolder);
         for (const std::uint64_t offset : offsets) visitFile(files[offset]);
     }
 
 private:
-    const BNode& root_;
+    const FolderNode& root_;
 };
 
 }  // namespace tessel

@@ -1,93 +1,202 @@
 #include "pathtree/TreeInserter.hpp"
 
-#include <type_traits>
+#include <array>
+#include <vector>
 
-#include "pathtree/Insertion.hpp"
+#include "pathtree/NodeWalk.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {
 
+namespace {
+
+ChildBatch batchOf(const ComponentList& files) noexcept {
+    return {files.bytes(), files.size(), false};
+}
+
+}  // namespace
+
+// Follows components from the root down as far as they are stored, and notes
+// the positions. Unless it is kept, its end takes the positions away again.
+class TreeInserter::Descent {
+public:
+    Descent(ChildIndex& index, BNode root, const ComponentList& components,
+            PathTrack& track)
+        : track_(track),
+          trackLength_(track.size()),
+          node_(root),
+          next_(components.begin()),
+          end_(components.end()) {
+        track_.reserve(trackLength_ + components.size());
+        try {
+            while (next_ != end_ && step(index)) ++next_;
+        } catch (...) {
+            track_.resize(trackLength_);
+            throw;
+        }
+    }
+    Descent(const Descent&) = delete;
+    Descent& operator=(const Descent&) = delete;
+    ~Descent() {
+        if (!kept_) track_.resize(trackLength_);
+    }
+
+    // The last node that is stored.
+    BNode node() const noexcept { return node_; }
+    // The first component that is not stored.
+    ComponentList::Iterator next() const noexcept { return next_; }
+    bool isAllStored() const noexcept { return next_ == end_; }
+    void keep() noexcept { kept_ = true; }
+
+private:
+    bool step(ChildIndex& index) {
+        FolderNode* const folder = node_.folder();
+        if (folder == nullptr) return false;
+        const std::size_t position = index.find(*folder, *next_);
+        if (position == ChildIndex::notFound) return false;
+        node_ = BNode(*folder, position);
+        track_.push_back(position);
+        return true;
+    }
+
+    PathTrack& track_;
+    std::size_t trackLength_;
+    BNode node_;
+    ComponentList::Iterator next_;
+    ComponentList::Iterator end_;
+    bool kept_ = false;
+};
+
+// New components, one below the other, made from the last to the first: what
+// is to be attached is always one child.
+class TreeInserter::Chain {
+public:
+    // Files go below the last component. There must be a component.
+    Chain(NodePool& pool, ComponentList::Iterator first,
+          ComponentList::Iterator end, const ChildBatch& files) {
+        std::vector<ComponentList::Iterator> components;
+        for (; first != end; ++first) components.push_back(first);
+        depth_ = components.size();
+        last_ = components.back().packedBytes();
+        if (files.count > 0) wrap(pool, *components.back(), files);
+        components.pop_back();
+        for (; !components.empty(); components.pop_back())
+            wrap(pool, *components.back(), top());
+    }
+
+    // The first component as a child to be attached; its share stays here
+    // until release().
+    ChildBatch top() noexcept {
+        if (!top_) return {last_, 1, false};
+        ChildBlock::writeFolder(entry_.data(), top_->folder());
+        return {entry_, 1, true};
+    }
+    void release() noexcept { top_.release(); }
+
+    // The node of the last component, after the first was attached at this
+    // position of a folder.
+    BNode last(FolderNode& parent, std::uint64_t position) const noexcept {
+        return bottom_ == nullptr ? BNode(parent, position)
+               : bottomIsLast_    ? BNode(*bottom_)
+                                  : BNode(*bottom_, 0);
+    }
+    std::size_t depth() const noexcept { return depth_; }
+
+private:
+    void wrap(NodePool& pool, ComponentView name, const ChildBatch& children) {
+        FolderNode* const made = pool.make(name, children);
+        if (bottom_ == nullptr) {
+            bottom_ = made;
+            bottomIsLast_ = children.entries.data() != last_.data();
+        }
+        top_.release();
+        top_ = BNodePtr::adopt(made);
+    }
+
+    std::size_t depth_ = 0;
+    ComponentView last_;  // as a packed file
+    BNodePtr top_;        // the folder made last
+    FolderNode* bottom_ = nullptr;
+    bool bottomIsLast_ = false;
+    std::array<std::uint8_t, ChildBlock::folderEntryBytes> entry_{};
+};
+
 BNodePtr TreeInserter::makeRoot() {
     index_.clear();
-    return BNodePtr::adopt(pool_.make({}, NodePool::Kind::folder));
+    return BNodePtr::adopt(pool_.make({}, {}));
 }
 
-bool TreeInserter::addPath(BNode& root, Components& components,
+// Takes over the shares of the children unless it throws.
+void TreeInserter::attach(BNode parent, const ChildBatch& children) {
+    if (FolderNode* const folder = parent.folder()) {
+        if (folder->children().count() > 0) hasGrown_ = true;
+        folder->append(children);
+        return;
+    }
+    parent.place_->reservePromotion(parent.position_);
+    FolderNode* const made = pool_.make(parent.value(), children);
+    parent.place_->promote(parent.position_, made);
+}
+
+void TreeInserter::add(BNode parent, ComponentView value) {
+    std::vector<std::uint8_t> entry(packed::headerBytes(value.size()));
+    packed::writeHeader(entry.data(), value.size());
+    entry.insert(entry.end(), value.begin(), value.end());
+    attach(parent, {entry, 1, false});
+}
+
+bool TreeInserter::addPath(BNode root, const ComponentList& components,
                            PathTrack& pathTrack) {
-    Insertion insertion(root, pool_, index_, pathTrack);
-    std::size_t stored = 0;
-    for (std::size_t i = 0; i < components.size(); ++i) {
-        const auto kind = i + 1 < components.size() ? NodePool::Kind::folder
-                                                    : NodePool::Kind::leaf;
-        const std::uint64_t position = insertion.enter(components[i], kind);
-        if (!insertion.existed()) continue;
-        pathTrack.push_back(position);
-        ++stored;
+    Descent descent(index_, root, components, pathTrack);
+    if (!descent.isAllStored()) {
+        Chain chain(pool_, descent.next(), components.end(), {});
+        attach(descent.node(), chain.top());
+        chain.release();
     }
-    insertion.commit();
-    for (std::size_t i = stored; i < components.size(); ++i)
-        releaseContents(components[i]);
-    return insertion.existed();
+    descent.keep();
+    return descent.isAllStored() && !components.empty();
 }
 
-template <class Folder, class Files>
-TreeInserter::AddedBatch TreeInserter::insertBatch(BNode& root,
-                                                   Folder& components,
-                                                   Files& fileNames,
-                                                   PathTrack& pathTrack) {
-    Insertion insertion(root, pool_, index_, pathTrack);
-    std::size_t stored = 0;
-    for (const ComponentView component : components) {
-        const std::uint64_t position =
-            insertion.enter(component, NodePool::Kind::folder);
-        pathTrack.push_back(position);
-        if (insertion.existed()) ++stored;
-    }
-    const std::uint64_t first = appendFiles(insertion.node(), fileNames);
-    insertion.commit();
-    if constexpr (std::is_same_v<Folder, Components>) {
-        for (std::size_t i = stored; i < components.size(); ++i)
-            releaseContents(components[i]);
-        for (Component& name : fileNames) releaseContents(name);
-    }
-    return {insertion.node(), insertion.existed(), first};
-}
-
-template <class Files>
-std::uint64_t TreeInserter::appendFiles(BNode& folder, const Files& fileNames) {
-    const std::size_t before = folder.children().size();
-    if (fileNames.empty()) return before;
-    NodePool::reserve(folder, fileNames.size());
-    try {
-        for (const ComponentView name : fileNames)
-            pool_.add(folder, name, NodePool::Kind::leaf);
-    } catch (...) {
-        NodePool::truncate(folder, before);
-        throw;
-    }
-    return before;
-}
-
-TreeInserter::AddedBatch TreeInserter::addBatch(BNode& root,
-                                                Components& folderComponents,
-                                                Components& fileNames,
+TreeInserter::AddedBatch TreeInserter::addBatch(BNode root,
+                                                const ComponentList& components,
+                                                const ComponentList& fileNames,
                                                 PathTrack& pathTrack) {
-    return insertBatch(root, folderComponents, fileNames, pathTrack);
+    Descent descent(index_, root, components, pathTrack);
+    const BNode found = descent.node();
+    if (descent.isAllStored()) {
+        const std::uint64_t first = addFiles(found, fileNames);
+        descent.keep();
+        return {found, !components.empty(), first, components.size()};
+    }
+    const std::size_t depth = components.size();
+    Chain chain(pool_, descent.next(), components.end(), batchOf(fileNames));
+    const std::uint64_t position = found.children().size();
+    attach(found, chain.top());
+    chain.release();
+    descent.keep();
+    pathTrack.push_back(position);  // there is room
+    for (std::size_t i = 1; i < chain.depth(); ++i) pathTrack.push_back(0);
+    return {chain.last(*found.folder(), position), false, 0,
+            depth - chain.depth()};
 }
 
-TreeInserter::AddedBatch TreeInserter::addBatch(
-    BNode& root, const ComponentList& folderComponents,
-    const ComponentList& fileNames, PathTrack& pathTrack) {
-    return insertBatch(root, folderComponents, fileNames, pathTrack);
-}
-
-std::uint64_t TreeInserter::addFiles(BNode& folder,
+std::uint64_t TreeInserter::addFiles(BNode folder,
                                      const ComponentList& fileNames) {
-    return appendFiles(folder, fileNames);
+    const std::uint64_t first = folder.children().size();
+    if (!fileNames.empty()) attach(folder, batchOf(fileNames));
+    return first;
 }
 
 void TreeInserter::releaseIndex(std::size_t maxChildren) noexcept {
     if (index_.indexedChildren() <= maxChildren) index_.clear();
+}
+
+void TreeInserter::trim(BNode root) {
+    if (!hasGrown_ || root.folder() == nullptr) return;
+    root.folder()->trim();
+    for (NodeWalk walk(root); walk.next();)
+        if (walk.node().folder != nullptr) walk.node().folder->trim();
+    hasGrown_ = false;
 }
 
 }  // namespace tessel

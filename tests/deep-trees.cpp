@@ -103,14 +103,14 @@ TEST(DeepTrees, WhatAHandleHoldsStaysWhenTheTreeIsReleased) {
         {
             BPathTree tree;
             addChain(tree, chainLength);
-            tessel::BNode* node = tree.root.get();
+            tessel::BNode node = *tree.root;
             for (std::size_t i = 0; i < chainLength / 2; ++i)
-                node = &node->children()[0];
+                node = node.children()[0];
             held = BNodePtr(node);
         }
         std::size_t below = 0;
-        for (const tessel::BNode* node = held.get(); !node->isLeaf();
-             node = &node->children()[0])
+        for (tessel::BNode node = *held; !node.isLeaf();
+             node = node.children()[0])
             ++below;
         EXPECT_EQ(below, chainLength - chainLength / 2);
     });

@@ -130,8 +130,8 @@ TEST(MemoryUsageParts, TheTotalIsTheirSum) {
     EXPECT_EQ(usage.total(), 7654321U);
 }
 
-// The children's arrays of a tree whose folder has so many files, at the end
-// of a chain of folders.
+// The blocks of children, beside their names, of a tree whose folder has so
+// many files, at the end of a chain of folders.
 std::size_t listBytes(std::size_t files) {
     tessel::BPathTree tree;
     tessel::Components folder = {{1}, {2}, {3}};
@@ -144,11 +144,14 @@ std::size_t listBytes(std::size_t files) {
     return tree.memoryUsage().childLists;
 }
 
-TEST(MemoryUsageParts, AnOnlyChildNeedsNoArray) {
-    EXPECT_EQ(listBytes(0), 0U);
-    EXPECT_EQ(listBytes(1), 0U);
-    EXPECT_GT(listBytes(2), 0U);
-    EXPECT_GE(listBytes(200), 200 * sizeof(void*));
+TEST(MemoryUsageParts, SmallFoldersNeedNoBlockOfTheirOwn) {
+    const std::size_t ofTheRoot = listBytes(0);
+    EXPECT_LE(ofTheRoot, 32U);
+    EXPECT_EQ(listBytes(1), ofTheRoot);
+    EXPECT_EQ(listBytes(59), ofTheRoot);
+    EXPECT_GT(listBytes(60), ofTheRoot);
+    EXPECT_GE(listBytes(200), ofTheRoot + 200);
+    EXPECT_LE(listBytes(200), ofTheRoot + 200 + 24 + 7 + 24);
 }
 
 TEST(MemoryUsageParts, AFreshCoderTakesLittle) {

@@ -13,6 +13,7 @@
 namespace {
 
 using tessel::BNode;
+using tessel::BNodePtr;
 using tessel::BPathTree;
 using tessel::Component;
 using tessel::ComponentArena;
@@ -28,7 +29,7 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
     BPathTree tree;
     tessel::FolderCache cache;
     ComponentArena packer;
-    std::map<Components, std::pair<BNode*, PathTrack>> expected;
+    std::map<Components, std::pair<BNodePtr, PathTrack>> expected;
     for (const Components& components : folders) {
         const auto list = support::packedBy(packer, components);
         const auto hash = tessel::FolderCache::hashOf(list);
@@ -37,16 +38,16 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
         RC_ASSERT((found != nullptr) == (known != expected.end()));
         if (found != nullptr) {
             const auto track = cache.trackOf(*found);
-            RC_ASSERT(found->node == known->second.first);
+            RC_ASSERT(found->node == *known->second.first);
             RC_ASSERT(PathTrack(track.begin(), track.end()) ==
                       known->second.second);
             continue;
         }
         PathTrack track;
-        BNode& node =
+        const BNode node =
             tree.inserter().addBatch(*tree.root, list, {}, track).folder;
         cache.add(list, hash, node, track);
-        expected[components] = {&node, track};
+        expected[components] = {BNodePtr(node), track};
     }
 }
 

@@ -405,11 +405,11 @@ TEST(HuffmanCode, CopyTreeToItselfKeepsTheCodeAndMakesAFreshPathTree) {
     const CoderPtr coder = coderWith(u"abcd", {1, 1, 1, 1});
     support::addBatch(*coder, {u"a"}, {u"b", u"c"});
     const tessel::BPathTree* before = coder->pathTree.get();
-    const tessel::BNode* root = coder->pathTree->root.get();
+    const tessel::BNodePtr root = coder->pathTree->root;
     const support::Bytes form = support::formOf(*coder, false);
     coder->copyTree(*coder);
     EXPECT_NE(coder->pathTree.get(), before);
-    EXPECT_EQ(coder->pathTree->root.get(), root);
+    EXPECT_TRUE(coder->pathTree->root == root);
     EXPECT_EQ(support::formOf(*coder, false), form);
     EXPECT_EQ(codeText(*coder, u'c'), "01");
     EXPECT_EQ(coder->partitionTracks.size(), 1U);

@@ -22,7 +22,7 @@ TEST(BNodePtr, AHeldNodeKeepsWhatIsBelowItAlive) {
     {
         BPathTree tree;
         addBatch(tree, {"a", "b"}, {"f", "g"});
-        held = BNodePtr(&tree.root->children()[0].children()[0]);
+        held = BNodePtr(tree.root->children()[0].children()[0]);
     }
     EXPECT_EQ(support::textOf(held->value()), "b");
     EXPECT_EQ(childTexts(*held), (Paths{"f", "g"}));
@@ -31,7 +31,7 @@ TEST(BNodePtr, AHeldNodeKeepsWhatIsBelowItAlive) {
 TEST(BNodePtr, HandlesAreSharedMovedAndEmptied) {
     BPathTree tree;
     addWhole(tree, {"a"});
-    BNodePtr first(&tree.root->children()[0]);
+    BNodePtr first(tree.root->children()[0]);
     BNodePtr second = first;
     EXPECT_TRUE(first == second);
     const BNodePtr moved = std::move(second);
@@ -39,9 +39,33 @@ TEST(BNodePtr, HandlesAreSharedMovedAndEmptied) {
     EXPECT_TRUE(moved == first);
     first = BNodePtr();
     EXPECT_FALSE(first);
-    EXPECT_EQ(first.get(), nullptr);
     EXPECT_EQ(support::textOf((*moved).value()), "a");
     EXPECT_TRUE(BNodePtr() == BNodePtr());
+}
+
+TEST(BNodePtr, AHeldFileKeepsItsFolderAlive) {
+    BNodePtr held;
+    {
+        BPathTree tree;
+        addBatch(tree, {"a"}, {"f", "g"});
+        held = BNodePtr(tree.root->children()[0].children()[1]);
+    }
+    EXPECT_EQ(support::textOf(held->value()), "g");
+    EXPECT_TRUE(held->isLeaf());
+}
+
+TEST(BNodePtr, AFileThatBecomesAFolderIsTheSameNode) {
+    BPathTree tree;
+    addBatch(tree, {"a"}, {"f", "g"});
+    const BNodePtr before(tree.root->children()[0].children()[1]);
+    const BNodePtr other(tree.root->children()[0].children()[0]);
+    addBatch(tree, {"a", "g"}, {"x"});
+    const BNodePtr after(tree.root->children()[0].children()[1]);
+    EXPECT_TRUE(before == after);
+    EXPECT_FALSE(before == other);
+    EXPECT_FALSE(after == other);
+    EXPECT_EQ(childTexts(*before), Paths{"x"});
+    EXPECT_EQ(support::textOf(before->value()), "g");
 }
 
 }  // namespace

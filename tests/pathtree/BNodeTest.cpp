@@ -1,97 +1,68 @@
-// One node: its value, its children and its release.
+// Nodes as they are seen from outside: folders, and files by their position.
 
 #include <gtest/gtest.h>
 
-#include "pathtree/BNode.hpp"
-#include "pathtree/NodePool.hpp"
+#include "pathtree/BPathTree.hpp"
 #include "tests/support/Trees.hpp"
 
 namespace {
 
+using support::addBatch;
+using support::childTexts;
+using support::textOf;
 using tessel::BNode;
-using tessel::BNodePtr;
-using tessel::Component;
-using tessel::NodePool;
-using Kind = NodePool::Kind;
+using tessel::BPathTree;
+using Texts = std::vector<std::string>;
 
-Component valueOf(std::size_t length) {
-    Component value(length);
-    for (std::size_t i = 0; i < length; ++i)
-        value[i] = static_cast<std::uint8_t>(i * 7 + length);
-    return value;
+TEST(BNode, ATreesNodesHaveValuesAndChildren) {
+    BPathTree tree;
+    EXPECT_TRUE(tree.root->isLeaf());
+    EXPECT_TRUE(tree.root->value().empty());
+    EXPECT_TRUE(tree.root->children().empty());
+    addBatch(tree, {"a"}, {"f", ""});
+    addBatch(tree, {"b"}, {});
+    EXPECT_EQ(childTexts(*tree.root), (Texts{"a", "b"}));
+    const BNode a = tree.root->children()[0];
+    EXPECT_EQ(childTexts(a), (Texts{"f", ""}));
+    EXPECT_FALSE(a.isLeaf());
+    EXPECT_NE(a.folder(), nullptr);
+    EXPECT_EQ(textOf(a.children().back().value()), "");
+    EXPECT_TRUE(a.children().node() == a);
+    const BNode b = tree.root->children()[1];
+    EXPECT_TRUE(b.isLeaf());
+    EXPECT_EQ(b.folder(), nullptr);
+    EXPECT_TRUE(b.children().empty());
+    EXPECT_TRUE(b.children().reader().atEnd());
 }
 
-// On both sides of each border: 62 and 63, 1024 and 1025.
-TEST(BNode, KeepsAValueOfAnyLength) {
-    NodePool pool;
-    std::vector<BNodePtr> nodes;
-    const std::size_t lengths[] = {0,    1,    61,   62,    63,    64,   255,
-                                   1023, 1024, 1025, 16000, 16384, 70000};
-    for (const Kind kind : {Kind::leaf, Kind::folder})
-        for (const std::size_t length : lengths)
-            nodes.push_back(BNodePtr::adopt(pool.make(valueOf(length), kind)));
-    for (std::size_t i = 0; i < nodes.size(); ++i) {
-        const Component expected = valueOf(lengths[i % std::size(lengths)]);
-        EXPECT_TRUE(tessel::sameComponent(nodes[i]->value(), expected)) << i;
-        EXPECT_TRUE(nodes[i]->isLeaf());
-        EXPECT_EQ(nodes[i]->childListBytes(), 0U);
+TEST(BNode, EqualityIsThatOfTheNodeNotOfTheValue) {
+    BPathTree tree;
+    addBatch(tree, {"a"}, {"f", "f"});
+    addBatch(tree, {"b"}, {"f", "f"});
+    const BNode a = tree.root->children()[0];
+    const BNode b = tree.root->children()[1];
+    EXPECT_TRUE(a == tree.root->children()[0]);
+    EXPECT_FALSE(a == b);
+    EXPECT_FALSE(a == *tree.root);
+    EXPECT_TRUE(a.children()[1] == a.children()[1]);
+    EXPECT_FALSE(a.children()[0] == a.children()[1]);
+    EXPECT_FALSE(a.children()[0] == b.children()[0]);
+    EXPECT_FALSE(a.children()[0] == a);
+}
+
+TEST(BNode, AFilesNodeFollowsItWhenItBecomesAFolder) {
+    BPathTree tree;
+    addBatch(tree, {}, {"f", "a name of more than eight bytes", ""});
+    for (std::size_t i = 0; i < 3; ++i) {
+        const BNode file = tree.root->children()[i];
+        const std::string name = textOf(file.value());
+        addBatch(tree, {name}, {"x", "y"});
+        EXPECT_EQ(textOf(file.value()), name);
+        EXPECT_EQ(childTexts(file), (Texts{"x", "y"}));
+        EXPECT_TRUE(file == tree.root->children()[i]);
     }
-}
-
-TEST(BNode, OnlyALongValueHasABlockOfItsOwn) {
-    NodePool pool;
-    const auto bytes = [&pool](std::size_t length) {
-        return BNodePtr::adopt(pool.make(valueOf(length), Kind::leaf))
-            ->ownValueBytes();
-    };
-    EXPECT_EQ(bytes(0), 0U);
-    EXPECT_EQ(bytes(63), 0U);
-    EXPECT_EQ(bytes(1024), 0U);
-    EXPECT_GE(bytes(1025), 1025U);
-    EXPECT_LE(bytes(1025), 1025U + 32);
-    EXPECT_GE(bytes(100000), 100000U);
-}
-
-// None, one in the node, several in an array: in order, however the node
-// was made, and with a value of any length before the children came.
-TEST(BNode, KeepsItsChildrenInEachOfTheThreeWays) {
-    for (const std::size_t length : {0U, 62U, 63U, 1025U})
-        for (const Kind kind : {Kind::leaf, Kind::folder}) {
-            NodePool pool;
-            const BNodePtr node =
-                BNodePtr::adopt(pool.make(valueOf(length), kind));
-            for (std::size_t i = 0; i < 20; ++i) {
-                const BNode& child = pool.add(*node, valueOf(i), Kind::leaf);
-                const tessel::ChildList children = node->children();
-                ASSERT_EQ(children.size(), i + 1);
-                EXPECT_EQ(&children.back(), &child);
-                EXPECT_EQ(&children.node(), node.get());
-                for (std::size_t k = 0; k <= i; ++k)
-                    ASSERT_EQ(children[k].value().size(), k);
-                EXPECT_EQ(node->childListBytes() > 0, i > 0);
-            }
-            EXPECT_TRUE(tessel::sameComponent(node->value(), valueOf(length)));
-        }
-}
-
-TEST(BNode, IsReleasedWithEveryKindOfChild) {
-    NodePool pool;
-    BNodePtr held;
-    {
-        const BNodePtr root = BNodePtr::adopt(pool.make({}, Kind::folder));
-        for (const Kind kind : {Kind::folder, Kind::leaf})
-            for (std::size_t children = 0; children < 4; ++children) {
-                BNode& node = pool.add(*root, valueOf(5000), kind);
-                for (std::size_t i = 0; i < children; ++i) {
-                    BNode& child = pool.add(node, valueOf(2000), kind);
-                    pool.add(child, valueOf(3), Kind::leaf);
-                }
-            }
-        held = BNodePtr(&root->children()[7]);
-    }
-    EXPECT_EQ(held->value().size(), 5000U);
-    ASSERT_EQ(held->children().size(), 3U);
-    EXPECT_EQ(held->children()[2].children()[0].value().size(), 3U);
+    EXPECT_EQ(childTexts(*tree.root),
+              (Texts{"f", "a name of more than eight bytes", ""}));
 }
 
 }  // namespace

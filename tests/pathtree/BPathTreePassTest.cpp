@@ -124,7 +124,7 @@ TEST(PathTreeIteration, ResetOnATreeThatBecameEmptyChangesNothing) {
     tree.reset();
     tessel::Components path;
     tree.getNextPath(path);
-    Bytes structure;
+    std::vector<std::uint8_t> structure;
     tessel::Components values;
     tree.deserialize(structure, values);
     tree.reset();
@@ -205,7 +205,7 @@ TEST(PathTreeIteration, BetweenCallsTheStacksAndThePrefixAgree) {
     addBatch(tree, {"a"}, {"h"});
     tree.reset();
     EXPECT_EQ(tree.parentNodes.size(), 1U);
-    EXPECT_EQ(&tree.parentNodes.top(), tree.root.get());
+    EXPECT_TRUE(tree.parentNodes.top() == *tree.root);
     EXPECT_TRUE(tree.currentPrefix.empty());
 
     EXPECT_EQ(next(tree), (Paths{"a", "b", "f"}));
@@ -280,8 +280,8 @@ TEST(PathTreeIteration, PushAllChildrenOfALeafPushesNothing) {
 TEST(PathTreeIteration, TheEndOfAParentIsAMatterOfIdentity) {
     BPathTree tree;
     addBatch(tree, {}, {"same", "same"});
-    const BNodePtr first(&tree.root->children()[0]);
-    const BNodePtr last(&tree.root->children()[1]);
+    const BNodePtr first(tree.root->children()[0]);
+    const BNodePtr last(tree.root->children()[1]);
     NodeStack stack;
     EXPECT_FALSE(tree.isNodeAtEndOfParent(last, stack));
     stack.push(tree.root);

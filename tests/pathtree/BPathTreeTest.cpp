@@ -433,8 +433,8 @@ TEST(PathTreeInsertion, ComponentsThatBecameNodesKeepNoMemory) {
 TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
     BPathTree tree;
     addWhole(tree, {"a", "b"});
-    const BNodePtr folder(&tree.root->children()[0]);
-    const BNodePtr file(&folder->children()[0]);
+    const BNodePtr folder(tree.root->children()[0]);
+    const BNodePtr file(folder->children()[0]);
     EXPECT_FALSE(tree.isLeaf(tree.root));
     EXPECT_FALSE(tree.isLeaf(folder));
     EXPECT_TRUE(tree.isLeaf(file));

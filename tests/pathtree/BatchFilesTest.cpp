@@ -23,7 +23,7 @@ TEST(BatchFiles, FilesOfAnOpenBatchAreAskedForOneByOne) {
     addBatch(tree, {"a"}, {"f"});
     addBatch(tree, {"a"}, {"g", "h"});
     const PathTrack track = {0, 1};
-    const BatchFiles files =
+    BatchFiles files =
         TrackLookup(*tree.root)
             .openBatch(track, [](tessel::ComponentView folder) {
                 EXPECT_EQ(textOf(folder), "a");
@@ -35,9 +35,9 @@ TEST(BatchFiles, FilesOfAnOpenBatchAreAskedForOneByOne) {
 
 TEST(BatchFiles, TheRootsFilesCountFromItsFirstChild) {
     BPathTree tree;
-    EXPECT_THROW(BatchFiles::ofRoot(*tree.root), std::out_of_range);
+    EXPECT_THROW(BatchFiles::ofRoot(*tree.root->folder()), std::out_of_range);
     addBatch(tree, {}, {"f", "g"});
-    const BatchFiles files = BatchFiles::ofRoot(*tree.root);
+    BatchFiles files = BatchFiles::ofRoot(*tree.root->folder());
     EXPECT_EQ(textOf(files[1]), "f");
     EXPECT_EQ(textOf(files[2]), "g");
     EXPECT_THROW(files[3], std::out_of_range);
@@ -48,9 +48,9 @@ TEST(BatchFiles, TheRootsFilesCountFromItsFirstChild) {
 TEST(BatchFiles, AChildIsFoundByItsPositionOrNotAtAll) {
     BPathTree tree;
     addBatch(tree, {}, {"f", "g"});
-    EXPECT_EQ(textOf(BatchFiles::childAt(*tree.root, 1).value()), "g");
-    EXPECT_THROW(BatchFiles::childAt(*tree.root, 2), std::out_of_range);
-    EXPECT_THROW(BatchFiles::childAt(*tree.root, ~std::uint64_t{0}),
+    EXPECT_EQ(textOf(BatchFiles::childAt(tree.root->folder(), 1).value()), "g");
+    EXPECT_THROW(BatchFiles::childAt(tree.root->folder(), 2), std::out_of_range);
+    EXPECT_THROW(BatchFiles::childAt(tree.root->folder(), ~std::uint64_t{0}),
                  std::out_of_range);
 }
 

@@ -25,13 +25,11 @@ Component nameOf(unsigned number, unsigned kinds) {
             static_cast<std::uint8_t>(kind >> 8)};
 }
 
-void compareIndex(ChildIndex& index, const BPathTree& tree, BNode& parent,
+void compareIndex(ChildIndex& index, const BPathTree& tree, BNode parent,
                   const Component& value) {
     const std::uint64_t expected = tree.findNode(value, parent.children());
-    const ChildIndex::Found found = index.find(parent, value);
-    RC_ASSERT(found.position == expected);
-    if (expected != BPathTree::allOnes)
-        RC_ASSERT(found.child == &parent.children()[found.position]);
+    if (tessel::FolderNode* const folder = parent.folder())
+        RC_ASSERT(index.find(*folder, value) == expected);
 }
 
 RC_GTEST_PROP(ChildIndex, FindsWhatASearchFromTheFrontFinds, ()) {
@@ -44,7 +42,7 @@ RC_GTEST_PROP(ChildIndex, FindsWhatASearchFromTheFrontFinds, ()) {
             rc::gen::pair(rc::gen::inRange(0U, 400U),
                           rc::gen::arbitrary<unsigned>()));
     for (const auto& [count, start] : rounds) {
-        BNode& parent = tree.root->children()[start % 3];
+        BNode parent = tree.root->children()[start % 3];
         Components files;
         for (unsigned i = 0; i < count; ++i)
             files.push_back(nameOf(start + i * 7, kinds));
@@ -107,12 +105,13 @@ TEST(ChildIndex, AroundTheWidthWhereTablesBegin) {
         for (unsigned i = 0; i < width; ++i) {
             support::addBatch(tree, {}, {support::numbered("n", i)});
             for (unsigned k = 0; k <= i; ++k) {
-                const auto found = index.find(
-                    *tree.root, support::component(support::numbered("n", k)));
-                EXPECT_EQ(found.position, k);
+                const auto name =
+                    support::component(support::numbered("n", k));
+                EXPECT_EQ(index.find(*tree.root->folder(), name), k);
             }
-            EXPECT_EQ(index.find(*tree.root, support::component("x")).child,
-                      nullptr);
+            EXPECT_EQ(
+                index.find(*tree.root->folder(), support::component("x")),
+                ChildIndex::notFound);
         }
     }
 }
@@ -127,11 +126,12 @@ TEST(ChildIndex, AFolderOfManyThousandsWithEqualNamesBetween) {
     PathTrack track;
     std::uint64_t first = 0;
     tree.addPath(folder, files, track, first);
-    BNode& parent = tree.root->children()[0];
+    tessel::FolderNode& parent = *tree.root->children()[0].folder();
     ChildIndex index;
     for (unsigned i = 0; i < kinds; ++i)
-        ASSERT_EQ(index.find(parent, nameOf(i, kinds)).position, i);
-    EXPECT_EQ(index.find(parent, nameOf(kinds, kinds + 1)).child, nullptr);
+        ASSERT_EQ(index.find(parent, nameOf(i, kinds)), i);
+    EXPECT_EQ(index.find(parent, nameOf(kinds, kinds + 1)),
+              ChildIndex::notFound);
     EXPECT_EQ(index.indexedChildren(), count);
     EXPECT_GT(index.memoryBytes(), 8 * count);
     index.clear();

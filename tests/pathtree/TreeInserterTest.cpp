@@ -33,7 +33,7 @@ TEST(TreeInserter, APackedBatchIsAddedLikeVectors) {
         tree.inserter().addBatch(*tree.root, folder, files, track);
     EXPECT_TRUE(found.existed);
     EXPECT_EQ(found.firstFile, 2U);
-    EXPECT_EQ(&found.folder, &made.folder);
+    EXPECT_TRUE(found.folder == made.folder);
     EXPECT_EQ(track, (PathTrack{0, 0, 0, 0}));
     EXPECT_EQ(tree.inserter().addFiles(made.folder, files), 4U);
     EXPECT_EQ(allPaths(tree),
@@ -48,7 +48,7 @@ TEST(TreeInserter, APackedFolderOfNoComponentsIsTheRoot) {
     for (const std::uint64_t first : {0U, 1U}) {
         const TreeInserter::AddedBatch added =
             tree.inserter().addBatch(*tree.root, {}, files, track);
-        EXPECT_EQ(&added.folder, tree.root.get());
+        EXPECT_TRUE(added.folder == *tree.root);
         EXPECT_FALSE(added.existed);
         EXPECT_EQ(added.firstFile, first);
         EXPECT_TRUE(track.empty());
