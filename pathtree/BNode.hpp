@@ -25,6 +25,13 @@ public:
             *this = BNode(*folder);
     }
 
+    // The file at a position of the folder; it must not be a folder so far.
+    static BNode fileAt(FolderNode& parent, std::uint64_t position) noexcept {
+        BNode file(parent);
+        file.position_ = static_cast<std::uint32_t>(position);
+        return file;
+    }
+
     // The component's encoded bytes. A file's are valid until its folder
     // changes.
     ComponentView value() const noexcept { return child().value(); }
@@ -35,6 +42,14 @@ public:
     bool isLeaf() const noexcept {
         const FolderNode* node = folder();
         return node == nullptr || node->children().count() == 0;
+    }
+
+    // Whether it is this folder's child at this position, which there must be.
+    bool isChildAt(const FolderNode& parent,
+                   std::uint64_t position) const noexcept {
+        const FolderNode* const own = folder();
+        if (own != nullptr) return parent.child(position).folder == own;
+        return place_ == &parent && position_ == position;
     }
 
     // Asks the processor for the folder's node, or for the file's folder.

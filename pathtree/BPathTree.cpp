@@ -127,8 +127,10 @@ void BPathTree::pushAllChildren(const BNodePtr& node) {
 bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node,
                                     const NodeStack& parents) const noexcept {
     if (parents.empty()) return false;
-    const ChildList siblings = parents.top().children();
-    return !siblings.empty() && siblings.back() == *node;
+    const FolderNode* const parent = parents.top().folder();
+    const std::uint64_t siblings =
+        parent == nullptr ? 0 : parent->children().count();
+    return siblings > 0 && node->isChildAt(*parent, siblings - 1);
 }
 
 bool BPathTree::isNodeAtEndOfParent(const BNodePtr& node) const noexcept {

@@ -19,13 +19,13 @@ std::size_t ChildBlock::sizeOfRare(const std::uint8_t* entry) noexcept {
 }
 
 std::uint64_t ChildBlock::offsetOf(std::uint64_t position) const noexcept {
-    if (position == count()) return usedBytes();
     const std::uint64_t j = position / childrenPerSample;
-    std::uint64_t offset = j == 0 ? 0 : sample(j);
+    const std::uint8_t* const first = entries();
+    const std::uint8_t* entry = first + (j == 0 ? 0 : sample(j));
     const bool isPadded = this->isPadded();
     for (std::uint64_t left = position % childrenPerSample; left > 0; --left)
-        offset += sizeOf(entries() + offset, isPadded);
-    return offset;
+        entry += sizeOf(entry, isPadded);
+    return static_cast<std::uint64_t>(entry - first);
 }
 
 // ---- Making blocks ----

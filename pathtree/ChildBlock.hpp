@@ -47,9 +47,9 @@ struct ChildBatch {
 //             | can become a folder in place
 //   folders   | there is a folder among the children
 //
-// Sample j is where the entry 16 * j begins, counted from the first entry;
+// Sample j is where the entry 8 * j begins, counted from the first entry;
 // samples are written from the end to the front, sample 0 is left out. So a
-// child is found by its position in at most 16 steps.
+// child is found by its position in at most 8 steps.
 //
 // Ownership: a view of the memory, which a FolderNode owns. Null is a folder
 //   without children.
@@ -69,7 +69,7 @@ public:
         return memory_ == nullptr ? nullptr : memory_ + headerBytes(isLarge());
     }
     // Where the entry of a child begins, counted from the first entry. The
-    // position must be at most count().
+    // position must be below count().
     std::uint64_t offsetOf(std::uint64_t position) const noexcept;
 
     // ---- One entry ----
@@ -154,7 +154,7 @@ private:
     static constexpr std::uint8_t folders = 4;
 
     static constexpr std::uint64_t maxSmall = 0xFFFF;
-    static constexpr std::uint64_t childrenPerSample = 16;
+    static constexpr std::uint64_t childrenPerSample = 8;
 
     // What a block is for: its size follows.
     struct Plan {
@@ -239,7 +239,9 @@ class ChildReader {
 public:
     // Begins at a position, which must be at most block.count().
     explicit ChildReader(ChildBlock block, std::uint64_t position = 0) noexcept
-        : at_(block.entries() + block.offsetOf(position)),
+        : at_(block.entries() + (position < block.count()
+                                     ? block.offsetOf(position)
+                                     : block.usedBytes())),
           left_(block.count() - position),
           isPadded_(block.isPadded()) {}
 

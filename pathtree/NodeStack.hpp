@@ -33,7 +33,7 @@ public:
         const Child child = topChild();
         return child.folder != nullptr
                    ? BNode(*child.folder)
-                   : BNode(*range.node->folder(), range.next);
+                   : BNode::fileAt(*range.node->folder(), range.next);
     }
     // What it is, without a search for its position.
     Child topChild() const noexcept;

@@ -54,7 +54,7 @@ void compare(const FolderNode& folder, const std::vector<PlainChild>& plain) {
         RC_ASSERT(sameChild(folder.child(i), plain[i]));
     }
     RC_ASSERT(reader.atEnd());
-    RC_ASSERT(block.offsetOf(plain.size()) == block.usedBytes());
+    RC_ASSERT(ChildReader(block, plain.size()).atEnd());
 }
 
 // A folder and its plain twin, changed by the same steps.

@@ -86,7 +86,7 @@ TEST(FolderNode, FirstChildrenAreExactAndLaterOnesHaveAnEighthMore) {
         filesOf(arena, Components(1000, component("123456789")));
     const BNodePtr node = BNodePtr::adopt(pool.make({}, thousand));
     FolderNode& folder = *node->folder();
-    const std::size_t exact = 7 + 1000 * 10 + 62 * 2;
+    const std::size_t exact = 7 + 1000 * 10 + 124 * 2;
     EXPECT_GE(folder.ownChildBytes(), exact);
     EXPECT_LE(folder.ownChildBytes(), exact + 32);
     folder.append(filesOf(arena, components({"x"})));

@@ -68,8 +68,8 @@ TEST(TreeBuilder, ListsOfChildrenAreMadeAtTheirSize) {
     codes.push_back(0);
     TreeBuilder builder(tree, codes);
     while (!builder.complete()) builder.add(component("n"));
-    // A length a file, a sample every 16 files, and the header.
-    const std::size_t exact = files + files / 16 * 2 + 7;
+    // A length a file, a sample every 8 files, and the header.
+    const std::size_t exact = files + files / 8 * 2 + 7;
     EXPECT_GE(tree.memoryUsage().childLists, exact);
     EXPECT_LE(tree.memoryUsage().childLists, exact + 64);  // and the root's
 }
