@@ -64,7 +64,7 @@ void BatchInserter::insert(const std::vector<ComponentList>& folders,
 void BatchInserter::insertFolder(const ComponentList& components,
                                  const ComponentList& fileNames,
                                  std::uint32_t hash) {
-    numbering_.reserveForPartition(components.size());
+    numbering_.reserveForPartition(components.size(), fileNames.size());
     track_.clear();
     track_.reserve(components.size() + 1);
     if (const FolderCache::Folder* cached = cache_.find(components, hash)) {

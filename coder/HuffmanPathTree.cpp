@@ -238,7 +238,7 @@ void HuffmanPathTree::insertBatch(Batch& batch) QZTESSEL_NO_THREAD_SAFETY {
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,
                                      Components& fileNames) {
     const std::size_t fileCount = fileNames.size();
-    numbering_->reserveForPartition(folderComponents.size());
+    numbering_->reserveForPartition(folderComponents.size(), fileCount);
     PathTrack track;
     track.reserve(folderComponents.size() + 1);
     std::uint64_t first = 0;

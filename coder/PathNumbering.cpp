@@ -1,15 +1,29 @@
 #include "coder/PathNumbering.hpp"
 
 #include <algorithm>
+#include <limits>
 #include <utility>
 
 #include "pathtree/containers.hpp"
 
 namespace tessel {
 
-void PathNumbering::reserveForPartition(std::size_t trackLength) {
+void PathNumbering::reserveForPartition(std::size_t trackLength,
+                                        std::size_t fileCount) {
     reserveGently(partitionEnds, 1);
     partitionTracks.reserveFor(trackLength + 1);
+    const std::uint64_t starts = ((pathCount + fileCount) >> shift_) + 1;
+    if (starts > starts_.size())
+        reserveGently(starts_,
+                      static_cast<std::size_t>(starts) - starts_.size());
+}
+
+// Brings the table up to the last partition. There is room.
+void PathNumbering::noteStarts() noexcept {
+    const std::size_t last = partitionEnds.size() - 1;
+    if (last > std::numeric_limits<std::uint32_t>::max()) return;
+    while (starts_.size() <= partitionEnds.back() >> shift_)
+        starts_.push_back(static_cast<std::uint32_t>(last));
 }
 
 void PathNumbering::notePartition(PathTrack& track, bool existed,
@@ -25,6 +39,7 @@ void PathNumbering::notePartition(PathTrack& track, bool existed,
                   (partitionEnds.empty() || partitionEnds.back() <= pathCount);
     partitionEnds.push_back(pathCount);
     partitionTracks.push_back(track);
+    noteStarts();
 }
 
 void PathNumbering::noteWholePath(PathTrack& track, bool existed) {
@@ -48,6 +63,15 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
     if (!endsAscend_)
         return static_cast<std::size_t>(
             std::find_if(at(k), partitionEnds.end(), holds) - begin);
+    if (!starts_.empty()) {
+        const std::size_t start =
+            starts_[std::min<std::uint64_t>(number >> shift_,
+                                            starts_.size() - 1)];
+        // Not if the ends were changed by hand.
+        if (start > k && start <= partitionEnds.size() &&
+            !holds(*at(start - 1)))
+            k = start;
+    }
     std::size_t stride = 1;
     while (stride < partitionEnds.size() - k && !holds(*at(k + stride - 1))) {
         k += stride;
@@ -60,11 +84,25 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
 
 void PathNumbering::checkEnds() {
     endsAscend_ = std::is_sorted(partitionEnds.begin(), partitionEnds.end());
+    starts_.clear();
+    shift_ = usualShift;
+    if (!endsAscend_ || partitionEnds.empty()) return;
+    // Not more entries than a form of that many bytes may ask for.
+    const std::uint64_t last = partitionEnds.back();
+    const std::uint64_t most = partitionEnds.size() + 1;
+    while (last >> shift_ >= most) ++shift_;
+    starts_.reserve(static_cast<std::size_t>((last >> shift_) + 1));
+    for (std::size_t k = 0; k < partitionEnds.size() &&
+                            k <= std::numeric_limits<std::uint32_t>::max();
+         ++k)
+        while (starts_.size() <= partitionEnds[k] >> shift_)
+            starts_.push_back(static_cast<std::uint32_t>(k));
 }
 
 std::size_t PathNumbering::partitionBytes() const noexcept {
     return partitionTracks.memoryBytes() +
-           partitionEnds.capacity() * sizeof(std::uint64_t);
+           partitionEnds.capacity() * sizeof(std::uint64_t) +
+           starts_.capacity() * sizeof(std::uint32_t);
 }
 
 // A node of the map has a color and three links, and the allocator adds a

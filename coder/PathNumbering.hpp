@@ -17,8 +17,8 @@ namespace tessel {
 // Invariants: partitionEnds and partitionTracks have one entry per partition
 //   (a loaded form may hold tracks without ends).
 // Ownership: a value; copies are independent.
-// Cost: 8 bytes and the folder's depth per partition; about 90 bytes per
-//   repeated whole path.
+// Cost: 8 bytes and the folder's depth per partition; a byte for 16 numbers;
+//   about 90 bytes per repeated whole path.
 class PathNumbering {
 public:
     // True when the path of this number repeats one that was stored before.
@@ -26,10 +26,10 @@ public:
         return !duplicates.empty() && duplicates.contains(pathNumber);
     }
 
-    // Makes sure that the next notePartition with a track of at most
-    // trackLength + 1 positions does not throw, so that tree and numbering
-    // never disagree.
-    void reserveForPartition(std::size_t trackLength);
+    // Makes sure that the next notePartition with so many files and a track of
+    // at most trackLength + 1 positions does not throw, so that tree and
+    // numbering never disagree.
+    void reserveForPartition(std::size_t trackLength, std::size_t fileCount);
 
     // Counts fileCount paths as one partition. Its track is the folder's,
     // which must have room for one more position; if the folder existed,
@@ -42,9 +42,9 @@ public:
     void noteWholePath(PathTrack& track, bool existed);
 
     // The first partition from k on whose end is not below the number; the
-    // number of partitions if there is none. Cost: galloping search, so that
-    // a neighbour is near and a far partition takes few steps; linear if the
-    // ends do not ascend, which only a loaded form can bring about.
+    // number of partitions if there is none. Cost: a look at a table, then a
+    // galloping search nearby; linear if the ends do not ascend, which only a
+    // loaded form can bring about.
     std::size_t partitionAtOrAfter(std::size_t k, std::uint64_t number) const;
 
     // Looks anew whether the ends ascend, after they were changed by hand.
@@ -70,7 +70,17 @@ public:
     std::uint64_t pathCount = 0;
 
 private:
+    // One entry of the table for so many numbers, as a power of two; more in a
+    // loaded form that has few partitions for its numbers.
+    static constexpr unsigned usualShift = 6;
+
+    void noteStarts() noexcept;
+
     bool endsAscend_ = true;  // partitionEnds can be searched by halves
+    // Entry j is the first partition whose end is not below j << shift_: a
+    // search for a number begins there.
+    std::vector<std::uint32_t> starts_;
+    unsigned shift_ = usualShift;
 };
 
 }  // namespace tessel

@@ -176,9 +176,12 @@ ComponentView BPathTree::enterFolders() {
 
 // Takes the file on top off, and the folders that end with it.
 void BPathTree::leavePath() noexcept {
-    const BNodePtr leaf(pendingNodes.top());
+    const FolderNode* const parent =
+        parentNodes.empty() ? nullptr : parentNodes.top().folder();
+    const bool isLast =
+        parent != nullptr && pendingNodes.isTopLastFileOf(*parent);
     pendingNodes.pop();
-    if (isNodeAtEndOfParent(leaf)) closeFinishedFolders();
+    if (isLast) closeFinishedFolders();
     unchangedFolders_ = currentPrefix.size();
 }
 

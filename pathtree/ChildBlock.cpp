@@ -19,6 +19,7 @@ std::size_t ChildBlock::sizeOfRare(const std::uint8_t* entry) noexcept {
 }
 
 std::uint64_t ChildBlock::offsetOf(std::uint64_t position) const noexcept {
+    if (!hasFiles()) return position * folderEntryBytes;
     const std::uint64_t j = position / childrenPerSample;
     const std::uint8_t* const first = entries();
     const std::uint8_t* entry = first + (j == 0 ? 0 : sample(j));
@@ -87,7 +88,7 @@ std::uint8_t* ChildBlock::grownCopy(std::uint64_t moreChildren,
     ChildBlock block = allocate(planToGrow(moreChildren, moreBytes));
     const std::uint64_t used = usedBytes();
     if (used > 0) std::memcpy(block.entries(), entries(), used);
-    block.setAppended(used, count(), hasFolders());
+    block.setAppended(used, all());
     return block.memory_;
 }
 
@@ -127,9 +128,8 @@ void ChildBlock::setCapacity(std::uint64_t bytes) noexcept {
 }
 
 std::uint8_t* ChildBlock::paddedCopy() const {
-    const ChildBatch all{{entries(), usedBytes()}, count(), hasFolders()};
-    ChildBlock block = allocate(Plan(count(), paddedBytes(all), 0, padded));
-    block.append(all);
+    ChildBlock block = allocate(Plan(count(), paddedBytes(all()), 0, padded));
+    block.append(all());
     return block.memory_;
 }
 
@@ -180,18 +180,19 @@ void ChildBlock::append(const ChildBatch& batch) noexcept {
             from += size;
         }
     }
-    setAppended(bytes, batch.count, batch.hasFolders);
+    setAppended(bytes, batch);
 }
 
-// Counts entries that were written after the last one.
-void ChildBlock::setAppended(std::uint64_t bytes, std::uint64_t children,
-                             bool withFolders) noexcept {
+// Counts the batch, whose entries were written after the last one.
+void ChildBlock::setAppended(std::uint64_t bytes,
+                             const ChildBatch& batch) noexcept {
     std::uint64_t position = count();
     std::uint64_t offset = usedBytes();
-    const std::uint64_t end = position + children;
+    const std::uint64_t end = position + batch.count;
     setNumber(0, end);
     setNumber(1, offset + bytes);
-    if (withFolders) *memory_ |= folders;
+    if (batch.hasFolders) *memory_ |= folders;
+    if (batch.hasFiles) *memory_ |= files;
     const bool isPadded = this->isPadded();
     const std::uint8_t* const first = entries();
     const std::uint64_t lastSampled =

@@ -26,6 +26,7 @@ struct ChildBatch {
     ComponentView entries;
     std::uint64_t count = 0;
     bool hasFolders = false;
+    bool hasFiles = true;
 };
 
 // ChildBlock is a folder's children in one buffer, in the order of insertion.
@@ -46,6 +47,8 @@ struct ChildBatch {
 //   padded    | entries have at least 9 bytes, so that a file of any length
 //             | can become a folder in place
 //   folders   | there is a folder among the children
+//   files     | there is, or was, a file among them: else all entries have the
+//             | same size, and positions need no samples
 //
 // Sample j is where the entry 8 * j begins, counted from the first entry;
 // samples are written from the end to the front, sample 0 is left out. So a
@@ -65,6 +68,7 @@ public:
     std::uint64_t usedBytes() const noexcept { return number(1); }
     bool isPadded() const noexcept { return hasFlag(padded); }
     bool hasFolders() const noexcept { return hasFlag(folders); }
+    bool hasFiles() const noexcept { return hasFlag(files); }
     std::uint8_t* entries() const noexcept {
         return memory_ == nullptr ? nullptr : memory_ + headerBytes(isLarge());
     }
@@ -152,6 +156,7 @@ private:
     static constexpr std::uint8_t large = 1;
     static constexpr std::uint8_t padded = 2;
     static constexpr std::uint8_t folders = 4;
+    static constexpr std::uint8_t files = 8;
 
     static constexpr std::uint64_t maxSmall = 0xFFFF;
     static constexpr std::uint64_t childrenPerSample = 8;
@@ -226,8 +231,13 @@ private:
                     std::uint64_t moreBytes) const noexcept;
     void setCapacity(std::uint64_t bytes) noexcept;
     static std::uint64_t paddedBytes(const ChildBatch& batch) noexcept;
-    void setAppended(std::uint64_t bytes, std::uint64_t children,
-                     bool withFolders) noexcept;
+    void setAppended(std::uint64_t bytes, const ChildBatch& batch) noexcept;
+    ChildBatch all() const noexcept {
+        return {{entries(), static_cast<std::size_t>(usedBytes())},
+                count(),
+                hasFolders(),
+                hasFiles()};
+    }
 
     std::uint8_t* memory_;
 };

@@ -4,23 +4,12 @@
 
 namespace tessel {
 
-// The entry of the child on top. Its offset is looked up anew if the children
-// were laid out anew since, which happens once at most.
-const std::uint8_t* NodeStack::topEntry() const noexcept {
+bool NodeStack::isTopLastFileOf(const FolderNode& parent) const noexcept {
     const Range& range = ranges_.back();
-    const ChildBlock block = range.node->folder()->children();
-    const std::uint64_t offset = block.isPadded() == range.isPadded
-                                     ? range.offset
-                                     : block.offsetOf(range.next);
-    return block.entries() + offset;
-}
-
-Child NodeStack::topChild() const noexcept {
-    const Range& range = ranges_.back();
-    if (!range.isNode) return ChildBlock::read(topEntry());
-    FolderNode* const folder = range.node->folder();
-    return folder != nullptr ? Child{{}, folder}
-                             : Child{range.node->value(), nullptr};
+    const std::uint64_t children = parent.children().count();
+    if (children == 0) return false;
+    if (range.isNode) return range.node->isChildAt(parent, children - 1);
+    return range.node->folder() == &parent && range.next == children - 1;
 }
 
 void NodeStack::pushChildren(const BNodePtr& node) {

@@ -36,7 +36,15 @@ public:
                    : BNode::fileAt(*range.node->folder(), range.next);
     }
     // What it is, without a search for its position.
-    Child topChild() const noexcept;
+    Child topChild() const noexcept {
+        const Range& range = ranges_.back();
+        if (!range.isNode) return ChildBlock::read(topEntry());
+        FolderNode* const folder = range.node->folder();
+        return folder != nullptr ? Child{{}, folder}
+                                 : Child{range.node->value(), nullptr};
+    }
+    // Whether the file on top is the last child of this folder.
+    bool isTopLastFileOf(const FolderNode& parent) const noexcept;
 
     void push(const BNodePtr& node) {
         ranges_.push_back({node, 0, 0, 1, true, false});
@@ -73,8 +81,16 @@ private:
         bool isPadded;  // the layout of the block that the offset is for
     };
 
-    // Where the offset of the top is right, whatever was inserted since.
-    const std::uint8_t* topEntry() const noexcept;
+    // The entry of the child on top. Its offset is looked up anew if the
+    // children were laid out anew since, which happens once at most.
+    const std::uint8_t* topEntry() const noexcept {
+        const Range& range = ranges_.back();
+        const ChildBlock block = range.node->folder()->children();
+        const std::uint64_t offset = block.isPadded() == range.isPadded
+                                         ? range.offset
+                                         : block.offsetOf(range.next);
+        return block.entries() + offset;
+    }
     void grow(std::size_t more);
 
     std::vector<Range> ranges_;

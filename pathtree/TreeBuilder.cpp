@@ -37,12 +37,17 @@ void TreeBuilder::add(ComponentView value) {
     const std::uint8_t code = codes_[nextCode_++];
     const std::size_t at = entries_.size();
     push(value);
-    if (code > nodecode::maxCode) throw UnknownNodeTypeException();
-    open_.back().hasLastChild = (code & nodecode::siblingFollows) == 0;
+    OpenFolder& parent = open_.back();
+    if (code > nodecode::maxCode) {
+        parent.hasFiles = true;
+        throw UnknownNodeTypeException();
+    }
+    parent.hasLastChild = (code & nodecode::siblingFollows) == 0;
     if ((code & nodecode::hasChildren) != 0) {
         open_.push_back({at});
         return;
     }
+    parent.hasFiles = true;
     ++leafCount_;
     while (!open_.empty() && open_.back().hasLastChild) close();
 }
@@ -68,15 +73,15 @@ void TreeBuilder::close() {
     const ComponentView value = packed::readComponent(name);
     const ChildBatch children{
         {value.data() + value.size(), entries_.data() + entries_.size()},
-        folder.count,
-        folder.hasFolders};
-    const bool isRoot = open_.size() == 1;
-    if (isRoot) {
+        folder.count, folder.hasFolders, folder.hasFiles};
+    if (open_.size() == 1) {
         if (folder.count > 0) root_.folder()->append(children);
         entries_.clear();
-    } else if (folder.count > 0) {
-        replaceByNode(folder.nameAt, children);
-        open_[open_.size() - 2].hasFolders = true;
+    } else {
+        OpenFolder& parent = open_[open_.size() - 2];
+        if (folder.count > 0) replaceByNode(folder.nameAt, children);
+        parent.hasFolders |= folder.count > 0;
+        parent.hasFiles |= folder.count == 0;
     }
     open_.pop_back();
 }

@@ -50,6 +50,7 @@ private:
         std::size_t nameAt;  // its own entry on the stack, as a file's
         std::uint32_t count = 0;
         bool hasFolders = false;
+        bool hasFiles = false;
         bool hasLastChild = false;
     };
 

@@ -11,7 +11,7 @@ namespace tessel {
 namespace {
 
 ChildBatch batchOf(const ComponentList& files) noexcept {
-    return {files.bytes(), files.size(), false};
+    return {files.bytes(), files.size()};
 }
 
 }  // namespace
@@ -87,9 +87,9 @@ public:
     // The first component as a child to be attached; its share stays here
     // until release().
     ChildBatch top() noexcept {
-        if (!top_) return {last_, 1, false};
+        if (!top_) return {last_, 1};
         ChildBlock::writeFolder(entry_.data(), top_->folder());
-        return {entry_, 1, true};
+        return {entry_, 1, true, false};
     }
     void release() noexcept { top_.release(); }
 
@@ -142,7 +142,7 @@ void TreeInserter::add(BNode parent, ComponentView value) {
     std::vector<std::uint8_t> entry(packed::headerBytes(value.size()));
     packed::writeHeader(entry.data(), value.size());
     entry.insert(entry.end(), value.begin(), value.end());
-    attach(parent, {entry, 1, false});
+    attach(parent, {entry, 1});
 }
 
 bool TreeInserter::addPath(BNode root, const ComponentList& components,

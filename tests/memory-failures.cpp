@@ -507,7 +507,7 @@ TEST(MemoryFailures, NotingAPartitionTakesNoMemory) {
     for (std::uint64_t i = 0; i < 200; ++i) {
         tessel::PathTrack track = {~std::uint64_t{0}, i};
         track.reserve(3);
-        numbering.reserveForPartition(2);
+        numbering.reserveForPartition(2, 1000);
         const AllocationFailure none(0);
         numbering.notePartition(track, i % 2 == 0, ~std::uint64_t{0}, 1);
         EXPECT_FALSE(none.happened());

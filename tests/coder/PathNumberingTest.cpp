@@ -12,7 +12,7 @@ using Ends = std::vector<std::uint64_t>;
 
 void note(PathNumbering& numbering, std::size_t files) {
     PathTrack track = {1};
-    numbering.reserveForPartition(track.size());
+    numbering.reserveForPartition(track.size(), 0);
     numbering.notePartition(track, false, 0, files);
 }
 
@@ -36,7 +36,7 @@ TEST(PathNumbering, PartitionsEndAtThePathsCountedSoFar) {
     note(numbering, 3);
     note(numbering, 0);
     PathTrack track = {4, 5};
-    numbering.reserveForPartition(2);
+    numbering.reserveForPartition(2, 0);
     numbering.notePartition(track, true, 9, 2);
     EXPECT_EQ(numbering.partitionEnds, (Ends{3, 3, 5}));
     EXPECT_EQ(numbering.pathCount, 5U);

@@ -74,7 +74,7 @@ public:
         FolderNode* const made = makeFolder(plain_.back());
         std::array<std::uint8_t, ChildBlock::folderEntryBytes> entry{};
         ChildBlock::writeFolder(entry.data(), made);
-        node_->folder()->append({entry, 1, true});
+        node_->folder()->append({entry, 1, true, seed % 3 == 0});
     }
     void promote(unsigned seed) {
         if (plain_.empty()) return;

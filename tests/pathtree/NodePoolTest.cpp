@@ -39,8 +39,9 @@ TEST(NodePool, ANodeTakesItsNameItsChildrenAndAFewBytes) {
     EXPECT_EQ(distance(50000, 0), 32U);
     EXPECT_EQ(distance(3, 1), 24U);   // 5 + 3, a header of 7, an entry of 6
     EXPECT_EQ(distance(3, 2), 28U);
-    EXPECT_EQ(distance(3, 30), 200U);  // a sample of 2, too
-    EXPECT_EQ(distance(3, 31), 16U);   // more than fits: on the heap
+    EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
+    EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
+    EXPECT_EQ(distance(3, 30), 16U);   // more than fits: on the heap
 }
 
 TEST(NodePool, SlabsGrowWithWhatWasMade) {
