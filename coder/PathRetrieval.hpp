@@ -41,7 +41,7 @@ public:
     //   visitor.folder(ComponentView);  // each component, the root first
     //   visitor.file(ComponentView);    // each file, in the order of numbers
     //
-    // The views are valid as long as the coder has the paths. The visit ends
+    // The views are valid until paths are added or a pass begins. The visit ends
     // at the first number that is above the last partition's end. Pass
     // numbers in ascending order: a number smaller than its predecessor is
     // looked up in the predecessor's partition and may return another file

@@ -49,9 +49,9 @@ public:
 //   be used again.
 // Ownership: owns all that it keeps; nothing that was passed in is referred
 //   to afterwards.
-// Threads: any number of threads may read one store at the same time, except
-//   by forEachInTreeOrder. append and assignment need it for themselves.
-// Cost: about 40 bytes per path of 72 bytes on real lists; bench/README.md
+// Threads: any number of threads may read one store at the same time.
+//   forEachInTreeOrder, append and assignment need it for themselves.
+// Cost: about 27 bytes per path of 72 bytes on real lists; bench/README.md
 //   has the figures. Reading neighbours together is several times as fast as
 //   reading one path after the other in random order.
 class PathStore {
@@ -118,8 +118,9 @@ public:
     std::default_sentinel_t end() const noexcept { return {}; }
 
     // Calls visit with every path, a folder's files together, wherever they
-    // were added. The view lives until visit returns. Not for several threads
-    // at a time, nor for a call from inside visit.
+    // were added. The view lives until visit returns. Not for a call from
+    // inside visit. Begins by giving back memory that appending left unused,
+    // so no other thread may read the store meanwhile.
     // Cost: per path less than any other way, and independent of the order of
     // addition.
     void forEachInTreeOrder(FunctionView<void(std::string_view)> visit) const;

@@ -91,7 +91,8 @@ public:
     // in the order of insertion. Do not insert during a pass.
 
     // Starts a new pass. On a tree without paths it does nothing.
-    // Releases the memory that speeds up insertion.
+    // Releases the memory that speeds up insertion, and what the growth of
+    // folders left unused: a walk over the tree if there was any.
     void reset();
 
     // True while the pass has a path left; false before the first reset.

@@ -6,7 +6,8 @@
 
 namespace tessel {
 
-// The files of one batch, found by its track. Valid as long as the tree.
+// The files of one batch, found by its track. Valid until paths are
+// added or a pass begins.
 //
 // Cost: a file after the one that was asked for before is found by a few
 //   steps from there, any other by its position.

@@ -12,8 +12,8 @@ namespace tessel {
 // Follows tracks through a path tree. Positions that lead outside the tree
 // throw std::out_of_range; components may have been visited by then.
 //
-// Ownership: borrows the root. The views that it hands out are valid as long
-//   as the tree.
+// Ownership: borrows the root. The views that it hands out are valid until
+//   paths are added or a pass begins.
 // Threads: any number of readers.
 class TrackLookup {
 public:
