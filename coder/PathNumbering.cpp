@@ -63,10 +63,10 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
     if (!endsAscend_)
         return static_cast<std::size_t>(
             std::find_if(at(k), partitionEnds.end(), holds) - begin);
+    if (k < partitionEnds.size() && holds(*at(k))) return k;
     if (!starts_.empty()) {
-        const std::size_t start =
-            starts_[std::min<std::uint64_t>(number >> shift_,
-                                            starts_.size() - 1)];
+        const std::size_t start = starts_[std::min<std::uint64_t>(
+            number >> shift_, starts_.size() - 1)];
         // Not if the ends were changed by hand.
         if (start > k && start <= partitionEnds.size() &&
             !holds(*at(start - 1)))

@@ -41,8 +41,8 @@ public:
     //   visitor.folder(ComponentView);  // each component, the root first
     //   visitor.file(ComponentView);    // each file, in the order of numbers
     //
-    // The views are valid until paths are added or a pass begins. The visit ends
-    // at the first number that is above the last partition's end. Pass
+    // The views are valid until paths are added or a pass begins. The visit
+    // ends at the first number that is above the last partition's end. Pass
     // numbers in ascending order: a number smaller than its predecessor is
     // looked up in the predecessor's partition and may return another file
     // of that folder.

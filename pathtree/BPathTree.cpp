@@ -91,8 +91,8 @@ std::uint64_t BPathTree::addIfExistsAndFind(const ChildList& nodes,
 bool BPathTree::addPath(Components& components, PathTrack& pathTrack) {
     ComponentArena arena;
     const std::size_t before = pathTrack.size();
-    const bool existed = inserter_->addPath(*root, packedBy(arena, components),
-                                            pathTrack);
+    const bool existed =
+        inserter_->addPath(*root, packedBy(arena, components), pathTrack);
     releaseFrom(components, pathTrack.size() - before);
     return existed;
 }

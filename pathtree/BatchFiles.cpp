@@ -17,16 +17,9 @@ Child BatchFiles::childAt(const FolderNode* node, std::uint64_t position) {
 }
 
 void BatchFiles::seek(std::uint64_t position) {
-    constexpr std::uint64_t maxSteps = 8;
-    if (position >= block_.count())
+    if (position >= count_)
         throw std::out_of_range("A position leads outside the path tree.");
-    if (position < position_ || position - position_ > maxSteps) {
-        entryOffset_ = block_.offsetOf(position);
-    } else {
-        for (; position_ < position; ++position_)
-            entryOffset_ += ChildBlock::sizeOf(block_.entries() + entryOffset_,
-                                               block_.isPadded());
-    }
+    entry_ = block_.entries() + block_.offsetOf(position);
     position_ = position;
 }
 

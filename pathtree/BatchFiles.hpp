@@ -9,13 +9,17 @@ namespace tessel {
 // The files of one batch, found by its track. Valid until paths are
 // added or a pass begins.
 //
-// Cost: a file after the one that was asked for before is found by a few
-//   steps from there, any other by its position.
+// Cost: the file after the one that was asked for before is found by one step
+//   from there, any other by its position.
 class BatchFiles {
 public:
     // The files of the folder from position `first` on.
     BatchFiles(const FolderNode& folder, std::uint64_t first) noexcept
-        : block_(folder.children()), first_(first) {}
+        : block_(folder.children()),
+          first_(first),
+          count_(block_.count()),
+          isPadded_(block_.isPadded()),
+          entry_(block_.entries()) {}
 
     // The files under the root itself. Throws std::out_of_range if the tree
     // has no paths.
@@ -24,8 +28,14 @@ public:
     // The name of the file at this offset, 1-based within the batch. Throws
     // std::out_of_range for a position outside the folder.
     ComponentView operator[](std::uint64_t offset) {
-        seek(first_ - 1 + offset);
-        return ChildBlock::read(block_.entries() + entryOffset_).value();
+        const std::uint64_t position = first_ - 1 + offset;
+        if (position == position_ + 1 && position < count_) {
+            entry_ += ChildBlock::sizeOf(entry_, isPadded_);
+            position_ = position;
+        } else if (position != position_ || position >= count_) {
+            seek(position);
+        }
+        return ChildBlock::read(entry_).value();
     }
 
     // Throws std::out_of_range if there is no such child.
@@ -36,9 +46,11 @@ private:
 
     ChildBlock block_;
     std::uint64_t first_;  // position of the batch's first file
-    // The last child that was asked for, and where its entry begins.
+    std::uint64_t count_;  // of the folder's children
+    bool isPadded_;
+    // The child that was asked for last, or the first.
+    const std::uint8_t* entry_;
     std::uint64_t position_ = 0;
-    std::uint64_t entryOffset_ = 0;
 };
 
 }  // namespace tessel

@@ -113,8 +113,7 @@ std::uint8_t* ChildBlock::shrink() noexcept {
     if (slack == 0) return memory_;
     setCapacity(capacity() - slack);
     void* const memory = std::realloc(
-        memory_,
-        static_cast<std::size_t>(headerBytes(isLarge()) + capacity()));
+        memory_, static_cast<std::size_t>(headerBytes(isLarge()) + capacity()));
     // Without memory for it, the block stays where it is.
     return memory == nullptr ? memory_ : static_cast<std::uint8_t*>(memory);
 }

@@ -186,9 +186,9 @@ private:
     // Bytes of the samples of so many children.
     static constexpr std::uint64_t sampleBytes(std::uint64_t children,
                                                bool isLarge) noexcept {
-        return children == 0 ? 0
-                             : (children - 1) / childrenPerSample *
-                                   numberBytes(isLarge);
+        return children == 0
+                   ? 0
+                   : (children - 1) / childrenPerSample * numberBytes(isLarge);
     }
     static std::size_t sizeOfRare(const std::uint8_t* entry) noexcept;
 

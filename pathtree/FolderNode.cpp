@@ -124,8 +124,7 @@ void FolderNode::destroy(FolderNode* dead) noexcept {
         dead->releaseOwned();
         if (parent == nullptr) return;
         dead = parent;
-        parent =
-            ChildBlock::folderAt(dead->children().currentDeadFolder());
+        parent = ChildBlock::folderAt(dead->children().currentDeadFolder());
     }
 }
 

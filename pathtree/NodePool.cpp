@@ -78,9 +78,9 @@ FolderNode* NodePool::make(ComponentView name, const ChildBatch& children) {
     const bool isInline = block == nullptr && children.count > 0;
     // A block that grows leaves the way to the new one in its place.
     const std::size_t childBytes =
-        isInline ? std::max(ChildBlock::exactBytes(children),
-                            sizeof(std::uint8_t*))
-                 : sizeof(std::uint8_t*);
+        isInline
+            ? std::max(ChildBlock::exactBytes(children), sizeof(std::uint8_t*))
+            : sizeof(std::uint8_t*);
     const std::size_t bytes =
         offsetof(FolderNode, lengthAndFlags_) + 1 +
         (isLong ? sizeof(std::uint64_t) : 0) +
@@ -90,9 +90,9 @@ FolderNode* NodePool::make(ComponentView name, const ChildBatch& children) {
     allocated_ += bytes;
     const auto length =
         isLong ? FolderNode::longLength : static_cast<unsigned>(name.size());
-    node->lengthAndFlags_ = static_cast<std::uint8_t>(
-        length << FolderNode::lengthShift |
-        (isInline ? FolderNode::inlineBlock : 0U));
+    node->lengthAndFlags_ =
+        static_cast<std::uint8_t>(length << FolderNode::lengthShift |
+                                  (isInline ? FolderNode::inlineBlock : 0U));
     std::uint8_t* at = node->afterFlags();
     if (isLong) at = put(at, std::uint64_t{name.size()});
     if (longName != nullptr)

@@ -18,8 +18,8 @@ void NodeStack::pushChildren(const BNodePtr& node) {
     const ChildBlock block = folder->children();
     const auto count = static_cast<std::uint32_t>(block.count());
     if (count > 0)
-        ranges_.push_back({BNodePtr(BNode(*folder)), 0, 0, count, false,
-                           block.isPadded()});
+        ranges_.push_back(
+            {BNodePtr(BNode(*folder)), 0, 0, count, false, block.isPadded()});
 }
 
 void NodeStack::pop() noexcept {
@@ -30,8 +30,8 @@ void NodeStack::pop() noexcept {
     }
     const ChildBlock block = range.node->folder()->children();
     if (block.isPadded() == range.isPadded) {
-        range.offset += ChildBlock::sizeOf(block.entries() + range.offset,
-                                           range.isPadded);
+        range.offset +=
+            ChildBlock::sizeOf(block.entries() + range.offset, range.isPadded);
     } else {
         range.isPadded = block.isPadded();
         range.offset = block.offsetOf(range.next);

@@ -16,9 +16,7 @@ namespace tessel {
 // Ownership: borrows the tree, which must not change during the walk.
 class NodeWalk {
 public:
-    explicit NodeWalk(BNode root) {
-        open_.push_back(root.children().reader());
-    }
+    explicit NodeWalk(BNode root) { open_.push_back(root.children().reader()); }
 
     // Moves to the next node; false when there is none.
     bool next() {

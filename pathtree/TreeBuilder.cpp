@@ -73,7 +73,9 @@ void TreeBuilder::close() {
     const ComponentView value = packed::readComponent(name);
     const ChildBatch children{
         {value.data() + value.size(), entries_.data() + entries_.size()},
-        folder.count, folder.hasFolders, folder.hasFiles};
+        folder.count,
+        folder.hasFolders,
+        folder.hasFiles};
     if (open_.size() == 1) {
         if (folder.count > 0) root_.folder()->append(children);
         entries_.clear();

@@ -23,11 +23,10 @@ TEST(BatchFiles, FilesOfAnOpenBatchAreAskedForOneByOne) {
     addBatch(tree, {"a"}, {"f"});
     addBatch(tree, {"a"}, {"g", "h"});
     const PathTrack track = {0, 1};
-    BatchFiles files =
-        TrackLookup(*tree.root)
-            .openBatch(track, [](tessel::ComponentView folder) {
-                EXPECT_EQ(textOf(folder), "a");
-            });
+    BatchFiles files = TrackLookup(*tree.root)
+                           .openBatch(track, [](tessel::ComponentView folder) {
+                               EXPECT_EQ(textOf(folder), "a");
+                           });
     EXPECT_EQ(textOf(files[2]), "h");
     EXPECT_EQ(textOf(files[1]), "g");
     EXPECT_THROW(files[3], std::out_of_range);
@@ -49,7 +48,8 @@ TEST(BatchFiles, AChildIsFoundByItsPositionOrNotAtAll) {
     BPathTree tree;
     addBatch(tree, {}, {"f", "g"});
     EXPECT_EQ(textOf(BatchFiles::childAt(tree.root->folder(), 1).value()), "g");
-    EXPECT_THROW(BatchFiles::childAt(tree.root->folder(), 2), std::out_of_range);
+    EXPECT_THROW(BatchFiles::childAt(tree.root->folder(), 2),
+                 std::out_of_range);
     EXPECT_THROW(BatchFiles::childAt(tree.root->folder(), ~std::uint64_t{0}),
                  std::out_of_range);
 }

@@ -106,8 +106,8 @@ private:
 
 RC_GTEST_PROP(ChildBlock, EqualsAVector, ()) {
     Pair pair;
-    const auto steps =
-        *rc::gen::container<std::vector<unsigned>>(rc::gen::arbitrary<unsigned>());
+    const auto steps = *rc::gen::container<std::vector<unsigned>>(
+        rc::gen::arbitrary<unsigned>());
     for (const unsigned step : steps) {
         const unsigned seed = step / 8;
         switch (step % 8) {
@@ -195,10 +195,8 @@ RC_GTEST_PROP(ChildBlock, TreesThatShareFoldersEqualAPlainTree, ()) {
     auto tree = std::make_unique<BPathTree>();
     auto copy = std::make_unique<BPathTree>(*tree);
     PlainNode plain;
-    const auto steps =
-        *rc::gen::container<std::vector<std::vector<unsigned>>>(
-            rc::gen::container<std::vector<unsigned>>(
-                rc::gen::inRange(0U, 60U)));
+    const auto steps = *rc::gen::container<std::vector<std::vector<unsigned>>>(
+        rc::gen::container<std::vector<unsigned>>(rc::gen::inRange(0U, 60U)));
     for (const std::vector<unsigned>& step : steps) {
         BPathTree& used = step.size() % 2 == 0 ? *tree : *copy;
         Components path;

@@ -105,13 +105,11 @@ TEST(ChildIndex, AroundTheWidthWhereTablesBegin) {
         for (unsigned i = 0; i < width; ++i) {
             support::addBatch(tree, {}, {support::numbered("n", i)});
             for (unsigned k = 0; k <= i; ++k) {
-                const auto name =
-                    support::component(support::numbered("n", k));
+                const auto name = support::component(support::numbered("n", k));
                 EXPECT_EQ(index.find(*tree.root->folder(), name), k);
             }
-            EXPECT_EQ(
-                index.find(*tree.root->folder(), support::component("x")),
-                ChildIndex::notFound);
+            EXPECT_EQ(index.find(*tree.root->folder(), support::component("x")),
+                      ChildIndex::notFound);
         }
     }
 }

@@ -31,7 +31,8 @@ TEST(ComponentList, OneOfNothingIsEmpty) {
 TEST(ComponentList, LengthsAboutTheMarkOfLongOnesComeBack) {
     ComponentArena arena;
     Components values;
-    for (const std::size_t length : {0U, 1U, 252U, 253U, 254U, 255U, 256U, 70000U})
+    for (const std::size_t length :
+         {0U, 1U, 252U, 253U, 254U, 255U, 256U, 70000U})
         values.emplace_back(length, static_cast<std::uint8_t>(length % 251));
     const ComponentList list = support::packedBy(arena, values);
     EXPECT_FALSE(list.empty());

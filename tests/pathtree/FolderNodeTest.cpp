@@ -103,8 +103,8 @@ TEST(FolderNode, TooManyChildrenAreRefusedBeforeMemoryIsTaken) {
     ComponentArena arena;
     const BNodePtr node =
         BNodePtr::adopt(pool.make({}, filesOf(arena, components({"a"}))));
-    const ChildBatch tooMany{{}, std::numeric_limits<std::uint32_t>::max(),
-                             false};
+    const ChildBatch tooMany{
+        {}, std::numeric_limits<std::uint32_t>::max(), false};
     EXPECT_THROW(node->folder()->append(tooMany), std::length_error);
     EXPECT_EQ(childTexts(*node), Texts{"a"});
 }

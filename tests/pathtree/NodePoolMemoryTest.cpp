@@ -1,12 +1,13 @@
-// What names of folders, of any length, take, beside what the tree says that they take.
+// What names of folders take, of any length, beside what the tree says of them.
+// they take.
 
 #include <gtest/gtest.h>
 #include <malloc.h>
 
 #include <cstring>
 
-#include "pathtree/BPathTree.hpp"
 #include "pathtree/BNodePtr.hpp"
+#include "pathtree/BPathTree.hpp"
 #include "pathtree/NodePool.hpp"
 #include "pathtree/NodeSlab.hpp"
 #include "tests/support/Trees.hpp"

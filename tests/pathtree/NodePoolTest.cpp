@@ -24,9 +24,8 @@ TEST(NodePool, ANodeTakesItsNameItsChildrenAndAFewBytes) {
         const auto list = support::packedBy(
             arena, tessel::Components(files, support::component("12345")));
         const BNodePtr before = empty(pool);
-        const BNodePtr node = BNodePtr::adopt(
-            pool.make(tessel::Component(length, 1),
-                      {list.bytes(), list.size(), false}));
+        const BNodePtr node = BNodePtr::adopt(pool.make(
+            tessel::Component(length, 1), {list.bytes(), list.size(), false}));
         const BNodePtr after = empty(pool);
         return reinterpret_cast<std::uintptr_t>(after->folder()) -
                reinterpret_cast<std::uintptr_t>(before->folder()) - 16;
@@ -37,7 +36,7 @@ TEST(NodePool, ANodeTakesItsNameItsChildrenAndAFewBytes) {
     EXPECT_EQ(distance(62, 0), 76U);
     EXPECT_EQ(distance(63, 0), 84U);
     EXPECT_EQ(distance(50000, 0), 32U);
-    EXPECT_EQ(distance(3, 1), 24U);   // 5 + 3, a header of 7, an entry of 6
+    EXPECT_EQ(distance(3, 1), 24U);  // 5 + 3, a header of 7, an entry of 6
     EXPECT_EQ(distance(3, 2), 28U);
     EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
     EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
