@@ -17,10 +17,9 @@ using tessel::NodeSlab;
 BNodePtr empty(NodePool& pool) { return BNodePtr::adopt(pool.make({}, {})); }
 
 TEST(NodePool, ANodeTakesItsNameItsChildrenAndAFewBytes) {
-    NodePool pool;
-    const BNodePtr first = empty(pool);
     tessel::ComponentArena arena;
     const auto distance = [&](std::size_t length, std::size_t files) {
+        NodePool pool;  // all in its first slab
         const auto list = support::packedBy(
             arena, tessel::Components(files, support::component("12345")));
         const BNodePtr before = empty(pool);
