@@ -6,6 +6,7 @@ import json
 import os
 import pickle
 import random
+import re
 import signal
 import sys
 import threading
@@ -239,6 +240,7 @@ def test_shards_are_opened_when_needed(tmp_path):
         with pytest.raises(FileNotFoundError, match=message) as raised:
             read()
         assert "\n" not in str(raised.value)
+    assert re.search("of 6 paths .* cannot be read, .*0.tessel", repr(paths))
     (tmp_path / "0.tessel.away").rename(tmp_path / "0.tessel")
     assert paths[0] == "a"
 
@@ -273,6 +275,8 @@ def wrong(field, value):
 WRONG_MANIFESTS = {
     "format": (lambda m: m.update(format="x"), "does not say that its format"),
     "version": (lambda m: m.update(version=2), "version is 2, not 1"),
+    "true version": (lambda m: m.update(version=True), "version is True, not 1"),
+    "fraction of paths": (lambda m: m.update(paths=4.0), "have 4 paths, not 4.0"),
     "no shards": (lambda m: m.pop("shards"), "has no list of shards"),
     "shards": (lambda m: m.update(shards={}), "has no list of shards"),
     "paths": (lambda m: m.update(paths=5), "have 4 paths, not 5"),

@@ -468,14 +468,13 @@ class PathList(Sequence[AnyStr]):
 
     def __repr__(self) -> str:
         size = len(self)
-        paths = [repr(self[i]) for i in range(min(size, 2))]
-        if size > 3:
-            paths.append("...")
-        if size > 2:
-            paths.append(repr(self[-1]))
         where = self._origin() + "".join(map(_described, self._paths.steps()))
         number = "1 path" if size == 1 else f"{size} paths"
-        return f"<{type(self).__name__} of {number} from {where}: [{', '.join(paths)}]>"
+        try:
+            shown = f"[{', '.join(self._outermost())}]"
+        except (OSError, ValueError) as error:  # who looks at a list wants no error
+            shown = f"cannot be read, {error}"
+        return f"<{type(self).__name__} of {number} from {where}: {shown}>"
 
     # ---- Copies ----
 
@@ -495,6 +494,15 @@ class PathList(Sequence[AnyStr]):
         return _rebuilt, (type(self), data, steps, self._as_bytes)
 
     # ---- Helpers ----
+
+    def _outermost(self) -> list[str]:
+        size = len(self)
+        paths = [repr(self[i]) for i in range(min(size, 2))]
+        if size > 3:
+            paths.append("...")
+        if size > 2:
+            paths.append(repr(self[-1]))
+        return paths
 
     @classmethod
     def _over(cls, core: _core.PathSequence, as_bytes: bool) -> PathList[Any]:

@@ -188,8 +188,9 @@ def _parsed(file: str, text: bytes) -> list[Shard]:
 def _shards(folder: str, manifest: Any) -> Iterator[Shard]:
     if type(manifest) is not dict or manifest.get("format") != _FORMAT:
         raise ValueError(f"it does not say that its format is {_FORMAT!r}")
-    if manifest.get("version") != _VERSION:
-        raise ValueError(f"its version is {manifest.get('version')!r}, not {_VERSION}")
+    version = manifest.get("version")
+    if type(version) is not int or version != _VERSION:
+        raise ValueError(f"its version is {version!r}, not {_VERSION}")
     entries = manifest.get("shards")
     if type(entries) is not list:
         raise ValueError("it has no list of shards")
@@ -200,8 +201,9 @@ def _shards(folder: str, manifest: Any) -> Iterator[Shard]:
             raise ValueError(f"shard {position} starts at {shard.first}, not {first}")
         first = shard.end
         yield shard
-    if manifest.get("paths") != first or first >= 2**63:
-        raise ValueError(f"its shards have {first} paths, not {manifest.get('paths')}")
+    paths = manifest.get("paths")
+    if type(paths) is not int or paths != first or first >= 2**63:
+        raise ValueError(f"its shards have {first} paths, not {paths!r}")
 
 
 def _shard(folder: str, position: int, entry: Any) -> Shard:
