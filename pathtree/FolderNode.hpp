@@ -54,10 +54,11 @@ public:
 
     // Valid until children are appended or promoted.
     ChildBlock children() const noexcept {
-        std::uint8_t* place = childPlace();
+        std::uint8_t* const place = childPlace();
         if ((lengthAndFlags_ & inlineBlock) != 0) return ChildBlock(place);
-        std::memcpy(&place, place, sizeof place);
-        return ChildBlock(place);
+        std::uint8_t* block = nullptr;
+        std::memcpy(&block, place, sizeof block);
+        return ChildBlock(block);
     }
     // The child at a position, which must be below children().count().
     Child child(std::uint64_t position) const noexcept {

@@ -164,31 +164,23 @@ TEST(ChildBlock, GrowsOverTheBorderOfSmallBlocks) {
 
 // Children as a plain tree has them: in order, never removed.
 struct PlainNode {
-    std::vector<std::pair<Component, PlainNode>> children;
+    Component name;
+    std::vector<PlainNode> children;
 
-    PlainNode* find(const Component& name, std::size_t& position) {
-        for (position = 0; position < children.size(); ++position)
-            if (children[position].first == name)
-                return &children[position].second;
-        return nullptr;
-    }
-    // The child of this name, made if there is none.
-    PlainNode& enter(const Component& name) {
-        std::size_t position = 0;
-        if (PlainNode* const found = find(name, position)) return *found;
-        children.emplace_back(name, PlainNode());
-        return children.back().second;
+    // The first child of this name, made if there is none.
+    PlainNode& enter(const Component& wanted) {
+        for (PlainNode& child : children)
+            if (child.name == wanted) return child;
+        return children.emplace_back(PlainNode{wanted, {}});
     }
 };
 
 void compare(const tessel::BNode& node, const PlainNode& plain) {
+    RC_ASSERT(tessel::sameComponent(node.value(), plain.name));
     const tessel::ChildList children = node.children();
     RC_ASSERT(children.size() == plain.children.size());
-    for (std::size_t i = 0; i < plain.children.size(); ++i) {
-        RC_ASSERT(tessel::sameComponent(children[i].value(),
-                                        plain.children[i].first));
-        compare(children[i], plain.children[i].second);
-    }
+    for (std::size_t i = 0; i < plain.children.size(); ++i)
+        compare(children[i], plain.children[i]);
 }
 
 RC_GTEST_PROP(ChildBlock, TreesThatShareFoldersEqualAPlainTree, ()) {
@@ -213,7 +205,7 @@ RC_GTEST_PROP(ChildBlock, TreesThatShareFoldersEqualAPlainTree, ()) {
                 files.push_back(nameOf(step[0] + i));
             for (const Component& name : path) place = &place->enter(name);
             for (const Component& name : files)
-                place->children.emplace_back(name, PlainNode());
+                place->children.push_back(PlainNode{name, {}});
             std::uint64_t first = 0;
             used.addPath(path, files, track, first);
         }
