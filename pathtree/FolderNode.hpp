@@ -73,6 +73,8 @@ public:
     // Makes sure that promote does not throw. Throws std::bad_alloc.
     void reservePromotion(std::uint64_t position);
     // Makes the file at this position a folder; takes over a share of it.
+    // What it changes is in the block, but belongs to the node.
+    // NOLINTNEXTLINE(readability-make-member-function-const)
     void promote(std::uint64_t position, FolderNode* folder) noexcept {
         children().promote(position, folder);
     }

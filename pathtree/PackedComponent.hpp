@@ -6,8 +6,6 @@
 
 #include "pathtree/Component.hpp"
 
-namespace tessel {
-
 // How a component stands in a packed list, be it a batch on its way into the
 // tree (ComponentList) or a folder's children (ChildBlock), so that a batch
 // becomes children by one copy of its bytes:
@@ -18,7 +16,7 @@ namespace tessel {
 //   253        | only among children: a folder that was a file, see ChildBlock
 //   254        | the length, 8 bytes, and so many bytes: the component
 //   255        | only among children: a folder, see ChildBlock
-namespace packed {
+namespace tessel::packed {
 
 constexpr std::size_t maxShortLength = 252;
 constexpr std::uint8_t promotedMark = 253;
@@ -52,6 +50,4 @@ inline ComponentView readComponent(const std::uint8_t* at) noexcept {
     return {at + 1 + sizeof length, static_cast<std::size_t>(length)};
 }
 
-}  // namespace packed
-
-}  // namespace tessel
+}  // namespace tessel::packed

@@ -47,7 +47,7 @@ public:
 private:
     // A folder that still awaits a child.
     struct OpenFolder {
-        std::size_t nameAt;  // its own entry on the stack, as a file's
+        std::size_t nameAt = 0;  // its own entry on the stack, as a file's
         std::uint32_t count = 0;
         bool hasFolders = false;
         bool hasFiles = false;

@@ -29,9 +29,9 @@ public:
     // components were stored.
     struct AddedBatch {
         BNode folder;
-        bool existed;
-        std::uint64_t firstFile;
-        std::size_t storedComponents;
+        bool existed = false;
+        std::uint64_t firstFile = 0;
+        std::size_t storedComponents = 0;
     };
 
     // A root for a new tree. Forgets the nodes of the former one.

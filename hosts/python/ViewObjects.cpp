@@ -91,7 +91,7 @@ py::list stepsOf(const View& view) {
 
 namespace {
 
-IndexArray numbersOf(const View& view, const IndexArray& indices) {
+IndexArray numbersAt(const View& view, const IndexArray& indices) {
     std::vector<std::uint64_t> numbers = fromStart(view.size(), indices);
     {
         const InterpreterReleased released;
@@ -121,7 +121,7 @@ void bindView(py::module_& module) {
              [](const View& view, const py::object& index) {
                  return view[fromStart(view.size(), index)];
              })
-        .def("numbers", &numbersOf)
+        .def("numbers", &numbersAt)
         .def("indices_of", [](const View& view, const IndexArray& numbers) {
             return indicesOf(view, fromStart(view.domain(), numbers));
         });
