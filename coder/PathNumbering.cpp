@@ -12,18 +12,15 @@ void PathNumbering::reserveForPartition(std::size_t trackLength,
                                         std::size_t fileCount) {
     reserveGently(partitionEnds, 1);
     partitionTracks.reserveFor(trackLength + 1);
-    const std::uint64_t starts = ((pathCount + fileCount) >> shift_) + 1;
-    if (starts > starts_.size())
-        reserveGently(starts_,
-                      static_cast<std::size_t>(starts) - starts_.size());
+    reserveGently(starts_, mostStarts(fileCount));
 }
 
-// Brings the table up to the last partition. There is room.
-void PathNumbering::noteStarts() noexcept {
-    const std::size_t last = partitionEnds.size() - 1;
-    if (last > std::numeric_limits<std::uint32_t>::max()) return;
-    while (starts_.size() <= partitionEnds.back() >> shift_)
-        starts_.push_back(static_cast<std::uint32_t>(last));
+// Brings the table up to partition k, by at most so many entries. There is
+// room. A table that lags behind makes searches longer, not wrong.
+void PathNumbering::noteStarts(std::size_t k, std::size_t most) noexcept {
+    if (k > std::numeric_limits<std::uint32_t>::max()) return;
+    for (; most > 0 && starts_.size() <= partitionEnds[k] >> shift_; --most)
+        starts_.push_back(static_cast<std::uint32_t>(k));
 }
 
 void PathNumbering::notePartition(PathTrack& track, bool existed,
@@ -39,7 +36,7 @@ void PathNumbering::notePartition(PathTrack& track, bool existed,
                   (partitionEnds.empty() || partitionEnds.back() <= pathCount);
     partitionEnds.push_back(pathCount);
     partitionTracks.push_back(track);
-    noteStarts();
+    noteStarts(partitionEnds.size() - 1, mostStarts(fileCount));
 }
 
 void PathNumbering::noteWholePath(PathTrack& track, bool existed) {
@@ -67,7 +64,7 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
     if (!starts_.empty()) {
         const std::size_t start = starts_[std::min<std::uint64_t>(
             number >> shift_, starts_.size() - 1)];
-        // Not if the ends were changed by hand.
+        // Not if the table lags behind, or the ends were changed by hand.
         if (start > k && start <= partitionEnds.size() &&
             !holds(*at(start - 1)))
             k = start;
@@ -92,11 +89,8 @@ void PathNumbering::checkEnds() {
     const std::uint64_t most = partitionEnds.size() + 1;
     while (last >> shift_ >= most) ++shift_;
     starts_.reserve(static_cast<std::size_t>((last >> shift_) + 1));
-    for (std::size_t k = 0; k < partitionEnds.size() &&
-                            k <= std::numeric_limits<std::uint32_t>::max();
-         ++k)
-        while (starts_.size() <= partitionEnds[k] >> shift_)
-            starts_.push_back(static_cast<std::uint32_t>(k));
+    for (std::size_t k = 0; k < partitionEnds.size(); ++k)
+        noteStarts(k, starts_.capacity() - starts_.size());
 }
 
 std::size_t PathNumbering::partitionBytes() const noexcept {

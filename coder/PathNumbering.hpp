@@ -74,7 +74,12 @@ private:
     // loaded form that has few partitions for its numbers.
     static constexpr unsigned usualShift = 6;
 
-    void noteStarts() noexcept;
+    // So many entries a partition of so many files may add to the table,
+    // however far the count has jumped.
+    std::size_t mostStarts(std::size_t fileCount) const noexcept {
+        return (fileCount >> shift_) + 1;
+    }
+    void noteStarts(std::size_t k, std::size_t most) noexcept;
 
     bool endsAscend_ = true;  // partitionEnds can be searched by halves
     // Entry j is the first partition whose end is not below j << shift_: a

@@ -79,6 +79,36 @@ TEST(PathNumbering, EndsThatFallAreNoticedWhenTheyAreCheckedAnew) {
     compareSearch(numbering);
 }
 
+// A count that jumps asks for no table of its size: what a partition may take
+// follows from its files.
+TEST(PathNumbering, AHugeCountTakesNoMemory) {
+    for (const std::uint64_t count :
+         {std::uint64_t{1} << 33, std::uint64_t{1} << 45,
+          ~std::uint64_t{0} - 100}) {
+        PathNumbering numbering;
+        note(numbering, 3);
+        numbering.pathCount = count;
+        for (int i = 0; i < 20; ++i) note(numbering, 2);
+        const Ends& ends = numbering.partitionEnds;
+        for (std::size_t k = 0; k < ends.size(); ++k)
+            EXPECT_EQ(numbering.partitionAtOrAfter(0, ends[k]), k);
+        EXPECT_EQ(numbering.partitionAtOrAfter(0, 4), 1U);
+        EXPECT_LT(numbering.partitionBytes(), 2000U);
+    }
+}
+
+// The same after a form whose last end is huge and whose ends fall.
+TEST(PathNumbering, HugeEndsThatFallTakeNoMemory) {
+    PathNumbering numbering;
+    numbering.partitionEnds = {std::uint64_t{1} << 60, 5,
+                               std::uint64_t{1} << 61};
+    numbering.pathCount = numbering.partitionEnds.back();
+    numbering.checkEnds();
+    note(numbering, 2);
+    compareSearch(numbering);
+    EXPECT_LT(numbering.partitionBytes(), 2000U);
+}
+
 TEST(PathNumbering, OnlyAPathThatExistedIsADuplicate) {
     PathNumbering numbering;
     PathTrack track = {1, 2};
