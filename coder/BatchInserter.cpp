@@ -73,6 +73,7 @@ void BatchInserter::insertFolder(const ComponentList& components,
         const std::uint64_t first =
             tree_.inserter().addFiles(cached->node, fileNames);
         numbering_.notePartition(track_, true, first, fileNames.size());
+        noteFolder(cached->node, false);
         return;
     }
     const std::size_t depth = components.size();
@@ -83,8 +84,16 @@ void BatchInserter::insertFolder(const ComponentList& components,
                              fileNames.size());
     // Without components the root takes the files and never counts as found.
     if (depth == 0) return;
+    noteFolder(added.folder, !added.existed);
     track_.resize(depth);
     cache_.add(components, hash, added.folder, track_);
+}
+
+// A batch that brought no file may have left a file as its folder.
+void BatchInserter::noteFolder(BNode folder, bool isEnd) noexcept {
+    if (folder.folder() != nullptr)
+        numbering_.partitionTracks.noteFolder(*tree_.root,
+                                              {folder.folder(), isEnd});
 }
 
 }  // namespace tessel

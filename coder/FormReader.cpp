@@ -28,6 +28,11 @@ FormReader::FormReader(PathNumbering before) : numbering(std::move(before)) {
 void FormReader::read(ByteCursor& cursor) {
     readShape(cursor);
     readTree(cursor);
+    readNumbering(cursor);
+    numbering.partitionTracks.findFolders(*tree->root);
+}
+
+void FormReader::readNumbering(ByteCursor& cursor) {
     if (cursor.empty()) return;
     std::uint8_t marker = cursor.takeByte();
     if (marker == formmarkers::partitions) {

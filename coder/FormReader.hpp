@@ -31,6 +31,7 @@ public:
 private:
     void readShape(sixpacks::ByteCursor& cursor);
     void readTree(sixpacks::ByteCursor& cursor);
+    void readNumbering(sixpacks::ByteCursor& cursor);
     void readPartitions(sixpacks::ByteCursor& cursor);
     void readDuplicates(sixpacks::ByteCursor& cursor);
 };

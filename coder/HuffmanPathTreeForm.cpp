@@ -86,6 +86,7 @@ std::size_t HuffmanPathTree::serializePathTree(
 std::size_t HuffmanPathTree::deserializePathTree(
     std::vector<std::uint8_t>& structure, Components& values) {
     pathTree = std::make_unique<BPathTree>();
+    partitionTracks.forgetFolders();
     pathCount = pathTree->deserialize(structure, values);
     return pathCount;
 }

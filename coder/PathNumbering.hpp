@@ -17,8 +17,8 @@ namespace tessel {
 // Invariants: partitionEnds and partitionTracks have one entry per partition
 //   (a loaded form may hold tracks without ends).
 // Ownership: a value; copies are independent.
-// Cost: 8 bytes and the folder's depth per partition; a byte for 16 numbers;
-//   about 90 bytes per repeated whole path.
+// Cost: 8 bytes per partition, some 5 for its track and 4 for the way to its
+//   folder; a byte for 16 numbers; about 90 bytes per repeated whole path.
 class PathNumbering {
 public:
     // True when the path of this number repeats one that was stored before.

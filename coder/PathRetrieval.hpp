@@ -9,6 +9,7 @@
 #include <stdexcept>
 #include <vector>
 
+#include "coder/FolderChain.hpp"
 #include "coder/PathNumbering.hpp"
 #include "pathtree/BPathTree.hpp"
 #include "pathtree/TrackLookup.hpp"
@@ -31,11 +32,11 @@ public:
     // std::out_of_range for NaN, for -1 and below.
     static std::uint64_t pathNumberOf(double value);
 
-    // Visits paths by number, in ascending order, without copies and without
-    // the heap. `numbers` is any random-access range of unsigned integers.
-    // Per partition met, the visitor sees its folder once, then the files
-    // asked for; usualFiles is how many they are at most, unless numbers
-    // repeat or descend:
+    // Visits paths by number, in ascending order, without copies and, where
+    // the folders are known, without the heap. `numbers` is any random-access
+    // range of unsigned integers. Per partition met, the visitor sees its
+    // folder once, then the files asked for; usualFiles is how many they are at
+    // most, unless numbers repeat or descend:
     //
     //   visitor.beginFolder(usualFiles);
     //   visitor.folder(ComponentView);  // each component, the root first
@@ -49,7 +50,9 @@ public:
     //
     // Throws std::out_of_range for a number that leads outside the tree; the
     // paths before it have been visited then.
-    // Cost: for each partition met a search in partitionEnds and its track.
+    // Cost: for each partition met a search in partitionEnds and the way from
+    // its
+    //   folder up, or its track down.
     template <class Numbers, class Visitor>
     void visit(const Numbers& numbers, Visitor&& visitor) const;
 
@@ -59,21 +62,10 @@ public:
                  const std::vector<double>& numbers) const;
 
 private:
-    // Reads tracks without the heap, unless a folder is this deep.
-    class TrackReader {
-    public:
-        // The array is not cleared: a position is written before it is read.
-        // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
-        TrackReader() noexcept {}  // NOLINT(modernize-use-equals-default)
-        std::span<const std::uint64_t> read(const PathTracks& tracks,
-                                            std::size_t k);
-
-    private:
-        static constexpr std::size_t inlineDepth = 32;
-
-        std::array<std::uint64_t, inlineDepth> inline_;
-        PathTrack longer_;
-    };
+    // Shows the folder of partition k to the visitor and returns its files.
+    template <class Visitor>
+    BatchFiles openPartition(std::size_t k, FolderChain& chain,
+                             PathTrack& track, Visitor& visitor) const;
 
     void getByNumber(std::vector<Components>& folderPaths,
                      std::vector<Components>& filePaths,
@@ -84,22 +76,6 @@ private:
     const BPathTree& tree_;
     const PathNumbering& numbering_;
 };
-
-inline std::span<const std::uint64_t> PathRetrieval::TrackReader::read(
-    const PathTracks& tracks, std::size_t k) {
-    std::size_t length = 0;
-    longer_.clear();
-    tracks.visitPositions(k, [&](std::uint64_t position) {
-        if (length < inlineDepth) {
-            inline_[length++] = position;
-            return;
-        }
-        if (longer_.empty()) longer_.assign(inline_.begin(), inline_.end());
-        longer_.push_back(position);
-    });
-    if (!longer_.empty()) return longer_;
-    return {inline_.data(), length};
-}
 
 // The numbers of a request as a range for visit, each converted when its turn
 // comes: those after the last partition's end are ignored, whatever they are.
@@ -135,10 +111,28 @@ private:
     std::span<const double> values_;
 };
 
+template <class Visitor>
+BatchFiles PathRetrieval::openPartition(std::size_t k, FolderChain& chain,
+                                        PathTrack& track,
+                                        Visitor& visitor) const {
+    const PathTracks& tracks = numbering_.partitionTracks;
+    const FolderNode& root = *tree_.root->folder();
+    const auto visitFolder = [&](ComponentView name) { visitor.folder(name); };
+    const auto [folder, isEnd] = tracks.folders().find(k, root);
+    if (folder == nullptr || !chain.find(root, *folder)) {
+        tracks.read(k, track);
+        return TrackLookup(*tree_.root).openBatch(track, visitFolder);
+    }
+    for (const FolderNode* above : chain.folders()) visitFolder(above->value());
+    if (isEnd) return {*folder, 0};
+    return TrackLookup::openLast(folder, tracks.lastOf(k), visitFolder);
+}
+
 template <class Numbers, class Visitor>
 void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
     const std::vector<std::uint64_t>& ends = numbering_.partitionEnds;
-    TrackReader reader;
+    FolderChain chain;
+    PathTrack track;
     std::size_t k = 0;
     auto next = std::begin(numbers);
     const auto last = std::end(numbers);
@@ -151,11 +145,7 @@ void PathRetrieval::visit(const Numbers& numbers, Visitor&& visitor) const {
         const auto left = static_cast<std::uint64_t>(last - next);
         visitor.beginFolder(
             static_cast<std::size_t>(std::min(left, ends[k] - number + 1)));
-        BatchFiles files =
-            TrackLookup(*tree_.root)
-                .openBatch(
-                    reader.read(numbering_.partitionTracks, k),
-                    [&visitor](ComponentView name) { visitor.folder(name); });
+        BatchFiles files = openPartition(k, chain, track, visitor);
         const std::uint64_t base = k > 0 ? ends[k - 1] : 0;
         while (number <= ends[k]) {
             visitor.file(files[number - base]);

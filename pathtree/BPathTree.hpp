@@ -28,9 +28,10 @@ class TreeInserter;
 // Threads: no locks. Use a tree and its copies from one thread at a time;
 //   releasing them on different threads is safe.
 // Cost: a file takes its encoded name and a byte in its folder's ChildBlock
-//   (nine for a name of 253 bytes or more), and at most half a byte for its
-//   position; a folder takes some 22 bytes, and 24 more if its block is on
-//   the heap. Finding a child takes constant time on average.
+//   (nine for a name of 253 bytes or more), and at most a quarter of a byte
+//   for its position, a whole byte in a folder of more than 64 KiB; a folder
+//   takes some 23 bytes, and 24 more if its block is on the heap. Finding a
+//   child takes constant time on average.
 class BPathTree {
 public:
     // No position: what a search answers that finds nothing.

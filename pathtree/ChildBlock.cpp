@@ -1,5 +1,6 @@
 #include "pathtree/ChildBlock.hpp"
 
+#include <array>
 #include <cstdlib>
 #include <new>
 
@@ -33,13 +34,14 @@ std::uint64_t ChildBlock::offsetOf(std::uint64_t position) const noexcept {
 
 ChildBlock::Plan::Plan(std::uint64_t children, std::uint64_t bytes,
                        std::uint64_t slack, std::uint8_t kind) noexcept
-    : count(children),
-      used(bytes),
-      capacity(bytes + slack + sampleBytes(children, false)),
-      flags(kind) {
-    if (count <= maxSmall && capacity <= maxSmall) return;
-    flags |= large;
-    capacity = bytes + slack + sampleBytes(children, true);
+    : count(children), used(bytes), capacity(0), flags(kind) {
+    constexpr std::array<std::uint8_t, 3> widths = {0, 1, 3};
+    for (const std::uint8_t exponent : widths) {
+        flags = static_cast<std::uint8_t>(kind | exponent);
+        capacity = bytes + slack + sampleBytes(children, numberBytes());
+        const std::uint64_t most = maxNumber(numberBytes());
+        if (count <= most && capacity <= most) return;
+    }
 }
 
 ChildBlock ChildBlock::begin(std::uint8_t* memory, const Plan& plan) noexcept {
@@ -57,13 +59,25 @@ ChildBlock ChildBlock::allocate(const Plan& plan) {
     return begin(static_cast<std::uint8_t*>(memory), plan);
 }
 
-void ChildBlock::setNumberAt(std::uint8_t* at, std::uint64_t value) noexcept {
-    if (isLarge()) {
-        std::memcpy(at, &value, sizeof value);
-        return;
-    }
-    const auto stored = static_cast<std::uint16_t>(value);
+namespace {
+
+template <class Number>
+void writeAs(std::uint8_t* at, std::uint64_t value) noexcept {
+    const auto stored = static_cast<Number>(value);
     std::memcpy(at, &stored, sizeof stored);
+}
+
+}  // namespace
+
+void ChildBlock::setNumberAt(std::uint8_t* at, std::uint64_t value) noexcept {
+    switch (numberBytes()) {
+        case sizeof(std::uint8_t):
+            return writeAs<std::uint8_t>(at, value);
+        case sizeof(std::uint16_t):
+            return writeAs<std::uint16_t>(at, value);
+        default:
+            return writeAs<std::uint64_t>(at, value);
+    }
 }
 
 std::size_t ChildBlock::exactBytes(const ChildBatch& batch) noexcept {
@@ -95,7 +109,7 @@ std::uint8_t* ChildBlock::grownCopy(std::uint64_t moreChildren,
 std::uint8_t* ChildBlock::grow(std::uint64_t moreChildren,
                                std::uint64_t moreBytes) {
     const Plan plan = planToGrow(moreChildren, moreBytes);
-    if (plan.isLarge() != isLarge()) {
+    if (plan.numberBytes() != numberBytes()) {
         std::uint8_t* const copy = grownCopy(moreChildren, moreBytes);
         std::free(memory_);
         return copy;
@@ -113,14 +127,15 @@ std::uint8_t* ChildBlock::shrink() noexcept {
     if (slack == 0) return memory_;
     setCapacity(capacity() - slack);
     void* const memory = std::realloc(
-        memory_, static_cast<std::size_t>(headerBytes(isLarge()) + capacity()));
+        memory_,
+        static_cast<std::size_t>(headerBytes(numberBytes()) + capacity()));
     // Without memory for it, the block stays where it is.
     return memory == nullptr ? memory_ : static_cast<std::uint8_t*>(memory);
 }
 
 // Moves the samples to where the capacity will end.
 void ChildBlock::setCapacity(std::uint64_t bytes) noexcept {
-    const std::uint64_t samples = sampleBytes(count(), isLarge());
+    const std::uint64_t samples = sampleBytes(count(), numberBytes());
     std::memmove(entries() + bytes - samples, entries() + capacity() - samples,
                  samples);
     setNumber(2, bytes);
@@ -134,7 +149,7 @@ std::uint8_t* ChildBlock::paddedCopy() const {
 
 std::uint64_t ChildBlock::slackBytes() const noexcept {
     if (memory_ == nullptr) return 0;
-    return capacity() - usedBytes() - sampleBytes(count(), isLarge());
+    return capacity() - usedBytes() - sampleBytes(count(), numberBytes());
 }
 
 // ---- Appending ----
@@ -158,8 +173,8 @@ bool ChildBlock::hasRoomFor(std::uint64_t moreChildren,
                             std::uint64_t moreBytes) const noexcept {
     if (memory_ == nullptr) return false;
     const std::uint64_t children = count() + moreChildren;
-    if (!isLarge() && children > maxSmall) return false;
-    const std::uint64_t samples = sampleBytes(children, isLarge());
+    if (children > maxNumber(numberBytes())) return false;
+    const std::uint64_t samples = sampleBytes(children, numberBytes());
     const std::uint64_t free = capacity() - usedBytes();
     return moreBytes <= free && samples <= free - moreBytes;
 }

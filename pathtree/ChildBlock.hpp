@@ -32,7 +32,7 @@ struct ChildBatch {
 // ChildBlock is a folder's children in one buffer, in the order of insertion.
 //
 //   | flags, 1 | count | used | capacity | entries, used | free | samples |
-//              |   2 or 8 bytes each     |<---------- capacity ----------->|
+//              |   1, 2 or 8 bytes each  |<---------- capacity ----------->|
 //
 //   entry of        | bytes
 //   ----------------+-------------------------------------------------------
@@ -43,7 +43,8 @@ struct ChildBatch {
 //
 //   flags     | says
 //   ----------+-------------------------------------------------------------
-//   large     | numbers have 8 bytes: for blocks of 64 KiB and more
+//   width     | two bits: numbers have 2^width bytes, 1 for blocks of up to
+//             | 255 bytes, 2 for up to 64 KiB, 8 beyond
 //   padded    | entries have at least 9 bytes, so that a file of any length
 //             | can become a folder in place
 //   folders   | there is a folder among the children
@@ -70,7 +71,8 @@ public:
     bool hasFolders() const noexcept { return hasFlag(folders); }
     bool hasFiles() const noexcept { return hasFlag(files); }
     std::uint8_t* entries() const noexcept {
-        return memory_ == nullptr ? nullptr : memory_ + headerBytes(isLarge());
+        return memory_ == nullptr ? nullptr
+                                  : memory_ + headerBytes(numberBytes());
     }
     // Where the entry of a child begins, counted from the first entry. The
     // position must be below count().
@@ -153,12 +155,11 @@ public:
 
 private:
     // Flags, a byte of the block.
-    static constexpr std::uint8_t large = 1;
-    static constexpr std::uint8_t padded = 2;
-    static constexpr std::uint8_t folders = 4;
-    static constexpr std::uint8_t files = 8;
+    static constexpr std::uint8_t width = 3;
+    static constexpr std::uint8_t padded = 4;
+    static constexpr std::uint8_t folders = 8;
+    static constexpr std::uint8_t files = 16;
 
-    static constexpr std::uint64_t maxSmall = 0xFFFF;
     static constexpr std::uint64_t childrenPerSample = 8;
 
     // What a block is for: its size follows.
@@ -171,58 +172,71 @@ private:
         // Of so many children, in so many bytes, and `slack` bytes beyond.
         Plan(std::uint64_t children, std::uint64_t bytes, std::uint64_t slack,
              std::uint8_t kind) noexcept;
-        bool isLarge() const noexcept { return (flags & large) != 0; }
+        std::size_t numberBytes() const noexcept { return bytesOf(flags); }
         std::uint64_t totalBytes() const noexcept {
-            return headerBytes(isLarge()) + capacity;
+            return headerBytes(numberBytes()) + capacity;
         }
     };
 
-    static constexpr std::size_t numberBytes(bool isLarge) noexcept {
-        return isLarge ? sizeof(std::uint64_t) : sizeof(std::uint16_t);
+    // Bytes of a number, as the flags say.
+    static constexpr std::size_t bytesOf(std::uint8_t flags) noexcept {
+        return std::size_t{1} << (flags & width);
     }
-    static constexpr std::size_t headerBytes(bool isLarge) noexcept {
-        return 1 + 3 * numberBytes(isLarge);
+    static constexpr std::uint64_t maxNumber(std::size_t numberBytes) noexcept {
+        return ~std::uint64_t{0} >> (64 - 8 * numberBytes);
+    }
+    static constexpr std::size_t headerBytes(std::size_t numberBytes) noexcept {
+        return 1 + 3 * numberBytes;
     }
     // Bytes of the samples of so many children.
-    static constexpr std::uint64_t sampleBytes(std::uint64_t children,
-                                               bool isLarge) noexcept {
-        return children == 0
-                   ? 0
-                   : (children - 1) / childrenPerSample * numberBytes(isLarge);
+    static constexpr std::uint64_t sampleBytes(
+        std::uint64_t children, std::size_t numberBytes) noexcept {
+        return children == 0 ? 0
+                             : (children - 1) / childrenPerSample * numberBytes;
     }
     static std::size_t sizeOfRare(const std::uint8_t* entry) noexcept;
 
     bool hasFlag(std::uint8_t flag) const noexcept {
         return memory_ != nullptr && (*memory_ & flag) != 0;
     }
-    bool isLarge() const noexcept { return hasFlag(large); }
+    std::size_t numberBytes() const noexcept {
+        return memory_ == nullptr ? 1 : bytesOf(*memory_);
+    }
     std::uint64_t capacity() const noexcept { return number(2); }
 
-    // Number i of the header or, counted on from there, of the block.
+    // Number i of the header.
     std::uint64_t number(std::size_t i) const noexcept {
-        if (memory_ == nullptr) return 0;
-        return isLarge() ? numberAt<std::uint64_t>(memory_ + 1, i)
-                         : numberAt<std::uint16_t>(memory_ + 1, i);
+        return memory_ == nullptr ? 0 : numberAt(headerNumber(i));
     }
     void setNumber(std::size_t i, std::uint64_t value) noexcept {
-        setNumberAt(memory_ + 1 + i * numberBytes(isLarge()), value);
+        setNumberAt(headerNumber(i), value);
+    }
+    std::uint8_t* headerNumber(std::size_t i) const noexcept {
+        return memory_ + 1 + i * numberBytes();
+    }
+    std::uint64_t numberAt(const std::uint8_t* at) const noexcept {
+        switch (numberBytes()) {
+            case sizeof(std::uint8_t):
+                return *at;
+            case sizeof(std::uint16_t):
+                return readAs<std::uint16_t>(at);
+            default:
+                return readAs<std::uint64_t>(at);
+        }
     }
     template <class Number>
-    static std::uint64_t numberAt(const std::uint8_t* first,
-                                  std::size_t i) noexcept {
+    static std::uint64_t readAs(const std::uint8_t* at) noexcept {
         Number value = 0;
-        std::memcpy(&value, first + i * sizeof value, sizeof value);
+        std::memcpy(&value, at, sizeof value);
         return value;
     }
     void setNumberAt(std::uint8_t* at, std::uint64_t value) noexcept;
 
     std::uint8_t* sampleAt(std::uint64_t j) const noexcept {
-        return entries() + capacity() - j * numberBytes(isLarge());
+        return entries() + capacity() - j * numberBytes();
     }
     std::uint64_t sample(std::uint64_t j) const noexcept {
-        const std::uint8_t* at = sampleAt(j);
-        return isLarge() ? numberAt<std::uint64_t>(at, 0)
-                         : numberAt<std::uint16_t>(at, 0);
+        return numberAt(sampleAt(j));
     }
 
     static ChildBlock begin(std::uint8_t* memory, const Plan& plan) noexcept;

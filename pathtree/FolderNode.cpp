@@ -73,6 +73,23 @@ void FolderNode::append(const ChildBatch& batch) {
             setBlock(block.grownCopy(batch.count, bytes));
     }
     children().append(batch);
+    adopt(batch);
+}
+
+void FolderNode::setParent(const FolderNode& parent) noexcept {
+    const std::int64_t steps = parent.stepsFrom(*this);
+    parent_ = static_cast<std::int32_t>(steps);
+    if (parent_ != steps) parent_ = 0;
+}
+
+void FolderNode::adopt(const ChildBatch& batch) noexcept {
+    if (!batch.hasFolders) return;
+    const std::uint8_t* entry = batch.entries.data();
+    for (std::uint64_t left = batch.count; left > 0; --left) {
+        if (FolderNode* folder = ChildBlock::read(entry).folder)
+            folder->setParent(*this);
+        entry += ChildBlock::sizeOf(entry, false);
+    }
 }
 
 void FolderNode::reservePromotion(std::uint64_t position) {

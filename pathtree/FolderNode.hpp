@@ -13,8 +13,8 @@ namespace tessel {
 // Its name, its share count and the way to its children are in one piece of a
 // NodeSlab. Files have no node: they are entries of their folder's ChildBlock.
 //
-//   | shares, 4 | length 6 | flags 2 bits | name | children |
-//   |           | one byte                |      |          |
+//   | shares, 4 | parent, 4 | length 6 | flags 2 bits | name | children |
+//   |           |           | one byte                |      |          |
 //
 //   length bits | length of the name | the name is in the bytes after
 //   ------------+--------------------+-----------------------------------------
@@ -29,8 +29,12 @@ namespace tessel {
 //   none         | where the 8 bytes here point to: a ChildBlock on the heap;
 //                | null: no children, as in a root without paths
 //
+// The parent is said as a distance: 0 for the root, and where it would be more
+// than 8 GiB.
+//
 // Invariants: the name never changes; children are only appended, or a file
-//   among them becomes a folder; every folder among them is kept alive.
+//   among them becomes a folder; every folder among them is kept alive, and
+//   is in one folder only.
 // Ownership: handles (BNodePtr) and the parent's block own shares of a node.
 // Threads: the count is atomic, all else must not be read while it changes.
 class FolderNode {
@@ -66,6 +70,27 @@ public:
         return ChildBlock::read(block.entries() + block.offsetOf(position));
     }
 
+    // The folder that this one is in, if that is known. It may be gone, unless
+    // somebody keeps the root alive.
+    const FolderNode* parent() const noexcept {
+        return parent_ == 0 ? nullptr : atSteps(parent_);
+    }
+
+    // How far this node is behind another one in memory, and the node that is
+    // so far behind this one.
+    std::int64_t stepsFrom(const FolderNode& other) const noexcept {
+        return (address() - other.address()) / step;
+    }
+    const FolderNode* atSteps(std::int64_t steps) const noexcept {
+        return reinterpret_cast<const FolderNode*>(
+            reinterpret_cast<const char*>(this) + steps * step);
+    }
+
+    // Asks the processor for the children.
+    void prefetchChildren() const noexcept {
+        __builtin_prefetch(children().memory());
+    }
+
     // Appends children. Throws std::bad_alloc, or std::length_error beyond
     // 2^32 - 1 children, with nothing changed.
     void append(const ChildBatch& batch);
@@ -77,6 +102,7 @@ public:
     // NOLINTNEXTLINE(readability-make-member-function-const)
     void promote(std::uint64_t position, FolderNode* folder) noexcept {
         children().promote(position, folder);
+        folder->setParent(*this);
     }
 
     // Gives back what growth of the children has left unused.
@@ -103,7 +129,16 @@ private:
     static constexpr unsigned lengthShift = 2;
     static constexpr unsigned longLength = 63;
 
+    static constexpr std::int64_t step = 4;
+
     FolderNode() noexcept = default;
+
+    std::int64_t address() const noexcept {
+        return static_cast<std::int64_t>(reinterpret_cast<std::intptr_t>(this));
+    }
+    void setParent(const FolderNode& parent) noexcept;
+    // Becomes the parent of the folders among new children.
+    void adopt(const ChildBatch& batch) noexcept;
 
     std::uint8_t* afterFlags() const noexcept {
         return const_cast<std::uint8_t*>(&lengthAndFlags_) + 1;
@@ -130,10 +165,11 @@ private:
     void releaseOwned() noexcept;
 
     std::atomic<std::uint32_t> shares_ = 1;
+    std::int32_t parent_ = 0;  // steps from here
     std::uint8_t lengthAndFlags_ = 0;
 };
 
-static_assert(alignof(FolderNode) >= 4);
+static_assert(alignof(FolderNode) == 4);
 
 inline ComponentView Child::value() const noexcept {
     return folder != nullptr ? folder->value() : name;

@@ -103,6 +103,7 @@ FolderNode* NodePool::make(ComponentView name, const ChildBatch& children) {
         ChildBlock::write(at, children);
     else
         put(at, block.release());
+    node->adopt(children);
     return node;
 }
 

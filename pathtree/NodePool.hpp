@@ -13,9 +13,9 @@ class NodeSlab;
 //
 //   a node takes | beside its name and its children
 //   -------------+-------------------------------------------------------
-//   5 to 8 bytes | up to 62 bytes of name
-//   13 to 16     | 63 to 1,024 bytes
-//   21 to 24     | more; the name has a heap block of its own (8 to 23
+//   9 to 12      | up to 62 bytes of name
+//   17 to 20     | 63 to 1,024 bytes
+//   25 to 28     | more; the name has a heap block of its own (8 to 23
 //                | bytes more)
 //   8 more       | if the block of children is not small: it is on the heap
 //

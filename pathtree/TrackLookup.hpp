@@ -56,8 +56,15 @@ public:
             visitFolder(child.value());
             folder = child.folder;
         }
-        const Child end = BatchFiles::childAt(folder, track.back());
-        if (end.folder == nullptr) return {*folder, track.back()};
+        return openLast(folder, track.back(), visitFolder);
+    }
+
+    // The same for a track that is known but for its last position.
+    template <class VisitFolder>
+    static BatchFiles openLast(const FolderNode* folder, std::uint64_t last,
+                               VisitFolder&& visitFolder) {
+        const Child end = BatchFiles::childAt(folder, last);
+        if (end.folder == nullptr) return {*folder, last};
         visitFolder(end.value());
         return {*end.folder, 0};
     }

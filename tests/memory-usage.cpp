@@ -148,8 +148,8 @@ TEST(MemoryUsageParts, SmallFoldersNeedNoBlockOfTheirOwn) {
     const std::size_t ofTheRoot = listBytes(0);
     EXPECT_LE(ofTheRoot, 32U);
     EXPECT_EQ(listBytes(1), ofTheRoot);
-    EXPECT_EQ(listBytes(57), ofTheRoot);
-    EXPECT_GT(listBytes(58), ofTheRoot);
+    EXPECT_EQ(listBytes(60), ofTheRoot);
+    EXPECT_GT(listBytes(61), ofTheRoot);
     EXPECT_GE(listBytes(200), ofTheRoot + 200);
     EXPECT_LE(listBytes(200), ofTheRoot + 200 + 48 + 7 + 24);
 }

@@ -1,9 +1,10 @@
 // Packed children beside a plain vector: batches, folders, files that become
-// folders, growth over both border of numbers, and trees that share them.
+// folders, growth over all borders of numbers, and trees that share them.
 
 #include <gtest/gtest.h>
 #include <rapidcheck/gtest.h>
 
+#include <algorithm>
 #include <array>
 #include <map>
 #include <set>
@@ -132,16 +133,17 @@ RC_GTEST_PROP(ChildBlock, EqualsAVector, ()) {
     }
 }
 
-// The block's numbers have two bytes at first: one step at a time over the
-// border, of bytes and of children.
-TEST(ChildBlock, GrowsOverTheBorderOfSmallBlocks) {
+// The block's numbers have one byte at first, then two: one step at a time
+// over the borders, of bytes and of children.
+void growOver(std::size_t border) {
     for (const std::size_t length : {0U, 20U, 252U}) {
         NodePool pool;
         const BNodePtr node = BNodePtr::adopt(pool.make({}, {}));
         FolderNode& folder = *node->folder();
         ComponentArena arena;
-        const std::size_t perBlock = 65535 / (1 + length);
-        const std::size_t first = perBlock - perBlock / 100 - 40;
+        const std::size_t perBlock = border / (1 + length);
+        const std::size_t distance = perBlock / 100 + 40;
+        const std::size_t first = perBlock - std::min(perBlock, distance);
         for (std::size_t i = 0; i < first; ++i)
             arena.append(Component(length, static_cast<std::uint8_t>(i)));
         auto list = arena.finish();
@@ -159,6 +161,9 @@ TEST(ChildBlock, GrowsOverTheBorderOfSmallBlocks) {
                 Component(length, static_cast<std::uint8_t>(i))));
     }
 }
+
+TEST(ChildBlock, GrowsOverTheBorderOfOneByte) { growOver(255); }
+TEST(ChildBlock, GrowsOverTheBorderOfTwoBytes) { growOver(65535); }
 
 // ---- A tree and its copy, beside plain lists of children ----
 

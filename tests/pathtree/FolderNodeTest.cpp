@@ -161,4 +161,47 @@ TEST(FolderNode, IsReleasedWithEveryKindOfChild) {
     EXPECT_EQ(held->children()[0].children()[20].value().size(), 300U);
 }
 
+// ---- The way up ----
+
+TEST(FolderNode, AFolderKnowsWhatItIsIn) {
+    NodePool pool;
+    ComponentArena arena;
+    const BNodePtr root = BNodePtr::adopt(pool.make({}, {}));
+    EXPECT_EQ(root->folder()->parent(), nullptr);
+
+    FolderNode* const inner = pool.make(valueOf(3), {});
+    FolderNode* const made = pool.make(valueOf(4), OneFolder(inner).batch());
+    EXPECT_EQ(inner->parent(), made);
+    EXPECT_EQ(made->parent(), nullptr);
+
+    root->folder()->append(OneFolder(made).batch());
+    EXPECT_EQ(made->parent(), root->folder());
+
+    root->folder()->append(filesOf(arena, {valueOf(9), valueOf(20)}));
+    root->folder()->reservePromotion(2);
+    FolderNode* const promoted = pool.make(valueOf(20), {});
+    root->folder()->promote(2, promoted);
+    EXPECT_EQ(promoted->parent(), root->folder());
+}
+
+// Files and folders in turn: each folder is found among them.
+TEST(FolderNode, FoldersAmongFilesKnowWhatTheyAreIn) {
+    NodePool pool;
+    std::vector<std::uint8_t> entries;
+    std::vector<FolderNode*> folders;
+    for (std::size_t i = 0; i < 40; ++i) {
+        folders.push_back(pool.make(valueOf(i), {}));
+        entries.resize(entries.size() + ChildBlock::folderEntryBytes);
+        ChildBlock::writeFolder(
+            entries.data() + entries.size() - ChildBlock::folderEntryBytes,
+            folders.back());
+        entries.push_back(static_cast<std::uint8_t>(i));
+        entries.insert(entries.end(), i, 7);
+    }
+    const BNodePtr root =
+        BNodePtr::adopt(pool.make({}, {entries, 80, true, true}));
+    for (const FolderNode* folder : folders)
+        EXPECT_EQ(folder->parent(), root->folder());
+}
+
 }  // namespace

@@ -27,19 +27,19 @@ TEST(NodePool, ANodeTakesItsNameItsChildrenAndAFewBytes) {
             tessel::Component(length, 1), {list.bytes(), list.size(), false}));
         const BNodePtr after = empty(pool);
         return reinterpret_cast<std::uintptr_t>(after->folder()) -
-               reinterpret_cast<std::uintptr_t>(before->folder()) - 16;
+               reinterpret_cast<std::uintptr_t>(before->folder()) - 20;
     };
-    EXPECT_EQ(distance(0, 0), 16U);  // 5, and the way to children: 8
-    EXPECT_EQ(distance(3, 0), 16U);
-    EXPECT_EQ(distance(4, 0), 20U);
-    EXPECT_EQ(distance(62, 0), 76U);
-    EXPECT_EQ(distance(63, 0), 84U);
-    EXPECT_EQ(distance(50000, 0), 32U);
-    EXPECT_EQ(distance(3, 1), 24U);  // 5 + 3, a header of 7, an entry of 6
+    EXPECT_EQ(distance(0, 0), 20U);  // 9, and the way to children: 8
+    EXPECT_EQ(distance(3, 0), 20U);
+    EXPECT_EQ(distance(4, 0), 24U);
+    EXPECT_EQ(distance(62, 0), 80U);
+    EXPECT_EQ(distance(63, 0), 88U);
+    EXPECT_EQ(distance(50000, 0), 36U);
+    EXPECT_EQ(distance(3, 1), 24U);  // 9 + 3, a header of 4, an entry of 6
     EXPECT_EQ(distance(3, 2), 28U);
-    EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
-    EXPECT_EQ(distance(3, 29), 196U);  // three samples of 2, too
-    EXPECT_EQ(distance(3, 30), 16U);   // more than fits: on the heap
+    EXPECT_EQ(distance(3, 29), 196U);  // three samples of 1, too
+    EXPECT_EQ(distance(3, 30), 200U);
+    EXPECT_EQ(distance(3, 31), 20U);  // more than fits: on the heap
 }
 
 TEST(NodePool, SlabsGrowWithWhatWasMade) {

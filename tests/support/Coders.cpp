@@ -226,6 +226,33 @@ std::string brokenInDuplicates(const HuffmanPathTree& coder) {
     return "";
 }
 
+// The folder at the end of a track, or nullptr.
+const tessel::FolderNode* folderAt(const tessel::FolderNode& root,
+                                   const tessel::PathTrack& track) {
+    const tessel::FolderNode* folder = &root;
+    for (const std::uint64_t position : track) {
+        if (folder == nullptr || position >= folder->children().count())
+            return nullptr;
+        folder = folder->child(position).folder;
+    }
+    return folder;
+}
+
+std::string brokenInShortcuts(const HuffmanPathTree& coder) {
+    const tessel::PathTracks& tracks = coder.partitionTracks;
+    const tessel::FolderNode& root = *coder.pathTree->root->folder();
+    for (std::size_t k = 0; k < tracks.size(); ++k) {
+        const auto [folder, isEnd] = tracks.folders().find(k, root);
+        if (folder == nullptr) continue;
+        tessel::PathTrack track = tracks[k];
+        if (track.empty()) return "a shortcut for an empty track";
+        if (!isEnd) track.pop_back();
+        if (folderAt(root, track) != folder)
+            return "a shortcut leads elsewhere than its track";
+    }
+    return "";
+}
+
 }  // namespace
 
 std::string brokenInvariant(const HuffmanPathTree& coder, bool loaded) {
@@ -233,8 +260,9 @@ std::string brokenInvariant(const HuffmanPathTree& coder, bool loaded) {
     if (!coder.pathTree->root) return "the path tree has no root";
     if (!coder.pathTree->root->value().empty()) return "the root has a value";
     if (!coder.genThreads.empty()) return "a worker is left behind";
-    if (loaded) return "";
-    std::string broken = brokenInCode(coder);
+    std::string broken = brokenInShortcuts(coder);
+    if (loaded) return broken;
+    if (broken.empty()) broken = brokenInCode(coder);
     if (broken.empty()) broken = brokenInPartitions(coder);
     if (broken.empty()) broken = brokenInDuplicates(coder);
     return broken;
