@@ -48,6 +48,11 @@ public:
         return {root.atSteps(entry >> 1), (entry & 1) != 0};
     }
 
+    // Asks the processor for what find will look at.
+    void prefetch(std::size_t k) const noexcept {
+        __builtin_prefetch(entries_.data() + k);
+    }
+
     void shrinkToFit() { entries_.shrink_to_fit(); }
     // Bytes on the heap.
     std::size_t memoryBytes() const noexcept {

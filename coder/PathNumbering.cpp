@@ -64,6 +64,7 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
     if (!starts_.empty()) {
         const std::size_t start = starts_[std::min<std::uint64_t>(
             number >> shift_, starts_.size() - 1)];
+        partitionTracks.folders().prefetch(start);
         // Not if the table lags behind, or the ends were changed by hand.
         if (start > k && start <= partitionEnds.size() &&
             !holds(*at(start - 1)))
