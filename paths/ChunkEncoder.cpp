@@ -152,7 +152,9 @@ EncodedChunk encodeChunk(const HuffmanCode& code, const PathList& paths,
     workers.front().run(paths, cuts[0], cuts[1]);
     for (Worker& worker : workers)
         if (worker.thread.joinable()) worker.thread.join();
-    return joined(workers);
+    EncodedChunk all = joined(workers);
+    all.pathCount = paths.size();
+    return all;
 }
 
 }  // namespace tessel::paths

@@ -22,6 +22,7 @@ struct EncodedChunk {
     std::vector<ComponentList> files;
     ComponentBuffers buffers;  // what both lists point into
     std::size_t maxComponentBytes = 0;
+    std::size_t pathCount = 0;
 };
 
 // Encodes the paths on at most that many threads (0: two). The result does not

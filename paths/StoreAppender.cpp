@@ -1,11 +1,10 @@
 #include "paths/StoreAppender.hpp"
 
-#include <algorithm>
+#include <system_error>
 #include <thread>
 #include <utility>
 
 #include "coder/HuffmanPathTree.hpp"
-#include "paths/ChunkEncoder.hpp"
 
 namespace tessel::paths {
 
@@ -18,24 +17,47 @@ void StoreAppender::add(std::string_view path) {
 
 void StoreAppender::finish() {
     if (!chunk_.empty()) addChunk();
+    insertWaiting();
+}
+
+EncodedChunk StoreAppender::encoded() const {
+    return encodeChunk(coder_->code(), chunk_,
+                       std::thread::hardware_concurrency());
 }
 
 void StoreAppender::addChunk() {
-    const std::size_t count = chunk_.size();
-    const EncodedChunk encoded = encodeChunk(
-        coder_->code(), chunk_, std::thread::hardware_concurrency());
+    std::future<EncodedChunk> next;
+    // One chunk is not worth a thread that only waits for it.
+    if (waiting_.pathCount > 0) next = begunEncoding();
+    insertWaiting();
+    waiting_ = next.valid() ? next.get() : encoded();
     chunk_.clear();
-    hasStarted_ = true;
-    coder_->maxCodeBytes.raise(encoded.maxComponentBytes);
+}
+
+// Without a thread to be had, nothing is begun.
+std::future<EncodedChunk> StoreAppender::begunEncoding() const {
     try {
-        coder_->encodedFolders = encoded.folders;
-        coder_->encodedFiles = encoded.files;
+        return std::async(std::launch::async, [this] { return encoded(); });
+    } catch (const std::system_error&) {
+        return {};
+    }
+}
+
+void StoreAppender::insertWaiting() {
+    const std::size_t count = waiting_.pathCount;
+    if (count == 0) return;
+    hasStarted_ = true;
+    coder_->maxCodeBytes.raise(waiting_.maxComponentBytes);
+    try {
+        coder_->encodedFolders = std::move(waiting_.folders);
+        coder_->encodedFiles = std::move(waiting_.files);
         coder_->addPathToBTreeFromAsyncData();
     } catch (...) {
         // They refer to what is encoded here.
         coder_->clearThreadResources();
         throw;
     }
+    waiting_ = {};
     pathCount_ += count;
 }
 

@@ -1,9 +1,11 @@
 #pragma once
 
 #include <cstddef>
+#include <future>
 #include <string_view>
 #include <vector>
 
+#include "paths/ChunkEncoder.hpp"
 #include "paths/PathList.hpp"
 
 namespace tessel {
@@ -17,10 +19,13 @@ namespace tessel::paths {
 // StoreAppender adds paths to a store's coder, a chunk at a time. The coder
 // must have a code for all their characters.
 //
+// A chunk is encoded on other threads while the one before is inserted on the
+// caller's, where all of the coder's memory comes from.
+//
 // Ownership: keeps a reference to the coder.
 // Threads: works on as many as the hardware runs. What is added does not
 //   depend on their number.
-// Cost: at most a chunk's text and its encoded names, see the limits.
+// Cost: at most a chunk's text and two chunks' encoded names, see the limits.
 class StoreAppender {
 public:
     explicit StoreAppender(HuffmanPathTree& coder) : coder_(&coder) {}
@@ -42,9 +47,14 @@ public:
 
 private:
     void addChunk();
+    EncodedChunk encoded() const;
+    std::future<EncodedChunk> begunEncoding() const;
+    // Inserts the chunk that waits, if there is one.
+    void insertWaiting();
 
     HuffmanPathTree* coder_;
     PathList chunk_;
+    EncodedChunk waiting_;  // encoded, to be inserted
     std::size_t pathCount_ = 0;
     bool hasStarted_ = false;
 };

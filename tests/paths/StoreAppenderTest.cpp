@@ -33,21 +33,40 @@ TEST(StoreAppender, NothingIsAddedBeforeTheEnd) {
     EXPECT_EQ(coder->pathCount, 2U);
 }
 
-TEST(StoreAppender, AFullChunkIsAdded) {
+// A full chunk waits until the next one is full or the end is there.
+TEST(StoreAppender, FullChunksAreAddedInOrder) {
     const auto coder = smallCoder();
     StoreAppender appender(*coder);
     const std::string big(StoreAppender::maxBytesPerChunk / 4, 'a');
-    for (int i = 0; i < 3; ++i) appender.add(big + std::to_string(i));
+    for (int i = 0; i < 7; ++i) appender.add(big + std::to_string(i));
     EXPECT_EQ(coder->pathCount, 0U);
-    appender.add(big + "3");
+    EXPECT_FALSE(appender.hasStarted());
+    appender.add(big + "7");
     EXPECT_EQ(coder->pathCount, 4U);
+    EXPECT_TRUE(appender.hasStarted());
     appender.add("b");
     appender.finish();
+    EXPECT_EQ(appender.pathCount(), 9U);
+    ASSERT_EQ(coder->pathCount, 9U);
     std::string text;
-    readPath(*coder, 3, text);
-    EXPECT_EQ(text, big + "3");
-    readPath(*coder, 4, text);
+    for (std::size_t i = 0; i < 8; ++i) {
+        readPath(*coder, i, text);
+        EXPECT_EQ(text, big + std::to_string(i));
+    }
+    readPath(*coder, 8, text);
     EXPECT_EQ(text, "b");
+}
+
+TEST(StoreAppender, ARefusedChunkLeavesTheOneBefore) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder);
+    const std::string big(StoreAppender::maxBytesPerChunk, 'a');
+    appender.add(big);
+    appender.add("?");
+    EXPECT_THROW(appender.finish(), tessel::CodeNotFoundException);
+    EXPECT_TRUE(appender.hasStarted());
+    EXPECT_EQ(coder->pathCount, 1U);
+    EXPECT_TRUE(coder->encodedFolders.empty());
 }
 
 TEST(StoreAppender, ARefusedChunkLeavesTheCoder) {
