@@ -91,7 +91,7 @@ void BatchInserter::insertFolder(const ComponentList& components,
 
 // A batch that brought no file may have left a file as its folder.
 void BatchInserter::noteFolder(BNode folder, bool isEnd) noexcept {
-    if (folder.folder() != nullptr)
+    if (folder.folder() != nullptr && tree_.root->folder() != nullptr)
         numbering_.partitionTracks.noteFolder(*tree_.root,
                                               {folder.folder(), isEnd});
 }

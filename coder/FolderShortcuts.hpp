@@ -36,16 +36,17 @@ public:
     // Makes sure that the next note for track k does not throw.
     void reserveFor(std::size_t k);
     // Notes that track k leads to this folder in the tree of this root. What
-    // is known of another root's tree, or of later tracks, is forgotten.
+    // is known of another root's tree, or of later tracks, is forgotten. The
+    // root must be a folder.
     void note(std::size_t k, BNode root, Shortcut shortcut) noexcept;
 
-    // Where track k leads in the tree of this root.
-    Shortcut find(std::size_t k, const FolderNode& root) const noexcept {
-        if (k >= entries_.size() || root_->folder() != &root) return {};
+    // Where track k leads in the tree of this root; null has none.
+    Shortcut find(std::size_t k, const FolderNode* root) const noexcept {
+        if (k >= entries_.size() || root_->folder() != root) return {};
         const std::int32_t entry = entries_[k];
         if (entry == unknown) return {};
         // Rounds down, for entries below 0, too.
-        return {root.atSteps(entry >> 1), (entry & 1) != 0};
+        return {root->atSteps(entry >> 1), (entry & 1) != 0};
     }
 
     // Asks the processor for what find will look at.

@@ -116,10 +116,10 @@ BatchFiles PathRetrieval::openPartition(std::size_t k, FolderChain& chain,
                                         PathTrack& track,
                                         Visitor& visitor) const {
     const PathTracks& tracks = numbering_.partitionTracks;
-    const FolderNode& root = *tree_.root->folder();
+    const FolderNode* const root = tree_.root->folder();
     const auto visitFolder = [&](ComponentView name) { visitor.folder(name); };
     const auto [folder, isEnd] = tracks.folders().find(k, root);
-    if (folder == nullptr || !chain.find(root, *folder)) {
+    if (folder == nullptr || !chain.find(*root, *folder)) {
         tracks.read(k, track);
         return TrackLookup(*tree_.root).openBatch(track, visitFolder);
     }

@@ -30,12 +30,12 @@ protected:
         shortcuts.note(k, *root_, {root().atSteps(steps), isEnd});
     }
     void expect(std::size_t k, std::int64_t steps, bool isEnd) {
-        const auto [folder, found] = shortcuts.find(k, root());
+        const auto [folder, found] = shortcuts.find(k, &root());
         EXPECT_EQ(folder, root().atSteps(steps)) << k;
         EXPECT_EQ(found, isEnd) << k;
     }
     bool knows(std::size_t k) {
-        return shortcuts.find(k, root()).folder != nullptr;
+        return shortcuts.find(k, &root()).folder != nullptr;
     }
 
     FolderShortcuts shortcuts;
@@ -49,6 +49,8 @@ TEST_F(FolderShortcutsTest, NothingIsKnownAtFirst) {
     EXPECT_FALSE(knows(0));
     EXPECT_FALSE(knows(~std::size_t{0}));
     EXPECT_EQ(shortcuts.memoryBytes(), 0U);
+    note(0, 5, true);
+    EXPECT_EQ(shortcuts.find(0, nullptr).folder, nullptr);
 }
 
 TEST_F(FolderShortcutsTest, AFolderIsFoundOnEitherSideOfTheRoot) {
@@ -90,10 +92,10 @@ TEST_F(FolderShortcutsTest, AnotherRootKnowsNothing) {
     note(0, 5, true);
     NodePool pool;
     const BNodePtr other = BNodePtr::adopt(pool.make({}, {}));
-    EXPECT_EQ(shortcuts.find(0, *other->folder()).folder, nullptr);
+    EXPECT_EQ(shortcuts.find(0, other->folder()).folder, nullptr);
     shortcuts.note(0, *other, {other->folder()->atSteps(9), true});
     EXPECT_FALSE(knows(0));
-    EXPECT_EQ(shortcuts.find(0, *other->folder()).folder,
+    EXPECT_EQ(shortcuts.find(0, other->folder()).folder,
               other->folder()->atSteps(9));
 }
 
@@ -105,7 +107,7 @@ TEST(FolderShortcuts, ACoderKnowsTheFoldersThatItAdded) {
     addBatch(*coder, {u"a"}, {u"c", u"d"});
     addBatch(*coder, {}, {u"d"});
     const PathTracks& tracks = coder->partitionTracks;
-    const FolderNode& root = *coder->pathTree->root->folder();
+    const FolderNode* const root = coder->pathTree->root->folder();
     ASSERT_NE(tracks.folders().find(0, root).folder, nullptr);
     EXPECT_TRUE(tracks.folders().find(0, root).isEnd);
     ASSERT_NE(tracks.folders().find(1, root).folder, nullptr);
@@ -126,7 +128,7 @@ TEST(FolderShortcuts, ARestoredCoderAndACopyKnowThemToo) {
     tessel::HuffmanPathTree copy;
     copy.copyTree(*coder);
     for (const tessel::HuffmanPathTree* known : {back.get(), &copy}) {
-        const FolderNode& root = *known->pathTree->root->folder();
+        const FolderNode* const root = known->pathTree->root->folder();
         for (std::size_t k = 0; k < 3; ++k)
             EXPECT_NE(known->partitionTracks.folders().find(k, root).folder,
                       nullptr)

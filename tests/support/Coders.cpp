@@ -240,14 +240,14 @@ const tessel::FolderNode* folderAt(const tessel::FolderNode& root,
 
 std::string brokenInShortcuts(const HuffmanPathTree& coder) {
     const tessel::PathTracks& tracks = coder.partitionTracks;
-    const tessel::FolderNode& root = *coder.pathTree->root->folder();
+    const tessel::FolderNode* const root = coder.pathTree->root->folder();
     for (std::size_t k = 0; k < tracks.size(); ++k) {
         const auto [folder, isEnd] = tracks.folders().find(k, root);
         if (folder == nullptr) continue;
         tessel::PathTrack track = tracks[k];
         if (track.empty()) return "a shortcut for an empty track";
         if (!isEnd) track.pop_back();
-        if (folderAt(root, track) != folder)
+        if (folderAt(*root, track) != folder)
             return "a shortcut leads elsewhere than its track";
     }
     return "";
