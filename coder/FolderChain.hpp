@@ -25,6 +25,8 @@ public:
     // empty chain, if the way up is not known or has more folders.
     bool find(const FolderNode& root, const FolderNode& folder) noexcept {
         folder.prefetchChildren();
+        // Not cleared either.
+        // NOLINTNEXTLINE(cppcoreguidelines-pro-type-member-init)
         std::array<const FolderNode*, maxDepth> above;
         std::size_t count = 0;
         std::size_t kept = 0;

@@ -34,7 +34,7 @@ std::uint64_t ChildBlock::offsetOf(std::uint64_t position) const noexcept {
 
 ChildBlock::Plan::Plan(std::uint64_t children, std::uint64_t bytes,
                        std::uint64_t slack, std::uint8_t kind) noexcept
-    : count(children), used(bytes), capacity(0), flags(kind) {
+    : count(children), used(bytes), flags(kind) {
     constexpr std::array<std::uint8_t, 3> widths = {0, 1, 3};
     for (const std::uint8_t exponent : widths) {
         flags = static_cast<std::uint8_t>(kind | exponent);

@@ -166,7 +166,7 @@ private:
     struct Plan {
         std::uint64_t count;
         std::uint64_t used;
-        std::uint64_t capacity;
+        std::uint64_t capacity = 0;
         std::uint8_t flags;
 
         // Of so many children, in so many bytes, and `slack` bytes beyond.

@@ -82,7 +82,7 @@ void FolderNode::setParent(const FolderNode& parent) noexcept {
     if (parent_ != steps) parent_ = 0;
 }
 
-void FolderNode::adopt(const ChildBatch& batch) noexcept {
+void FolderNode::adopt(const ChildBatch& batch) const noexcept {
     if (!batch.hasFolders) return;
     const std::uint8_t* entry = batch.entries.data();
     for (std::uint64_t left = batch.count; left > 0; --left) {

@@ -138,7 +138,7 @@ private:
     }
     void setParent(const FolderNode& parent) noexcept;
     // Becomes the parent of the folders among new children.
-    void adopt(const ChildBatch& batch) noexcept;
+    void adopt(const ChildBatch& batch) const noexcept;
 
     std::uint8_t* afterFlags() const noexcept {
         return const_cast<std::uint8_t*>(&lengthAndFlags_) + 1;
