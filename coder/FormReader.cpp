@@ -1,6 +1,7 @@
 #include "coder/FormReader.hpp"
 
 #include <algorithm>
+#include <exception>
 #include <utility>
 
 #include "coder/FormMarkers.hpp"
@@ -17,6 +18,20 @@ namespace {
 
 PackedSizeT takeWidth(ByteCursor& cursor) {
     return static_cast<PackedSizeT>(cursor.takeByte());
+}
+
+// A copy of the next n bytes, taken in pieces: a source need not have all of
+// them in memory beside it.
+std::vector<std::uint8_t> takeCopy(ByteCursor& cursor, std::uint64_t n) {
+    constexpr std::uint64_t pieceBytes = 4096;
+    cursor.requireItems(n, 1);
+    std::vector<std::uint8_t> copy;
+    copy.reserve(static_cast<std::size_t>(n));
+    while (copy.size() < n) {
+        const auto piece = cursor.take(std::min(pieceBytes, n - copy.size()));
+        copy.insert(copy.end(), piece.begin(), piece.end());
+    }
+    return copy;
 }
 
 }  // namespace
@@ -50,24 +65,31 @@ void FormReader::readShape(ByteCursor& cursor) {
     if (!HuffmanCode::isShape(shape)) throw DamagedFormException();
 }
 
+// All values are judged, those behind a node that cannot be made, too: a value
+// that is no value is reported before such a node.
 void FormReader::readTree(ByteCursor& cursor) {
-    const auto nodeCodes = sixpacks::unpackVector(cursor, PackedSizeT::Uint64);
+    const std::vector<std::uint8_t> nodeCodes =
+        takeCopy(cursor, cursor.takeUint(PackedSizeT::Uint64));
     const std::uint64_t count = cursor.takeUint(PackedSizeT::Uint64);
     const PackedSizeT width = takeWidth(cursor);
     if (count > 0) cursor.requireItems(count, sixpacks::widthBytes(width));
-    // All values are judged before the first node is made.
-    ByteCursor values = cursor;
     numbering.maxCodeBytes = 0;
-    for (std::uint64_t i = 0; i < count; ++i)
-        numbering.maxCodeBytes.raise(
-            sixpacks::unpackVector(cursor, width).size());
     numbering.pathCount = 0;
     if (nodeCodes.empty() && count == 0) return;
     TreeBuilder builder(*tree, nodeCodes);
-    for (std::uint64_t i = 0; !builder.complete(); ++i) {
-        if (i == count) throw DamagedFormException();
-        builder.add(sixpacks::unpackVector(values, width));
+    std::exception_ptr failure;
+    for (std::uint64_t i = 0; i < count; ++i) {
+        const auto value = sixpacks::unpackVector(cursor, width);
+        numbering.maxCodeBytes.raise(value.size());
+        if (failure || builder.complete()) continue;
+        try {
+            builder.add(value);
+        } catch (...) {
+            failure = std::current_exception();
+        }
     }
+    if (failure) std::rethrow_exception(failure);
+    if (!builder.complete()) throw DamagedFormException();
     numbering.pathCount = builder.leaves();
 }
 

@@ -15,7 +15,8 @@ namespace tessel {
 //
 // Input may be hostile: throws DamagedFormException,
 // InvalidUintConversionException or UnknownNodeTypeException.
-// Ownership: a value. Memory is bounded by the payload, see TreeBuilder.
+// Ownership: a value. Memory is bounded by the payload, see TreeBuilder; of the
+//   payload it keeps a copy of the node codes while it makes the tree.
 class FormReader {
 public:
     // New partitions are appended to those of `before`.

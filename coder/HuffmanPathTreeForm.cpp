@@ -30,9 +30,29 @@
 #include "coder/FormWriter.hpp"
 #include "coder/HuffmanCode.hpp"
 #include "coder/HuffmanPathTree.hpp"
+#include "packing/Inflater.hpp"
 #include "packing/sixpacks.hpp"
 
 namespace tessel {
+
+namespace {
+
+// Reads the payload while it is inflated, so that it is never whole in memory.
+// A damaged stream is reported before anything that is wrong with the payload.
+void readCompressed(FormReader& reader, std::span<const std::uint8_t> stream,
+                    std::uint64_t payloadLength) {
+    sixpacks::Inflater inflater(stream, payloadLength);
+    sixpacks::ByteCursor cursor(inflater);
+    try {
+        reader.read(cursor);
+    } catch (...) {
+        inflater.finish();
+        throw;
+    }
+    inflater.finish();
+}
+
+}  // namespace
 
 void HuffmanPathTree::serialize(std::vector<std::uint8_t>& out,
                                 bool compress) const {
@@ -66,13 +86,11 @@ void HuffmanPathTree::deserialize(std::vector<std::uint8_t>& in,
     sixpacks::ByteCursor form(in);
     const std::uint64_t payloadLength =
         form.takeUint(sixpacks::PackedSizeT::Uint64);
-    const auto body = form.take(form.remaining());
-    std::vector<std::uint8_t> payload;
-    if (compress) payload = sixpacks::decompressChecked(body, payloadLength);
-    sixpacks::ByteCursor cursor(
-        compress ? std::span<const std::uint8_t>(payload) : body);
     FormReader reader(*numbering_);
-    reader.read(cursor);
+    if (compress)
+        readCompressed(reader, form.take(form.remaining()), payloadLength);
+    else
+        reader.read(form);
     code_->boolTree = std::move(reader.shape);
     pathTree = std::move(reader.tree);
     *numbering_ = std::move(reader.numbering);

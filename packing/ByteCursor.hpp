@@ -56,22 +56,48 @@ constexpr std::uint64_t fromLittleEndian(
     return value;
 }
 
-// The one bounded reader of outside bytes. It borrows the bytes, which must
-// outlive it, and only moves forward. A read that asks for more than is left
-// throws DamagedFormException and leaves the cursor where it was.
+// Makes bytes for a ByteCursor, a block at a time, so that they need not all
+// be in memory.
+class ByteSource {
+public:
+    ByteSource() = default;
+    ByteSource(const ByteSource&) = delete;
+    ByteSource& operator=(const ByteSource&) = delete;
+    virtual ~ByteSource() = default;
+
+    // Bytes beyond the blocks that were made.
+    virtual std::size_t remaining() const noexcept = 0;
+
+    // The next block, of at least `size` bytes. It begins with `rest`, the
+    // end of the block before, which is no longer valid then. Throws
+    // DamagedFormException if there are fewer bytes.
+    virtual std::span<const std::uint8_t> nextBlock(
+        std::span<const std::uint8_t> rest, std::uint64_t size) = 0;
+};
+
+// The one bounded reader of outside bytes. It borrows the bytes or their
+// source, which must outlive it, and only moves forward. A read that asks for
+// more than is left throws DamagedFormException and leaves the cursor where it
+// was.
+//
+// Over a source, what take returned is valid until the next read, of a cursor
+// and its copies only one may be read, and none after the source has thrown.
 // Inline: reading a stored form is a long row of these calls.
 class ByteCursor {
 public:
     explicit ByteCursor(std::span<const std::uint8_t> bytes) noexcept
         : rest_(bytes) {}
+    explicit ByteCursor(ByteSource& source) noexcept : source_(&source) {}
 
-    bool empty() const noexcept { return rest_.empty(); }
-    std::size_t remaining() const noexcept { return rest_.size(); }
+    bool empty() const noexcept { return remaining() == 0; }
+    std::size_t remaining() const noexcept {
+        return rest_.size() + (source_ == nullptr ? 0 : source_->remaining());
+    }
 
     // The next n bytes; advances past them.
     // The only place where an outside length meets the end of the data.
     std::span<const std::uint8_t> take(std::uint64_t n) {
-        if (n > rest_.size()) throw DamagedFormException();
+        if (n > rest_.size()) fetch(n);
         const auto head = rest_.first(static_cast<std::size_t>(n));
         rest_ = rest_.subspan(static_cast<std::size_t>(n));
         return head;
@@ -90,11 +116,15 @@ public:
     // `bytesEach` (not 0) bytes can still follow. Call it before reserving
     // memory for a count that was read.
     void requireItems(std::uint64_t count, std::size_t bytesEach) const {
-        if (count > rest_.size() / bytesEach) throw DamagedFormException();
+        if (count > remaining() / bytesEach) throw DamagedFormException();
     }
 
 private:
+    // Has the source make more until n bytes are there.
+    void fetch(std::uint64_t n);
+
     std::span<const std::uint8_t> rest_;
+    ByteSource* source_ = nullptr;
 };
 
 }  // namespace sixpacks

@@ -8,10 +8,6 @@ namespace tessel::sixpacks {
 
 namespace {
 
-// Deflate's best case is a 258-byte match in two bits, so no stream grows by
-// more than this factor.
-constexpr std::uint64_t maxInflationFactor = 1032;
-
 constexpr int compressionLevel = 9;
 
 // The next n bytes, which the caller vouches for; advances `it` past them.
@@ -204,21 +200,6 @@ std::vector<std::uint8_t> decompressUint8(ByteIterator begin,
     const std::uint8_t* stream = compressedSize == 0 ? nullptr : &*begin;
     uncompress(result.data(), &length, stream, compressedSize);
     result.resize(length);
-    return result;
-}
-
-std::vector<std::uint8_t> decompressChecked(
-    std::span<const std::uint8_t> stream, std::uint64_t uncompressedSize) {
-    if (uncompressedSize / maxInflationFactor > stream.size())
-        throw DamagedFormException();
-    std::vector<std::uint8_t> result(
-        static_cast<std::size_t>(uncompressedSize));
-    uLongf length = result.size();
-    const int status =
-        uncompress(result.data(), &length, stream.data(), stream.size());
-    if (status == Z_MEM_ERROR) throw std::bad_alloc();
-    if (status != Z_OK || length != uncompressedSize)
-        throw DamagedFormException();
     return result;
 }
 

@@ -171,18 +171,10 @@ void appendCompressed(std::span<const std::uint8_t> data,
 
 // What zlib can get out of the stream at `begin`: at most uncompressedSize
 // bytes, fewer when the stream is damaged or shorter. Errors are not
-// reported, and uncompressedSize bytes are allocated first, so use
-// decompressChecked for outside bytes.
+// reported, and uncompressedSize bytes are allocated first: not for outside
+// bytes.
 std::vector<std::uint8_t> decompressUint8(ByteIterator begin,
                                           std::size_t compressedSize,
                                           std::size_t uncompressedSize);
-
-// The bytes of a zlib stream from outside, which must be whole, undamaged
-// and of exactly uncompressedSize bytes: DamagedFormException otherwise. A
-// size that no zlib stream of this length can reach is refused before memory
-// is taken for it: a stream of n bytes can demand 1,032 n bytes, no more.
-// Throws std::bad_alloc when memory runs out, zlib's own included.
-std::vector<std::uint8_t> decompressChecked(
-    std::span<const std::uint8_t> stream, std::uint64_t uncompressedSize);
 
 }  // namespace tessel::sixpacks

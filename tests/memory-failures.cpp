@@ -21,8 +21,7 @@ bool zlibHasMemory = true;
 extern "C" {
 int __real_compress2(Bytef* to, uLongf* toBytes, const Bytef* from,
                      uLong fromBytes, int level);
-int __real_uncompress(Bytef* to, uLongf* toBytes, const Bytef* from,
-                      uLong fromBytes);
+int __real_inflateInit_(z_streamp stream, const char* version, int size);
 
 int __wrap_compress2(Bytef* to, uLongf* toBytes, const Bytef* from,
                      uLong fromBytes, int level) {
@@ -30,9 +29,8 @@ int __wrap_compress2(Bytef* to, uLongf* toBytes, const Bytef* from,
                          : Z_MEM_ERROR;
 }
 
-int __wrap_uncompress(Bytef* to, uLongf* toBytes, const Bytef* from,
-                      uLong fromBytes) {
-    return zlibHasMemory ? __real_uncompress(to, toBytes, from, fromBytes)
+int __wrap_inflateInit_(z_streamp stream, const char* version, int size) {
+    return zlibHasMemory ? __real_inflateInit_(stream, version, size)
                          : Z_MEM_ERROR;
 }
 }
@@ -439,6 +437,20 @@ TEST(MemoryFailures, AFormTakesItsMemoryOnce) {
     const support::AllocationMeter meter;
     coder->serialize(out, false);
     EXPECT_LT(meter.total(), 2 * out.size());
+}
+
+// What a compressed form holds is never whole in memory.
+TEST(MemoryFailures, AFormIsInflatedAPieceAtATime) {
+    const CoderPtr coder = support::fourLetterCoder();
+    for (const char16_t letter : std::u16string(u"abcd"))
+        support::addBatch(*coder, Texts(1, std::u16string(1, letter)),
+                          Texts(200, std::u16string(2'000, u'd')));
+    Bytes form = support::formOf(*coder, true);
+    const std::size_t payload = support::formOf(*coder, false).size();
+    HuffmanPathTree restored;
+    const support::AllocationMeter meter;
+    restored.deserialize(form, true);
+    EXPECT_LT(meter.largest(), payload / 2);
 }
 
 // zlib takes its own memory, which no wrapper sees.

@@ -108,4 +108,25 @@ TEST(FormReader, ACutIsDamageUnlessItIsBetweenGroups) {
     }
 }
 
+// No shape; the codes; values whose lengths are bytes.
+Bytes treeOf(const Bytes& codes, const Bytes& values, std::uint8_t count) {
+    Bytes out(8);
+    const Bytes parts[] = {
+        {static_cast<std::uint8_t>(codes.size()), 0, 0, 0, 0, 0, 0, 0},
+        codes,
+        {count, 0, 0, 0, 0, 0, 0, 0, /*width*/ 0},
+        values};
+    for (const Bytes& part : parts)
+        out.insert(out.end(), part.begin(), part.end());
+    return out;
+}
+
+TEST(FormReader, AValueThatIsCutIsReportedBeforeANodeThatIsUnknown) {
+    const Bytes unknown = {9};
+    EXPECT_THROW(readBack(treeOf(unknown, {1, 'a', 1, 'b'}, 2)),
+                 tessel::UnknownNodeTypeException);
+    EXPECT_THROW(readBack(treeOf(unknown, {1, 'a', 2, 'b'}, 2)),
+                 DamagedFormException);
+}
+
 }  // namespace

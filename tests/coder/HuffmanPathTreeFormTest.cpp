@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <stdexcept>
 
+#include "packing/sixpacks.hpp"
 #include "tests/support/Coders.hpp"
 
 namespace {
@@ -668,6 +669,18 @@ TEST(CoderForm, AnUnknownNodeCodeIsRefusedAsSuch) {
         plainForm({shapeOfTwo, u64(1), {4}, u64(1), {0}, {1, 0xAB}}));
     expectRefused<tessel::UnknownNodeTypeException>(
         plainForm({shapeOfTwo, u64(2), {2, 0xFF}, u64(2), {0}, {1, 1, 1, 2}}));
+}
+
+TEST(CoderForm, ADamagedStreamIsReportedBeforeWhatItHolds) {
+    const Bytes plain =
+        plainForm({shapeOfTwo, u64(1), {4}, u64(1), {0}, {1, 0xAB}});
+    Bytes payload(plain.begin() + 8, plain.end());
+    Bytes form = u64(payload.size());
+    const Bytes stream = tessel::sixpacks::compressUint8(payload);
+    form.insert(form.end(), stream.begin(), stream.end());
+    expectRefused<tessel::UnknownNodeTypeException>(form, true);
+    form.back() ^= 1;
+    expectRefused<DamagedFormException>(form, true);
 }
 
 TEST(CoderForm, AnIncompleteTreeIsDamaged) {

@@ -242,7 +242,6 @@ TEST(PackedBlocks, AValidStreamOfTheExactSizeComesBack) {
         const Bytes stream = compressUint8(data);
         EXPECT_EQ(decompressUint8(stream.begin(), stream.size(), data.size()),
                   data);
-        EXPECT_EQ(decompressChecked(stream, data.size()), data);
     }
 }
 
@@ -254,49 +253,6 @@ TEST(PackedBlocks, TheTrustingReaderGivesWhatZlibGot) {
     EXPECT_EQ(decompressUint8(stream.begin(), stream.size(), 100),
               Bytes(data.begin(), data.begin() + 100));
     EXPECT_EQ(decompressUint8(stream.begin(), 0, 100), Bytes());
-}
-
-TEST(PackedBlocks, TheCheckedReaderWantsTheExactSize) {
-    Bytes data = manyBytes();
-    const Bytes stream = compressUint8(data);
-    for (const std::size_t size :
-         {std::size_t{0}, data.size() - 1, data.size() + 1, data.size() * 2})
-        EXPECT_THROW(decompressChecked(stream, size), DamagedFormException);
-}
-
-TEST(PackedBlocks, TheCheckedReaderWantsAWholeStream) {
-    Bytes data = manyBytes();
-    const Bytes stream = compressUint8(data);
-    for (std::size_t length = 0; length < stream.size(); ++length) {
-        const Bytes cut(stream.begin(),
-                        stream.begin() + static_cast<std::ptrdiff_t>(length));
-        EXPECT_THROW(decompressChecked(cut, data.size()), DamagedFormException);
-    }
-}
-
-TEST(PackedBlocks, TheCheckedReaderWantsTheRightChecksum) {
-    Bytes data = manyBytes();
-    Bytes stream = compressUint8(data);
-    stream.back() ^= 1;
-    EXPECT_THROW(decompressChecked(stream, data.size()), DamagedFormException);
-}
-
-TEST(PackedBlocks, TheBestCompressionThatExistsIsAccepted) {
-    Bytes data(8 << 20, 0);
-    const Bytes stream = compressUint8(data);
-    EXPECT_GT(data.size() / stream.size(), 1000U);
-    EXPECT_EQ(decompressChecked(stream, data.size()), data);
-}
-
-TEST(PackedBlocks, ASizeThatNoStreamReachesIsRefused) {
-    Bytes data(100, 0);
-    const Bytes stream = compressUint8(data);
-    EXPECT_THROW(decompressChecked(stream, stream.size() * 1100),
-                 DamagedFormException);
-    EXPECT_THROW(decompressChecked(stream, ~std::uint64_t{0}),
-                 DamagedFormException);
-    EXPECT_THROW(decompressChecked({}, 1), DamagedFormException);
-    EXPECT_THROW(decompressChecked({}, 0), DamagedFormException);
 }
 
 TEST(PackedBlocks, ADamagedFormSaysSo) {
