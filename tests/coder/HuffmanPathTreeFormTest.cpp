@@ -672,8 +672,9 @@ TEST(CoderForm, AnUnknownNodeCodeIsRefusedAsSuch) {
 }
 
 TEST(CoderForm, ADamagedStreamIsReportedBeforeWhatItHolds) {
-    const Bytes plain =
-        plainForm({shapeOfTwo, u64(1), {4}, u64(1), {0}, {1, 0xAB}});
+    // So much behind the unknown node that the damage is met only later.
+    const Bytes plain = plainForm(
+        {shapeOfTwo, u64(1), {4}, u64(1), {0}, {1, 0xAB}, Bytes(200'000, 9)});
     Bytes payload(plain.begin() + 8, plain.end());
     Bytes form = u64(payload.size());
     const Bytes stream = tessel::sixpacks::compressUint8(payload);
