@@ -52,6 +52,7 @@ void PathNumbering::noteWholePath(PathTrack& track, bool existed) {
 
 std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
                                               std::uint64_t number) const {
+    if (k >= partitionEnds.size()) return partitionEnds.size();
     const auto begin = partitionEnds.begin();
     const auto at = [begin](std::size_t i) {
         return begin + static_cast<std::ptrdiff_t>(i);
@@ -60,7 +61,7 @@ std::size_t PathNumbering::partitionAtOrAfter(std::size_t k,
     if (!endsAscend_)
         return static_cast<std::size_t>(
             std::find_if(at(k), partitionEnds.end(), holds) - begin);
-    if (k < partitionEnds.size() && holds(*at(k))) return k;
+    if (holds(*at(k))) return k;
     if (!starts_.empty()) {
         const std::size_t start = starts_[std::min<std::uint64_t>(
             number >> shift_, starts_.size() - 1)];

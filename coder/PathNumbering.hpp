@@ -44,7 +44,8 @@ public:
     // The first partition from k on whose end is not below the number; the
     // number of partitions if there is none. Cost: a look at a table, then a
     // galloping search nearby; linear if the ends do not ascend, which only a
-    // loaded form can bring about.
+    // loaded form can bring about, or who changes them by hand: until
+    // checkEnds, such a search may miss partitions.
     std::size_t partitionAtOrAfter(std::size_t k, std::uint64_t number) const;
 
     // Looks anew whether the ends ascend, after they were changed by hand.
