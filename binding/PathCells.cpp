@@ -1,6 +1,7 @@
 #include "binding/PathCells.hpp"
 
 #include "binding/Conversions.hpp"
+#include "pathtree/containers.hpp"
 
 namespace tessel::binding {
 
@@ -15,7 +16,7 @@ using NameViews = std::span<const ComponentView>;
 class PathCells::Collector {
 public:
     void beginFolder(std::size_t maxFiles) {
-        names_.reserve(names_.size() + maxFiles);
+        reserveGently(names_, maxFiles);
         entries_.push_back({names_.size(), names_.size()});
     }
     void folder(ComponentView name) {

@@ -28,9 +28,11 @@ public:
     void file(ComponentView name) {
         files_.emplace_back(name.begin(), name.end());
     }
-    // Appends the current folder and its files.
+    // Appends the current folder and its files. Few of many may have been
+    // asked for: the room for the others is not kept.
     void finish() {
         if (!started_) return;
+        if (files_.size() < files_.capacity() / 2) files_.shrink_to_fit();
         folderPaths_.push_back(std::exchange(folder_, {}));
         filePaths_.push_back(std::exchange(files_, {}));
     }
