@@ -264,7 +264,7 @@ BPathTree::MemoryUsage BPathTree::memoryUsage() const {
         latest = slab;
         if (slabs.insert(slab).second) usage.nodes += slab->memoryBytes();
     };
-    account(*root->folder());
+    if (root->folder() != nullptr) account(*root->folder());
     for (NodeWalk walk(*root); walk.next();)
         if (walk.node().folder != nullptr) account(*walk.node().folder);
     usage.childIndex = inserter_->indexBytes();

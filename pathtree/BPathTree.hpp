@@ -102,7 +102,8 @@ public:
     // Calls visit(const PathView&) with the next path and moves on. Throws
     // NoMorePathException when none is left, with nothing changed.
     // If memory runs out, or visit throws, the pass stays before this path:
-    // the call may be repeated.
+    // the call may be repeated. If visit itself changes the tree or the pass,
+    // its views end there and the pass moves on by one more node.
     // Cost: the folders that are entered and left; no copy of the path.
     template <class Visit>
     void visitNextPath(Visit&& visit) {
@@ -180,6 +181,10 @@ public:
     MemoryUsage memoryUsage() const;
 
     // ---- State, public for inspection; change it through the operations ----
+    //
+    // Any handles may be put here, those of other trees among them: the pass
+    // goes on with them. A root that is a file or no node is a tree without
+    // paths; inserting under no node throws std::logic_error.
 
     BNodePtr root;
     NodeStack pendingNodes;    // still to visit in the pass; top is next

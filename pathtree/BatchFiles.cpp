@@ -4,10 +4,10 @@
 
 namespace tessel {
 
-BatchFiles BatchFiles::ofRoot(const FolderNode& root) {
-    if (root.children().count() == 0)
+BatchFiles BatchFiles::ofRoot(const FolderNode* root) {
+    if (root == nullptr || root->children().count() == 0)
         throw std::out_of_range("A track leads nowhere.");
-    return {root, 0};
+    return {*root, 0};
 }
 
 Child BatchFiles::childAt(const FolderNode* node, std::uint64_t position) {

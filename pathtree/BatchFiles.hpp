@@ -22,8 +22,8 @@ public:
           entry_(block_.entries()) {}
 
     // The files under the root itself. Throws std::out_of_range if the tree
-    // has no paths.
-    static BatchFiles ofRoot(const FolderNode& root);
+    // has no paths, or no root (null).
+    static BatchFiles ofRoot(const FolderNode* root);
 
     // The name of the file at this offset, 1-based within the batch. Throws
     // std::out_of_range for a position outside the folder.

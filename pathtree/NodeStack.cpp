@@ -5,6 +5,7 @@
 namespace tessel {
 
 bool NodeStack::isTopLastFileOf(const FolderNode& parent) const noexcept {
+    if (ranges_.empty()) return false;
     const Range& range = ranges_.back();
     const std::uint64_t children = parent.children().count();
     if (children == 0) return false;
@@ -23,6 +24,7 @@ void NodeStack::pushChildren(const BNodePtr& node) {
 }
 
 void NodeStack::pop() noexcept {
+    if (ranges_.empty()) return;
     Range& range = ranges_.back();
     if (++range.next == range.end) {
         ranges_.pop_back();

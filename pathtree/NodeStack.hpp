@@ -10,7 +10,8 @@ namespace tessel {
 
 // A stack of nodes. All children of a node, pushed together, are kept as one
 // range of positions, so that pushing a folder of a million files is one
-// step and takes no memory for the files.
+// step and takes no memory for the files. The top of an empty stack is no node:
+// it has no folder, no children and an empty name.
 //
 // Ownership: the stack keeps its nodes alive, children through their parent.
 //   A copy shares them.
@@ -26,8 +27,9 @@ public:
         return count;
     }
 
-    // The node on top; the stack must not be empty.
+    // The node on top.
     BNode top() const noexcept {
+        if (ranges_.empty()) return *BNodePtr();
         const Range& range = ranges_.back();
         if (range.isNode) return *range.node;
         const Child child = topChild();
@@ -37,6 +39,7 @@ public:
     }
     // What it is, without a search for its position.
     Child topChild() const noexcept {
+        if (ranges_.empty()) return {};
         const Range& range = ranges_.back();
         if (!range.isNode) return ChildBlock::read(topEntry());
         FolderNode* const folder = range.node->folder();
@@ -54,7 +57,7 @@ public:
     // the first is on top. Children appended later are not on the stack.
     void pushChildren(const BNodePtr& node);
 
-    // Takes the top off; the stack must not be empty.
+    // Takes the top off, if there is one.
     void pop() noexcept;
 
     void clear() noexcept { ranges_.clear(); }

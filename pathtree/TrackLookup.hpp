@@ -10,7 +10,8 @@
 namespace tessel {
 
 // Follows tracks through a path tree. Positions that lead outside the tree
-// throw std::out_of_range; components may have been visited by then.
+// throw std::out_of_range; components may have been visited by then. A root
+// that is a file or no node is that of a tree without paths.
 //
 // Ownership: borrows the root. The views that it hands out are valid until
 //   paths are added or a pass begins.
@@ -19,16 +20,17 @@ class TrackLookup {
 public:
     using Track = std::span<const std::uint64_t>;
 
-    explicit TrackLookup(BNode root) noexcept : root_(*root.folder()) {}
+    explicit TrackLookup(BNode root) noexcept : root_(root.folder()) {}
 
     // Calls visit(ComponentView) with each component along the track. Throws
     // NoTreeToTraverseException on a tree without paths, otherwise
     // EmptyPathForTraverseException on an empty track.
     template <class Visit>
     void visitTrack(Track track, Visit&& visit) const {
-        if (root_.children().count() == 0) throw NoTreeToTraverseException();
+        if (root_ == nullptr || root_->children().count() == 0)
+            throw NoTreeToTraverseException();
         if (track.empty()) throw EmptyPathForTraverseException();
-        const FolderNode* folder = &root_;
+        const FolderNode* folder = root_;
         for (const std::uint64_t position : track) {
             const Child child = BatchFiles::childAt(folder, position);
             visit(child.value());
@@ -50,7 +52,7 @@ public:
     template <class VisitFolder>
     BatchFiles openBatch(Track track, VisitFolder&& visitFolder) const {
         if (track.empty()) return BatchFiles::ofRoot(root_);
-        const FolderNode* folder = &root_;
+        const FolderNode* folder = root_;
         for (const std::uint64_t position : track.first(track.size() - 1)) {
             const Child child = BatchFiles::childAt(folder, position);
             visitFolder(child.value());
@@ -79,7 +81,7 @@ public:
     }
 
 private:
-    const FolderNode& root_;
+    const FolderNode* root_;
 };
 
 }  // namespace tessel

@@ -1,6 +1,7 @@
 #include "pathtree/TreeInserter.hpp"
 
 #include <array>
+#include <stdexcept>
 #include <vector>
 
 #include "pathtree/NodeWalk.hpp"
@@ -121,20 +122,33 @@ private:
     std::array<std::uint8_t, ChildBlock::folderEntryBytes> entry_{};
 };
 
-BNodePtr TreeInserter::makeRoot() {
+// The index borrows nodes. Those of another tree may be released by now, and
+// others may be where they were.
+void TreeInserter::indexUnder(BNode root) {
+    if (indexedRoot_ && *indexedRoot_ == root) return;
+    clearIndex();
+    indexedRoot_ = BNodePtr(root);
+}
+
+void TreeInserter::clearIndex() noexcept {
     index_.clear();
+    indexedRoot_ = {};
+}
+
+BNodePtr TreeInserter::makeRoot() {
+    clearIndex();
     return BNodePtr::adopt(pool_.make({}, {}));
 }
 
 // Takes over the shares of the children unless it throws.
 void TreeInserter::attach(BNode parent, const ChildBatch& children) {
+    if (parent.place_ == nullptr)
+        throw std::logic_error("There is no node to insert under.");
     if (FolderNode* const folder = parent.folder()) {
         if (folder->children().count() > 0) hasGrown_ = true;
         folder->append(children);
         return;
     }
-    // A file is always in some folder, which the analyzer cannot know.
-    // NOLINTNEXTLINE(clang-analyzer-core.CallAndMessage)
     parent.place_->reservePromotion(parent.position_);
     FolderNode* const made = pool_.make(parent.value(), children);
     parent.place_->promote(parent.position_, made);
@@ -149,6 +163,7 @@ void TreeInserter::add(BNode parent, ComponentView value) {
 
 bool TreeInserter::addPath(BNode root, const ComponentList& components,
                            PathTrack& pathTrack) {
+    indexUnder(root);
     Descent descent(index_, root, components, pathTrack);
     if (!descent.isAllStored()) {
         Chain chain(pool_, descent.next(), components.end(), {});
@@ -163,6 +178,7 @@ TreeInserter::AddedBatch TreeInserter::addBatch(BNode root,
                                                 const ComponentList& components,
                                                 const ComponentList& fileNames,
                                                 PathTrack& pathTrack) {
+    indexUnder(root);
     Descent descent(index_, root, components, pathTrack);
     const BNode found = descent.node();
     if (descent.isAllStored()) {
@@ -190,7 +206,7 @@ std::uint64_t TreeInserter::addFiles(BNode folder,
 }
 
 void TreeInserter::releaseIndex(std::size_t maxChildren) noexcept {
-    if (index_.indexedChildren() <= maxChildren) index_.clear();
+    if (index_.indexedChildren() <= maxChildren) clearIndex();
 }
 
 void TreeInserter::trim(BNode root) {

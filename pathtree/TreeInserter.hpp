@@ -14,11 +14,12 @@ namespace tessel {
 // Inserts into one path tree: it finds what is there, makes what is not, from
 // the last component to the first, and attaches that in one step. What each
 // operation means is said at BPathTree's operation of the same name; if one
-// throws (std::bad_alloc, std::length_error), nothing has changed.
+// throws (std::bad_alloc, std::length_error, or std::logic_error if there is no
+// node to insert under), nothing has changed.
 //
 // Ownership: owns the pool that fills the tree's slabs and the index of the
-//   tree's children. Borrows the nodes, which must be of this tree or of a
-//   copy that lives as long.
+//   tree's children, and a share of the root that these are under, so that no
+//   node that the index knows is released. Borrows all other nodes.
 // Threads: one.
 // Cost: finding a child takes constant time on average.
 class TreeInserter {
@@ -70,9 +71,12 @@ private:
     class Chain;
 
     void attach(BNode parent, const ChildBatch& children);
+    void indexUnder(BNode root);
+    void clearIndex() noexcept;
 
     NodePool pool_;
     ChildIndex index_;
+    BNodePtr indexedRoot_;   // of the tree whose children the index knows
     bool hasGrown_ = false;  // a folder got children after its first ones
 };
 

@@ -34,9 +34,9 @@ TEST(BatchFiles, FilesOfAnOpenBatchAreAskedForOneByOne) {
 
 TEST(BatchFiles, TheRootsFilesCountFromItsFirstChild) {
     BPathTree tree;
-    EXPECT_THROW(BatchFiles::ofRoot(*tree.root->folder()), std::out_of_range);
+    EXPECT_THROW(BatchFiles::ofRoot(tree.root->folder()), std::out_of_range);
     addBatch(tree, {}, {"f", "g"});
-    BatchFiles files = BatchFiles::ofRoot(*tree.root->folder());
+    BatchFiles files = BatchFiles::ofRoot(tree.root->folder());
     EXPECT_EQ(textOf(files[1]), "f");
     EXPECT_EQ(textOf(files[2]), "g");
     EXPECT_THROW(files[3], std::out_of_range);
