@@ -203,10 +203,17 @@ void ArchiveWriter::addAllOf(const ArchiveReader& old) {
              [this](std::uint64_t, std::string_view path) { add(path); });
 }
 
-void ArchiveWriter::add(std::string_view path) { impl_->add(path); }
+ArchiveWriter::Impl& ArchiveWriter::impl() const {
+    if (impl_ == nullptr) throw std::logic_error("this writer was moved from");
+    return *impl_;
+}
 
-std::uint64_t ArchiveWriter::size() const noexcept { return impl_->size(); }
+void ArchiveWriter::add(std::string_view path) { impl().add(path); }
 
-std::uint64_t ArchiveWriter::finish() { return impl_->finish(); }
+std::uint64_t ArchiveWriter::size() const noexcept {
+    return impl_ == nullptr ? 0 : impl_->size();
+}
+
+std::uint64_t ArchiveWriter::finish() { return impl().finish(); }
 
 }  // namespace tessel

@@ -186,8 +186,16 @@ PathArchive::Iterator& PathArchive::Iterator::operator=(Iterator&&) noexcept =
 PathArchive::Iterator::~Iterator() = default;
 
 PathArchive::Iterator& PathArchive::Iterator::operator++() {
+    if (isAtEnd()) return *this;
+    path_ = {};
     ++number_;
-    if (number_ < size_) path_ = paths_->next();
+    if (isAtEnd()) return *this;
+    try {
+        path_ = paths_->next();
+    } catch (...) {
+        paths_.reset();
+        throw;
+    }
     return *this;
 }
 

@@ -212,7 +212,9 @@ private:
 // the archive's bytes alive by itself.
 //
 // A view is valid until the iterator is advanced or destroyed. Moving the
-// iterator keeps it valid.
+// iterator keeps it valid; the one that it was moved from is at the end. So is
+// one whose advance has thrown DamagedArchiveException; number() is then that
+// of the damaged path. Advancing at the end changes nothing.
 // Cost: some kilobytes; on a list whose folders are scattered up to 10 MiB,
 //   because paths are decoded in batches, in the order in which they are
 //   stored. Batches start small.
@@ -237,15 +239,19 @@ public:
     std::uint64_t number() const noexcept { return number_; }
 
     friend bool operator==(const Iterator& it, std::default_sentinel_t) {
-        return it.number_ == it.size_;
+        return it.isAtEnd();
     }
 
 private:
     friend class PathArchive;
     explicit Iterator(std::shared_ptr<const archive::ArchiveReader> reader);
+    bool isAtEnd() const noexcept {
+        return paths_ == nullptr || number_ >= size_;
+    }
 
     std::shared_ptr<const archive::ArchiveReader> reader_;
-    std::unique_ptr<archive::SequentialReader> paths_;  // borrows reader_
+    // Borrows reader_; null once nothing more can be read.
+    std::unique_ptr<archive::SequentialReader> paths_;
     std::string_view path_;
     std::uint64_t number_ = 0;
     std::uint64_t size_ = 0;

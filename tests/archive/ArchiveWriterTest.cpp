@@ -308,6 +308,20 @@ TEST(ArchiveWriterTest, AFinishedWriterTakesNothing) {
     EXPECT_THROW(writer.finish(), std::logic_error);
 }
 
+TEST(ArchiveWriterTest, AWriterThatWasMovedFromTakesNothing) {
+    Bytes bytes;
+    ArchiveWriter writer(bytes);
+    writer.add("a");
+    ArchiveWriter moved = std::move(writer);
+    // NOLINTBEGIN(bugprone-use-after-move): what is tested
+    EXPECT_THROW(writer.add("b"), std::logic_error);
+    EXPECT_THROW(writer.finish(), std::logic_error);
+    EXPECT_EQ(writer.size(), 0U);
+    // NOLINTEND(bugprone-use-after-move)
+    moved.finish();
+    EXPECT_EQ(readBack(bytes), Paths{"a"});
+}
+
 TEST(ArchiveWriterTest, CancellingLeavesTheOldBytes) {
     Bytes bytes = {1, 2, 3};
     std::stop_source source;

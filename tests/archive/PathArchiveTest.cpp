@@ -351,6 +351,37 @@ TEST(PathArchive, AnIteratorKeepsTheBytes) {
     EXPECT_TRUE(moved == std::default_sentinel);
 }
 
+TEST(PathArchive, AnIteratorAtTheEndStaysThere) {
+    const auto archive = PathArchive::own(archiveOf({"a/b", "c"}));
+    auto it = archive.begin();
+    for (int i = 0; i < 5; ++i) ++it;
+    EXPECT_TRUE(it == std::default_sentinel);
+    EXPECT_EQ(it.number(), 2U);
+    auto from = archive.begin();
+    const auto moved = std::move(from);
+    // NOLINTNEXTLINE(bugprone-use-after-move): what is tested
+    EXPECT_TRUE(from == std::default_sentinel);
+    ++from;
+    EXPECT_EQ(*moved, "a/b");
+}
+
+TEST(PathArchive, AnIteratorThatMetDamageIsAtTheEnd) {
+    const auto paths = archives::sortedPaths(5000);
+    auto bytes = archiveOf(paths);
+    bytes[bytes.size() / 2] ^= 1;
+    const auto archive = PathArchive::own(bytes);
+    auto it = archive.begin();
+    std::size_t read = 0;
+    EXPECT_THROW(for (; it != std::default_sentinel; ++it)
+                     EXPECT_EQ(*it, paths[read++]),
+                 DamagedArchiveException);
+    EXPECT_TRUE(it == std::default_sentinel);
+    EXPECT_EQ(it.number(), read);
+    ++it;
+    EXPECT_EQ(it.number(), read);
+    EXPECT_LT(read, paths.size());
+}
+
 TEST(PathArchive, RefusesWhatIsNoArchive) {
     EXPECT_THROW(PathArchive::own({}), DamagedArchiveException);
     EXPECT_THROW(PathArchive::own(std::vector<std::uint8_t>(1000)),
