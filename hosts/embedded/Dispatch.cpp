@@ -23,10 +23,6 @@ void notify(const Instance& instance, const PropertyRecord& property,
             listener.notify();
 }
 
-void* nativeFor(const Instance& instance, const PropertyRecord& property) {
-    return property.has(attributes::isStatic) ? nullptr : instance.native();
-}
-
 }  // namespace
 
 // The inputs of one call, the instance first if there is one; all borrowed.
@@ -146,6 +142,13 @@ void Dispatch::checkAccess(const PropertyRecord& property, HostAccess access,
         errors_.raiseOwn("propertyRestricted", {property.name->str()});
     if (property.has(attributes::isAbstract))
         errors_.raiseOwn("propertyHasNoValue", {property.name->str()});
+}
+
+// A listener may have destroyed the instance by now.
+void* Dispatch::nativeFor(const Instance& instance,
+                          const PropertyRecord& property) const {
+    if (!instance.isLiving()) errors_.raiseOwn("invalidInstance");
+    return property.has(attributes::isStatic) ? nullptr : instance.native();
 }
 
 Value Dispatch::get(const Instance& instance, const PropertyRecord& property,

@@ -55,6 +55,8 @@ private:
              const Inputs& inputs, std::int32_t requested) const;
     void checkAccess(const PropertyRecord& property, HostAccess access,
                      Caller caller) const;
+    void* nativeFor(const Instance& instance,
+                    const PropertyRecord& property) const;
 
     const Errors& errors_;
 };

@@ -105,6 +105,17 @@ TEST_F(HostAttributesTest, ListenersAreNotifiedWhereAllowed) {
     EXPECT_EQ(sets, 1);
 }
 
+TEST_F(HostAttributesTest, AListenerMayDestroyTheInstance) {
+    behaviour_.bits = attr::getListenersAllowed | attr::inspectionAllowed;
+    define();
+    const Value instance = host_.construct(counterName);
+    host_.listen(instance, "Number", ListenerKind::Get,
+                 [&] { host_.destroy(instance); });
+    EXPECT_EQ(errorOf([&] { host_.inspect(instance); }).identifier(),
+              errorOf([&] { host_.get(instance, "Number"); }).identifier());
+    EXPECT_EQ(behaviour_.destroyed, 1);
+}
+
 TEST_F(HostAttributesTest, UnchangedValueAbortsTheSetWhereSoMarked) {
     behaviour_.bits = attr::abortSetWhenUnchanged | attr::setListenersAllowed;
     define();
