@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <stdexcept>
 #include <thread>
 #include <utility>
 
@@ -90,6 +91,17 @@ void Batch::resizeResults() {
     }
     const MutexLock lock(fileResultMutex);
     encodedFiles.resize(folders.size());
+}
+
+void Batch::requireRoom(std::uint64_t end) const {
+    bool hasRoom = files.size() >= end;
+    {
+        const MutexLock lock(folderResultMutex);
+        hasRoom = hasRoom && encodedFolders.size() >= end;
+    }
+    const MutexLock lock(fileResultMutex);
+    if (!hasRoom || encodedFiles.size() < end)
+        throw std::logic_error("A folder has no files or no room for results.");
 }
 
 // No other thread can reach either batch.
@@ -199,7 +211,8 @@ void BatchEncoder::encode(unsigned hardwareThreads) {
     // would save nothing, since a folder costs far more than a step.
     constexpr std::uint64_t minStepsPerWorker = 64;
     constexpr std::uint64_t maxFoldersPerStep = 64;
-    const auto split = splitFolders(count, hardwareThreads);
+    const auto split =
+        splitFolders(count, std::min(hardwareThreads, maxWorkers));
     foldersPerStep_ = std::clamp(count / split.size() / minStepsPerWorker,
                                  std::uint64_t{1}, maxFoldersPerStep);
     std::vector<Worker> workers;

@@ -36,6 +36,9 @@ struct Batch {
 
     // Makes the result lists as long as the list of folders.
     void resizeResults();
+    // Throws std::logic_error if a list of files or of results does not reach
+    // to the folder before `end`.
+    void requireRoom(std::uint64_t end) const;
     // Moves all that the other batch holds into this one.
     void takeOver(Batch& other);
     void clearResults();
@@ -68,9 +71,9 @@ public:
     BatchEncoder(const HuffmanCode& code, AtomicMaximum& maxCodeBytes,
                  FolderTexts& folders, FolderTexts& files);
 
-    // Encodes all folders, on as many workers as splitFolders gives ranges,
-    // and releases their texts on the way. A single folder is encoded without
-    // a worker and keeps its texts.
+    // Encodes all folders, on as many workers as splitFolders gives ranges, but
+    // at most maxWorkers, and releases their texts on the way. A single folder
+    // is encoded without a worker and keeps its texts.
     //
     // If texts cannot be encoded or a thread cannot be started, all workers
     // end first; then the failure of the lowest folder is thrown, where a
@@ -86,6 +89,9 @@ public:
     // threads whose ranges differ.
     static void encodeRange(const HuffmanCode& code, Batch& batch,
                             FolderRange folders, AtomicMaximum& maxCodeBytes);
+
+    // No more threads than this are started, however many are said to run.
+    static constexpr unsigned maxWorkers = 256;
 
     // How n folders are split among that many hardware threads (0: unknown,
     // two are assumed): a range per worker, the remainder to the last one.

@@ -34,8 +34,10 @@ public:
         return entries_[pageStart_[character >> 8] + (character & 0xFFU)];
     }
 
-    // Adds the entry unless the character has one already. If it throws
-    // (std::bad_alloc), nothing changes.
+    // Adds the entry unless the character has one already. Throws
+    // std::invalid_argument if the code is longer than longestInline or has
+    // bits after its length, unless it is long. If it throws (std::bad_alloc,
+    // too), nothing changes.
     void insert(char16_t character, const Entry& entry);
 
     // Removes every code; keeps the memory.

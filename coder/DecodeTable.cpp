@@ -52,7 +52,8 @@ std::vector<FirstCharacter> firstCharacters(const std::vector<HNode>& nodes,
         }
         if (at.bits == DecodeTable::windowBits) continue;
         const auto descend = [&](std::int32_t child, std::size_t bit) {
-            if (child < 0) return;
+            if (child < 0 || static_cast<std::size_t>(child) >= nodes.size())
+                return;
             pending.push_back({&nodes[static_cast<std::size_t>(child)],
                                at.code | bit << at.bits, at.bits + 1});
         };

@@ -16,6 +16,10 @@ std::size_t at(std::int32_t position) {
     return static_cast<std::size_t>(position);
 }
 
+[[noreturn]] void refuseNodes() {
+    throw std::logic_error("The coder's nodes are not those of one tree.");
+}
+
 std::size_t leavesIn(const std::vector<bool>& shape) {
     return static_cast<std::size_t>(
         std::count(shape.begin(), shape.end(), true));
@@ -66,6 +70,8 @@ void HuffmanCode::build(const double* characterFrequencies,
 
 void HuffmanCode::makeHeapAndTree(const double* characterFrequencies,
                                   const std::u16string& characters) {
+    if (characterFrequencies == nullptr && !characters.empty())
+        throw std::invalid_argument("Characters need frequencies.");
     releaseContents(frequencies);
     frequencies.reserve(characters.size());
     HeapQueue queue;
@@ -128,11 +134,14 @@ void HuffmanCode::generateCode() {
     decodeTable_.build(nodes, rootIndex);
 }
 
+// -1 also for a position that is none.
+std::int32_t HuffmanCode::parentOfNode(std::int32_t child) const noexcept {
+    if (child < 0 || at(child) >= parentOf.size()) return -1;
+    const std::int32_t parent = parentOf[at(child)];
+    return isPosition(parent) ? parent : -1;
+}
+
 void HuffmanCode::addCode(const HNode& leaf) {
-    const auto parentOfNode = [this](std::int32_t child) {
-        const bool known = child >= 0 && at(child) < parentOf.size();
-        return known ? parentOf[at(child)] : -1;
-    };
     CodeTable::Entry entry;
     entry.leaf = leaf.index;
     std::int32_t child = leaf.index;
@@ -218,6 +227,24 @@ void HuffmanCode::inflate() {
 
 // ---- Questions ----
 
+// Iterative: a tree may be as deep as it has leaves.
+std::vector<HNode> HuffmanCode::inPreOrder() const {
+    std::vector<HNode> order;
+    std::vector<std::int32_t> pending;
+    if (isPosition(rootIndex)) pending.push_back(rootIndex);
+    while (!pending.empty()) {
+        const std::int32_t position = pending.back();
+        pending.pop_back();
+        if (!isPosition(position) || order.size() == nodes.size())
+            refuseNodes();
+        const HNode& node = nodes[at(position)];
+        order.push_back(node);
+        if (node.right != -1) pending.push_back(node.right);
+        if (node.left != -1) pending.push_back(node.left);
+    }
+    return order;
+}
+
 std::vector<bool> HuffmanCode::codeOf(char16_t character) const {
     const CodeTable::Entry& entry = codes[character];
     if (!entry.exists()) throw CodeNotFoundException();
@@ -227,8 +254,10 @@ std::vector<bool> HuffmanCode::codeOf(char16_t character) const {
             bits.push_back(((entry.bits >> i) & 1U) != 0);
         return bits;
     }
-    for (std::int32_t child = entry.leaf; parentOf[at(child)] != -1;) {
-        const std::int32_t parent = parentOf[at(child)];
+    std::int32_t child = entry.leaf;
+    for (std::int32_t parent = parentOfNode(child); parent != -1;
+         parent = parentOfNode(child)) {
+        if (bits.size() == nodes.size()) refuseNodes();
         bits.push_back(nodes[at(parent)].left != child);
         child = parent;
     }

@@ -54,14 +54,18 @@ public:
 
     // ---- Questions ----
 
-    // Calls visit with a copy of every node, in pre-order, left before right.
-    // Without a tree it does nothing. Iterative: a tree may be as deep as it
-    // has leaves.
+    // Calls visit with a copy of every node, in pre-order, left before right;
+    // visit may change the tree. Without a tree it does nothing. Throws
+    // std::logic_error before the first visit if a node links to none, or two
+    // to one, as nodes that were edited may.
     template <class Visit>
-    void traverse(Visit visit) const;
+    void traverse(Visit visit) const {
+        for (HNode& node : inPreOrder()) visit(node);
+    }
 
     // The code of a character, nearest the root first. Throws
-    // CodeNotFoundException if it has none.
+    // CodeNotFoundException if it has none, and std::logic_error if a long one
+    // leads through parentOf to no root.
     std::vector<bool> codeOf(char16_t character) const;
 
     const DecodeTable& decodeTable() const noexcept { return decodeTable_; }
@@ -83,6 +87,8 @@ public:
 
 private:
     void requireNoCode() const;
+    std::vector<HNode> inPreOrder() const;
+    std::int32_t parentOfNode(std::int32_t child) const noexcept;
     template <class Build>
     void buildOrClear(Build build);
     bool isPosition(std::int32_t position) const noexcept {
@@ -92,22 +98,5 @@ private:
 
     DecodeTable decodeTable_;  // empty: decode by walking the tree
 };
-
-template <class Visit>
-void HuffmanCode::traverse(Visit visit) const {
-    if (!isPosition(rootIndex)) return;
-    const auto nodeAt = [this](std::int32_t position) -> const HNode& {
-        return nodes[static_cast<std::size_t>(position)];
-    };
-    std::vector<HNode> pending{nodeAt(rootIndex)};
-    while (!pending.empty()) {
-        HNode node = pending.back();
-        pending.pop_back();
-        const HNode seen = node;  // the visitor may change its copy
-        visit(node);
-        if (seen.right != -1) pending.push_back(nodeAt(seen.right));
-        if (seen.left != -1) pending.push_back(nodeAt(seen.left));
-    }
-}
 
 }  // namespace tessel

@@ -63,6 +63,12 @@ HuffmanPathTree::HuffmanPathTree() QZTESSEL_NO_THREAD_SAFETY
 
 HuffmanPathTree::~HuffmanPathTree() { joinAllGenThreads(); }
 
+BPathTree& HuffmanPathTree::tree() const {
+    if (pathTree == nullptr)
+        throw std::logic_error("The coder's path tree was taken away.");
+    return *pathTree;
+}
+
 // ---- The Huffman code ----
 
 void HuffmanPathTree::deflateHuffman(const double* characterFrequencies,
@@ -113,7 +119,7 @@ void HuffmanPathTree::setFrequencies(std::vector<double>& newFrequencies) {
 
 // All copies are made before the first member is replaced.
 void HuffmanPathTree::copyTree(const HuffmanPathTree& other) {
-    auto newTree = std::make_unique<BPathTree>(*other.pathTree);
+    auto newTree = std::make_unique<BPathTree>(other.tree());
     if (&other != this) {
         HuffmanCode newCode = *other.code_;
         PathNumbering newNumbering = *other.numbering_;
@@ -199,6 +205,7 @@ void HuffmanPathTree::generateCodeForPath(std::uint64_t first,
                                           std::uint64_t last) {
     const std::uint64_t end =
         last < asyncFolders.size() ? last + 1 : asyncFolders.size();
+    if (first < end) batch_->requireRoom(end);
     BatchEncoder::encodeRange(*code_, *batch_, {first, end},
                               numbering_->maxCodeBytes);
 }
@@ -225,14 +232,16 @@ void HuffmanPathTree::addPathToBTreeFromAsyncData() { insertBatch(*batch_); }
 // No worker is left that could write to the batch.
 void HuffmanPathTree::insertBatch(Batch& batch) QZTESSEL_NO_THREAD_SAFETY {
     const std::size_t folders = batch.encodedFolders.size();
-    BatchInserter(*pathTree, *numbering_)
+    if (batch.encodedFiles.size() != folders)
+        throw std::logic_error("Each folder needs exactly one list of files.");
+    BatchInserter(tree(), *numbering_)
         .insert(batch.encodedFolders, batch.encodedFiles);
     batch.clear();
     // Search memory is worth keeping only while it serves many more folders
     // than this batch had: it is rebuilt at about the price of an insertion
     // per child.
     constexpr std::size_t childrenWorthAFolder = 16;
-    pathTree->inserter().releaseIndex(folders * childrenWorthAFolder);
+    tree().inserter().releaseIndex(folders * childrenWorthAFolder);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& folderComponents,
@@ -243,13 +252,13 @@ void HuffmanPathTree::addPathToBTree(Components& folderComponents,
     track.reserve(folderComponents.size() + 1);
     std::uint64_t first = 0;
     const bool existed =
-        pathTree->addPath(folderComponents, fileNames, track, first);
+        tree().addPath(folderComponents, fileNames, track, first);
     numbering_->notePartition(track, existed, first, fileCount);
 }
 
 void HuffmanPathTree::addPathToBTree(Components& components) {
     PathTrack track;
-    const bool existed = pathTree->addPath(components, track);
+    const bool existed = tree().addPath(components, track);
     numbering_->noteWholePath(track, existed);
 }
 
@@ -276,15 +285,15 @@ bool HuffmanPathTree::appendToPathIfLeaf(std::int32_t& position,
 }
 
 bool HuffmanPathTree::hasNextPathFromBTree() const {
-    return PathIteration(*pathTree, *numbering_).hasNext();
+    return PathIteration(tree(), *numbering_).hasNext();
 }
 
 void HuffmanPathTree::getNextPathFromBTree(Components& components) {
-    PathIteration(*pathTree, *numbering_).getNext(components);
+    PathIteration(tree(), *numbering_).getNext(components);
 }
 
 void HuffmanPathTree::resetPathsToBTree() {
-    PathIteration(*pathTree, *numbering_).reset();
+    PathIteration(tree(), *numbering_).reset();
     joinAllGenThreads();
     clearThreadResources();
 }
@@ -292,25 +301,25 @@ void HuffmanPathTree::resetPathsToBTree() {
 void HuffmanPathTree::getPath(std::vector<Components>& folderPaths,
                               std::vector<Components>& filePaths,
                               const std::vector<double>& partitions) const {
-    PathRetrieval(*pathTree, *numbering_)
+    PathRetrieval(tree(), *numbering_)
         .getPath(folderPaths, filePaths, partitions);
 }
 
 // ---- Memory ----
 
 HuffmanPathTree::MemoryUsage HuffmanPathTree::memoryUsage() const {
-    const BPathTree::MemoryUsage tree = pathTree->memoryUsage();
+    const BPathTree::MemoryUsage ofTree = tree().memoryUsage();
     MemoryUsage usage;
-    usage.names = tree.names;
-    usage.nodes = tree.nodes;
-    usage.childLists = tree.childLists;
+    usage.names = ofTree.names;
+    usage.nodes = ofTree.nodes;
+    usage.childLists = ofTree.childLists;
     usage.partitionTracks = numbering_->partitionBytes();
     usage.duplicates = numbering_->duplicateBytes();
     usage.code = code_->memoryBytes();
     usage.batch = batch_->memoryBytes();
     usage.other = sizeof(HuffmanPathTree) + sizeof(HuffmanCode) +
                   sizeof(PathNumbering) + sizeof(Batch) + sizeof(BPathTree) +
-                  sizeof(TreeInserter) + tree.childIndex + tree.iteration;
+                  sizeof(TreeInserter) + ofTree.childIndex + ofTree.iteration;
     return usage;
 }
 

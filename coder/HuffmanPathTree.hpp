@@ -81,7 +81,8 @@ public:
     // Source of the construction: D. A. Huffman, "A Method for the
     // Construction of Minimum-Redundancy Codes", 1952, over a binary heap.
     // Throws std::logic_error, with nothing changed, if the coder has a code
-    // or a loaded shape already.
+    // or a loaded shape already, and std::invalid_argument if there are
+    // characters but no frequencies (null).
     void deflateHuffman(const double* characterFrequencies,
                         const std::u16string& characters);
     // The same in the map's own order, so codes of characters that are
@@ -102,7 +103,10 @@ public:
     void generateTree(HeapQueue& queue);
 
     // Inspection. Calls visit with a copy of every node of the tree, in
-    // pre-order, left before right. Without a tree it does nothing.
+    // pre-order, left before right; visit may change the coder. Without a tree
+    // it does nothing. Throws std::logic_error, before the first visit, if the
+    // nodes were edited so that they are not those of one tree; generateCode
+    // and generateCompressedTree throw the same.
     void traverse(Visitor visit);
 
     // Rebuilds parentOf and adds the code of every leaf to `codes`. Codes
@@ -198,13 +202,15 @@ public:
                                       unsigned hardwareThreads);
 
     // The folders of each worker, first and last, when n of them meet that
-    // many hardware threads (0: two).
+    // many hardware threads (0: two). Takes 16 bytes for each of these.
     static std::vector<std::pair<std::uint64_t, std::uint64_t>> splitFolders(
         std::uint64_t n, unsigned hardwareThreads);
 
     // Encodes the folders first to last of asyncFolders and asyncFiles into
-    // encodedFolders and encodedFiles, which must be as long. Throws what
-    // generateCodeFor throws. Safe on several threads whose folders differ.
+    // encodedFolders and encodedFiles. Throws what generateCodeFor throws, and
+    // std::logic_error, with nothing encoded, if one of the other lists ends
+    // before the last of these folders. Safe on several threads whose folders
+    // differ.
     void generateCodeForPath(std::uint64_t first, std::uint64_t last);
 
     // Waits for genThreads and forgets them.
@@ -213,7 +219,8 @@ public:
     void clearThreadResources();
 
     // Inserts what generateCodeForPath encoded, in order, and clears the
-    // workers' buffers.
+    // workers' buffers. Throws std::logic_error, with nothing changed, if
+    // encodedFolders and encodedFiles differ in length.
     void addPathToBTreeFromAsyncData();
 
     // Inserts one partition. What is stored is moved from; use neither list
@@ -321,6 +328,17 @@ public:
     MemoryUsage memoryUsage() const;
 
     // ---- State, public for inspection; change it through the operations ----
+    //
+    // Who sets it by hand gets answers that fit what was set, or exceptions:
+    // every operation checks what it follows. After partitionEnds was changed,
+    // call numbering().checkEnds(). A caller must keep three things:
+    //
+    // - encodedFolders and encodedFiles hold views into buffers of this coder,
+    //   which clearThreadResources and every insertion of a batch release. Do
+    //   not put views there that outlived their coder or their batch.
+    // - Calls lock the two mutexes: do not call while you hold one.
+    // - A thread in genThreads must end by itself; calls and the destructor
+    //   join it.
 
     const HuffmanCode& code() const noexcept { return *code_; }
     const PathNumbering& numbering() const noexcept { return *numbering_; }
@@ -328,6 +346,8 @@ public:
 
 private:
     void insertBatch(Batch& batch);
+    // Throws std::logic_error if pathTree was set to null.
+    BPathTree& tree() const;
 
     std::unique_ptr<HuffmanCode> code_;
     std::unique_ptr<PathNumbering> numbering_;
@@ -346,7 +366,7 @@ public:
     CodeTable& codes;
     std::vector<std::int32_t>& parentOf;
 
-    std::unique_ptr<BPathTree> pathTree;
+    std::unique_ptr<BPathTree> pathTree;  // null: operations throw logic_error
 
     // ---- PathNumbering ----
     std::map<std::uint64_t, PathTrack>& duplicates;

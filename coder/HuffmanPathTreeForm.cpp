@@ -66,11 +66,11 @@ void HuffmanPathTree::serialize(std::vector<std::uint8_t>& out,
         std::size_t payloadLength = 0;
         if (compress) {
             std::vector<std::uint8_t> payload;
-            FormWriter(*pathTree, *numbering_, payload).write(boolTree);
+            FormWriter(tree(), *numbering_, payload).write(boolTree);
             payloadLength = payload.size();
             sixpacks::appendCompressed(payload, out);
         } else {
-            FormWriter(*pathTree, *numbering_, out).write(boolTree);
+            FormWriter(tree(), *numbering_, out).write(boolTree);
             payloadLength = out.size() - bodyAt;
         }
         for (std::size_t j = 0; j < sizeof(std::uint64_t); ++j)
@@ -98,7 +98,7 @@ void HuffmanPathTree::deserialize(std::vector<std::uint8_t>& in,
 
 std::size_t HuffmanPathTree::serializePathTree(
     std::vector<std::uint8_t>& structure, Components& values) const {
-    return pathTree->serialize(structure, values);
+    return tree().serialize(structure, values);
 }
 
 std::size_t HuffmanPathTree::deserializePathTree(
