@@ -131,7 +131,9 @@ void FormReader::readDuplicates(ByteCursor& cursor) {
             std::max(numbering.maxDuplicatePathNumber, number);
         numbering.maxDuplicateTrackLength = std::max<std::uint64_t>(
             numbering.maxDuplicateTrackLength, track.size());
-        numbering.duplicates[number] = std::move(track);
+        // At the end, where a writer's numbers go, without a search.
+        numbering.duplicates.insert_or_assign(numbering.duplicates.end(),
+                                              number, std::move(track));
     }
     numbering.pathCount += numbering.duplicates.size();
 }
