@@ -16,6 +16,11 @@ std::size_t at(std::int32_t position) {
     return static_cast<std::size_t>(position);
 }
 
+void requireFrequencies(const double* frequencies, std::size_t count) {
+    if (count > 0 && frequencies == nullptr)
+        throw std::invalid_argument("Characters need frequencies.");
+}
+
 [[noreturn]] void refuseNodes() {
     throw std::logic_error("The coder's nodes are not those of one tree.");
 }
@@ -55,6 +60,7 @@ void HuffmanCode::build(const double* characterFrequencies,
     requireNoCode();
     if (!boolTree.empty())
         throw std::logic_error("The coder has loaded a shape already.");
+    requireFrequencies(characterFrequencies, characters.size());
     try {
         buildOrClear([&] {
             makeHeapAndTree(characterFrequencies, characters);
@@ -70,12 +76,12 @@ void HuffmanCode::build(const double* characterFrequencies,
 
 void HuffmanCode::makeHeapAndTree(const double* characterFrequencies,
                                   const std::u16string& characters) {
-    if (characterFrequencies == nullptr && !characters.empty())
-        throw std::invalid_argument("Characters need frequencies.");
+    const std::size_t count = characters.size();
+    requireFrequencies(characterFrequencies, count);
     releaseContents(frequencies);
-    frequencies.reserve(characters.size());
+    frequencies.reserve(count);
     HeapQueue queue;
-    for (std::size_t i = 0; i < characters.size(); ++i) {
+    for (std::size_t i = 0; i < count; ++i) {
         HNode leaf;
         leaf.frequency = characterFrequencies[i];
         leaf.character = characters[i];

@@ -159,7 +159,10 @@ TEST(WrongCallers, AnEntryThatNoWriterCanWriteIsRefused) {
 
 TEST(WrongCallers, CharactersWithoutFrequenciesAreRefused) {
     HuffmanPathTree coder;
+    coder.setTreeString(u"kept");
     EXPECT_THROW(coder.deflateHuffman(nullptr, u"ab"), std::invalid_argument);
+    EXPECT_THROW(coder.makeHeapAndTree(nullptr, u"ab"), std::invalid_argument);
+    EXPECT_EQ(coder.getTreeString(), u"kept");
     coder.deflateHuffman(nullptr, u"");
     EXPECT_TRUE(coder.nodes.empty());
 }
