@@ -81,6 +81,7 @@ std::optional<std::vector<Texts>> fetched(const HuffmanPathTree& coder,
         std::vector<Components> files;
         coder.getPath(folders, files, {number});
         std::vector<Texts> lists;
+        lists.reserve(folders.size() + files.size());
         for (const Components& names : folders)
             lists.push_back(decode(coder, names));
         for (const Components& names : files)

@@ -89,7 +89,9 @@ private:
         const BNodePtr among = realHandle();
         tree().findNode(takeComponent(input_), among->children());
         tree().isLeaf(handle());
-        require(handle() == handle() || true, "handles compare");
+        const BNodePtr& one = handle();
+        const BNodePtr& other = handle();
+        require((one == other) == (other == one), "equality goes both ways");
     }
 
     void searchAndAdd() {
