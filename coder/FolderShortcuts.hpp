@@ -51,7 +51,7 @@ public:
 
     // Asks the processor for what find will look at.
     void prefetch(std::size_t k) const noexcept {
-        __builtin_prefetch(entries_.data() + k);
+        if (k < entries_.size()) __builtin_prefetch(entries_.data() + k);
     }
 
     void shrinkToFit() { entries_.shrink_to_fit(); }
