@@ -31,6 +31,12 @@ public:
         return *std::get_if<Bytes>(&source_);
     }
 
+    // See FileMapping; bytes in memory stay what they are.
+    void requireIntact() const {
+        if (const auto* mapping = std::get_if<FileMapping>(&source_))
+            mapping->requireIntact();
+    }
+
     // See FileMapping; bytes in memory stay.
     void releasePages() const noexcept {
         if (const auto* mapping = std::get_if<FileMapping>(&source_))

@@ -18,6 +18,7 @@ ArchiveReader::ArchiveReader(ArchiveBytes bytes) : bytes_(std::move(bytes)) {
     for (const SegmentEntry& entry : directory.entries())
         segments_.push_back(std::make_unique<const Segment>(
             bytes_.bytes().subspan(entry.offset, entry.bytes), entry));
+    requireIntact();
 }
 
 std::size_t ArchiveReader::segmentOf(std::uint64_t number) const noexcept {
@@ -34,19 +35,27 @@ void ArchiveReader::read(std::uint64_t number, std::string& into) const {
     const Segment& of = segment(segmentOf(number));
     PathCursor paths(of);
     into = paths.at(placeOf(of, number - of.entry().firstNumber));
+    requireIntact();
 }
 
 bool ArchiveReader::readStored(const Segment& segment, std::uint64_t first,
                                std::uint64_t last, PathVisitor visitor) const {
     const std::uint64_t base = segment.entry().firstNumber;
     PathCursor paths(segment);
-    for (std::uint64_t place = first - base; place < last - base; ++place)
-        if (!visitor(base + place, paths.at(place))) return false;
+    for (std::uint64_t place = first - base; place < last - base; ++place) {
+        const std::string_view path = paths.at(place);
+        requireIntact();
+        if (!visitor(base + place, path)) return false;
+    }
     return true;
 }
 
 bool ArchiveReader::read(std::uint64_t first, std::uint64_t last,
                          PathVisitor visitor) const {
+    const auto checked = [&](std::uint64_t number, std::string_view path) {
+        requireIntact();
+        return visitor(number, path);
+    };
     while (first < last) {
         const Segment& current = segment(segmentOf(first));
         const std::uint64_t end =
@@ -54,7 +63,7 @@ bool ArchiveReader::read(std::uint64_t first, std::uint64_t last,
         const bool goesOn =
             isInPlace(current)
                 ? readStored(current, first, end, visitor)
-                : ScatteredReader(current).read(first, end, visitor);
+                : ScatteredReader(current).read(first, end, checked);
         if (!goesOn) return false;
         first = end;
     }
@@ -63,6 +72,10 @@ bool ArchiveReader::read(std::uint64_t first, std::uint64_t last,
 
 bool ArchiveReader::read(std::span<const std::uint64_t> numbers,
                          PathVisitor visitor) const {
+    const auto checked = [&](std::uint64_t number, std::string_view path) {
+        requireIntact();
+        return visitor(number, path);
+    };
     while (!numbers.empty()) {
         const Segment& current = segment(segmentOf(numbers.front()));
         const std::uint64_t base = current.entry().firstNumber;
@@ -70,7 +83,7 @@ bool ArchiveReader::read(std::span<const std::uint64_t> numbers,
             return number - base >= current.size();
         });
         const auto count = static_cast<std::size_t>(end - numbers.begin());
-        if (!ScatteredReader(current).read(numbers.first(count), visitor))
+        if (!ScatteredReader(current).read(numbers.first(count), checked))
             return false;
         numbers = numbers.subspan(count);
     }

@@ -35,6 +35,10 @@ public:
     std::span<const std::uint8_t> data() const noexcept {
         return bytes_.bytes();
     }
+    // Throws DamagedArchiveException if what was read so far may not be what
+    // the file held. Call it after reading, before anyone uses what was read;
+    // `read` does that itself.
+    void requireIntact() const { bytes_.requireIntact(); }
     void releasePages() const noexcept { bytes_.releasePages(); }
 
     std::size_t segmentCount() const noexcept { return segments_.size(); }

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <span>
 #include <stdexcept>
+#include <system_error>
 #include <utility>
 
 #include "archive/ArchiveBytes.hpp"
@@ -170,7 +171,13 @@ ArchiveWriter ArchiveWriter::append(const std::string& file,
     const FileMapping old(file);
     auto impl = std::make_unique<Impl>(std::make_unique<FileTarget>(file),
                                        std::move(options));
-    impl->startWith(old.bytes());
+    try {
+        impl->startWith(old.bytes());
+    } catch (const std::system_error&) {
+        old.requireIntact();  // bytes that are gone cannot be written
+        throw;
+    }
+    old.requireIntact();
     return ArchiveWriter(std::move(impl));
 }
 

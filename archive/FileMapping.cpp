@@ -9,6 +9,8 @@
 #include <system_error>
 #include <utility>
 
+#include "archive/ArchiveExceptions.hpp"
+
 namespace tessel::archive {
 namespace {
 
@@ -44,18 +46,39 @@ std::size_t sizeOf(const Descriptor& descriptor, const std::string& file) {
 
 }  // namespace
 
-FileMapping::FileMapping(const std::string& file) {
+// Complete before it maps anything, so that a throw unmaps it.
+FileMapping::FileMapping(const std::string& file) : FileMapping() {
     const Descriptor descriptor(file);
-    size_ = sizeOf(descriptor, file);
-    if (size_ == 0) return;  // mmap refuses to map nothing
+    const std::size_t size = sizeOf(descriptor, file);
+    if (size == 0) return;  // mmap refuses to map nothing
     void* const start =
-        ::mmap(nullptr, size_, PROT_READ, MAP_SHARED, descriptor.number(), 0);
+        ::mmap(nullptr, size, PROT_READ, MAP_SHARED, descriptor.number(), 0);
     if (start == MAP_FAILED) fail(errno, file);
     start_ = start;
+    size_ = size;
+    lostPages_ = LostPages(start_, size_);
+    lastBytes_ = lastBytes();
 }
 
 FileMapping::~FileMapping() {
+    lostPages_ = {};
     if (start_ != nullptr) ::munmap(start_, size_);
+}
+
+void FileMapping::failChanged() const {
+    throw DamagedArchiveException(
+        size_,
+        "The file was cut or overwritten while it was open, or the disk "
+        "failed.");
+}
+
+void FileMapping::settle() {
+    constexpr std::size_t smallestPage = 4096;
+    const volatile std::uint8_t* const start = bytes().data();
+    for (std::size_t i = 0; i < size_; i += smallestPage)
+        static_cast<void>(start[i]);
+    if (start_ != nullptr) lostPages_ = LostPages(start_, size_);
+    lastBytes_ = lastBytes();
 }
 
 void FileMapping::releasePages() const noexcept {
@@ -64,11 +87,15 @@ void FileMapping::releasePages() const noexcept {
 
 FileMapping::FileMapping(FileMapping&& other) noexcept
     : start_(std::exchange(other.start_, nullptr)),
-      size_(std::exchange(other.size_, 0)) {}
+      size_(std::exchange(other.size_, 0)),
+      lastBytes_(std::exchange(other.lastBytes_, 0)),
+      lostPages_(std::move(other.lostPages_)) {}
 
 FileMapping& FileMapping::operator=(FileMapping&& other) noexcept {
     std::swap(start_, other.start_);
     std::swap(size_, other.size_);
+    std::swap(lastBytes_, other.lastBytes_);
+    std::swap(lostPages_, other.lostPages_);
     return *this;
 }
 

@@ -84,23 +84,26 @@ void removeIfLeft(const fs::path& path) {
 // What killed writers of the same target left behind. Nothing here is worth
 // an error: the next writer tries again.
 void removeLeftovers(const std::string& folder, std::string_view prefix) {
-    std::error_code ignored;
-    for (const fs::directory_entry& entry :
-         fs::directory_iterator(folder, ignored))
-        if (isHiddenName(entry.path().filename().string(), prefix))
-            removeIfLeft(entry.path());
+    std::error_code error;
+    for (fs::directory_iterator entry(folder, error);
+         !error && entry != fs::directory_iterator(); entry.increment(error))
+        if (isHiddenName(entry->path().filename().string(), prefix))
+            removeIfLeft(entry->path());
 }
 
 }  // namespace
 
-FileTarget::FileTarget(const std::string& file) {
+// Complete before it makes a file, so that a throw removes it.
+FileTarget::FileTarget(const std::string& file) : FileTarget() {
     requireRegular(file);
     file_ = replacedFile(file);
     const std::size_t nameAt = file_.rfind('/') + 1;
     folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
     prefix_ = hiddenPrefix(std::string_view(file_).substr(nameAt));
     removeLeftovers(folder_, prefix_);
-    createTemporary();
+    while (!tryCreate()) {
+    }
+    takePermissions();
 }
 
 bool FileTarget::isHiddenFile(const std::string& target,
@@ -112,22 +115,13 @@ bool FileTarget::isHiddenFile(const std::string& target,
                         hiddenPrefix(name.native()));
 }
 
-FileTarget::~FileTarget() {
+FileTarget::~FileTarget() { removeTemporary(); }
+
+void FileTarget::removeTemporary() noexcept {
     if (descriptor_ < 0) return;
     if (!temporary_.empty()) ::unlink(temporary_.c_str());
     ::close(descriptor_);
-}
-
-void FileTarget::createTemporary() {
-    while (!tryCreate()) {
-    }
-    try {
-        takePermissions();
-    } catch (...) {
-        ::unlink(temporary_.c_str());
-        ::close(descriptor_);
-        throw;
-    }
+    descriptor_ = -1;
 }
 
 // False if somebody else has the name, or took the file for a leftover before
@@ -141,19 +135,22 @@ bool FileTarget::tryCreate() {
         if (errno == EEXIST) return false;
         fail(file_);
     }
+    // Where there are no locks, nobody gets one to remove this file either.
+    const bool isTaken =
+        ::flock(descriptor_, LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK;
     struct stat status {};
-    if (::flock(descriptor_, LOCK_EX | LOCK_NB) == 0 &&
-        ::fstat(descriptor_, &status) == 0 && status.st_nlink > 0)
-        return true;
-    ::close(descriptor_);
-    descriptor_ = -1;
+    if (::fstat(descriptor_, &status) != 0) fail(file_);
+    if (!isTaken && status.st_nlink > 0) return true;
+    removeTemporary();
     return false;
 }
 
 void FileTarget::takePermissions() const {
     struct stat old {};
     if (::stat(file_.c_str(), &old) != 0) return;
-    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0) fail(file_);
+    // Some file systems know no permissions.
+    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0 && errno != EPERM)
+        fail(file_);
 }
 
 void FileTarget::append(Bytes bytes) {

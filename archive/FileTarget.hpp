@@ -15,7 +15,7 @@ namespace tessel::archive {
 //
 // The hidden file is locked (flock) while its writer lives. A killed writer
 // leaves it behind unlocked, and the next writer of the same target removes
-// it.
+// it. On a file system without locks, it stays.
 //
 // The new file has the permissions of the old one, if there was one. If the
 // target is a symbolic link, what it points to is replaced, or made.
@@ -37,8 +37,10 @@ public:
     static bool isHiddenFile(const std::string& target, std::string_view path);
 
 private:
-    void createTemporary();
+    FileTarget() = default;
+
     bool tryCreate();
+    void removeTemporary() noexcept;
     void takePermissions() const;
     void write(Bytes bytes, std::uint64_t offset) const;
     void flushFolder() const;

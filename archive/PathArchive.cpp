@@ -93,15 +93,21 @@ PathArchive::Iterator PathArchive::begin() const { return Iterator(reader_); }
 
 std::optional<std::uint64_t> PathArchive::numberOf(
     std::string_view path) const {
-    return archive::numberOf(*reader_, path);
+    const auto number = archive::numberOf(*reader_, path);
+    reader_->requireIntact();
+    return number;
 }
 
 bool PathArchive::contains(std::string_view path) const {
-    return archive::contains(*reader_, path);
+    const bool isThere = archive::contains(*reader_, path);
+    reader_->requireIntact();
+    return isThere;
 }
 
 std::vector<NumberRange> PathArchive::folder(std::string_view path) const {
-    return archive::numbersBelow(*reader_, path);
+    auto ranges = archive::numbersBelow(*reader_, path);
+    reader_->requireIntact();
+    return ranges;
 }
 
 // ---- Search ----
@@ -149,13 +155,20 @@ void PathArchive::verify(const ScanOptions& options) const {
 
 std::vector<ArchiveDamage> PathArchive::findDamage(
     const ScanOptions& options) const {
-    return archive::findDamage(*reader_, options);
+    auto damages = archive::findDamage(*reader_, options);
+    if (damages.empty()) reader_->requireIntact();
+    return damages;
 }
 
 SalvageReport PathArchive::salvage(const std::string& file,
                                    PathVisitor visitor) {
-    const archive::FileMapping mapping(file);
-    return salvage(mapping.bytes(), visitor);
+    archive::FileMapping mapping(file);
+    mapping.settle();
+    return salvage(mapping.bytes(),
+                   [&](std::uint64_t number, std::string_view path) {
+                       mapping.requireIntact();
+                       return visitor(number, path);
+                   });
 }
 
 SalvageReport PathArchive::salvage(std::span<const std::uint8_t> bytes,

@@ -62,11 +62,15 @@ private:
 
 // Lets a predicate pass for a filter.
 struct PredicateFilter {
+    const ArchiveReader* archive;
     PathPredicate predicate;
 
     void enterFolder(std::string_view) const noexcept {}
     bool takesWholeFolder() const noexcept { return false; }
-    bool takes(std::string_view path) const { return predicate(path); }
+    bool takes(std::string_view path) const {
+        archive->requireIntact();
+        return predicate(path);
+    }
 };
 
 // Adds what the filter takes of the paths that start with the prefix.
@@ -117,12 +121,14 @@ std::vector<Stretch> stretchesOf(const ArchiveReader& archive,
 // Hands over what was found, in ascending order of numbers.
 class Delivery {
 public:
-    Delivery(Show show, PathVisitor visitor) noexcept
-        : show_(show), visitor_(visitor) {}
+    Delivery(const ArchiveReader& archive, Show show,
+             PathVisitor visitor) noexcept
+        : archive_(archive), show_(show), visitor_(visitor) {}
 
     // The stretches must come in their order. False if the visitor ended the
     // visit.
     bool take(const Stretch& stretch, const Matches& matches) {
+        archive_.requireIntact();
         if (isInPlace(*stretch.segment)) return show(stretch, matches);
         const Segment& segment = *stretch.segment;
         if (found_.empty()) found_.resize(segment.size());
@@ -160,12 +166,18 @@ private:
 
     bool showNumbers(const Segment& segment,
                      std::span<const std::uint64_t> numbers) const {
+        archive_.requireIntact();
         if (show_ == Show::Paths)
-            return ScatteredReader(segment).read(numbers, visitor_);
+            return ScatteredReader(segment).read(
+                numbers, [this](std::uint64_t number, std::string_view path) {
+                    archive_.requireIntact();
+                    return visitor_(number, path);
+                });
         return std::ranges::all_of(
             numbers, [this](auto number) { return visitor_(number, {}); });
     }
 
+    const ArchiveReader& archive_;
     Show show_;
     PathVisitor visitor_;
     std::vector<bool> found_;  // places of a rearranged segment
@@ -178,7 +190,7 @@ void search(const ArchiveReader& archive, const Filter& filter,
     const auto stretches = stretchesOf(archive, prefix);
     OrderedScan scan(stretches.size(), options);
     std::vector<Matches> matches(scan.slots(), Matches(show));
-    Delivery delivery(show, visitor);
+    Delivery delivery(archive, show, visitor);
     scan.run(
         [&](std::uint64_t i) {
             Matches& found = matches[i % scan.slots()];
@@ -199,6 +211,7 @@ std::vector<std::uint64_t> numbersOf(const ArchiveReader& archive,
         numbers.push_back(number);
     };
     search(archive, filter, options, Show::Numbers, keep);
+    archive.requireIntact();
     return numbers;
 }
 
@@ -213,7 +226,7 @@ std::vector<std::uint64_t> find(const ArchiveReader& archive,
 std::vector<std::uint64_t> find(const ArchiveReader& archive,
                                 PathPredicate predicate,
                                 const FindOptions& options) {
-    return numbersOf(archive, PredicateFilter{predicate}, options);
+    return numbersOf(archive, PredicateFilter{&archive, predicate}, options);
 }
 
 void findEach(const ArchiveReader& archive,
@@ -224,7 +237,8 @@ void findEach(const ArchiveReader& archive,
 
 void findEach(const ArchiveReader& archive, PathPredicate predicate,
               PathVisitor visitor, const FindOptions& options) {
-    search(archive, PredicateFilter{predicate}, options, Show::Paths, visitor);
+    search(archive, PredicateFilter{&archive, predicate}, options, Show::Paths,
+           visitor);
 }
 
 }  // namespace tessel::archive

@@ -35,6 +35,7 @@ std::string_view SequentialReader::next() {
     const std::string_view path =
         batch_ ? nextInBatch()
                : paths_->at(number_ - segment_->entry().firstNumber);
+    archive_.requireIntact();
     ++number_;
     return path;
 }
