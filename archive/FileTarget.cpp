@@ -7,6 +7,7 @@
 
 #include <cerrno>
 #include <filesystem>
+#include <optional>
 #include <random>
 #include <system_error>
 
@@ -25,14 +26,29 @@ constexpr std::size_t maxNameInPrefix = 200;
     throw std::system_error(errno, std::generic_category(), file);
 }
 
-void requireRegular(const std::string& file) {
+// The type and permissions of a file, if it is there.
+std::optional<mode_t> modeOf(const std::string& file) {
     struct stat status {};
-    if (::stat(file.c_str(), &status) != 0 || S_ISREG(status.st_mode)) return;
-    if (!S_ISDIR(status.st_mode))
+    if (::stat(file.c_str(), &status) == 0) return status.st_mode;
+    if (errno != ENOENT) fail(file);
+    return std::nullopt;
+}
+
+void requireRegular(mode_t mode, const std::string& file) {
+    if (S_ISREG(mode)) return;
+    if (!S_ISDIR(mode))
         throw std::system_error(EINVAL, std::generic_category(),
                                 file + ": not a regular file");
     errno = EISDIR;
     fail(file);
+}
+
+bool isLink(const fs::path& path) {
+    std::error_code error;
+    const fs::file_status status = fs::symlink_status(path, error);
+    if (status.type() == fs::file_type::none)  // the system does not tell
+        throw std::system_error(error, path.string());
+    return fs::is_symlink(status);
 }
 
 // The file that is to be replaced: the target, or what it links to, which need
@@ -40,9 +56,7 @@ void requireRegular(const std::string& file) {
 std::string replacedFile(const std::string& file) {
     constexpr int maxLinks = 40;  // as Linux has it
     fs::path path(file);
-    std::error_code none;
-    for (int links = 0; fs::is_symlink(fs::symlink_status(path, none));
-         ++links) {
+    for (int links = 0; isLink(path); ++links) {
         if (links == maxLinks) {
             errno = ELOOP;
             fail(file);
@@ -95,7 +109,8 @@ void removeLeftovers(const std::string& folder, std::string_view prefix) {
 
 // Complete before it makes a file, so that a throw removes it.
 FileTarget::FileTarget(const std::string& file) : FileTarget() {
-    requireRegular(file);
+    const auto oldMode = modeOf(file);
+    if (oldMode) requireRegular(*oldMode, file);
     file_ = replacedFile(file);
     const std::size_t nameAt = file_.rfind('/') + 1;
     folder_ = nameAt == 0 ? "./" : file_.substr(0, nameAt);
@@ -103,7 +118,7 @@ FileTarget::FileTarget(const std::string& file) : FileTarget() {
     removeLeftovers(folder_, prefix_);
     while (!tryCreate()) {
     }
-    takePermissions();
+    if (oldMode) takePermissions(*oldMode);
 }
 
 bool FileTarget::isHiddenFile(const std::string& target,
@@ -145,11 +160,9 @@ bool FileTarget::tryCreate() {
     return false;
 }
 
-void FileTarget::takePermissions() const {
-    struct stat old {};
-    if (::stat(file_.c_str(), &old) != 0) return;
+void FileTarget::takePermissions(mode_t mode) const {
     // Some file systems know no permissions.
-    if (::fchmod(descriptor_, old.st_mode & 07777U) != 0 && errno != EPERM)
+    if (::fchmod(descriptor_, mode & 07777U) != 0 && errno != EPERM)
         fail(file_);
 }
 

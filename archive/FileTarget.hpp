@@ -1,5 +1,7 @@
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -41,7 +43,7 @@ private:
 
     bool tryCreate();
     void removeTemporary() noexcept;
-    void takePermissions() const;
+    void takePermissions(mode_t mode) const;
     void write(Bytes bytes, std::uint64_t offset) const;
     void flushFolder() const;
 

@@ -1,6 +1,7 @@
 #include "paths/WholeFile.hpp"
 
 #include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -8,8 +9,11 @@
 #include <cerrno>
 #include <cstdio>
 #include <filesystem>
+#include <optional>
 #include <random>
+#include <string_view>
 #include <system_error>
+#include <utility>
 
 namespace tessel::paths {
 
@@ -27,22 +31,26 @@ void requireNoNul(const char* verb, const std::string& file) {
 
 class FileDescriptor {
 public:
+    FileDescriptor() = default;
     explicit FileDescriptor(int descriptor) : number_(descriptor) {}
     FileDescriptor(const FileDescriptor&) = delete;
     FileDescriptor& operator=(const FileDescriptor&) = delete;
-    ~FileDescriptor() {
-        if (number_ >= 0) ::close(number_);
-    }
+    ~FileDescriptor() { close(); }
     int get() const noexcept { return number_; }
-    // Closes it and returns 0 or what went wrong.
+    // Closes it, if it is open, and returns 0 or what went wrong.
     int close() noexcept {
-        const int closed = ::close(number_);
+        const int closed = number_ < 0 ? 0 : ::close(number_);
         number_ = -1;
         return closed == 0 ? 0 : errno;
     }
+    // Takes another one.
+    void reset(int descriptor) noexcept {
+        close();
+        number_ = descriptor;
+    }
 
 private:
-    int number_;
+    int number_ = -1;
 };
 
 // The size of an open file, as far as that can be told; at least one block.
@@ -53,10 +61,20 @@ std::size_t expectedBytes(int file) noexcept {
     return std::max(block, static_cast<std::size_t>(about.st_size) + 1);
 }
 
+// The type and permissions of a file, if it is there.
+std::optional<mode_t> modeOf(const std::string& file) {
+    struct stat about {};
+    if (::stat(file.c_str(), &about) == 0) return about.st_mode;
+    if (errno != ENOENT) fail("write", file, errno);
+    return std::nullopt;
+}
+
 // The file that symbolic links lead to, or the name itself if there is none.
 std::string linkTarget(const std::string& file) {
     std::error_code error;
     const auto target = std::filesystem::canonical(file, error);
+    if (error && error != std::errc::no_such_file_or_directory)
+        fail("write", file, error.value());
     return error ? file : target.string();
 }
 
@@ -77,10 +95,8 @@ void writeAll(const FileDescriptor& to, std::span<const std::uint8_t> bytes,
 }
 
 // True for a pipe or a device: it must not make room for a file.
-bool isSpecial(const std::string& file) noexcept {
-    struct stat about {};
-    return ::stat(file.c_str(), &about) == 0 && !S_ISREG(about.st_mode) &&
-           !S_ISDIR(about.st_mode);
+bool isSpecial(mode_t mode) noexcept {
+    return !S_ISREG(mode) && !S_ISDIR(mode);
 }
 
 void writeInto(const std::string& file, std::span<const std::uint8_t> bytes) {
@@ -91,26 +107,82 @@ void writeInto(const std::string& file, std::span<const std::uint8_t> bytes) {
         fail("write", file, error);
 }
 
-// A new file beside the target, which is removed unless it takes its place.
+// ---- Replacing ----
+
+// What the names of the new files beside a target begin and end with. Whatever
+// replaces the target uses the same names, so that each removes what another
+// left when it was killed.
+std::string hiddenPrefix(const std::string& target) {
+    // Of a long name the beginning, so that the new one is not too long.
+    constexpr std::size_t maxNameBytes = 200;
+    std::string prefix(1, '.');
+    prefix.append(target, target.rfind('/') + 1, maxNameBytes);
+    return prefix.append(".tessel-");
+}
+constexpr std::string_view hiddenSuffix = ".tmp";
+constexpr std::size_t randomLetters = 6;
+
+std::string randomName() {
+    constexpr std::string_view letters = "abcdefghijklmnopqrstuvwxyz0123456789";
+    std::random_device source;
+    std::uniform_int_distribution<std::size_t> choose(0, letters.size() - 1);
+    std::string name(randomLetters, ' ');
+    for (char& letter : name) letter = letters[choose(source)];
+    return name;
+}
+
+// Removes a file unless its writer still holds its lock.
+void removeIfLeft(const std::string& file) {
+    const FileDescriptor left(
+        ::open(file.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW));
+    if (left.get() >= 0 && ::flock(left.get(), LOCK_EX | LOCK_NB) == 0)
+        ::unlink(file.c_str());
+}
+
+// Nothing here is worth an error: the next writer tries again.
+void removeLeftovers(const std::string& target) {
+    namespace fs = std::filesystem;
+    const std::string prefix = hiddenPrefix(target);
+    const std::size_t bytes =
+        prefix.size() + randomLetters + hiddenSuffix.size();
+    std::error_code error;
+    for (fs::directory_iterator entry(folderOf(target), error);
+         !error && entry != fs::directory_iterator(); entry.increment(error)) {
+        const std::string name = entry->path().filename().string();
+        if (name.size() == bytes && name.starts_with(prefix) &&
+            name.ends_with(hiddenSuffix))
+            removeIfLeft(entry->path().string());
+    }
+}
+
+// A new file beside the target, which is removed unless it takes its place. It
+// is locked, so that nobody takes it for one that a killed writer left.
 class Replacement {
 public:
-    explicit Replacement(const std::string& target)
-        : target_(target), name_(unusedName(target)), file_(create()) {}
+    explicit Replacement(const std::string& target) : target_(target) {
+        removeLeftovers(target);
+        while (!tryCreate()) {
+        }
+    }
     Replacement(const Replacement&) = delete;
     Replacement& operator=(const Replacement&) = delete;
-    ~Replacement() {
-        if (!name_.empty()) ::unlink(name_.c_str());
+    ~Replacement() { remove(); }
+
+    void takePermissions(mode_t mode) const {
+        constexpr mode_t permissions = 07777;
+        // Those of a file that is not ours, or has none, stay the usual ones.
+        if (::fchmod(file_.get(), mode & permissions) != 0 && errno != EPERM)
+            fail("write", target_, errno);
     }
 
     void write(std::span<const std::uint8_t> bytes) const {
         writeAll(file_, bytes, target_);
     }
 
-    // Moves it to the target's place once its bytes are on disk.
+    // Moves it to the target's place once its bytes are on disk. The lock is
+    // kept until then.
     void commit() {
         if (::fsync(file_.get()) != 0) fail("write", target_, errno);
-        if (const int error = file_.close(); error != 0)
-            fail("write", target_, error);
         if (std::rename(name_.c_str(), target_.c_str()) != 0)
             fail("replace", target_, errno);
         name_.clear();
@@ -122,40 +194,36 @@ public:
     }
 
 private:
-    static std::string unusedName(const std::string& target) {
-        // Of a long name the beginning, so that the new one is not too long.
-        constexpr std::size_t maxNameBytes = 200;
-        std::random_device random;
-        const std::size_t slash = target.rfind('/') + 1;
-        return target.substr(0, slash) + "." +
-               target.substr(slash, maxNameBytes) + "-" +
-               std::to_string(::getpid()) + "-" + std::to_string(random()) +
-               ".tmp";
-    }
-
-    int create() const {
+    // False if somebody else has the name, or took the file for a leftover
+    // before it was locked.
+    bool tryCreate() {
         constexpr mode_t usual = 0666;
-        const int file = ::open(name_.c_str(),
+        std::string name = target_.substr(0, target_.rfind('/') + 1);
+        name.append(hiddenPrefix(target_)).append(randomName());
+        name.append(hiddenSuffix);
+        const int file = ::open(name.c_str(),
                                 O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, usual);
+        if (file < 0 && errno == EEXIST) return false;
         if (file < 0) fail("write", target_, errno);
-        struct stat about {};
-        constexpr mode_t permissions = 07777;
-        // A target that is not there, or not ours, leaves the usual ones.
-        if (::stat(target_.c_str(), &about) == 0 &&
-            ::fchmod(file, about.st_mode & permissions) != 0 && errno != EPERM)
-            removeAndFail(file);
-        return file;
+        file_.reset(file);
+        name_ = std::move(name);
+        // Where there are no locks, nobody gets one to remove this file either.
+        if (::flock(file, LOCK_EX | LOCK_NB) == 0 || errno != EWOULDBLOCK) {
+            struct stat about {};
+            if (::fstat(file, &about) != 0 || about.st_nlink > 0) return true;
+        }
+        remove();
+        return false;
     }
 
-    [[noreturn]] void removeAndFail(int file) const {
-        const int error = errno;
-        ::close(file);
-        ::unlink(name_.c_str());
-        fail("write", target_, error);
+    void remove() noexcept {
+        if (!name_.empty()) ::unlink(name_.c_str());
+        name_.clear();
+        file_.close();
     }
 
     std::string target_;
-    std::string name_;  // empty once it has the target's
+    std::string name_;  // empty while there is no file, or it has the target's
     FileDescriptor file_;
 };
 
@@ -181,8 +249,10 @@ std::string readWholeFile(const std::string& file) {
 
 void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes) {
     requireNoNul("write", file);
-    if (isSpecial(file)) return writeInto(file, bytes);
+    const auto oldMode = modeOf(file);
+    if (oldMode && isSpecial(*oldMode)) return writeInto(file, bytes);
     Replacement replacement(linkTarget(file));
+    if (oldMode) replacement.takePermissions(*oldMode);
     replacement.write(bytes);
     replacement.commit();
 }

@@ -15,7 +15,9 @@ std::string readWholeFile(const std::string& file);
 // new one, or none if there was none. A symbolic link is followed, and a
 // target keeps its permissions. A pipe or a device is not replaced: the bytes
 // are written to it. Throws std::system_error, whose message has
-// the file's name; what was written is removed then.
+// the file's name; what was written is removed then. What a killed process
+// left, a hidden file `.NAME.tessel-XXXXXX.tmp`, is removed by the next one
+// that replaces the same file.
 void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes);
 
 }  // namespace tessel::paths

@@ -3,16 +3,35 @@
 #include <fmt/format.h>
 #include <sys/stat.h>
 
+#include <cerrno>
+#include <system_error>
+
 #include "archive/FileTarget.hpp"
 #include "hosts/console/ConsoleException.hpp"
 #include "hosts/console/Terminal.hpp"
 
 namespace tessel::console {
 
+namespace {
+
+// Whether a call found the file.
+bool isFound(int result, const std::string& file) {
+    if (result == 0) return true;
+    if (errno == ENOENT) return false;
+    throw std::system_error(errno, std::generic_category(), file);
+}
+
+}  // namespace
+
+bool exists(const std::string& file) {
+    struct stat about {};
+    return isFound(::stat(file.c_str(), &about), file);
+}
+
 void checkOverwrite(const std::string& file, Overwrite overwrite) {
     struct stat about {};
     if (file == "-" || overwrite == Overwrite::Allowed ||
-        ::lstat(file.c_str(), &about) != 0)
+        !isFound(::lstat(file.c_str(), &about), file))
         return;
     throw ConsoleException(
         ExitStatus::BadInput,

@@ -12,8 +12,13 @@ namespace tessel::console {
 // Whether an existing file may be replaced.
 enum class Overwrite { Refused, Allowed };
 
+// Whether there is such a file; a link that leads nowhere is none. Throws
+// std::system_error if the system does not tell: a file that is taken for
+// missing would be replaced.
+bool exists(const std::string& file);
+
 // Throws ConsoleException with the status BadInput if the file exists and may
-// not be replaced. "-" never exists.
+// not be replaced, and std::system_error. "-" never exists.
 void checkOverwrite(const std::string& file, Overwrite overwrite);
 
 // Throws ConsoleException with the status Usage if bytes that are no text

@@ -1,7 +1,6 @@
 #include "hosts/console/PackCommand.hpp"
 
 #include <fmt/format.h>
-#include <sys/stat.h>
 
 #include <chrono>
 #include <cstdint>
@@ -29,11 +28,6 @@ constexpr Command::Description packDescription = {
     "  tessel pack files.store -o files.tessel"};
 
 using Clock = std::chrono::steady_clock;
-
-bool exists(const std::string& file) {
-    struct stat about {};
-    return ::stat(file.c_str(), &about) == 0;
-}
 
 ArchiveLevel levelOf(std::string_view name) noexcept {
     if (name == "fast") return ArchiveLevel::Fast;

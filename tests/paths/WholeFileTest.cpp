@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -104,6 +105,31 @@ TEST_F(WholeFile, AFailedReplacementLeavesNothingBehind) {
     EXPECT_THROW(replaceFile(path("folder"), Bytes{'n'}), std::system_error);
     EXPECT_EQ(entries(), 1U);
     EXPECT_EQ(readWholeFile(path("folder/file")), "kept");
+}
+
+TEST_F(WholeFile, RemovesWhatAKilledProcessLeft) {
+    std::ofstream(path(".a.tessel-abc123.tmp")) << "left";
+    const std::vector<std::string> others = {
+        ".a.tessel-abc123.tmpx", ".a.tessel-abc1234.tmp",
+        ".b.tessel-abc123.tmp", "a.tessel-abc123.tmp"};
+    for (const std::string& name : others) std::ofstream(path(name)) << "kept";
+    replaceFile(path("a"), Bytes{'n'});
+    EXPECT_FALSE(fs::exists(path(".a.tessel-abc123.tmp")));
+    for (const std::string& name : others)
+        EXPECT_TRUE(fs::exists(path(name))) << name;
+    EXPECT_EQ(entries(), 5U);
+}
+
+TEST_F(WholeFile, LeavesWhatALivingProcessWrites) {
+    const std::string name = path(".a.tessel-abc123.tmp");
+    const int file = ::open(name.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC,
+                            S_IRUSR | S_IWUSR);
+    ASSERT_EQ(::flock(file, LOCK_EX), 0);
+    replaceFile(path("a"), Bytes{'n'});
+    EXPECT_TRUE(fs::exists(name));
+    ::close(file);
+    replaceFile(path("a"), Bytes{'n'});
+    EXPECT_FALSE(fs::exists(name));
 }
 
 TEST_F(WholeFile, ANameMayBeAsLongAsAnyFiles) {
