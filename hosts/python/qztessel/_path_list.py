@@ -82,8 +82,9 @@ class PathList(Sequence[AnyStr]):
     def open(cls, file: Path, *, as_bytes: bool = False) -> PathList[Any]:
         """Open an archive by mapping its file, which takes a millisecond.
 
-        Do not change the file in place or cut it while it is open; `pack`,
-        `save` and `append` replace files as a whole.
+        If the file is cut or written anew while it is open, reading raises
+        `DamagedArchiveError`. Do not write into its middle; `pack`, `save` and
+        `append` replace files as a whole, and this list keeps the old one.
 
         >>> PathList.open("missing.tessel")
         Traceback (most recent call last):
@@ -159,8 +160,8 @@ class PathList(Sequence[AnyStr]):
         Takes 0.6 to 1.2 microseconds per path on one core and uses all cores.
         Raises `ValueError`, with the position, for a path that is empty, holds
         a NUL or has a name or folder of over 1 MiB; `TypeError` for what is no
-        path. After an exception, `file` is as it was; only what `progress` raises
-        at its last call comes too late.
+        path. After an exception, `file` is the old one, or the new one if the
+        exception came in the last moment, as Ctrl-C may; it is always whole.
 
         >>> PathList.pack(["a", ""])
         Traceback (most recent call last):
