@@ -244,9 +244,9 @@ TEST(ChangedFiles, ThreadsReadWhileTheFileIsAppendedTo) {
             std::uint64_t last = 0;
             while (!isDone) {
                 const auto archive = PathArchive::open(file.name());
-                const Paths part(list.begin(),
-                                 list.begin() + static_cast<std::ptrdiff_t>(
-                                                    archive.size()));
+                const Paths part(
+                    list.begin(),
+                    list.begin() + static_cast<std::ptrdiff_t>(archive.size()));
                 if (archive.size() % step != 0 || archive.size() < last ||
                     !readsInOrder(archive, part))
                     ++failures;

@@ -175,8 +175,8 @@ TEST_F(WholeFileDisks, LoadingGivesTheStoreOrAnError) {
     std::vector<std::string> found;
     eachFailure([&] { found.clear(); }, [&] { found = loaded(path("a")); },
                 [&](bool isDone) {
-                    EXPECT_EQ(found, isDone ? oldPaths
-                                            : std::vector<std::string>());
+                    EXPECT_EQ(found,
+                              isDone ? oldPaths : std::vector<std::string>());
                     if (!isDone) ++refused;
                 });
     EXPECT_GE(refused, 4);

@@ -122,8 +122,8 @@ TEST_F(WholeFile, RemovesWhatAKilledProcessLeft) {
 
 TEST_F(WholeFile, LeavesWhatALivingProcessWrites) {
     const std::string name = path(".a.tessel-abc123.tmp");
-    const int file = ::open(name.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC,
-                            S_IRUSR | S_IWUSR);
+    const int file =
+        ::open(name.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
     ASSERT_EQ(::flock(file, LOCK_EX), 0);
     replaceFile(path("a"), Bytes{'n'});
     EXPECT_TRUE(fs::exists(name));

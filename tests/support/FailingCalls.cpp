@@ -64,9 +64,9 @@ bool fails(std::string_view kind, int file) {
     const std::string link = "/proc/self/fd/" + std::to_string(file);
     const long length = ::syscall(SYS_readlinkat, AT_FDCWD, link.c_str(),
                                   path.data(), path.size());
-    return length > 0 && fails(kind, std::string_view(path.data(),
-                                                      static_cast<std::size_t>(
-                                                          length)));
+    return length > 0 &&
+           fails(kind, std::string_view(path.data(),
+                                        static_cast<std::size_t>(length)));
 }
 
 template <class Function>
