@@ -1,6 +1,7 @@
 #include <unistd.h>
 
 #include <exception>
+#include <iostream>
 #include <string>
 #include <vector>
 
@@ -24,8 +25,9 @@ int main(int wordCount, char** words) {
         } catch (const console::ClosedPipeException&) {
             interrupts.endByClosedPipe();
         }
-    } catch (const std::exception&) {
-        // Not even the error could be told.
+    } catch (const std::exception& failure) {
+        // The command did not start.
+        std::cerr << "tessel: " << failure.what() << '\n';
         return static_cast<int>(console::ExitStatus::System);
     }
 }

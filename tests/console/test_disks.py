@@ -34,13 +34,13 @@ ERRORS = {
 }
 
 
-def runs_with_failures(tessel, words, prepare, **options):
+def runs_with_failures(tessel, words, prepare, all_errors=ERRORS):
     """Runs the command with the first, second ... call of every kind failing
     until no call is left to fail. Yields what failed and the result."""
     disk = tessel.folder / "disk"
     disk.mkdir()
     mark = tessel.folder / "mark"
-    for kind, errors in ERRORS.items():
+    for kind, errors in all_errors.items():
         for error in errors:
             number = 0
             mark.touch()
@@ -55,7 +55,7 @@ def runs_with_failures(tessel, words, prepare, **options):
                     check=False, env={
                         **os.environ, "LD_PRELOAD": FAILING_CALLS,
                         "FAIL_FOLDER": str(disk), "FAIL_MARK": str(mark),
-                        "FAIL_CALL": f"{kind} {number} {error}"}, **options)
+                        "FAIL_CALL": f"{kind} {number} {error}"})
                 if mark.exists():
                     yield (kind, number, errno.errorcode.get(error)), done
 
@@ -134,6 +134,29 @@ def test_reading(tessel, words):
         check_end(what, done, right.err)
         if done.returncode == 0:
             assert done.stdout == right.out, what
+
+
+@pytest.mark.parametrize("words", [
+    ["pack", "list", "-f", "-j", "4", "-o", "disk/a.tessel"],
+    ["list", "a.tessel"], ["find", "a.tessel", "e", "-j", "4"],
+    ["verify", "a.tessel", "-j", "4"]], ids=lambda words: words[0])
+def test_threads_that_cannot_start(tessel, words):
+    paths = some_paths(50000)
+    (tessel.folder / "list").write_bytes(b"\n".join(paths) + b"\n")
+    tessel("pack", "list", "-o", "a.tessel")
+    right = tessel(*words) if words[0] != "pack" else None
+    failures = 0
+    for what, done in runs_with_failures(
+            tessel, words, lambda disk: None, {"pthread_create": [errno.EAGAIN]}):
+        failures += 1
+        check_end(what, done)
+        assert done.returncode == (5 if what[1] == 1 else 0), what
+        if done.returncode == 0 and right:
+            assert done.stdout == right.out, what
+        elif done.returncode == 0:
+            assert ((tessel.folder / "disk/a.tessel").read_bytes() ==
+                    (tessel.folder / "a.tessel").read_bytes())
+    assert failures > 1
 
 
 @pytest.mark.parametrize("size", [0, 5000])

@@ -3,6 +3,7 @@
 #include <dirent.h>
 #include <dlfcn.h>
 #include <fcntl.h>
+#include <pthread.h>
 #include <sys/file.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -190,6 +191,14 @@ int flock(int file, int operation) noexcept {
 int fchmod(int file, mode_t mode) noexcept {
     if (fails("fchmod", file)) return -1;
     return real<int(int, mode_t)>("fchmod")(file, mode);
+}
+
+int pthread_create(pthread_t* thread, const pthread_attr_t* attributes,
+                   void* (*start)(void*), void* argument) noexcept {
+    if (fails("pthread_create", plan().folder)) return plan().error;
+    return real<int(pthread_t*, const pthread_attr_t*, void* (*)(void*),
+                    void*)>("pthread_create")(thread, attributes, start,
+                                              argument);
 }
 
 dirent* readdir(DIR* folder) {

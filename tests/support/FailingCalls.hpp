@@ -9,6 +9,8 @@
 //   open close read write pwrite fsync rename mmap fstat stat lstat flock
 //   fchmod readdir
 //
+// Of the kind pthread_create, all calls count.
+//
 // In a process of its own, the environment says what fails; the file FAIL_MARK
 // is made when it did:
 //
