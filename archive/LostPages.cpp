@@ -1,6 +1,7 @@
 #include "archive/LostPages.hpp"
 
 #include <sys/mman.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -21,6 +22,12 @@ struct sigaction before;               // what handled SIGBUS before us
 std::size_t pageBytes = 0;
 // NOLINTEND(cppcoreguidelines-avoid-non-const-global-variables)
 
+#ifdef SYS_mmap2
+constexpr long mapCall = SYS_mmap2;  // SYS_mmap takes other arguments here
+#else
+constexpr long mapCall = SYS_mmap;
+#endif
+
 // ---- In the handler: nothing but atomics and system calls ----
 
 // False, too, for a range that another thread just changes: no range that
@@ -39,11 +46,10 @@ bool replacePage(std::size_t address) noexcept {
     for (Range* range = ranges.load(); range != nullptr; range = range->next) {
         if (!holds(*range, address)) continue;
         range->lost.store(true);
-        void* const page =
-            reinterpret_cast<void*>(address - address % pageBytes);
-        return ::mmap(page, pageBytes, PROT_READ,
-                      MAP_PRIVATE | MAP_ANONYMOUS | MAP_FIXED, -1,
-                      0) != MAP_FAILED;
+        // The system call itself: nothing says that a handler may call mmap.
+        return ::syscall(mapCall, address - address % pageBytes, pageBytes,
+                         PROT_READ, MAP_PRIVATE | MAP_ANONYMOUS | MAP_FIXED, -1,
+                         0) != -1;
     }
     return false;
 }
