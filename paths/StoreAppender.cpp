@@ -10,7 +10,7 @@ namespace tessel::paths {
 
 void StoreAppender::add(std::string_view path) {
     chunk_.append(path);
-    if (chunk_.size() >= maxPathsPerChunk ||
+    if (chunk_.size() >= pathsPerChunk_ ||
         chunk_.textBytes() >= maxBytesPerChunk)
         addChunk();
 }

@@ -28,7 +28,9 @@ namespace tessel::paths {
 // Cost: at most a chunk's text and two chunks' encoded names, see the limits.
 class StoreAppender {
 public:
-    explicit StoreAppender(HuffmanPathTree& coder) : coder_(&coder) {}
+    explicit StoreAppender(HuffmanPathTree& coder,
+                           std::size_t pathsPerChunk = maxPathsPerChunk)
+        : coder_(&coder), pathsPerChunk_(pathsPerChunk) {}
 
     // Adds the path, now or later. It must not be empty.
     void add(std::string_view path);
@@ -53,6 +55,7 @@ private:
     void insertWaiting();
 
     HuffmanPathTree* coder_;
+    std::size_t pathsPerChunk_;
     PathList chunk_;
     EncodedChunk waiting_;  // encoded, to be inserted
     std::size_t pathCount_ = 0;

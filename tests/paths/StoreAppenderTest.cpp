@@ -36,12 +36,11 @@ TEST(StoreAppender, NothingIsAddedBeforeTheEnd) {
 // A full chunk waits until the next one is full or the end is there.
 TEST(StoreAppender, FullChunksAreAddedInOrder) {
     const auto coder = smallCoder();
-    StoreAppender appender(*coder);
-    const std::string big(StoreAppender::maxBytesPerChunk / 4, 'a');
-    for (int i = 0; i < 7; ++i) appender.add(big + std::to_string(i));
+    StoreAppender appender(*coder, 4);
+    for (int i = 0; i < 7; ++i) appender.add("a/" + std::to_string(i));
     EXPECT_EQ(coder->pathCount, 0U);
     EXPECT_FALSE(appender.hasStarted());
-    appender.add(big + "7");
+    appender.add("a/7");
     EXPECT_EQ(coder->pathCount, 4U);
     EXPECT_TRUE(appender.hasStarted());
     appender.add("b");
@@ -51,17 +50,30 @@ TEST(StoreAppender, FullChunksAreAddedInOrder) {
     std::string text;
     for (std::size_t i = 0; i < 8; ++i) {
         readPath(*coder, i, text);
-        EXPECT_EQ(text, big + std::to_string(i));
+        EXPECT_EQ(text, "a/" + std::to_string(i));
     }
     readPath(*coder, 8, text);
     EXPECT_EQ(text, "b");
 }
 
-TEST(StoreAppender, ARefusedChunkLeavesTheOneBefore) {
+TEST(StoreAppender, LongPathsFillAChunkToo) {
     const auto coder = smallCoder();
     StoreAppender appender(*coder);
     const std::string big(StoreAppender::maxBytesPerChunk, 'a');
-    appender.add(big);
+    appender.add(big + "0");
+    appender.add(big + "1");
+    EXPECT_EQ(coder->pathCount, 1U);
+    appender.finish();
+    EXPECT_EQ(coder->pathCount, 2U);
+    std::string text;
+    readPath(*coder, 1, text);
+    EXPECT_EQ(text, big + "1");
+}
+
+TEST(StoreAppender, ARefusedChunkLeavesTheOneBefore) {
+    const auto coder = smallCoder();
+    StoreAppender appender(*coder, 1);
+    appender.add("a");
     appender.add("?");
     EXPECT_THROW(appender.finish(), tessel::CodeNotFoundException);
     EXPECT_TRUE(appender.hasStarted());
