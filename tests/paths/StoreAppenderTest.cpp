@@ -74,8 +74,7 @@ TEST(StoreAppender, ARefusedChunkLeavesTheOneBefore) {
     const auto coder = smallCoder();
     StoreAppender appender(*coder, 1);
     appender.add("a");
-    appender.add("?");
-    EXPECT_THROW(appender.finish(), tessel::CodeNotFoundException);
+    EXPECT_THROW(appender.add("?"), tessel::CodeNotFoundException);
     EXPECT_TRUE(appender.hasStarted());
     EXPECT_EQ(coder->pathCount, 1U);
     EXPECT_TRUE(coder->encodedFolders.empty());
