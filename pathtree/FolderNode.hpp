@@ -79,11 +79,11 @@ public:
     // How far this node is behind another one in memory, and the node that is
     // so far behind this one.
     std::int64_t stepsFrom(const FolderNode& other) const noexcept {
-        return (address() - other.address()) / step;
+        return (address() - other.address()) / step();
     }
     const FolderNode* atSteps(std::int64_t steps) const noexcept {
         return reinterpret_cast<const FolderNode*>(
-            reinterpret_cast<const char*>(this) + steps * step);
+            reinterpret_cast<const char*>(this) + steps * step());
     }
 
     // Asks the processor for the children.
@@ -129,10 +129,12 @@ private:
     static constexpr unsigned lengthShift = 2;
     static constexpr unsigned longLength = 63;
 
-    static constexpr std::int64_t step = 4;
-
     FolderNode() noexcept = default;
 
+    // Nodes are as far apart as some of these.
+    static constexpr std::int64_t step() noexcept {
+        return alignof(FolderNode);
+    }
     std::int64_t address() const noexcept {
         return static_cast<std::int64_t>(reinterpret_cast<std::intptr_t>(this));
     }

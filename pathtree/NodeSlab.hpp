@@ -26,7 +26,7 @@ public:
     // each other in memory waste no space between them.
     static constexpr std::size_t maxBytes = alignment - 64;
     static constexpr std::size_t minBytes = 1024 - 64;
-    static constexpr std::size_t nodeAlignment = 4;
+    static constexpr std::size_t nodeAlignment = alignof(FolderNode);
 
     // A slab of so many bytes, held once. Throws std::bad_alloc.
     static NodeSlab* create(std::size_t bytes);

@@ -6,6 +6,7 @@ import subprocess
 import pytest
 
 from conftest import TESSEL, Tessel, some_paths
+from failing_calls import ERRORS
 
 FAILING_CALLS = os.environ.get("FAILING_CALLS")
 
@@ -14,25 +15,6 @@ pytestmark = pytest.mark.skipif(not FAILING_CALLS,
 
 OLD = some_paths(400, 1)
 NEW = some_paths(400, 2)
-
-# What a kind of call can fail with; 0: it does a half of what it should.
-ERRORS = {
-    "open": [errno.EIO, errno.ENOSPC],
-    "pwrite": [errno.EIO, errno.ENOSPC, errno.EDQUOT, errno.EINTR, 0],
-    "write": [errno.EIO, errno.EINTR, 0],
-    "read": [errno.EIO, errno.EINTR, 0],
-    "fsync": [errno.EIO, errno.EDQUOT],
-    "rename": [errno.EIO],
-    "close": [errno.EIO],
-    "mmap": [errno.ENOMEM],
-    "fstat": [errno.EIO],
-    "stat": [errno.EIO],
-    "lstat": [errno.EIO],
-    "flock": [errno.ENOLCK, errno.EINTR],
-    "fchmod": [errno.EIO, errno.EPERM],
-    "readdir": [errno.EIO],
-}
-
 
 def runs_with_failures(tessel, words, prepare, all_errors=ERRORS):
     """Runs the command with the first, second ... call of every kind failing

@@ -12,6 +12,7 @@ import time
 
 import lists
 import pytest
+from failing_calls import ERRORS
 from qztessel import DamagedArchiveError, PathList
 
 # What lets calls fail is loaded before the C library.
@@ -22,23 +23,6 @@ NEW = lists.tree(300, 2)
 
 # Moments at which a writer is killed; more of them find rarer ones.
 KILLED_WRITERS = int(os.environ.get("KILLED_WRITERS", "20"))
-
-# What a kind of call can fail with; 0: it does a half of what it should.
-ERRORS = {
-    "open": [errno.EIO],
-    "pwrite": [errno.EIO, errno.ENOSPC, errno.EDQUOT, errno.EINTR, 0],
-    "read": [errno.EIO],
-    "fsync": [errno.EIO, errno.EDQUOT],
-    "rename": [errno.EIO],
-    "close": [errno.EIO],
-    "mmap": [errno.ENOMEM],
-    "fstat": [errno.EIO],
-    "stat": [errno.EIO],
-    "lstat": [errno.EIO],
-    "flock": [errno.ENOLCK, errno.EINTR],
-    "fchmod": [errno.EIO, errno.EPERM],
-    "readdir": [errno.EIO],
-}
 
 
 def each_failure(folder, prepare, work, check):
