@@ -21,6 +21,16 @@ target_compile_definitions(
   qztessel_options
   INTERFACE $<$<NOT:$<CONFIG:Release,MinSizeRel>>:_GLIBCXX_ASSERTIONS>)
 
+# What makes a fault harder to exploit. A test reads it back from what was built.
+if(NOT QZTESSEL_SANITIZE)
+  target_compile_options(qztessel_options INTERFACE -fstack-protector-strong)
+  # Works on optimized code only.
+  target_compile_definitions(
+    qztessel_options INTERFACE $<$<CONFIG:Release,RelWithDebInfo>:_FORTIFY_SOURCE=2>)
+  target_link_options(qztessel_options INTERFACE LINKER:-z,relro LINKER:-z,now
+                      LINKER:-z,noexecstack)
+endif()
+
 # In a unit of several sources, each of them looks like a header to this warning.
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
   target_compile_options(

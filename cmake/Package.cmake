@@ -93,8 +93,9 @@ if(NOT heading MATCHES "^## ${PROJECT_VERSION} \\(([0-9-]+)\\)$")
   message(FATAL_ERROR "CHANGELOG.md begins with '${heading}', not with"
                       " '## ${PROJECT_VERSION} (DATE)'")
 endif()
+set(releaseDay ${CMAKE_MATCH_1})
 execute_process(
-  COMMAND date --utc --rfc-email --date=${CMAKE_MATCH_1}
+  COMMAND date --utc --rfc-email --date=${releaseDay}
   OUTPUT_VARIABLE releaseDate
   OUTPUT_STRIP_TRAILING_WHITESPACE COMMAND_ERROR_IS_FATAL ANY)
 configure_file(cmake/debian/changelog.in ${PROJECT_BINARY_DIR}/debian/changelog)
@@ -103,12 +104,22 @@ execute_process(
   COMMAND gzip --best --no-name --force ${PROJECT_BINARY_DIR}/debian/changelog
           COMMAND_ERROR_IS_FATAL ANY)
 
+# What each package holds and needs of others' code.
+include(cmake/Sbom.cmake)
+set(partsOfAll libc6 libgcc-s1 libstdc++6 libxxhash-dev zlib1g)
+set(commandParts ${partsOfAll} libcli11-dev libfmt9 libre2-9 nlohmann-json3-dev)
+set(runtimeParts ${partsOfAll})
+set(developmentParts libxxhash-dev zlib1g-dev)
+set(pythonParts ${partsOfAll} libfmt9 libre2-9 pybind11-dev python3 python3-numpy)
+
 foreach(component IN LISTS CPACK_COMPONENTS_ALL)
   string(TOUPPER ${component} upperComponent)
+  set(package ${CPACK_DEBIAN_${upperComponent}_PACKAGE_NAME})
+  set(sbom ${PROJECT_BINARY_DIR}/debian/${component}/sbom.spdx.json)
+  qztesselWriteSbom(${sbom} ${package} ${releaseDay} ${${component}Parts})
   install(
-    FILES cmake/debian/copyright ${PROJECT_BINARY_DIR}/debian/changelog.gz
-    DESTINATION
-      ${CMAKE_INSTALL_DATADIR}/doc/${CPACK_DEBIAN_${upperComponent}_PACKAGE_NAME}
+    FILES cmake/debian/copyright ${PROJECT_BINARY_DIR}/debian/changelog.gz ${sbom}
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/${package}
     COMPONENT ${component}
     EXCLUDE_FROM_ALL)
 endforeach()

@@ -2,8 +2,9 @@
 # Usage: packages.sh CMAKE BUILD_FOLDER WORK_FOLDER
 #
 # Makes the Debian packages from a finished build and looks at them: all that
-# cmake --install copies is in one of them, lintian has no error, every library that a program needs is of a package that it
-# depends on, the command runs from where the packages put it, and, as root,
+# cmake --install copies is in one of them, lintian has no error, every library
+# that a program needs is of a package that it depends on, the list of parts (SBOM)
+# names what it depends on, the command runs from where the packages put it, and, as root,
 # dpkg installs them into an empty root and purges them without a trace.
 set -euo pipefail
 cmake=$1 build=$2 work=$(realpath -m "$3")
@@ -53,11 +54,33 @@ checkDependencies() {
         -exec readelf -d {} + | sed -n 's/.*(NEEDED).*\[\(.*\)\]/\1/p' |
         grep -v '^ld-linux' | sort -u)
 }
+
+# The list of parts has our package, its version and what it depends on, each
+# with a version.
+checkSbom() {
+    local package=$1 folder=$2 name depends
+    name=$(dpkg-deb -f "$package" Package)
+    depends=$(dpkg-deb -f "$package" Depends | sed 's/([^)]*)//g' | tr -d ,)
+    /usr/bin/python3 -c '
+import json, sys
+document = json.load(open(sys.argv[1]))
+parts = {part["name"]: part["versionInfo"] for part in document["packages"]}
+assert parts[sys.argv[2]] == sys.argv[3], parts
+ours = {name for name in sys.argv[4:] if name.startswith("libqztessel")}
+missing = set(sys.argv[4:]) - set(parts) - ours
+assert not missing, f"not in the list of parts: {missing}"
+assert "NOASSERTION" not in parts.values(), parts
+assert len(document["relationships"]) == len(parts), document
+' "$folder/usr/share/doc/$name/sbom.spdx.json" "$name" \
+        "$(dpkg-deb -f "$package" Version)" $depends ||
+        fail "the list of parts of ${package##*/} is wrong"
+}
 for package in "${packages[@]}"; do
     folder=$work/one
     rm -rf "$folder"
     dpkg-deb -x "$package" "$folder"
     checkDependencies "$package" "$folder"
+    checkSbom "$package" "$folder"
 done
 
 # ---- The command, where it was put ----

@@ -1,0 +1,46 @@
+#!/usr/bin/env python3
+"""Usage: tidy.py OUTPUT FILE... -- CLANG_TIDY [OPTION...] -- [COMPILER_OPTION...]
+
+Runs clang-tidy over source files that are joined into the one file OUTPUT.
+
+They are copied, not included: the static analyzer looks into no file that
+another one includes. What is found is shown with the names and lines of the
+source files.
+"""
+import pathlib
+import re
+import subprocess
+import sys
+
+
+def join(files: list[str]) -> tuple[list[str], list[str]]:
+    """All lines of the files, and the place of each. A header that a file before
+    has included is left out; its line stays, empty."""
+    joined: list[str] = []
+    places: list[str] = []
+    included: set[str] = set()
+    for file in files:
+        lines = pathlib.Path(file).read_text().splitlines()
+        joined += ["" if line in included else line for line in lines]
+        places += [f"{file}:{number}" for number in range(1, len(lines) + 1)]
+        included |= {line for line in lines if line.startswith("#include")}
+    return joined, places
+
+
+def main(output: str, *words: str) -> int:
+    first = words.index("--")
+    second = words.index("--", first + 1)
+    lines, places = join(list(words[:first]))
+    unit = pathlib.Path(output)
+    unit.parent.mkdir(parents=True, exist_ok=True)
+    unit.write_text("\n".join(lines) + "\n")
+    result = subprocess.run(
+        [*words[first + 1:second], str(unit), *words[second:]],
+        stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True, check=False)
+    print(re.sub(re.escape(str(unit)) + r":(\d+)",
+                 lambda found: places[int(found[1]) - 1], result.stdout), end="")
+    return result.returncode
+
+
+if __name__ == "__main__":
+    sys.exit(main(*sys.argv[1:]))
