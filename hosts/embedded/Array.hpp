@@ -74,7 +74,8 @@ private:
 // Ownership: who makes an array has its first reference; each holder gives its
 //   reference back with drop(), and the last one deletes the array. No
 //   operation recurses, so that depth costs no stack.
-// Invariants: an array with more than one reference is not changed.
+// Invariants: an array with more than one reference is not changed. Arrays of
+//   the classes Cell and Struct are those that Value makes.
 // Threads: references may be counted on several threads at once; everything
 //   else as a standard container. A plug-in's array has one reference, so a
 //   usual array is made and deleted without an atomic read-modify-write.

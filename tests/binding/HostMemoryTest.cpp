@@ -17,11 +17,12 @@ namespace {
 constexpr long mostAllocations = 20'000;
 
 // Calls operate() with its first, second ... allocation failing, until none is
-// left to fail. It must raise the host's out-of-memory error, or std::bad_alloc
+// left to fail. It must raise this host error, or std::bad_alloc
 // where the host itself lacks memory. Calls prepare() before and
 // check(succeeded) after it.
 template <class Prepare, class Operate, class Check>
-void atEachAllocation(Prepare prepare, Operate operate, Check check) {
+void atEachAllocation(Prepare prepare, Operate operate, Check check,
+                      const char* error = "VELOX:embedded:outOfMemory") {
     long n = 0;
     for (bool enough = false; !enough && n < mostAllocations;) {
         ++n;
@@ -31,9 +32,9 @@ void atEachAllocation(Prepare prepare, Operate operate, Check check) {
             const failing::Allocation allocation(n);
             try {
                 operate();
-            } catch (const HostException& error) {
+            } catch (const HostException& raised) {
                 succeeded = false;
-                EXPECT_EQ(error.identifier(), "VELOX:embedded:outOfMemory");
+                EXPECT_EQ(raised.identifier(), error);
             } catch (const std::bad_alloc&) {
                 succeeded = false;
             }
@@ -151,7 +152,7 @@ TEST_F(HostMemory, PathsAreAddedFolderByFolder) {
             EXPECT_TRUE(!succeeded || folders == more.folders.size());
             EXPECT_EQ(fetched(*instance, numbersTo(5)), listing_);
             // It goes on from there.
-            add(*instance, {{{u"/", u"usr", u"new"}}, {{u"ls"}}});
+            add(*instance, {{{u"/", u"usr", u"nev"}}, {{u"ls"}}});
             EXPECT_EQ(iterated(*instance).size(), paths.size() + 1);
         });
     EXPECT_TRUE(seen.front());
@@ -265,7 +266,8 @@ TEST_F(HostMemory, AModuleIsLoadedOrNot) {
         [&](bool succeeded) {
             isLoaded = succeeded;
             EXPECT_EQ(host_.hasClass(filesetClassName), succeeded);
-        });
+        },
+        "VELOX:embedded:entryFailed");
     expectHolds(filled(listing_), listing_);
 }
 
