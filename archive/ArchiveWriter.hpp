@@ -31,9 +31,9 @@ class ArchiveReader;
 //   depend on the paths and the options, not on threads or machines.
 // Ownership: copies what it is given. A vector to write to must outlive it.
 // Threads: one thread at a time; the writer starts and ends its own.
-// Errors: after an exception other than those of `add`, the writer can only be
-//   destroyed. Whoever goes on with one that has ended, or was moved from,
-//   gets std::logic_error.
+// Errors: after an exception while a segment is built or the archive is put in
+//   place, the writer can only be destroyed. Whoever goes on with one that
+//   has ended, or was moved from, gets std::logic_error.
 // Cost: 0.6 to 1.2 microseconds per path on one core, nearly all of it in
 //   `finish` or wherever a segment is full. Memory for one segment: its text
 //   and 100 bytes per path.
@@ -72,8 +72,9 @@ public:
 
     // Adds a path. Throws std::invalid_argument if it is empty or holds a NUL,
     // and std::length_error if its name or its folder is longer than 1 MiB;
-    // both say which path it is, and the path is left out. Where a segment is
-    // full, it is built first; see `finish` for what that throws.
+    // both say which path it is, and the path is left out. So it is if there is
+    // no memory for it (std::bad_alloc), and can be added again. Where a
+    // segment is full, it is built first; see `finish` for what that throws.
     void add(std::string_view path);
 
     // Adds what can be turned into views, in order.

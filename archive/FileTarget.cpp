@@ -11,6 +11,8 @@
 #include <random>
 #include <system_error>
 
+#include "packing/OpenFolder.hpp"
+
 namespace tessel::archive {
 
 namespace {
@@ -87,7 +89,7 @@ bool isHiddenName(std::string_view name, std::string_view prefix) {
 }
 
 // Removes a hidden file unless its writer still holds its lock.
-void removeIfLeft(const fs::path& path) {
+void removeIfLeft(const std::string& path) {
     const int descriptor =
         ::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW);
     if (descriptor < 0) return;
@@ -98,11 +100,10 @@ void removeIfLeft(const fs::path& path) {
 // What killed writers of the same target left behind. Nothing here is worth
 // an error: the next writer tries again.
 void removeLeftovers(const std::string& folder, std::string_view prefix) {
-    std::error_code error;
-    for (fs::directory_iterator entry(folder, error);
-         !error && entry != fs::directory_iterator(); entry.increment(error))
-        if (isHiddenName(entry->path().filename().string(), prefix))
-            removeIfLeft(entry->path());
+    OpenFolder entries(::opendir(folder.c_str()));
+    while (const dirent* const entry = entries.next())
+        if (isHiddenName(&entry->d_name[0], prefix))
+            removeIfLeft(folder + &entry->d_name[0]);
 }
 
 }  // namespace

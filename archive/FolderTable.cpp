@@ -17,10 +17,13 @@ std::uint32_t FolderTable::numberOf(std::string_view folder) {
         const std::uint32_t number = slots_[slot] - 1;
         if (hashes_[number] == hash && (*this)[number] == folder) return number;
     }
+    // What an addition that lacked memory left behind.
+    text_.resize(starts_.back());
+    hashes_.resize(size());
     text_.insert(text_.end(), folder.begin(), folder.end());
     text_.push_back('\0');
-    starts_.push_back(static_cast<std::uint32_t>(text_.size()));
     hashes_.push_back(hash);
+    starts_.push_back(static_cast<std::uint32_t>(text_.size()));
     slots_[slot] = static_cast<std::uint32_t>(size());
     return static_cast<std::uint32_t>(size() - 1);
 }

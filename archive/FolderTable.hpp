@@ -18,6 +18,7 @@ namespace tessel::archive {
 class FolderTable {
 public:
     // The number of the folder, which is a new one if it was not there yet.
+    // If it throws std::bad_alloc, the table holds what it held before.
     std::uint32_t numberOf(std::string_view folder);
 
     std::size_t size() const noexcept { return starts_.size() - 1; }

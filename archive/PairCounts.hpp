@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <utility>
 #include <vector>
 
 namespace tessel::archive {
@@ -58,7 +59,7 @@ private:
 };
 
 // Counts pairs exactly, and keeps the token that a pair becomes. Open
-// addressing with linear probing; at most a third of it is used.
+// addressing with linear probing; at most half of it is used.
 class PairTable {
 public:
     struct Entry {
@@ -69,11 +70,13 @@ public:
     // Both halves are the separator, which is part of no pair.
     static constexpr TokenPair noPair = 0xFFFFFFFF;
 
-    // Forgets all and makes room.
+    // Forgets all and makes room for so many pairs. Of more it takes care, at
+    // some cost: different pairs can share a count of a sketch.
     void reset(std::size_t expectedPairs) {
         std::size_t size = 1024;
         while (size < 3 * expectedPairs) size *= 2;
         entries_.assign(size, {});
+        used_ = 0;
     }
 
     // The entry of the pair, or the empty one where it belongs.
@@ -81,13 +84,29 @@ public:
 
     void add(TokenPair pair, std::uint32_t count) {
         Entry& entry = entries_[slotOf(pair)];
-        entry.pair = pair;
+        if (entry.pair == noPair) {
+            addNew({pair, count, 0});
+            return;
+        }
         entry.count += count;
     }
 
+    // Valid until a pair is added.
     std::vector<Entry>& entries() noexcept { return entries_; }
 
 private:
+    void addNew(const Entry& entry) {
+        if (2 * ++used_ > entries_.size()) grow();
+        entries_[slotOf(entry.pair)] = entry;
+    }
+
+    void grow() {
+        const std::vector<Entry> old =
+            std::exchange(entries_, std::vector<Entry>(2 * entries_.size()));
+        for (const Entry& entry : old)
+            if (entry.pair != noPair) entries_[slotOf(entry.pair)] = entry;
+    }
+
     std::size_t slotOf(TokenPair pair) const {
         const std::size_t mask = entries_.size() - 1;
         std::size_t slot = pair * 0x9E3779B97F4A7C15 >> 30U & mask;
@@ -97,6 +116,7 @@ private:
     }
 
     std::vector<Entry> entries_;
+    std::size_t used_ = 0;
 };
 
 }  // namespace tessel::archive

@@ -59,6 +59,9 @@ class SequentialReader;
 //   handler of before (archive/LostPages.hpp). Not noticed: bytes that somebody
 //   writes in the middle of the file. Where that may happen, read the file into
 //   memory and use own().
+// Memory: where it runs out, any member may throw std::bad_alloc. The archive
+// is
+//   as it was and answers again once there is memory.
 // Cost: opening reads the tables (some hundred kilobytes per 8 million
 //   paths), not the paths, and derives at most 0.3 MB per segment. What each
 //   member costs is said there; a "block" is 16 paths.
@@ -221,8 +224,9 @@ private:
 //
 // A view is valid until the iterator is advanced or destroyed. Moving the
 // iterator keeps it valid; the one that it was moved from is at the end. So is
-// one whose advance has thrown DamagedArchiveException; number() is then that
-// of the damaged path. Advancing at the end changes nothing.
+// one whose advance has thrown DamagedArchiveException or std::bad_alloc;
+// number() is then that of the path that was not read. Advancing at the end
+// changes nothing.
 // Cost: some kilobytes; on a list whose folders are scattered up to 10 MiB,
 //   because paths are decoded in batches, in the order in which they are
 //   stored. Batches start small.

@@ -31,11 +31,15 @@ std::strong_ordering SplitPath::operator<=>(
 
 // ---- SegmentList ----
 
+// Text that a failed addition leaves behind belongs to no name.
 void SegmentList::add(const SplitPath& path) {
-    const std::uint32_t folder = folderOf(path);
+    if (names_.size() == names_.capacity())
+        names_.reserve(2 * names_.capacity() + 1);
     const auto start = static_cast<std::uint32_t>(text_.size());
     text_.insert(text_.end(), path.name.begin(), path.name.end());
     text_.push_back('\0');
+    // The last step that can fail: no folder may be left without a name.
+    const std::uint32_t folder = folderOf(path);
     names_.push_back(
         {start, static_cast<std::uint32_t>(path.name.size()), folder});
     textBytes_ += path.folder.size() + path.name.size();
@@ -49,8 +53,10 @@ std::uint32_t SegmentList::folderOf(const SplitPath& path) {
         if (path.name < lastPath.name) sorted_ = false;
         return last.folder;
     }
-    if (sorted_ && path < lastPath) sorted_ = false;
-    return folders_.numberOf(path.folder);
+    const bool endsOrder = sorted_ && path < lastPath;
+    const std::uint32_t number = folders_.numberOf(path.folder);
+    if (endsOrder) sorted_ = false;
+    return number;
 }
 
 void SegmentList::clear() {

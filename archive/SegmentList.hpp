@@ -39,7 +39,8 @@ struct NameRef {
 class SegmentList {
 public:
     // The path must not be empty, hold no zero byte, and both of its parts
-    // must be at most maxComponentBytes long.
+    // must be at most maxComponentBytes long. If it throws std::bad_alloc, the
+    // list is as it was.
     void add(const SplitPath& path);
 
     std::size_t size() const noexcept { return names_.size(); }

@@ -1,6 +1,7 @@
 #include "archive/Workers.hpp"
 
 #include <algorithm>
+#include <new>
 #include <system_error>
 #include <utility>
 
@@ -10,12 +11,14 @@ Workers::Workers(unsigned threads, std::stop_token cancel)
     : cancel_(std::move(cancel)) {
     if (threads == 0)
         threads = std::max(1U, std::thread::hardware_concurrency());
-    threads_.reserve(threads - 1);
+    // A thread that cannot be started, for want of memory too, is done
+    // without: those that did start do its work.
     try {
+        threads_.reserve(threads - 1);
         for (unsigned worker = 1; worker < threads; ++worker)
             threads_.emplace_back([this, worker] { serve(worker); });
     } catch (const std::system_error&) {
-        // The threads that did start do the work of the others.
+    } catch (const std::bad_alloc&) {
     }
 }
 

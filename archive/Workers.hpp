@@ -17,8 +17,8 @@ namespace tessel::archive {
 // A few threads that share out the steps of one loop at a time.
 //
 // Invariants: the calling thread is worker 0 and does its share, so one
-//   worker means no thread at all. If the system refuses a thread, the others
-//   do its work.
+//   worker means no thread at all. If there is no system resource or memory for
+//   a thread, the others do its work.
 // Threads: `run` is called from one thread at a time. The destructor waits for
 //   the threads, which are idle between loops.
 // Cost: waking the others takes some 20 microseconds per loop.

@@ -9,6 +9,7 @@
 #include <system_error>
 #include <utility>
 
+#include "packing/OpenFolder.hpp"
 #include "paths/PathList.hpp"
 
 namespace tessel::paths {
@@ -18,20 +19,6 @@ namespace {
 struct Entries {
     std::vector<std::string> files;
     std::vector<std::string> folders;
-};
-
-class OpenFolder {
-public:
-    explicit OpenFolder(DIR* stream) : folder_(stream) {}
-    OpenFolder(const OpenFolder&) = delete;
-    OpenFolder& operator=(const OpenFolder&) = delete;
-    ~OpenFolder() {
-        if (folder_ != nullptr) ::closedir(folder_);
-    }
-    DIR* get() const noexcept { return folder_; }
-
-private:
-    DIR* folder_;
 };
 
 // Closes a descriptor at the end and leaves errno as it was.
@@ -100,13 +87,11 @@ bool isDots(std::string_view name) noexcept {
 
 // Reads a folder's entries, sorted. Returns 0 or what went wrong.
 int readFolder(const std::string& name, bool followLink, Entries& entries) {
-    const OpenFolder folder(openStream(name, followLink));
+    OpenFolder folder(openStream(name, followLink));
     if (folder.get() == nullptr) return errno;
     for (;;) {
         errno = 0;
-        // One stream, one reader.
-        const dirent* entry =
-            ::readdir(folder.get());  // NOLINT(concurrency-mt-unsafe)
+        const dirent* const entry = folder.next();
         if (entry == nullptr) break;
         const std::string_view text = &entry->d_name[0];
         if (isDots(text)) continue;

@@ -15,6 +15,8 @@
 #include <system_error>
 #include <utility>
 
+#include "packing/OpenFolder.hpp"
+
 namespace tessel::paths {
 
 namespace {
@@ -141,17 +143,16 @@ void removeIfLeft(const std::string& file) {
 
 // Nothing here is worth an error: the next writer tries again.
 void removeLeftovers(const std::string& target) {
-    namespace fs = std::filesystem;
     const std::string prefix = hiddenPrefix(target);
+    const std::string folder = folderOf(target);
     const std::size_t bytes =
         prefix.size() + randomLetters + hiddenSuffix.size();
-    std::error_code error;
-    for (fs::directory_iterator entry(folderOf(target), error);
-         !error && entry != fs::directory_iterator(); entry.increment(error)) {
-        const std::string name = entry->path().filename().string();
+    OpenFolder entries(::opendir(folder.c_str()));
+    while (const dirent* const entry = entries.next()) {
+        const std::string_view name = &entry->d_name[0];
         if (name.size() == bytes && name.starts_with(prefix) &&
             name.ends_with(hiddenSuffix))
-            removeIfLeft(entry->path().string());
+            removeIfLeft((folder + '/').append(name));
     }
 }
 

@@ -162,6 +162,40 @@ TEST(Threads, PassesOfCopiesAreReleasedOnDifferentThreads) {
     EXPECT_EQ(support::iterated(*source), paths);
 }
 
+// Everything of a coder that only reads, on it and on its copies at once.
+TEST(Threads, ACoderAndItsCopiesAreReadOnDifferentThreads) {
+    const CoderPtr source = lettersCoder();
+    const Batch batch = batchOf(300, 7);
+    support::addBatches(*source, batch.folders, batch.files);
+    std::vector<double> numbers;
+    for (std::uint64_t i = 1; i <= source->pathCount; i += 3)
+        numbers.push_back(static_cast<double>(i));
+    const auto expected = support::found(*source, numbers);
+    ASSERT_TRUE(expected);
+    const std::vector<Texts> paths = support::iterated(*source);
+    const Bytes form = support::formOf(*source, false);
+    HuffmanPathTree copy;
+    copy.copyTree(*source);
+    std::vector<std::thread> threads;
+    for (std::size_t t = 0; t < 4; ++t) {
+        threads.emplace_back([&, t] {
+            HuffmanPathTree& read = t % 2 == 0 ? *source : copy;
+            for (int round = 0; round < 5; ++round) {
+                const auto found = support::found(read, numbers);
+                EXPECT_TRUE(found && found->files == expected->files &&
+                            found->folders == expected->folders);
+                EXPECT_EQ(support::formOf(read, false), form);
+                EXPECT_GT(read.memoryUsage().total(), 0U);
+            }
+        });
+    }
+    // A pass changes the coder that it is made on, and no other.
+    HuffmanPathTree walked;
+    walked.copyTree(*source);
+    EXPECT_EQ(support::iterated(walked), paths);
+    for (std::thread& thread : threads) thread.join();
+}
+
 TEST(Threads, CodersThatShareNothingWorkAtTheSameTime) {
     Bytes forms[3];
     std::vector<std::thread> threads;

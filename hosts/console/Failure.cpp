@@ -44,8 +44,7 @@ Failure describeCurrentException() {
     } catch (const std::system_error& failure) {
         return {ExitStatus::System, withoutFullStop(failure.what())};
     } catch (const std::bad_alloc&) {
-        return {ExitStatus::System,
-                "memory is used up; close other programs or raise the limit"};
+        return {ExitStatus::System, outOfMemoryLine};
     } catch (const std::exception& failure) {
         return {ExitStatus::System, withoutFullStop(failure.what())};
     }

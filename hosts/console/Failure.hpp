@@ -6,6 +6,10 @@
 
 namespace tessel::console {
 
+// What the user is told when memory runs out.
+inline constexpr const char* outOfMemoryLine =
+    "memory is used up; close other programs or raise the limit";
+
 // How the command ends after an exception.
 struct Failure {
     ExitStatus status = ExitStatus::System;

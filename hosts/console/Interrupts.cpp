@@ -52,7 +52,11 @@ Interrupts::Interrupts()
     setAction(SIGINT, SIG_DFL);
     const sigset_t signals = handledSignals();
     ::pthread_sigmask(SIG_BLOCK, &signals, nullptr);
-    listener_ = std::thread([this] { listen(); });
+    try {
+        listener_ = std::thread([this] { listen(); });
+    } catch (const std::system_error& failure) {
+        throw std::system_error(failure.code(), "cannot start a thread");
+    }
 }
 
 Interrupts::~Interrupts() {

@@ -2,12 +2,14 @@
 
 #include <exception>
 #include <iostream>
+#include <new>
 #include <string>
 #include <vector>
 
 #include "hosts/console/Console.hpp"
 #include "hosts/console/ConsoleException.hpp"
 #include "hosts/console/ExitStatus.hpp"
+#include "hosts/console/Failure.hpp"
 #include "hosts/console/StandardStreams.hpp"
 
 int main(int wordCount, char** words) {
@@ -25,6 +27,10 @@ int main(int wordCount, char** words) {
         } catch (const console::ClosedPipeException&) {
             interrupts.endByClosedPipe();
         }
+    } catch (const std::bad_alloc&) {
+        // Here, too, where there is no memory to describe another failure.
+        std::cerr << "tessel: " << console::outOfMemoryLine << '\n';
+        return static_cast<int>(console::ExitStatus::System);
     } catch (const std::exception& failure) {
         // The command did not start.
         std::cerr << "tessel: " << failure.what() << '\n';

@@ -72,8 +72,10 @@ private:
 // InlineArray) or by a container of them (see ContainerArray).
 //
 // Ownership: who makes an array has its first reference; each holder gives its
-//   reference back with drop(), and the last one deletes the array.
-// Invariants: an array with more than one reference is not changed.
+//   reference back with drop(), and the last one deletes the array. No
+//   operation recurses, so that depth costs no stack.
+// Invariants: an array with more than one reference is not changed. Arrays of
+//   the classes Cell and Struct are those that Value makes.
 // Threads: references may be counted on several threads at once; everything
 //   else as a standard container. A plug-in's array has one reference, so a
 //   usual array is made and deleted without an atomic read-modify-write.
@@ -109,9 +111,7 @@ public:
     // Gives one reference back. Acquire-release: every holder's last use comes
     // before the deletion by the last of them.
     void drop() const noexcept {
-        if (isUnique() ||
-            references_.fetch_sub(1, std::memory_order_acq_rel) == 1)
-            destroy();
+        if (losesReference()) bury();
     }
 
 protected:
@@ -119,6 +119,25 @@ protected:
         : valueClass_(valueClass), shape_(std::move(shape)) {}
 
 private:
+    // Gives one reference back. True if it was the last one.
+    bool losesReference() const noexcept {
+        return isUnique() ||
+               references_.fetch_sub(1, std::memory_order_acq_rel) == 1;
+    }
+
+    // Destroys an array without references, and what it alone refers to.
+    // Cells and structs may be nested as deep as there is memory: they are
+    // taken apart first, level by level (Value.cpp).
+    void bury() const noexcept {
+        if (valueClass_ == ValueClass::Cell ||
+            valueClass_ == ValueClass::Struct)
+            buryNested();
+        else
+            destroy();
+    }
+    void buryNested() const noexcept;
+    void bury(Array*& waiting) noexcept;
+
     // Destroys the array and releases its block.
     virtual void destroy() const noexcept = 0;
 

@@ -112,9 +112,11 @@ std::vector<Value> Dispatch::call(const MethodRecord& method,
     checkCounts(signature, all.size(), requested);
     checkTypes(signature, all);
     OutputSlots outputs(signature.outputs.size(), nullptr);
-    run(method, outputs, all, requested);
     const std::size_t wanted = asSize(requested);
+    // First: once the method has run, nothing may fail for want of memory.
     std::vector<Value> results;
+    results.reserve(std::max<std::size_t>(wanted, 1));
+    run(method, outputs, all, requested);
     for (std::size_t i = 0; i < std::max<std::size_t>(wanted, 1); ++i) {
         if (outputs.isFilled(i))
             results.push_back(outputs.take(i));

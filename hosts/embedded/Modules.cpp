@@ -19,14 +19,31 @@ fs::path resolved(const fs::path& file) {
     return path.empty() ? file : path;
 }
 
-void terminate(const Module& module) noexcept {
-    if (const HostModuleEntry end = module.find("VXTerminate_" + module.name()))
-        end();
-}
+// While it lives, what is registered belongs to the module.
+class Entering {
+public:
+    Entering(Registry& registry, const Module& module) noexcept
+        : registry_(registry),
+          outer_(std::exchange(registry.enteringModule, &module)) {}
+    Entering(const Entering&) = delete;
+    Entering& operator=(const Entering&) = delete;
+    ~Entering() { registry_.enteringModule = outer_; }
+
+private:
+    Registry& registry_;
+    const Module* outer_;
+};
 
 }  // namespace
 
-Module::~Module() { dlclose(handle_); }
+void Module::Closer::operator()(void* handle) const noexcept {
+    dlclose(handle);
+}
+
+Module::Module(fs::path path, Handle handle)
+    : path_(std::move(path)),
+      handle_(std::move(handle)),
+      terminate_(find("VXTerminate_" + name())) {}
 
 std::string Module::name() const {
     const std::string fileName = path_.filename().string();
@@ -34,7 +51,8 @@ std::string Module::name() const {
 }
 
 HostModuleEntry Module::find(const std::string& function) const {
-    return reinterpret_cast<HostModuleEntry>(dlsym(handle_, function.c_str()));
+    return reinterpret_cast<HostModuleEntry>(
+        dlsym(handle_.get(), function.c_str()));
 }
 
 Modules::Loaded::iterator Modules::find(const fs::path& file) {
@@ -45,7 +63,7 @@ Modules::Loaded::iterator Modules::find(const fs::path& file) {
 std::unique_ptr<Module> Modules::open(const fs::path& file) const {
     if (!fs::is_regular_file(file))
         errors_.raiseOwn("moduleMissing", {file.string()});
-    void* const handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
+    Module::Handle handle(dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL));
     if (handle == nullptr) {
         const std::string reason = dlerror();
         const bool lacksSymbol =
@@ -53,7 +71,7 @@ std::unique_ptr<Module> Modules::open(const fs::path& file) const {
         errors_.raiseOwn(lacksSymbol ? "interfaceMissing" : "moduleUnreadable",
                          {file.string(), reason});
     }
-    return std::make_unique<Module>(file, handle);
+    return std::make_unique<Module>(file, std::move(handle));
 }
 
 // Calls the entry; what it registers belongs to the module. When it fails, the
@@ -64,16 +82,14 @@ void Modules::enter(const Module& module) {
     if (entry == nullptr)
         errors_.raiseOwn("entryMissing", {module.path().string(), name});
     std::optional<std::string> failure;
-    const Module* const outer =
-        std::exchange(registry_.enteringModule, &module);
     try {
+        const Entering entering(registry_, module);
         entry();
     } catch (const std::exception& exception) {
         failure = exception.what();
     } catch (...) {
         failure = "an unknown exception";
     }
-    registry_.enteringModule = outer;
     if (failure)
         errors_.raiseOwn("entryFailed", {module.path().string(), *failure});
 }
@@ -113,13 +129,13 @@ void Modules::removeClasses(const fs::path& file) { withoutClasses(file); }
 
 void Modules::unload(const fs::path& file) {
     const auto present = withoutClasses(file);
-    terminate(**present);
+    (*present)->terminate();
     modules_.erase(present);
 }
 
 void Modules::unloadAll() noexcept {
     while (!modules_.empty()) {
-        terminate(*modules_.back());
+        modules_.back()->terminate();
         modules_.pop_back();
     }
 }

@@ -16,11 +16,12 @@ namespace tessel::embedded {
 //   everything whose code is in the module must be deleted.
 class Module {
 public:
-    Module(std::filesystem::path path, void* handle)
-        : path_(std::move(path)), handle_(handle) {}
-    Module(const Module&) = delete;
-    Module& operator=(const Module&) = delete;
-    ~Module();
+    struct Closer {
+        void operator()(void* handle) const noexcept;
+    };
+    using Handle = std::unique_ptr<void, Closer>;
+
+    Module(std::filesystem::path path, Handle handle);
 
     const std::filesystem::path& path() const noexcept { return path_; }
     // The file name up to ".so".
@@ -29,9 +30,16 @@ public:
     // A function that the module exports, or null.
     HostModuleEntry find(const std::string& function) const;
 
+    // Calls the entry VXTerminate_libX, if there is one.
+    void terminate() const noexcept {
+        if (terminate_ != nullptr) terminate_();
+    }
+
 private:
     std::filesystem::path path_;
-    void* handle_;
+    Handle handle_;
+    // Found early: to end a module takes no memory.
+    HostModuleEntry terminate_;
 };
 
 // Modules loads module files and lets them register their classes.
@@ -45,8 +53,8 @@ public:
 
     // Loads a module file and calls its entry. For a module that is loaded
     // already it only calls the entry. Raises moduleMissing, moduleUnreadable,
-    // interfaceMissing, entryMissing or entryFailed; a module that failed is
-    // unloaded again, and its classes are removed.
+    // interfaceMissing, entryMissing or entryFailed; a module that
+    // failed is unloaded again, and its classes are removed.
     void load(const std::filesystem::path& file);
 
     // Removes the classes of a module, or removes them and unloads it. Raises

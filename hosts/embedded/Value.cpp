@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <array>
+#include <span>
 #include <stdexcept>
+#include <utility>
 #include <variant>
 
 namespace tessel::embedded {
@@ -178,8 +180,7 @@ const std::shared_ptr<Instance>& Value::instance(std::size_t index) const {
 
 const std::vector<Value>* Value::findField(std::string_view name) const {
     const auto& columns = as<Structs>(ValueClass::Struct).content.columns;
-    const auto found = std::ranges::find(
-        columns, name, &std::pair<std::string, std::vector<Value>>::first);
+    const auto found = std::ranges::find(columns, name, &Column::first);
     return found == columns.end() ? nullptr : &found->second;
 }
 
@@ -201,15 +202,95 @@ const Value& Value::field(std::string_view name, std::size_t index) const {
     return values->at(index);
 }
 
-bool Value::Fields::operator==(const Fields& other) const {
-    return columns == other.columns;
+bool Value::areAlike(const Array& a, const Array& b, ArrayPairs& inner) {
+    if (a.valueClass() != b.valueClass() || !(a.shape() == b.shape()))
+        return false;
+    const auto addPairs = [&inner](std::span<const Value> first,
+                                   std::span<const Value> second) {
+        for (std::size_t i = 0; i < first.size(); ++i)
+            inner.emplace_back(&first[i].shown(), &second[i].shown());
+    };
+    if (a.valueClass() == ValueClass::Cell) {
+        addPairs(static_cast<const Cells&>(a).elements(),
+                 static_cast<const Cells&>(b).elements());
+        return true;
+    }
+    if (a.valueClass() != ValueClass::Struct) return a.hasElementsOf(b);
+    const auto& columns = static_cast<const Structs&>(a).content.columns;
+    const auto& others = static_cast<const Structs&>(b).content.columns;
+    if (!std::ranges::equal(columns, others, {}, &Column::first,
+                            &Column::first))
+        return false;
+    for (std::size_t i = 0; i < columns.size(); ++i)
+        addPairs(columns[i].second, others[i].second);
+    return true;
 }
 
 bool operator==(const Value& a, const Value& b) {
-    const Array& first = a.shown();
-    const Array& second = b.shown();
-    return first.valueClass() == second.valueClass() &&
-           first.shape() == second.shape() && first.hasElementsOf(second);
+    Value::ArrayPairs inner;
+    if (!Value::areAlike(a.shown(), b.shown(), inner)) return false;
+    while (!inner.empty()) {
+        const auto [first, second] = inner.back();
+        inner.pop_back();
+        if (!Value::areAlike(*first, *second, inner)) return false;
+    }
+    return true;
+}
+
+// ---- Nested values ----
+
+template <class Visit>
+void Value::visitElements(Array& array, Visit visit) {
+    if (array.valueClass() == ValueClass::Cell) {
+        for (Value& element : static_cast<Cells&>(array).elements())
+            if (!visit(element)) return;
+    } else if (array.valueClass() == ValueClass::Struct) {
+        for (auto& [name, values] :
+             static_cast<Structs&>(array).content.columns)
+            for (Value& value : values)
+                if (!visit(value)) return;
+    }
+}
+
+// Null if the array holds no arrays.
+Value* Value::firstElement(Array& array) noexcept {
+    Value* first = nullptr;
+    visitElements(array, [&first](Value& element) {
+        first = &element;
+        return false;
+    });
+    return first;
+}
+
+// Destroys an array without references or, if it holds arrays, puts it on the
+// list of those that wait for it. The list takes no memory: an array on it
+// keeps the next one where it had its first element, which is buried instead.
+void Array::bury(Array*& waiting) noexcept {
+    Array* dead = this;
+    for (;;) {
+        Value* const first = Value::firstElement(*dead);
+        if (first == nullptr) return dead->destroy();
+        Array* const inner = std::exchange(first->array_, waiting);
+        waiting = dead;
+        if (inner == nullptr || !inner->losesReference()) return;
+        dead = inner;
+    }
+}
+
+void Array::buryNested() const noexcept {
+    Array* waiting = nullptr;
+    const_cast<Array*>(this)->bury(waiting);
+    while (waiting != nullptr) {
+        Array* const dead = waiting;
+        waiting = std::exchange(Value::firstElement(*dead)->array_, nullptr);
+        Value::visitElements(*dead, [&waiting](Value& element) {
+            Array* const inner = std::exchange(element.array_, nullptr);
+            if (inner != nullptr && inner->losesReference())
+                inner->bury(waiting);
+            return true;
+        });
+        dead->destroy();
+    }
 }
 
 // ---- Changing values ----
@@ -236,8 +317,7 @@ void Value::setField(std::string_view name, Value value, std::size_t index) {
     if (index >= numel()) throw std::out_of_range("There is no such element.");
     auto& columns = changeableAs<Structs>(ValueClass::Struct).content.columns;
     if (isNew) columns.emplace_back(name, std::vector<Value>(numel()));
-    const auto found = std::ranges::find(
-        columns, name, &std::pair<std::string, std::vector<Value>>::first);
+    const auto found = std::ranges::find(columns, name, &Column::first);
     found->second.at(index) = std::move(value);
 }
 

@@ -28,7 +28,8 @@ const char* className(ValueClass valueClass) noexcept;
 //   a copied object refers to the same instances.
 // Threads: as any standard container.
 // Cost: a pointer; copying counts a reference. Texts, cells and logicals take
-//   one heap block each.
+//   one heap block each. Cells and structs may be nested as deep as there is
+//   memory: nothing here recurses.
 // Failures: an accessor for another class than the value's throws
 //   std::bad_variant_access, an index outside throws std::out_of_range.
 class Value {
@@ -144,12 +145,16 @@ public:
     static Value share(const HostArray* array) noexcept;
 
 private:
+    friend class Array;
     friend class BorrowedValue;
 
+    // A field's name and its values, one per element of the struct.
+    using Column = std::pair<std::string, std::vector<Value>>;
     struct Fields {
-        std::vector<std::pair<std::string, std::vector<Value>>> columns;
-        bool operator==(const Fields& other) const;
+        std::vector<Column> columns;
+        bool operator==(const Fields& other) const = default;
     };
+    using ArrayPairs = std::vector<std::pair<const Array*, const Array*>>;
     struct Doubles {
         std::vector<double> parts;
         bool isComplex;
@@ -185,6 +190,15 @@ private:
     template <class Kind>
     Kind& changeableAs(ValueClass valueClass);
     const std::vector<Value>* findField(std::string_view name) const;
+
+    // Calls visit(Value&) for each element of a cell and each field of a
+    // struct, in the same order each time, until it returns false.
+    template <class Visit>
+    static void visitElements(Array& array, Visit visit);
+    static Value* firstElement(Array& array) noexcept;
+    // Whether two arrays are equal as far as one can see without a look into
+    // the arrays in them, which are added to `inner`.
+    static bool areAlike(const Array& a, const Array& b, ArrayPairs& inner);
 
     Array* array_ = nullptr;
 };

@@ -71,5 +71,22 @@ TEST(PairCountsTest, ATableCountsExactly) {
     EXPECT_EQ(table.find(0).pair, PairTable::noPair);
 }
 
+// A sketch tells fewer pairs than there are if some share a count.
+TEST(PairCountsTest, ATableTakesMorePairsThanExpected) {
+    PairTable table;
+    table.reset(1);
+    for (TokenPair pair = 1; pair <= 5000; ++pair)
+        table.add(pair * 65537, pair);
+    for (TokenPair pair = 1; pair <= 5000; ++pair) {
+        ASSERT_EQ(table.find(pair * 65537).pair, pair * 65537);
+        ASSERT_EQ(table.find(pair * 65537).count, pair);
+    }
+    EXPECT_EQ(table.find(12345).pair, PairTable::noPair);
+    EXPECT_GE(table.entries().size(), 10'000U);
+    table.reset(1);
+    table.add(65537, 1);
+    EXPECT_EQ(table.find(65537).count, 1U);
+}
+
 }  // namespace
 }  // namespace tessel::archive

@@ -3,47 +3,20 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <new>
 #include <string>
 #include <vector>
 
 #include "paths/PathStore.hpp"
 #include "tests/paths/Stores.hpp"
-#include "tests/support/AllocationMeter.hpp"
+#include "tests/support/EachAllocation.hpp"
 
 namespace {
 
 using stores::inTreeOrder;
 using stores::iterated;
-using support::AllocationFailure;
+using support::atEachAllocation;
 using tessel::PathStore;
 using Strings = std::vector<std::string>;
-
-// More than any of these operations makes.
-constexpr std::size_t mostAllocations = 5000;
-
-// Calls operate() with 0, 1, 2 and so on allocations to spend, until they are
-// enough, and each time afterwards check(succeeded).
-template <class Prepare, class Operate, class Check>
-void atEachAllocation(Prepare prepare, Operate operate, Check check) {
-    std::size_t n = 0;
-    for (bool enough = false; !enough && n < mostAllocations; ++n) {
-        prepare();
-        bool succeeded = true;
-        {
-            const AllocationFailure failure(n);
-            try {
-                operate();
-            } catch (const std::bad_alloc&) {
-                succeeded = false;
-            }
-            enough = !failure.happened();
-        }
-        check(succeeded);
-    }
-    EXPECT_GT(n, 1U) << "nothing was allocated";
-    EXPECT_LT(n, mostAllocations);
-}
 
 // By every way out, these paths and no others.
 void expectPaths(const PathStore& store, Strings expected) {

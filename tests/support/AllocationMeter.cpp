@@ -1,6 +1,7 @@
 #include "tests/support/AllocationMeter.hpp"
 
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <cstdlib>
 #include <new>
@@ -15,11 +16,20 @@ thread_local bool failing = false;
 thread_local std::size_t allocationsLeft = 0;
 thread_local bool failed = false;
 
+// The same for all threads at once. Sequentially consistent: cheap enough.
+std::atomic<bool> allFailing{false};
+std::atomic<long> allAllocationsLeft{0};
+std::atomic<bool> anyFailed{false};
+
 // Counts an allocation; false if it is to fail.
 bool allow(std::size_t bytes) {
     if (watching) {
         largestBytes = std::max(largestBytes, bytes);
         totalBytes += bytes;
+    }
+    if (allFailing && --allAllocationsLeft < 0) {
+        anyFailed = true;
+        return false;
     }
     if (!failing) return true;
     if (allocationsLeft > 0) {
@@ -83,14 +93,21 @@ std::size_t AllocationMeter::largest() const { return largestBytes; }
 
 std::size_t AllocationMeter::total() const { return totalBytes; }
 
-AllocationFailure::AllocationFailure(std::size_t count) {
+AllocationFailure::AllocationFailure(std::size_t count,
+                                     FailingThreads threads) {
     allocationsLeft = count;
+    allAllocationsLeft = static_cast<long>(count);
     failed = false;
-    failing = true;
+    anyFailed = false;
+    failing = threads == FailingThreads::ThisOne;
+    allFailing = threads == FailingThreads::All;
 }
 
-AllocationFailure::~AllocationFailure() { failing = false; }
+AllocationFailure::~AllocationFailure() {
+    failing = false;
+    allFailing = false;
+}
 
-bool AllocationFailure::happened() const { return failed; }
+bool AllocationFailure::happened() const { return failed || anyFailed; }
 
 }  // namespace support

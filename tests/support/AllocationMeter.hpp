@@ -20,10 +20,14 @@ public:
     std::size_t total() const;    // of all allocations, in bytes
 };
 
-// While it exists, this thread's allocations fail after the first `count`.
+// Whose allocations an AllocationFailure counts and refuses.
+enum class FailingThreads { ThisOne, All };
+
+// While it exists, allocations fail after the first `count`. One at a time.
 class AllocationFailure {
 public:
-    explicit AllocationFailure(std::size_t count);
+    explicit AllocationFailure(
+        std::size_t count, FailingThreads threads = FailingThreads::ThisOne);
     ~AllocationFailure();
     AllocationFailure(const AllocationFailure&) = delete;
     AllocationFailure& operator=(const AllocationFailure&) = delete;

@@ -70,7 +70,7 @@ TEST(ArrayTest, NewArrayHasOneReference) {
 
 TEST(ArrayTest, LastReferenceDestroysTheElements) {
     auto* const array =
-        InlineArray<Counted>::make(ValueClass::Cell, Shape(2, 2));
+        InlineArray<Counted>::make(ValueClass::Logical, Shape(2, 2));
     EXPECT_EQ(Counted::alive, 4);
     Array* const copy = array->clone();
     EXPECT_EQ(Counted::alive, 8);

@@ -168,4 +168,91 @@ TEST(ValueTest, IndicesOutsideThrow) {
     EXPECT_THROW(Value::logical(true).truth(1), std::out_of_range);
 }
 
+// ---- Nesting ----
+
+// As deep as memory allows, on the usual stack of 8 MiB.
+constexpr std::size_t deepest = 1'000'000;
+
+Value nestedCells(std::size_t depth, Value innermost) {
+    Value value = std::move(innermost);
+    for (std::size_t i = 0; i < depth; ++i) {
+        Value outer = Value::cell(1, 1);
+        outer.setElement(0, std::move(value));
+        value = std::move(outer);
+    }
+    return value;
+}
+
+// The nested value is the last element, after a text and an empty cell; every
+// other one is a field of a struct.
+Value nestedValues(std::size_t depth, Value innermost) {
+    Value value = std::move(innermost);
+    for (std::size_t i = 0; i < depth; ++i) {
+        Value outer = Value::cell(1, 3);
+        outer.setElement(0, Value::text(u"name"));
+        outer.setElement(1, Value::cell(0, 1));
+        outer.setElement(2, std::move(value));
+        value = Value::structure();
+        value.setField("first", Value::scalar(1));
+        value.setField("inner", std::move(outer));
+    }
+    return value;
+}
+
+TEST(ValueTest, DeeplyNestedValuesAreReleased) {
+    nestedCells(deepest, Value::text(u"x"));
+    nestedValues(deepest / 4, Value::text(u"x"));
+}
+
+TEST(ValueTest, DeeplyNestedValuesAreCompared) {
+    const Value cells = nestedCells(deepest, Value::text(u"x"));
+    EXPECT_TRUE(cells == nestedCells(deepest, Value::text(u"x")));
+    EXPECT_FALSE(cells == nestedCells(deepest, Value::text(u"y")));
+    EXPECT_FALSE(cells == nestedCells(deepest - 1, Value::text(u"x")));
+    const Value values = nestedValues(deepest / 4, Value::scalar(1));
+    EXPECT_TRUE(values == nestedValues(deepest / 4, Value::scalar(1)));
+    EXPECT_FALSE(values == nestedValues(deepest / 4, Value::scalar(2)));
+}
+
+TEST(ValueTest, DeeplyNestedValuesAreCopiedAndChanged) {
+    Value value = nestedCells(deepest, Value::text(u"x"));
+    const Value copy = value.clone();
+    value.setElement(0, Value());
+    EXPECT_FALSE(value == copy);
+    Value inner = copy.element(0);
+    EXPECT_EQ(inner.valueClass(), ValueClass::Cell);
+}
+
+// What a part of a nested value is shared with stays as it is.
+TEST(ValueTest, SharedPartsOfAReleasedValueStay) {
+    const Value shared = nestedValues(3, Value::text(u"shared"));
+    const Value same = nestedValues(3, Value::text(u"shared"));
+    for (const std::size_t place : {0U, 1U, 2U}) {
+        Value outer = Value::cell(1, 3);
+        outer.setElement(place, shared);
+        outer.setElement((place + 1) % 3, outer);
+        nestedCells(5, std::move(outer));
+        EXPECT_EQ(shared, same);
+    }
+    Value twice = Value::structure({1, 2});
+    twice.setField("a", shared, 0);
+    twice.setField("a", shared, 1);
+    twice = Value();
+    EXPECT_EQ(shared, same);
+}
+
+TEST(ValueTest, WideNestedValuesAreReleased) {
+    Value wide = Value::cell(300, 1);
+    for (std::size_t i = 0; i < 300; ++i) {
+        Value inner = Value::cell(i % 4, 1);
+        for (std::size_t k = 0; k < i % 4; ++k)
+            inner.setElement(k, nestedValues(k, Value::text(u"leaf")));
+        wide.setElement(i, std::move(inner));
+    }
+    const Value copy = wide.clone();
+    wide = Value();
+    EXPECT_EQ(copy.element(7).element(2),
+              nestedValues(2, Value::text(u"leaf")));
+}
+
 }  // namespace tessel::embedded
