@@ -6,7 +6,7 @@
 #include <thread>
 #include <utility>
 
-#include "coder/ComponentEncoder.hpp"
+#include "coder/ArenaEncoder.hpp"
 #include "pathtree/containers.hpp"
 
 namespace tessel {
@@ -15,8 +15,6 @@ namespace {
 
 // The number of hardware threads to assume where the platform knows none.
 constexpr unsigned threadsIfUnknown = 2;
-
-static_assert(ComponentEncoder::slack <= ComponentArena::slack);
 
 // Encodes folders of a batch into lists of its own.
 class FolderEncoder {
@@ -63,15 +61,13 @@ public:
 private:
     ComponentList encodeAll(const std::vector<std::u16string>& texts) {
         for (const std::u16string& text : texts) {
-            const std::size_t length = encoder_.bytesFor(text);
-            std::uint8_t* to = arena_.extend(length);
-            if (length > 0) encoder_.write(text, to);
+            const std::size_t length = encoder_.append(text, arena_);
             maxInFolder_ = std::max<std::uint64_t>(maxInFolder_, length);
         }
         return arena_.finish();
     }
 
-    ComponentEncoder encoder_;
+    ArenaEncoder encoder_;
     Batch& batch_;
     ComponentArena arena_;
     std::size_t buffersAt_ = 0;

@@ -52,6 +52,57 @@ private:
     std::array<std::uint32_t, ring> hashes_{};
 };
 
+// The folders above a new one that the cache knows or should know.
+class NearestAbove {
+public:
+    // So many are looked for, the nearest first: all of them would take time
+    // by the square of the depth. With four, a sorted build takes 10 % fewer
+    // instructions than with none, a shuffled one 3 to 9 %.
+    static constexpr std::size_t most = 4;
+
+    NearestAbove(const ComponentList& components, const FolderCache& cache)
+        : depth_(components.size()), rest_(components) {
+        std::size_t length = 0;
+        for (auto end = components.begin(); length < depth_; ++end, ++length)
+            folders_[length % most] = components.before(end, length);
+        for (; unknown_ < most && length-- > 1; ++unknown_) {
+            const ComponentList& folder = folders_[length % most];
+            hashes_[length % most] = FolderCache::hashOf(folder);
+            known_ = cache.find(folder, hashes_[length % most]);
+            if (known_ != nullptr) {
+                rest_ = components.after(folder);
+                return;
+            }
+        }
+    }
+
+    // The nearest folder that the cache knows, or null.
+    const FolderCache::Folder* known() const noexcept { return known_; }
+    // The components after those of known(): all of them, if there is none.
+    const ComponentList& rest() const noexcept { return rest_; }
+
+    // Adds the folders that the cache did not know. The one below them was
+    // added last.
+    void addUnknown(BNode below, FolderCache& cache) const {
+        FolderNode* folder = below.folder();
+        for (std::size_t i = 1; folder != nullptr && i <= unknown_; ++i) {
+            folder = folder->parent();
+            const std::size_t at = (depth_ - i) % most;
+            if (folder != nullptr)
+                cache.addAbove(folders_[at], hashes_[at], BNode(*folder));
+        }
+    }
+
+private:
+    std::size_t depth_;
+    const FolderCache::Folder* known_ = nullptr;
+    ComponentList rest_;
+    // That of the first n components is at n % most.
+    std::array<ComponentList, most> folders_;
+    std::array<std::uint32_t, most> hashes_{};
+    std::size_t unknown_ = 0;
+};
+
 }  // namespace
 
 void BatchInserter::insert(const std::vector<ComponentList>& folders,
@@ -76,10 +127,24 @@ void BatchInserter::insertFolder(const ComponentList& components,
         noteFolder(cached->node, false);
         return;
     }
+    insertNewFolder(components, fileNames, hash);
+}
+
+// Searches the tree from the nearest folder above that the cache knows.
+void BatchInserter::insertNewFolder(const ComponentList& components,
+                                    const ComponentList& fileNames,
+                                    std::uint32_t hash) {
     const std::size_t depth = components.size();
-    cache_.reserveFor(depth);
-    const TreeInserter::AddedBatch added =
-        tree_.inserter().addBatch(*tree_.root, components, fileNames, track_);
+    cache_.reserveFor(depth, NearestAbove::most);
+    const NearestAbove above(components, cache_);
+    BNode start = *tree_.root;
+    if (above.known() != nullptr) {
+        start = above.known()->node;
+        const auto positions = cache_.trackOf(*above.known());
+        track_.assign(positions.begin(), positions.end());
+    }
+    const TreeInserter::AddedBatch added = tree_.inserter().addBatch(
+        *tree_.root, start, above.rest(), fileNames, track_);
     numbering_.notePartition(track_, added.existed, added.firstFile,
                              fileNames.size());
     // Without components the root takes the files and never counts as found.
@@ -87,6 +152,7 @@ void BatchInserter::insertFolder(const ComponentList& components,
     noteFolder(added.folder, !added.existed);
     track_.resize(depth);
     cache_.add(components, hash, added.folder, track_);
+    above.addUnknown(added.folder, cache_);
 }
 
 // A batch that brought no file may have left a file as its folder.

@@ -33,6 +33,8 @@ public:
 private:
     void insertFolder(const ComponentList& components,
                       const ComponentList& fileNames, std::uint32_t hash);
+    void insertNewFolder(const ComponentList& components,
+                         const ComponentList& fileNames, std::uint32_t hash);
     void noteFolder(BNode folder, bool isEnd) noexcept;
 
     BPathTree& tree_;

@@ -14,22 +14,34 @@ const FolderCache::Folder* FolderCache::find(
     return position == HashIndex::notFound ? nullptr : &folders_[position];
 }
 
-void FolderCache::reserveFor(std::size_t depth) {
+void FolderCache::reserveFor(std::size_t depth, std::size_t above) {
     const std::size_t positions = positions_.size() + depth;
     if (positions > positions_.capacity()) positions_.reserve(2 * positions);
-    if (folders_.size() == folders_.capacity())
-        folders_.reserve(2 * folders_.size() + 1);
-    index_.reserveOne();
+    const std::size_t folders = folders_.size() + 1 + above;
+    if (folders > folders_.capacity()) folders_.reserve(2 * folders);
+    index_.reserveMore(1 + above);
+}
+
+void FolderCache::add(const ComponentList& components, std::uint32_t hash,
+                      BNode node, const PathTrack& track) {
+    const std::size_t start = positions_.size();
+    positions_.insert(positions_.end(), track.begin(), track.end());
+    addFolder({components.bytes(), node, start, track.size()}, hash);
+}
+
+// Its track is the beginning of the other's.
+void FolderCache::addAbove(const ComponentList& components, std::uint32_t hash,
+                           BNode node) {
+    addFolder({components.bytes(), node, folders_.back().trackStart,
+               components.size()},
+              hash);
 }
 
 // What a failed step leaves behind is not reached from the index.
-void FolderCache::add(const ComponentList& components, std::uint32_t hash,
-                      BNode node, const PathTrack& track) {
+void FolderCache::addFolder(const Folder& folder, std::uint32_t hash) {
     // More folders than the index can tell apart are not cached.
     if (folders_.size() > HashIndex::maxPosition) return;
-    const std::size_t start = positions_.size();
-    positions_.insert(positions_.end(), track.begin(), track.end());
-    folders_.push_back({components.bytes(), node, start, track.size()});
+    folders_.push_back(folder);
     index_.insert(hash, folders_.size() - 1);
 }
 

@@ -16,6 +16,9 @@ namespace tessel {
 // comes again is found in one step instead of level by level: a list in
 // random order names most of its folders again and again.
 //
+// The folders above them are found, too, so that a new folder needs no search
+// from the root down.
+//
 // Ownership: borrows the folders' bytes and the nodes, which must outlive it.
 // Cost: constant time on average; about 60 bytes and 8 bytes per level for
 //   each different folder.
@@ -36,13 +39,18 @@ public:
     const Folder* find(const ComponentList& components,
                        std::uint32_t hash) const noexcept;
 
-    // Makes sure that adding a folder of so many components does not throw.
-    void reserveFor(std::size_t depth);
+    // Makes sure that adding a folder of so many components, and so many
+    // folders above it, does not throw.
+    void reserveFor(std::size_t depth, std::size_t above);
 
     // Adds a folder that find did not find. If it throws (std::bad_alloc),
     // nothing changes.
     void add(const ComponentList& components, std::uint32_t hash, BNode node,
              const PathTrack& track);
+    // Adds a folder that is above the one that was added last, and that find
+    // did not find: the folder of its first components.
+    void addAbove(const ComponentList& components, std::uint32_t hash,
+                  BNode node);
 
     // Prefetch what a later find will touch, one dependent step each: call
     // them in this order, some folders apart. They change nothing and may be
@@ -56,6 +64,7 @@ public:
     }
 
 private:
+    void addFolder(const Folder& folder, std::uint32_t hash);
     // The folder in the slot that find looks at first, if it may be the one.
     const Folder* inHomeSlot(std::uint32_t hash) const noexcept;
 

@@ -39,8 +39,17 @@ void CharacterCounter::add(std::u16string_view text) {
     for (; at != end; ++at) add(*pages_.front(), *at);
 }
 
+// Eight bytes at a time, as long as all of them are ASCII.
 void CharacterCounter::addBytes(std::string_view bytes) {
+    constexpr std::uint64_t beyondAscii = 0x8080808080808080;
     Page& firstPage = *pages_.front();
+    std::uint64_t word = 0;
+    for (; bytes.size() >= sizeof word; bytes.remove_prefix(sizeof word)) {
+        std::memcpy(&word, bytes.data(), sizeof word);
+        if ((word & beyondAscii) != 0) break;
+        for (std::size_t i = 0; i < sizeof word; ++i)
+            ++firstPage[static_cast<unsigned char>(bytes[i])];
+    }
     forEachUnit(bytes, [&](char16_t unit) { add(firstPage, unit); });
 }
 

@@ -9,7 +9,7 @@
 #include <thread>
 #include <utility>
 
-#include "coder/ComponentEncoder.hpp"
+#include "coder/ArenaEncoder.hpp"
 #include "coder/HuffmanCode.hpp"
 #include "paths/PathText.hpp"
 #include "paths/Segments.hpp"
@@ -17,8 +17,6 @@
 namespace tessel::paths {
 
 namespace {
-
-static_assert(ComponentEncoder::slack <= ComponentArena::slack);
 
 // Fewer paths are not worth a thread: they are encoded in the time that it
 // takes to start one, 20 to 50 microseconds.
@@ -54,23 +52,27 @@ private:
         do {
             put(paths[i].substr(folders.size()));
             ++i;
-        } while (i < end && foldersOf(paths[i]) == folders);
+        } while (i < end && hasFolders(paths[i], folders));
         part_.files.push_back(arena_.finish());
         return i;
     }
 
     void put(std::string_view segment) {
+        std::size_t length = encoder_.appendAscii(segment, arena_);
+        if (length == 0) length = putText(segment);
+        part_.maxComponentBytes = std::max(part_.maxComponentBytes, length);
+    }
+
+    std::size_t putText(std::string_view segment) {
         text_.clear();
         if (segment.empty())
             text_.push_back(noName);
         else
             appendText(segment, text_);
-        const std::size_t length = encoder_.bytesFor(text_);
-        encoder_.write(text_, arena_.extend(length));
-        part_.maxComponentBytes = std::max(part_.maxComponentBytes, length);
+        return encoder_.append(text_, arena_);
     }
 
-    ComponentEncoder encoder_;
+    ArenaEncoder encoder_;
     ComponentArena arena_;
     std::u16string text_;
     EncodedChunk part_;
@@ -83,7 +85,7 @@ std::vector<std::size_t> cutsOf(const PathList& paths, std::size_t threads) {
     for (std::size_t t = 1; t < threads; ++t) {
         std::size_t cut = std::max(cuts.back(), paths.size() / threads * t);
         while (cut > 0 && cut < paths.size() &&
-               foldersOf(paths[cut]) == foldersOf(paths[cut - 1]))
+               hasFolders(paths[cut], foldersOf(paths[cut - 1])))
             ++cut;
         cuts.push_back(cut);
     }

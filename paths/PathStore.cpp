@@ -45,12 +45,11 @@ public:
     }
 
     void count(std::string_view path) {
-        const std::size_t cut = paths::fileStartOf(path);
-        if (path.substr(0, cut) != lastFolders_ || cut == 0) {
-            lastFolders_.assign(path.substr(0, cut));
+        if (lastFolders_.empty() || !paths::hasFolders(path, lastFolders_)) {
+            lastFolders_.assign(path.substr(0, paths::fileStartOf(path)));
             countSegment(lastFolders_);
         }
-        countSegment(path.substr(cut));
+        countSegment(path.substr(lastFolders_.size()));
     }
 
     std::size_t checkedPaths() const noexcept { return checkedPaths_; }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstring>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -25,7 +26,19 @@ inline constexpr char16_t noName = 0xDC00;
 
 // Where the file's name begins: after the last '/'.
 inline std::size_t fileStartOf(std::string_view path) noexcept {
-    return path.rfind('/') + 1;
+    const void* const slash = memrchr(path.data(), '/', path.size());
+    if (slash == nullptr) return 0;
+    return static_cast<std::size_t>(static_cast<const char*>(slash) -
+                                    path.data()) +
+           1;
+}
+
+// True if these are the path's folders: its beginning up to fileStartOf. For
+// the folders of the path before it, this is faster than to compare them.
+inline bool hasFolders(std::string_view path,
+                       std::string_view folders) noexcept {
+    return path.starts_with(folders) &&
+           path.find('/', folders.size()) == std::string_view::npos;
 }
 
 // Calls visit(std::string_view) with each folder's segment. `folders` is a

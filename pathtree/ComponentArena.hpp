@@ -40,6 +40,25 @@ public:
         return packed::writeHeader(at, length);
     }
 
+    // Makes room for a component of up to `most` bytes and returns the place to
+    // write it, with `slack` bytes more. It is appended when its length is
+    // committed, before the arena is used otherwise; or it is dropped.
+    std::uint8_t* reserve(std::size_t most) {
+        const std::size_t room = packed::headerBytes(most) + most + slack;
+        if (room > capacity_ - used_) moveOn(room);
+        return buffers_.back().get() + used_ + packed::headerBytes(0);
+    }
+
+    void commit(std::size_t length) noexcept {
+        std::uint8_t* const at = buffers_.back().get() + used_;
+        const std::size_t header = packed::headerBytes(length);
+        if (header != packed::headerBytes(0))
+            std::memmove(at + header, at + packed::headerBytes(0), length);
+        packed::writeHeader(at, length);
+        used_ += header + length;
+        ++count_;
+    }
+
     // Appends a copy of the component to the current list.
     void append(ComponentView component) {
         std::uint8_t* to = extend(component.size());

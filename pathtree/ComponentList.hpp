@@ -37,6 +37,8 @@ public:
         }
 
     private:
+        friend class ComponentList;
+
         const std::uint8_t* at_;
     };
 
@@ -46,6 +48,16 @@ public:
     bool empty() const noexcept { return count_ == 0; }
     Iterator begin() const noexcept { return Iterator(first_); }
     Iterator end() const noexcept { return Iterator(first_ + byteCount_); }
+
+    // The first `count` components, which end at this position.
+    ComponentList before(Iterator end, std::size_t count) const noexcept {
+        return {first_, static_cast<std::size_t>(end.at_ - first_), count};
+    }
+    // All components but these, which before() gave.
+    ComponentList after(const ComponentList& beginning) const noexcept {
+        return {first_ + beginning.byteCount_,
+                byteCount_ - beginning.byteCount_, count_ - beginning.count_};
+    }
 
     // The whole list as it is in the buffer. Lists of equal components
     // have equal bytes, and no others have.

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <utility>
 
 #include "pathtree/ChildBlock.hpp"
 
@@ -74,6 +75,10 @@ public:
     // somebody keeps the root alive.
     const FolderNode* parent() const noexcept {
         return parent_ == 0 ? nullptr : atSteps(parent_);
+    }
+
+    FolderNode* parent() noexcept {
+        return const_cast<FolderNode*>(std::as_const(*this).parent());
     }
 
     // How far this node is behind another one in memory, and the node that is

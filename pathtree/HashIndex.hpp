@@ -50,14 +50,14 @@ public:
     // Inserts a position that find does not find. If it throws
     // (std::bad_alloc), nothing changes.
     void insert(std::uint32_t hash, std::size_t position) {
-        reserveOne();
+        reserveMore(1);
         place({hash, static_cast<std::uint32_t>(position + 1)});
         ++used_;
     }
 
-    // Makes sure that the next insertion does not throw.
-    void reserveOne() {
-        if (used_ >= entries_.size() / 4 * 3) reserve(used_ + 1);
+    // Makes sure that the next `count` insertions do not throw.
+    void reserveMore(std::size_t count) {
+        if (used_ + count > entries_.size() / 4 * 3) reserve(used_ + count);
     }
 
     // Makes room for `count` things in all.

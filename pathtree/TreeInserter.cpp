@@ -174,12 +174,12 @@ bool TreeInserter::addPath(BNode root, const ComponentList& components,
     return descent.isAllStored() && !components.empty();
 }
 
-TreeInserter::AddedBatch TreeInserter::addBatch(BNode root,
+TreeInserter::AddedBatch TreeInserter::addBatch(BNode root, BNode start,
                                                 const ComponentList& components,
                                                 const ComponentList& fileNames,
                                                 PathTrack& pathTrack) {
     indexUnder(root);
-    Descent descent(index_, root, components, pathTrack);
+    Descent descent(index_, start, components, pathTrack);
     const BNode found = descent.node();
     if (descent.isAllStored()) {
         const std::uint64_t first = addFiles(found, fileNames);

@@ -44,6 +44,13 @@ public:
     bool addPath(BNode root, const ComponentList& components,
                  PathTrack& pathTrack);
     AddedBatch addBatch(BNode root, const ComponentList& folderComponents,
+                        const ComponentList& fileNames, PathTrack& pathTrack) {
+        return addBatch(root, root, folderComponents, fileNames, pathTrack);
+    }
+    // The same below a node that was found under the root, whose positions the
+    // track already has; the components are those that follow.
+    AddedBatch addBatch(BNode root, BNode start,
+                        const ComponentList& components,
                         const ComponentList& fileNames, PathTrack& pathTrack);
 
     // Appends files to a folder that was found before; returns the position

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <random>
+
 #include "tests/support/Coders.hpp"
 
 namespace {
@@ -53,6 +55,35 @@ TEST(BatchInserter, ASecondBatchAppendsAfterTheFirst) {
     support::addBatches(*coder, {{u"c"}, {u"d"}}, {{u"a"}, {u"b", u"c"}});
     EXPECT_EQ(coder->partitionEnds, (Ends{1, 3, 4, 6}));
     EXPECT_EQ(coder->pathCount, 6U);
+}
+
+// A batch of its own finds every folder from the root down.
+TEST(BatchInserter, FoldersOfOneBatchGetWhatTheyWouldGetInBatchesOfTheirOwn) {
+    std::mt19937 numbers(20230610);
+    const auto below = [&](std::size_t bound) { return numbers() % bound; };
+    for (std::size_t round = 0; round < 30; ++round) {
+        const CoderPtr together = fourLetterCoder();
+        const CoderPtr apart = fourLetterCoder();
+        std::vector<Texts> folders;
+        std::vector<Texts> files;
+        Texts folder;
+        for (std::size_t i = 0; i < 60; ++i) {
+            folder.resize(below(folder.size() + 1));
+            for (std::size_t more = below(4); more > 0; --more)
+                folder.emplace_back(1, static_cast<char16_t>(u'a' + below(4)));
+            Texts names;
+            for (std::size_t more = below(3); more > 0; --more)
+                names.emplace_back(1, static_cast<char16_t>(u'a' + below(4)));
+            folders.push_back(folder);
+            files.push_back(names);
+            support::addBatch(*apart, folder, names);
+        }
+        support::addBatches(*together, folders, files);
+        ASSERT_EQ(support::tracksOf(*together), support::tracksOf(*apart));
+        ASSERT_EQ(support::formOf(*together, false),
+                  support::formOf(*apart, false));
+        ASSERT_EQ(support::brokenInvariant(*together), "");
+    }
 }
 
 TEST(BatchInserter, AFolderWithoutFilesIsAPartitionOfNoPaths) {

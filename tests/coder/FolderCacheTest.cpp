@@ -51,6 +51,27 @@ RC_GTEST_PROP(FolderCache, EqualsAMap, ()) {
     }
 }
 
+TEST(FolderCache, AFolderAboveHasTheBeginningOfTheTrack) {
+    BPathTree tree;
+    ComponentArena packer;
+    tessel::FolderCache cache;
+    const auto deep = support::packedBy(packer, {{1}, {2, 2}, {3}});
+    PathTrack track;
+    const BNode node =
+        tree.inserter().addBatch(*tree.root, deep, {}, track).folder;
+    cache.reserveFor(3, 1);
+    cache.add(deep, tessel::FolderCache::hashOf(deep), node, {7, 8, 9});
+    const auto above = support::packedBy(packer, {{1}, {2, 2}});
+    const auto hash = tessel::FolderCache::hashOf(above);
+    EXPECT_EQ(cache.find(above, hash), nullptr);
+    cache.addAbove(above, hash, *tree.root);
+    const tessel::FolderCache::Folder* found = cache.find(above, hash);
+    ASSERT_NE(found, nullptr);
+    EXPECT_EQ(found->node, *tree.root);
+    const auto positions = cache.trackOf(*found);
+    EXPECT_EQ(PathTrack(positions.begin(), positions.end()), (PathTrack{7, 8}));
+}
+
 TEST(FolderCache, FoldersOfEqualHashAreToldApart) {
     constexpr std::size_t count = 400000;
     tessel::FolderCache cache;

@@ -3,10 +3,12 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "coder/HuffmanPathTree.hpp"
 #include "paths/CharacterCounter.hpp"
+#include "paths/PathText.hpp"
 
 namespace {
 
@@ -41,6 +43,25 @@ TEST(CharacterCounter, AUnitOfAnotherPageIsCountedWhereverItIs) {
                 }
                 EXPECT_EQ(counts.characters, (std::u16string{u'a', far}));
                 EXPECT_EQ(counts.frequencies, (std::vector<double>{others, 1}));
+            }
+        }
+    }
+}
+
+TEST(CharacterCounter, BytesAreCountedAsTheirText) {
+    for (std::size_t length = 1; length < 30; ++length) {
+        for (std::size_t at = 0; at < length; ++at) {
+            for (const std::string_view far : {"\xC3\xA9", "\xFF", "\x7F"}) {
+                std::string bytes(length, 'a');
+                bytes.replace(at, 1, far);
+                CharacterCounter ofBytes;
+                ofBytes.addBytes(bytes);
+                CharacterCounter ofText;
+                for (const char16_t unit : toText(bytes)) ofText.add(unit);
+                EXPECT_EQ(ofBytes.result().characters,
+                          ofText.result().characters);
+                EXPECT_EQ(ofBytes.result().frequencies,
+                          ofText.result().frequencies);
             }
         }
     }

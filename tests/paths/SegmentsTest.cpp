@@ -32,6 +32,20 @@ TEST(Segments, FoldersKeepTheirSlashes) {
     EXPECT_EQ(segmentsOf("name"), "name");
 }
 
+TEST(Segments, APathHasTheFoldersUpToItsLastSlash) {
+    const std::vector<std::string> paths = {
+        "name", "a/", "a/b", "a//", "a//b", "a/b/", "a/b/c", "/", "/a", "ab/c",
+    };
+    const std::vector<std::string> folders = {
+        "", "a/", "a//", "a/b/", "/", "ab/", "a", "b/",
+    };
+    for (const std::string& path : paths)
+        for (const std::string& folder : folders)
+            EXPECT_EQ(hasFolders(path, folder),
+                      path.substr(0, fileStartOf(path)) == folder)
+                << path << " in " << folder;
+}
+
 TEST(Segments, NamesThatAreNotThereAddNothing) {
     std::string bytes = "a/";
     EXPECT_TRUE(appendSegment(std::u16string(1, noName), bytes));

@@ -82,6 +82,28 @@ TEST(ComponentArena, TheSlackAfterAComponentMayBeWritten) {
     EXPECT_EQ(length, 3000U);
 }
 
+TEST(ComponentArena, WhatIsCommittedIsTheListWhateverWasReserved) {
+    ComponentArena arena;
+    Components expected;
+    for (std::size_t length = 0; length < 600; ++length) {
+        const std::size_t most = length + 3 * (length % 100);
+        std::fill_n(arena.reserve(most), most + ComponentArena::slack,
+                    std::uint8_t{0xAA});  // dropped
+        const auto byte = static_cast<std::uint8_t>(length);
+        std::uint8_t* const to = arena.reserve(most);
+        std::fill_n(to, length, byte);
+        std::fill_n(to + length, most - length + ComponentArena::slack,
+                    std::uint8_t{0xBB});
+        arena.commit(length);
+        expected.emplace_back(length, byte);
+        if (length % 7 == 0) {
+            arena.append(expected.front());
+            expected.push_back(expected.front());
+        }
+    }
+    EXPECT_EQ(unpacked(arena.finish()), expected);
+}
+
 // A batch that is inserted packed equals one that is inserted unpacked.
 RC_GTEST_PROP(ComponentArena, InsertionEqualsThatOfVectors, ()) {
     const auto component =
