@@ -48,3 +48,17 @@ if(QZTESSEL_SANITIZE)
     qztessel_options INTERFACE -fno-omit-frame-pointer ${sanitizers})
   target_link_options(qztessel_options INTERFACE ${sanitizers})
 endif()
+
+# Counts which lines and branches of ours are run. Tests and the headers of
+# others are not counted, which makes the counting cheap. Threads count, too, so
+# counters are atomic.
+if(CMAKE_BUILD_TYPE STREQUAL "Coverage")
+  set(rooms packing pathtree coder archive paths binding)
+  list(JOIN rooms "|" rooms)
+  target_compile_options(
+    qztessel_options
+    INTERFACE --coverage -fprofile-update=prefer-atomic
+              "-fprofile-filter-files=(^|/)(${rooms})/[^/]*$"
+              "-fprofile-exclude-files=/tests/")
+  target_link_options(qztessel_options INTERFACE --coverage)
+endif()

@@ -6,7 +6,7 @@ buildPackages=(
     nlohmann-json3-dev pkg-config scdoc zlib1g-dev
 )
 checkPackages=(
-    clang clang-format clang-tidy dpkg-dev file fish libclang-rt-dev
+    clang clang-format clang-tidy dpkg-dev file fish gcovr libclang-rt-dev
     libgtest-dev liblzma-dev libmarisa-dev librapidcheck-dev libzstd-dev
     lintian llvm mypy pybind11-dev python3-build python3-dev
     python3-distributed python3-fsspec python3-h5py python3-numpy

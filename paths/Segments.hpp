@@ -4,7 +4,6 @@
 #include <cstring>
 #include <string>
 #include <string_view>
-#include <vector>
 
 // How a path's bytes become the components that a store keeps. A path is cut
 // after each run of '/': every folder keeps its own '/', and what is left is
@@ -53,12 +52,6 @@ void forEachSegment(std::string_view folders, Visit visit) {
         folders.remove_prefix(end);
     }
 }
-
-// The texts of the folders' segments, at least one.
-std::vector<std::u16string> folderTexts(std::string_view folders);
-
-// The text of the file's segment.
-std::u16string fileText(std::string_view name);
 
 // Appends the bytes of a segment's text and returns true. Returns false, with
 // `bytes` unchanged, if no segment has this text.

@@ -99,6 +99,18 @@ TEST_F(WholeFile, FollowsASymbolicLink) {
     EXPECT_EQ(readWholeFile(path("a")), "n");
 }
 
+TEST_F(WholeFile, ALinkToItselfIsNotReplaced) {
+    fs::create_symlink("link", path("link"));
+    try {
+        replaceFile(path("link"), Bytes{'n'});
+        FAIL() << "nothing was thrown";
+    } catch (const std::system_error& error) {
+        EXPECT_EQ(error.code(), std::errc::too_many_symbolic_link_levels);
+    }
+    EXPECT_TRUE(fs::is_symlink(path("link")));
+    EXPECT_EQ(entries(), 1U);
+}
+
 TEST_F(WholeFile, AFailedReplacementLeavesNothingBehind) {
     fs::create_directory(path("folder"));
     std::ofstream(path("folder/file")) << "kept";
