@@ -9,7 +9,6 @@ static_assert(ComponentEncoder::slack <= ComponentArena::slack);
 
 namespace {
 
-constexpr unsigned bitsPerByte = 8;
 constexpr unsigned char asciiEnd = 0x80;
 
 // More bits than a step takes.
@@ -20,19 +19,16 @@ static_assert(noStep > CodeTable::longestInline);
 // codes of the greatest length. Most file systems have no longer names.
 constexpr std::size_t maxShortText = 255;
 
-// Bytes that a short text may take, the end of its block included.
-constexpr std::size_t maxBytesFor(std::size_t units) noexcept {
-    return units * CodeTable::longestInline / bitsPerByte + 2;
-}
-
+// A packed code has its length in so many low bits.
+constexpr unsigned lengthBits = 8;
 unsigned lengthOf(std::uint64_t code) noexcept { return code & 0xFFU; }
-std::uint64_t bitsOf(std::uint64_t code) noexcept {
-    return code >> bitsPerByte;
-}
+std::uint64_t bitsOf(std::uint64_t code) noexcept { return code >> lengthBits; }
 
 // Writes bits to bytes, least significant first, without a branch.
 class StepWriter {
 public:
+    static constexpr unsigned bitsPerByte = 8;
+
     explicit StepWriter(std::uint8_t* to) noexcept : out_(to) {}
 
     // Appends the `count` (at most CodeTable::longestInline) low bits; all
@@ -60,6 +56,11 @@ private:
     unsigned heldBits_ = 0;  // below bitsPerByte
 };
 
+// Bytes that a short text may take, the end of its block included.
+constexpr std::size_t maxBytesFor(std::size_t units) noexcept {
+    return units * CodeTable::longestInline / StepWriter::bitsPerByte + 2;
+}
+
 }  // namespace
 
 ArenaEncoder::ArenaEncoder(const HuffmanCode& code) noexcept
@@ -73,7 +74,7 @@ ArenaEncoder::ArenaEncoder(const HuffmanCode& code) noexcept
 ArenaEncoder::PackedCode ArenaEncoder::packed(
     const CodeTable::Entry& entry) noexcept {
     if (!entry.exists() || entry.isLong || entry.length == 0) return noStep;
-    return entry.bits << bitsPerByte | entry.length;
+    return entry.bits << lengthBits | entry.length;
 }
 
 ArenaEncoder::PackedCode ArenaEncoder::codeOf(char byte) const noexcept {
