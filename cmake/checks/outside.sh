@@ -1,13 +1,15 @@
 #!/bin/bash
 # Usage: outside.sh CXX BUILD_FOLDER
-# Builds one program on the core and one on the store of paths, each with one
-# plain compiler line, as a project without our build files would, and runs
-# them.
+# Builds a program on the core with one plain compiler line, as a project without
+# our build files would, and one on the store of paths with a second line, which
+# takes the core as the first one compiled it. Runs both.
 set -euo pipefail
 mkdir -p "$2"
+rm -f "$2"/main*
 "$1" -std=c++20 -I. packing/*.cpp pathtree/*.cpp coder/*.cpp \
-    tests/outside/main.cpp -o "$2/main" -lz -pthread
+    tests/outside/main.cpp -o "$2/main" -lz -pthread -save-temps=obj
 "$2/main"
-"$1" -std=c++20 -I. packing/*.cpp pathtree/*.cpp coder/*.cpp paths/*.cpp \
+rm "$2"/main*-main.o
+"$1" -std=c++20 -I. "$2"/main*.o paths/*.cpp \
     tests/outside/store.cpp -o "$2/store" -lz -pthread
 cd "$2" && ./store
