@@ -25,6 +25,7 @@ inline constexpr char16_t noName = 0xDC00;
 
 // Where the file's name begins: after the last '/'.
 inline std::size_t fileStartOf(std::string_view path) noexcept {
+    if (path.empty()) return 0;  // perhaps of no bytes at all
     const void* const slash = memrchr(path.data(), '/', path.size());
     if (slash == nullptr) return 0;
     return static_cast<std::size_t>(static_cast<const char*>(slash) -
