@@ -25,8 +25,8 @@ from typing import Any
 WORKERS = 2
 BATCH = 1000
 
-# What /proc/PID/smaps_rollup calls them. Pages that several processes have
-# mapped are divided among them; the rest is private.
+# What /proc/PID/smaps calls them. Pages that several processes have mapped are
+# divided among them; the rest is private.
 FIGURES = {"total": ["Pss"], "private": ["Private_Clean", "Private_Dirty"]}
 
 
@@ -91,12 +91,18 @@ KINDS: dict[str, Callable[[pathlib.Path, pathlib.Path], Any]] = {
 
 
 def memory_of(pid: int) -> dict[str, int]:
-    text = pathlib.Path(f"/proc/{pid}/smaps_rollup").read_text()
-    rows = dict(line.split(":") for line in text.splitlines()[1:])
-    sums = {
-        figure: sum(1024 * int(rows[name].split()[0]) for name in names)
-        for figure, names in FIGURES.items()
-    }
+    """The memory of a process, without the system's libraries: how their pages
+    are divided depends on what else runs on the machine."""
+    sums = dict.fromkeys(FIGURES, 0)
+    counts = True
+    for line in pathlib.Path(f"/proc/{pid}/smaps").read_text().splitlines():
+        name, *words = line.split()
+        if "-" in name:  # a range of addresses, and at the end a file
+            counts = not words[-1].startswith("/usr/")
+        elif counts:
+            for figure, names in FIGURES.items():
+                if name.rstrip(":") in names:
+                    sums[figure] += 1024 * int(words[0])
     return {**sums, "shared": sums["total"] - sums["private"]}
 
 
