@@ -74,6 +74,11 @@ void* operator new(std::size_t bytes) {
     throw std::bad_alloc();
 }
 
+// What a stable sort asks for; it does with less where there is none.
+void* operator new(std::size_t bytes, const std::nothrow_t&) noexcept {
+    return std::malloc(bytes);
+}
+
 void operator delete(void* memory) noexcept { std::free(memory); }
 void operator delete(void* memory, std::size_t /*bytes*/) noexcept {
     std::free(memory);
