@@ -31,7 +31,7 @@ public:
 
 private:
     struct Folder {
-        std::size_t pathBytes;  // of the path up to it, with its '/'
+        std::size_t pathBytes = 0;  // of the path up to it, with its '/'
         std::size_t children = 0;
     };
 

@@ -143,7 +143,7 @@ private:
         require(!archive.numberOf("srv/none"), "a path that is not there");
     }
 
-    void findText(const PathArchive& archive) {
+    void findText(const PathArchive& archive) const {
         const std::uint64_t project =
             (paths_ - 1) / bench::GeneratedTree::pathsPerProject / 2;
         const std::uint64_t first =

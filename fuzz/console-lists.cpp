@@ -38,7 +38,7 @@ public:
     MemoryFile& operator=(const MemoryFile&) = delete;
     ~MemoryFile() { ::close(descriptor_); }
 
-    void write(std::string_view bytes) {
+    void write(std::string_view bytes) const {
         require(::ftruncate(descriptor_, 0) == 0 &&
                     ::pwrite(descriptor_, bytes.data(), bytes.size(), 0) ==
                         static_cast<ssize_t>(bytes.size()),
@@ -58,7 +58,7 @@ private:
 // memory.
 Session& session() {
     static Interrupts interrupts;
-    static MemoryFile shown;
+    static const MemoryFile shown;
     static OutputBuffer output(shown.descriptor(), "standard output");
     static OutputBuffer errors(shown.descriptor(), "standard error");
     static Session one{interrupts, output, errors};
@@ -110,7 +110,7 @@ bool isOfAnotherKind(std::string_view bytes) {
 // An archive of a few paths, for words to be tried on.
 const MemoryFile& someArchive() {
     static const MemoryFile& file = []() -> const MemoryFile& {
-        static MemoryFile made;
+        static const MemoryFile made;
         std::vector<std::uint8_t> bytes;
         ArchiveWriter writer(bytes);
         writer.addAll(Paths{"a", "a/b", "a/b/c.txt", "b", "\xFF/d", "zz"});
@@ -143,7 +143,7 @@ void readList(Input& input, std::uint8_t choice) {
     if ((choice & 2U) != 0) options.emptyLines = EmptyLines::Skipped;
     const auto rest = input.remainder();
     const std::string bytes(rest.begin(), rest.end());
-    static MemoryFile file;
+    static const MemoryFile file;
     file.write(bytes);
     const auto paths = read(file, options);
     if (!isOfAnotherKind(bytes))
