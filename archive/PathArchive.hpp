@@ -59,8 +59,8 @@ class SequentialReader;
 //   handler of before (archive/LostPages.hpp). Not noticed: bytes that somebody
 //   writes in the middle of the file. Where that may happen, read the file into
 //   memory and use own().
-// Memory: where it runs out, any member may throw std::bad_alloc. The archive is
-//   as it was and answers again once there is memory.
+// Memory: where it runs out, any member may throw std::bad_alloc. The archive
+//   is as it was and answers again once there is memory.
 // Cost: opening reads the tables (some hundred kilobytes per 8 million
 //   paths), not the paths, and derives at most 0.3 MB per segment. What each
 //   member costs is said there; a "block" is 16 paths.
