@@ -1,7 +1,6 @@
 #include "coder/ArenaEncoder.hpp"
 
-#include <bit>
-#include <cstring>
+#include "coder/BitWriter.hpp"
 
 namespace tessel {
 
@@ -24,41 +23,9 @@ constexpr unsigned lengthBits = 8;
 unsigned lengthOf(std::uint64_t code) noexcept { return code & 0xFFU; }
 std::uint64_t bitsOf(std::uint64_t code) noexcept { return code >> lengthBits; }
 
-// Writes bits to bytes, least significant first, without a branch.
-class StepWriter {
-public:
-    static constexpr unsigned bitsPerByte = 8;
-
-    explicit StepWriter(std::uint8_t* to) noexcept : out_(to) {}
-
-    // Appends the `count` (at most CodeTable::longestInline) low bits; all
-    // higher bits must be 0. Writes eight bytes.
-    void put(std::uint64_t bits, unsigned count) noexcept {
-        static_assert(std::endian::native == std::endian::little);
-        held_ |= bits << heldBits_;
-        heldBits_ += count;
-        std::memcpy(out_, &held_, sizeof held_);
-        out_ += heldBits_ / bitsPerByte;
-        held_ >>= heldBits_ / bitsPerByte * bitsPerByte;
-        heldBits_ %= bitsPerByte;
-    }
-
-    // Ends the block: the last bits, then how many they are. Returns the end.
-    std::uint8_t* finish() noexcept {
-        *out_++ = static_cast<std::uint8_t>(held_);
-        *out_++ = static_cast<std::uint8_t>(heldBits_);
-        return out_;
-    }
-
-private:
-    std::uint8_t* out_;
-    std::uint64_t held_ = 0;
-    unsigned heldBits_ = 0;  // below bitsPerByte
-};
-
 // Bytes that a short text may take, the end of its block included.
 constexpr std::size_t maxBytesFor(std::size_t units) noexcept {
-    return units * CodeTable::longestInline / StepWriter::bitsPerByte + 2;
+    return BitWriter::blockBytes(units * CodeTable::longestInline);
 }
 
 }  // namespace
@@ -92,7 +59,7 @@ std::size_t ArenaEncoder::appendShort(std::basic_string_view<Unit> text,
                                       ComponentArena& arena) const {
     if (text.empty() || text.size() > maxShortText) return 0;
     std::uint8_t* const begin = arena.reserve(maxBytesFor(text.size()));
-    StepWriter writer(begin);
+    BitWriter writer(begin);
     const Unit* at = text.data();
     const Unit* const end = at + text.size();
     while (at != end) {

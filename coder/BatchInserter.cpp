@@ -119,8 +119,7 @@ void BatchInserter::insertFolder(const ComponentList& components,
     track_.clear();
     track_.reserve(components.size() + 1);
     if (const FolderCache::Folder* cached = cache_.find(components, hash)) {
-        const auto positions = cache_.trackOf(*cached);
-        track_.assign(positions.begin(), positions.end());
+        beginTrackAt(*cached);
         const std::uint64_t first =
             tree_.inserter().addFiles(cached->node, fileNames);
         numbering_.notePartition(track_, true, first, fileNames.size());
@@ -140,8 +139,7 @@ void BatchInserter::insertNewFolder(const ComponentList& components,
     BNode start = *tree_.root;
     if (above.known() != nullptr) {
         start = above.known()->node;
-        const auto positions = cache_.trackOf(*above.known());
-        track_.assign(positions.begin(), positions.end());
+        beginTrackAt(*above.known());
     }
     const TreeInserter::AddedBatch added = tree_.inserter().addBatch(
         *tree_.root, start, above.rest(), fileNames, track_);
@@ -153,6 +151,11 @@ void BatchInserter::insertNewFolder(const ComponentList& components,
     track_.resize(depth);
     cache_.add(components, hash, added.folder, track_);
     above.addUnknown(added.folder, cache_);
+}
+
+void BatchInserter::beginTrackAt(const FolderCache::Folder& folder) {
+    const auto positions = cache_.trackOf(folder);
+    track_.assign(positions.begin(), positions.end());
 }
 
 // A batch that brought no file may have left a file as its folder.

@@ -35,6 +35,7 @@ private:
                       const ComponentList& fileNames, std::uint32_t hash);
     void insertNewFolder(const ComponentList& components,
                          const ComponentList& fileNames, std::uint32_t hash);
+    void beginTrackAt(const FolderCache::Folder& folder);
     void noteFolder(BNode folder, bool isEnd) noexcept;
 
     BPathTree& tree_;

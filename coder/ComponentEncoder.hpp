@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <string>
 
+#include "coder/BitWriter.hpp"
 #include "coder/HuffmanCode.hpp"
 
 namespace tessel {
@@ -16,7 +17,7 @@ namespace tessel {
 class ComponentEncoder {
 public:
     // Bytes that write may touch after the component.
-    static constexpr std::size_t slack = 7;
+    static constexpr std::size_t slack = BitWriter::slack;
 
     explicit ComponentEncoder(const HuffmanCode& code) noexcept : code_(code) {}
 
