@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <limits>
 #include <new>
+#include <system_error>
+#include <thread>
 
 namespace tessel::sixpacks {
 
@@ -12,7 +14,10 @@ namespace {
 // more than this factor.
 constexpr std::uint64_t maxInflationFactor = 1032;
 
-constexpr std::size_t windowBytes = std::size_t{64} << 10U;
+constexpr std::size_t windowBytes = std::size_t{256} << 10U;
+
+// Room before a window, for the rest of the one before it.
+constexpr std::size_t headroom = std::size_t{4} << 10U;
 
 // As many of so many bytes as zlib takes at once.
 uInt zlibCount(std::size_t bytes) noexcept {
@@ -20,39 +25,87 @@ uInt zlibCount(std::size_t bytes) noexcept {
         std::min<std::size_t>(bytes, std::numeric_limits<uInt>::max()));
 }
 
+// A thread pays only beside another core.
+std::launch aheadOfReader() noexcept {
+    return std::thread::hardware_concurrency() > 1 ? std::launch::async
+                                                   : std::launch::deferred;
+}
+
 }  // namespace
 
 Inflater::Inflater(std::span<const std::uint8_t> stream, std::uint64_t size)
-    : stream_(stream), toInflate_(static_cast<std::size_t>(size)) {
+    : unread_(static_cast<std::size_t>(size)),
+      stream_(stream),
+      toInflate_(unread_) {
     if (size / maxInflationFactor > stream.size()) throw DamagedFormException();
-    // One byte at least: zlib wants an address, also where nothing is to go.
-    window_.resize(std::clamp<std::size_t>(toInflate_, 1, windowBytes));
     if (inflateInit(&zlib_) != Z_OK) throw std::bad_alloc();
 }
 
-Inflater::~Inflater() { inflateEnd(&zlib_); }
+Inflater::~Inflater() {
+    ahead_ = {};  // waits for the thread
+    inflateEnd(&zlib_);
+}
 
 std::span<const std::uint8_t> Inflater::nextBlock(
     std::span<const std::uint8_t> rest, std::uint64_t size) {
-    if (size > window_.size()) {
-        std::vector<std::uint8_t> larger(static_cast<std::size_t>(size));
-        std::ranges::copy(rest, larger.begin());
-        window_.swap(larger);
-    } else {
-        std::ranges::copy(rest, window_.begin());
-    }
-    const auto room = std::span(window_).subspan(rest.size());
-    const std::size_t count = std::min(room.size(), toInflate_);
-    fill(room.first(count));
-    return std::span(window_).first(rest.size() + count);
+    if (!ahead_.valid()) inflateAhead(std::launch::deferred);
+    ahead_.get();
+    const std::size_t count = rest.size() + aheadBytes_;
+    const bool isLong = rest.size() > headroom || size > count;
+    const auto block = isLong
+                           ? longBlock(rest, std::max<std::size_t>(size, count))
+                           : shortBlock(rest);
+    unread_ -= block.size() - rest.size();
+    if (unread_ > 0) inflateAhead(aheadOfReader());
+    return block;
+}
+
+// The window that was inflated ahead, with the rest put in front of it.
+std::span<const std::uint8_t> Inflater::shortBlock(
+    std::span<const std::uint8_t> rest) {
+    const std::size_t begin = headroom - rest.size();
+    std::ranges::copy(rest, std::span(next_).subspan(begin).begin());
+    window_.swap(next_);
+    return std::span(window_).subspan(begin, rest.size() + aheadBytes_);
+}
+
+// A block of more than was inflated ahead, or with a long rest.
+std::span<const std::uint8_t> Inflater::longBlock(
+    std::span<const std::uint8_t> rest, std::size_t size) {
+    std::vector<std::uint8_t> block(size);
+    const auto ahead = std::span(next_).subspan(headroom, aheadBytes_);
+    const auto afterRest = std::ranges::copy(rest, block.begin()).out;
+    const auto end = std::ranges::copy(ahead, afterRest).out;
+    fill(std::span(end, block.end()));
+    window_.swap(block);
+    return window_;
 }
 
 void Inflater::finish() {
-    const std::span<std::uint8_t> window(window_);
-    while (toInflate_ > 0)
-        fill(window.first(std::min(window.size(), toInflate_)));
+    if (ahead_.valid()) ahead_.get();
+    while (toInflate_ > 0) fill(room());
     // The checksum, and maybe blocks of no bytes before it.
-    while (!hasEnded_) inflateSome(window.first(0));
+    while (!hasEnded_) inflateSome(room());
+    unread_ = 0;
+}
+
+// Begins to inflate the next window into next_.
+void Inflater::inflateAhead(std::launch how) {
+    const auto inflateNext = [this, to = room()] { fill(to); };
+    try {
+        ahead_ = std::async(how, inflateNext);
+    } catch (const std::system_error&) {
+        ahead_ = std::async(std::launch::deferred, inflateNext);
+    }
+}
+
+// The place in next_ for the next window. It has an address, which zlib wants,
+// also if it is empty.
+std::span<std::uint8_t> Inflater::room() {
+    aheadBytes_ = std::min(windowBytes, toInflate_);
+    if (next_.size() < headroom + aheadBytes_)
+        next_.resize(headroom + aheadBytes_);
+    return std::span(next_).subspan(headroom, aheadBytes_);
 }
 
 // Inflates as many bytes as fit in `to`.
