@@ -31,6 +31,9 @@ install(
   FILE_SET HEADERS
   DESTINATION ${headerFolder}
   COMPONENT development
+  FILE_SET headersAlone
+  DESTINATION ${headerFolder}
+  COMPONENT development
   INCLUDES
   DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(

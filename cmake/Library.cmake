@@ -22,6 +22,14 @@ function(qztesselAddLibrary name)
     list(TRANSFORM publicHeaders PREPEND ${PROJECT_SOURCE_DIR}/)
   endif()
   list(REMOVE_ITEM headers ${publicHeaders})
+  # A header that no source of its name includes first (includes.sh sees to
+  # that) is compiled by itself, to show that it needs nothing before it.
+  set(headersAlone ${publicHeaders})
+  foreach(source IN LISTS sources)
+    string(REGEX REPLACE "cpp$" "hpp" header ${source})
+    list(REMOVE_ITEM headersAlone ${header})
+  endforeach()
+  list(REMOVE_ITEM publicHeaders ${headersAlone})
 
   add_library(${target} STATIC ${sources} ${headers})
   add_library(qztessel::${name} ALIAS ${target})
@@ -32,7 +40,15 @@ function(qztesselAddLibrary name)
            BASE_DIRS
            ${PROJECT_SOURCE_DIR}
            FILES
-           ${publicHeaders})
+           ${publicHeaders}
+           FILE_SET
+           headersAlone
+           TYPE
+           HEADERS
+           BASE_DIRS
+           ${PROJECT_SOURCE_DIR}
+           FILES
+           ${headersAlone})
   target_compile_features(${target} PUBLIC cxx_std_20)
   # An installed library must not name a target that is not installed.
   target_link_libraries(${target} PRIVATE $<BUILD_INTERFACE:qztessel_options>)
@@ -48,7 +64,8 @@ function(qztesselAddLibrary name)
                POSITION_INDEPENDENT_CODE ON
                CXX_VISIBILITY_PRESET hidden
                VISIBILITY_INLINES_HIDDEN ON
-               VERIFY_INTERFACE_HEADER_SETS ON)
+               VERIFY_INTERFACE_HEADER_SETS ON
+               INTERFACE_HEADER_SETS_TO_VERIFY headersAlone)
 endfunction()
 
 # For a program that is compiled without optimization and linked to libraries of

@@ -1,8 +1,10 @@
 #!/bin/bash
 # Usage: includes.sh ROOT
 #
-# Checks which folder includes which, and that each of our own headers is
-# named by its path from the root. Prints every line that breaks a rule.
+# Checks which folder includes which, that each of our own headers is named by
+# its path from the root, and that a source includes the header of its name before
+# all others, which shows that the header needs nothing before it. Prints every
+# line that breaks a rule.
 #
 # Each room includes itself and those before it, in one straight order:
 #
@@ -41,12 +43,20 @@ report() {
     breaches=$((breaches + 1))
 }
 
+# The file of the line before.
+previous=
+
 # grep finds nothing in a folder without quoted includes: not a failure.
 named='["<]([^">]*)[">]'
 while IFS=: read -r file line text; do
     [[ $text =~ $named ]] || continue
     header=${BASH_REMATCH[1]}
     findAllowed "$file"
+    if [[ $file != "$previous" && -f ${file%.cpp}.hpp && $file == *.cpp &&
+        $header != "${file%.cpp}.hpp" ]]; then
+        report "$file:$line: include \"${file%.cpp}.hpp\" first"
+    fi
+    previous=$file
     if [[ $text != *'"'* ]]; then
         if [[ $header =~ ^(packing|pathtree|coder|paths|archive|binding|hosts)/ ]]; then
             report "$file:$line: <$header> is ours: quote it"
