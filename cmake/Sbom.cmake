@@ -1,6 +1,6 @@
-# Lists what a package is made of and needs, as an SPDX 2.3 document in JSON
-# (https://spdx.github.io/spdx-spec/v2.3/), so that whoever learns of a fault in a
-# library can tell whether it reached them. Equal builds give equal documents.
+# Lists what a package is made of and needs, as an SPDX 2.3 document in JSON, so
+# that whoever learns of a fault in a library can tell whether it reached them.
+# Equal builds give equal documents.
 
 # What ours is compiled with or linked to: Debian's package, its licence, and
 # whether its code is inside of ours ("header") or loaded beside it ("dynamic").

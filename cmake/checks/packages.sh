@@ -3,9 +3,10 @@
 #
 # Makes the Debian packages from a finished build and looks at them: all that
 # cmake --install copies is in one of them, lintian has no error, every library
-# that a program needs is of a package that it depends on, the list of parts (SBOM)
-# names what it depends on, the command runs from where the packages put it, and, as root,
-# dpkg installs them into an empty root and purges them without a trace.
+# that a program needs is of a package that it depends on, the list of parts
+# (SBOM) names what it depends on, the command runs from where the packages put
+# it, and, as root, dpkg installs them into an empty root and purges them without
+# a trace.
 set -euo pipefail
 cmake=$1 build=$2 work=$(realpath -m "$3")
 root=$work/root
@@ -61,6 +62,7 @@ checkSbom() {
     local package=$1 folder=$2 name depends
     name=$(dpkg-deb -f "$package" Package)
     depends=$(dpkg-deb -f "$package" Depends | sed 's/([^)]*)//g' | tr -d ,)
+    # shellcheck disable=SC2086  # the names are words
     /usr/bin/python3 -c '
 import json, sys
 document = json.load(open(sys.argv[1]))
