@@ -26,7 +26,7 @@ namespace {
 // processor's second cache until they are read, and that the host's pool keeps
 // their blocks for the next call.
 constexpr std::size_t numbersPerCall = 1'000;
-constexpr std::size_t pathsPerBatch = 100'000;
+constexpr std::size_t pathsPerAddition = 100'000;
 
 HostOptions options() {
     HostOptions options;
@@ -57,7 +57,7 @@ public:
     // Makes the code and adds the paths; the values are there before.
     double build() override {
         double seconds = makeInstance();
-        BatchReader reader(splitter_, pathsPerBatch);
+        BatchReader reader(splitter_, pathsPerAddition);
         Batch batch;
         while (reader.next(batch)) {
             const Value folders = Value::textLists(batch.folders);

@@ -64,28 +64,42 @@ function(qztesselAddTidyTest name)
   set_tests_properties(tidy.${name} PROPERTIES LABELS "check;tidy" COST 50)
 endfunction()
 
-# The sources of a room, joined in groups: most of the time goes into the headers
-# of libraries, which are the same for all of them.
+# Sources, joined in groups: most of the time goes into the headers of libraries,
+# which are the same for all of them.
+function(qztesselTidyFiles name)
+  set(number 0)
+  while(ARGN)
+    list(SUBLIST ARGN 0 30 files)
+    list(REMOVE_ITEM ARGN ${files})
+    qztesselAddTidyTest(
+      ${name}-${number} cmake/checks/tidy.py
+      ${PROJECT_BINARY_DIR}/tidy/${name}-${number}.cpp ${files} -- ${tidy}
+      --config-file=${PROJECT_SOURCE_DIR}/.clang-tidy -- -std=c++20
+      -I${PROJECT_SOURCE_DIR} -DQZTESSEL_PLUGIN="" -DQZTESSEL_MESSAGES=""
+      ${systemIncludes})
+    math(EXPR number "${number} + 1")
+  endwhile()
+endfunction()
+
+# Programs, and what stands in for another file: they have names in common.
+file(
+  GLOB aloneInTidy CONFIGURE_DEPENDS
+  RELATIVE ${PROJECT_SOURCE_DIR}
+  examples/*.cpp hosts/embedded/demo/*.cpp hosts/minimal/*.cpp)
+list(APPEND aloneInTidy bench/NoRivals.cpp bench/hostile-costs.cpp
+     bench/limits.cpp bench/path-bench.cpp bench/workloads.cpp)
+
 function(qztesselTidyRoom room)
   file(
     GLOB sources CONFIGURE_DEPENDS
     RELATIVE ${PROJECT_SOURCE_DIR}
     ${PROJECT_SOURCE_DIR}/${room}/*.cpp)
-  set(number 0)
-  while(sources)
-    list(SUBLIST sources 0 30 files)
-    list(REMOVE_ITEM sources ${files})
-    qztesselAddTidyTest(
-      ${room}-${number} cmake/checks/tidy.py
-      ${PROJECT_BINARY_DIR}/tidy/${room}-${number}.cpp ${files} -- ${tidy}
-      --config-file=${PROJECT_SOURCE_DIR}/.clang-tidy -- -std=c++20
-      -I${PROJECT_SOURCE_DIR} ${systemIncludes})
-    math(EXPR number "${number} + 1")
-  endwhile()
+  list(REMOVE_ITEM sources ${aloneInTidy})
+  qztesselTidyFiles(${room} ${sources})
 endfunction()
 
 set(rooms packing pathtree coder paths archive binding hosts/embedded
-          hosts/console hosts/patterns)
+          hosts/console hosts/patterns bench fuzz)
 set(systemIncludes)
 if(TARGET qztessel_python)
   list(APPEND rooms hosts/python hosts/python/host)
@@ -95,18 +109,6 @@ endif()
 foreach(room IN LISTS rooms)
   qztesselTidyRoom(${room})
 endforeach()
-
-# Programs have a main each, so they are checked file by file.
-file(
-  GLOB_RECURSE programs CONFIGURE_DEPENDS
-  RELATIVE ${PROJECT_SOURCE_DIR}
-  bench/*.cpp
-  examples/*.cpp
-  fuzz/*.cpp
-  hosts/embedded/demo/*.cpp
-  hosts/minimal/*.cpp)
-foreach(source IN LISTS programs)
-  qztesselAddTidyTest(
-    ${source} ${tidy} ${source} -- -std=c++20 -I${PROJECT_SOURCE_DIR}
-    -DQZTESSEL_PLUGIN="" -DQZTESSEL_MESSAGES="")
+foreach(source IN LISTS aloneInTidy)
+  qztesselTidyFiles(${source} ${source})
 endforeach()

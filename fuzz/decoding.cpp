@@ -45,7 +45,7 @@ std::u16string walk(const HuffmanPathTree& coder, const Component& bytes) {
     return text;
 }
 
-void run(Input input) {
+void decodeAndEncode(Input input) {
     HuffmanPathTree coder;
     const std::size_t characterCount = input.byte();
     buildCode(coder, input, characterCount);
@@ -68,6 +68,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::decodeAndEncode({data, size});
     return 0;
 }

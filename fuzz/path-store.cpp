@@ -22,7 +22,7 @@ using Bytes = std::vector<std::uint8_t>;
 using Strings = std::vector<std::string>;
 
 // Paths read at most, however many a form claims to hold.
-constexpr std::size_t manyPaths = 300;
+constexpr std::size_t maxRead = 300;
 
 void putUint(std::uint64_t value, std::size_t width, Bytes& out) {
     for (std::size_t i = 0; i < width; ++i)
@@ -60,7 +60,7 @@ Bytes enveloped(Input& input) {
 
 // Runs something that may be refused for what the bytes hold.
 template <class Operation>
-bool accepted(Operation operation) {
+bool storeAccepted(Operation operation) {
     try {
         operation();
         return true;
@@ -72,12 +72,12 @@ bool accepted(Operation operation) {
 
 // All routes must give the same, as far as they give anything.
 void checkRoutes(const PathStore& store) {
-    const std::size_t last = std::min(store.size(), manyPaths);
+    const std::size_t last = std::min(store.size(), maxRead);
     Strings one;
     bool whole = true;
     for (std::size_t i = 0; i < last && whole; ++i) {
         one.emplace_back();
-        whole = accepted([&] { store.read(i, one.back()); });
+        whole = storeAccepted([&] { store.read(i, one.back()); });
     }
     if (!whole) one.pop_back();
     Strings many;
@@ -85,17 +85,17 @@ void checkRoutes(const PathStore& store) {
         require(number == many.size(), "numbers come in order");
         many.emplace_back(path);
     };
-    require(accepted([&] { store.read(0, last, keep); }) == whole,
+    require(storeAccepted([&] { store.read(0, last, keep); }) == whole,
             "one by one and together fail alike");
     require(one == many, "one by one and together give the same");
 }
 
 void checkHostile(const Bytes& bytes) {
     PathStore store;
-    if (!accepted([&] { store = PathStore::load(bytes); })) return;
+    if (!storeAccepted([&] { store = PathStore::load(bytes); })) return;
     checkRoutes(store);
     std::size_t met = 0;
-    accepted([&] {
+    storeAccepted([&] {
         store.forEachInTreeOrder([&](std::string_view path) {
             require(!path.empty(), "no path is empty");
             ++met;
@@ -136,7 +136,7 @@ void checkPaths(Input& input) {
     require(met == paths, "the tree has every path");
 }
 
-void run(Input input) {
+void useStore(Input input) {
     switch (input.byte()) {
         case 0:
             return checkHostile(input.remainder());
@@ -154,6 +154,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::useStore({data, size});
     return 0;
 }

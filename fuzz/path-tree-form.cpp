@@ -45,7 +45,7 @@ void checkWhatWasRead(BPathTree& tree, std::size_t leaves,
             "what is written can be read");
 }
 
-void run(Input input) {
+void useTree(Input input) {
     std::vector<std::uint8_t> codes = input.block();
     Components values;
     while (!input.empty()) values.push_back(input.block());
@@ -68,6 +68,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::useTree({data, size});
     return 0;
 }

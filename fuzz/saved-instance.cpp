@@ -23,7 +23,7 @@ using embedded::Value;
 using Bytes = std::vector<std::uint8_t>;
 
 // Paths asked for at most, however many a form claims to hold.
-constexpr std::uint64_t manyPaths = 40;
+constexpr std::uint64_t maxNumber = 40;
 
 Bytes compressedForm(Bytes payload) {
     Bytes form;
@@ -93,7 +93,7 @@ std::optional<std::vector<Texts>> fetched(const HuffmanPathTree& coder,
 }
 
 void compareNumbers(const Value& instance, const HuffmanPathTree& coder) {
-    for (std::uint64_t n = 0; n <= manyPaths; ++n) {
+    for (std::uint64_t n = 0; n <= maxNumber; ++n) {
         const auto number = static_cast<double>(n);
         require(fetched(instance, number) == fetched(coder, number),
                 "host and coder fetch the same");
@@ -126,7 +126,7 @@ std::optional<Texts> next(HuffmanPathTree& coder) {
 void compareIteration(const Value& instance, HuffmanPathTree& coder) {
     pluggedHost().call(0, instance, "reset");
     coder.resetPathsToBTree();
-    for (std::uint64_t n = 0; n < manyPaths; ++n) {
+    for (std::uint64_t n = 0; n < maxNumber; ++n) {
         const bool hasNext =
             pluggedHost().call(1, instance, "hasNextPath")[0].truth(0);
         require(hasNext == coder.hasNextPathFromBTree(),
@@ -146,7 +146,7 @@ void compareSaved(const Value& instance) {
             "the characters are kept");
 }
 
-void run(Input input) {
+void useInstance(Input input) {
     const std::u16string treeString = input.text(input.byte());
     const Bytes form = compressedForm(input.remainder());
     const Value instance =
@@ -166,6 +166,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::useInstance({data, size});
     return 0;
 }

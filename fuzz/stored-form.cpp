@@ -23,7 +23,7 @@ struct Stored {
 };
 
 // Paths asked for at most, however many a form claims to hold.
-constexpr std::uint64_t manyPaths = 64;
+constexpr std::uint64_t maxAsked = 64;
 
 Stored takeStored(Input& input) {
     Stored stored;
@@ -45,7 +45,7 @@ Stored takeStored(Input& input) {
 // Runs something that may be refused for what the bytes hold. Any exception
 // but the documented ones ends the process.
 template <class Operation>
-bool accepted(Operation operation) {
+bool formAccepted(Operation operation) {
     try {
         operation();
         return true;
@@ -78,7 +78,8 @@ void checkRefusal(const Stored& stored) {
     fill(coder);
     const std::vector<std::uint8_t> before = formOf(coder, false);
     std::vector<std::uint8_t> bytes = stored.bytes;
-    if (accepted([&] { coder.deserialize(bytes, stored.compressed); })) return;
+    if (formAccepted([&] { coder.deserialize(bytes, stored.compressed); }))
+        return;
     require(formOf(coder, false) == before, "a refused form changes nothing");
     require(coder.pathCount == 5, "a refused form leaves the count");
 }
@@ -87,28 +88,27 @@ void iterate(HuffmanPathTree& coder) {
     coder.resetPathsToBTree();
     std::uint64_t handedOut = 0;
     for (Components path;
-         coder.hasNextPathFromBTree() && ++handedOut < manyPaths;
-         path.clear()) {
-        accepted([&] { coder.getNextPathFromBTree(path); });
-        accepted([&] { decode(coder, path); });
+         coder.hasNextPathFromBTree() && ++handedOut < maxAsked; path.clear()) {
+        formAccepted([&] { coder.getNextPathFromBTree(path); });
+        formAccepted([&] { decode(coder, path); });
     }
 }
 
 void fetch(const HuffmanPathTree& coder, const std::vector<double>& numbers) {
     std::vector<Components> folders;
     std::vector<Components> files;
-    if (!accepted([&] { coder.getPath(folders, files, numbers); }))
+    if (!formAccepted([&] { coder.getPath(folders, files, numbers); }))
         require(folders.empty() && files.empty(),
                 "a refused fetch leaves its outputs");
     for (const Components& components : folders)
-        accepted([&] { decode(coder, components); });
+        formAccepted([&] { decode(coder, components); });
     for (const Components& components : files)
-        accepted([&] { decode(coder, components); });
+        formAccepted([&] { decode(coder, components); });
 }
 
 void fetchByNumber(const HuffmanPathTree& coder) {
     std::vector<double> all;
-    for (std::uint64_t n = 1; n <= manyPaths; ++n) {
+    for (std::uint64_t n = 1; n <= maxAsked; ++n) {
         all.push_back(static_cast<double>(n));
         fetch(coder, {all.back()});
     }
@@ -138,15 +138,16 @@ void checkRewritten(const HuffmanPathTree& coder) {
     require(again.pathCount == coder.pathCount, "the count is kept");
 }
 
-void run(Input input) {
+void useForm(Input input) {
     const Stored stored = takeStored(input);
     checkRefusal(stored);
 
     HuffmanPathTree coder;
     std::vector<std::uint8_t> bytes = stored.bytes;
-    if (!accepted([&] { coder.deserialize(bytes, stored.compressed); })) return;
+    if (!formAccepted([&] { coder.deserialize(bytes, stored.compressed); }))
+        return;
     checkRewritten(coder);
-    accepted([&] { coder.inflateHuffman(stored.treeString); });
+    formAccepted([&] { coder.inflateHuffman(stored.treeString); });
     iterate(coder);
     fetchByNumber(coder);
 }
@@ -156,6 +157,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::useForm({data, size});
     return 0;
 }

@@ -79,10 +79,11 @@ private:
     void keepHandle() {
         const BNodePtr from = realHandle();
         const ChildList children = from->children();
-        if (children.empty())
+        const std::size_t count = children.size();
+        if (count == 0)
             handles_.push_back(tree().root);
         else
-            handles_.emplace_back(children[input_.byte() % children.size()]);
+            handles_.emplace_back(children[input_.byte() % count]);
     }
 
     void search() {

@@ -150,7 +150,7 @@ void checkRestored(const HuffmanPathTree& coder, const Batch& batch) {
     require(formOf(again, false) == firstForm, "what was read is written");
 }
 
-void run(Input input) {
+void compareWorkers(Input input) {
     const unsigned threads = 2U + input.byte() % 7;
     HuffmanPathTree onMany;
     const std::size_t characterCount = 2U + input.byte() % 30;
@@ -184,6 +184,6 @@ void run(Input input) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size) {
-    tessel::fuzz::run({data, size});
+    tessel::fuzz::compareWorkers({data, size});
     return 0;
 }

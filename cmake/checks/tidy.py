@@ -12,17 +12,22 @@ import re
 import subprocess
 import sys
 
+# Where a fuzz target begins.
+BEGIN = "LLVMFuzzerTestOneInput"
+
 
 def join(files: list[str]) -> tuple[list[str], list[str]]:
     """All lines of the files, and the place of each. A header that a file before
-    has included is left out; its line stays, empty."""
+    has included is left out; its line stays, empty. The beginnings of fuzz targets
+    are numbered, so that targets can be joined."""
     joined: list[str] = []
     places: list[str] = []
     included: set[str] = set()
-    for file in files:
-        lines = pathlib.Path(file).read_text().splitlines()
+    for number, file in enumerate(files):
+        text = pathlib.Path(file).read_text().replace(BEGIN, f"{BEGIN}{number}")
+        lines = text.splitlines()
         joined += ["" if line in included else line for line in lines]
-        places += [f"{file}:{number}" for number in range(1, len(lines) + 1)]
+        places += [f"{file}:{at}" for at in range(1, len(lines) + 1)]
         included |= {line for line in lines if line.startswith("#include")}
     return joined, places
 
