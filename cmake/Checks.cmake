@@ -18,8 +18,6 @@ qztesselAddCheck(includes includes.sh .)
 qztesselAddCheck(includes-self-test includes-self-test.sh)
 qztesselAddCheck(outside outside.sh ${CMAKE_CXX_COMPILER}
                  ${PROJECT_BINARY_DIR}/outside)
-qztesselAddCheck(outside-tree outside-tree.sh ${CMAKE_CXX_COMPILER}
-                 ${PROJECT_BINARY_DIR}/outside)
 qztesselAddCheck(
   consumer consumer.sh ${CMAKE_COMMAND} ${CMAKE_CXX_COMPILER}
   ${PROJECT_BINARY_DIR} ${PROJECT_BINARY_DIR}/consumer)
