@@ -7,6 +7,7 @@
 
 #include "hosts/embedded/Classes.hpp"
 #include "hosts/embedded/Value.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace tessel::embedded {
 
@@ -171,7 +172,7 @@ TEST(ValueTest, IndicesOutsideThrow) {
 // ---- Nesting ----
 
 // As deep as memory allows, on the usual stack of 8 MiB.
-constexpr std::size_t deepest = 1'000'000;
+constexpr std::size_t deepest = support::shareOf(1'000'000);
 
 Value nestedCells(std::size_t depth, Value innermost) {
     Value value = std::move(innermost);
