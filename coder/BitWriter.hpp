@@ -12,7 +12,7 @@ namespace tessel {
 // Writes codes to bytes as a bit block (sixpacks::boolVecToBytes): least
 // significant bit first, without a branch.
 //
-// Ownership: borrows the bytes. May write `slack` bytes more than the block has.
+// Ownership: borrows the bytes. May write `slack` more than the block has.
 class BitWriter {
 public:
     static constexpr unsigned bitsPerByte = 8;
