@@ -5,6 +5,9 @@
 
 #include <functional>
 
+#include "archive/PathArchive.hpp"
+#include "paths/PathStore.hpp"
+#include "tests/paths/Stores.hpp"
 #include "tests/support/Coders.hpp"
 #include "tests/support/Trees.hpp"
 
@@ -18,9 +21,15 @@ using tessel::Component;
 using tessel::Components;
 using tessel::PathTrack;
 
-constexpr std::size_t chainLength = 1000000;
+#ifdef QZTESSEL_SLOWED
+constexpr std::size_t chainLength = 1'000'000;
+constexpr std::size_t coderDepth = 200'000;
+#else
+constexpr std::size_t chainLength = 2'000'000;
+constexpr std::size_t coderDepth = chainLength;
+#endif
 
-// Far less than a million frames of any function.
+// Far less than so many frames of any function.
 constexpr std::size_t smallStack = std::size_t{512} << 10;
 
 void* callTask(void* task) {
@@ -48,7 +57,7 @@ void addChain(BPathTree& tree, std::size_t length) {
     tree.addPath(path, track);
 }
 
-TEST(DeepTrees, AChainOfAMillionNodesIsReleased) {
+TEST(DeepTrees, AChainOfMillionsOfNodesIsReleased) {
     onSmallStack([] {
         BPathTree tree;
         addChain(tree, chainLength);
@@ -131,7 +140,7 @@ TEST(DeepTrees, AChainIsStoredAndReadBack) {
 
 TEST(DeepTrees, ACoderWithADeepFolderDoesEverything) {
     onSmallStack([] {
-        constexpr std::size_t depth = chainLength / 5;
+        constexpr std::size_t depth = coderDepth;
         const CoderPtr coder = support::fourLetterCoder();
         Components folder = chain(depth);
         Components files = {{2}, {3}};
@@ -151,6 +160,51 @@ TEST(DeepTrees, ACoderWithADeepFolderDoesEverything) {
         copy.copyTree(*back);
         EXPECT_GT(copy.memoryUsage().total(), depth);
         EXPECT_EQ(support::formOf(copy, true), form);
+    });
+}
+
+// A path of so many folders of one character each.
+std::string deepPath(std::size_t depth) {
+    std::string path;
+    for (std::size_t i = 0; i < depth; ++i) path += "d/";
+    return path + "f";
+}
+
+TEST(DeepTrees, AStoreWithADeepPathDoesEverything) {
+    onSmallStack([] {
+        const std::vector<std::string> paths = {deepPath(coderDepth), "d/f"};
+        tessel::PathStore store = tessel::PathStore::from(paths);
+        EXPECT_EQ(stores::iterated(store), paths);
+        EXPECT_EQ(stores::inTreeOrder(store), paths);
+        EXPECT_EQ(store[0], paths[0]);
+        store = tessel::PathStore::load(store.save());
+        store.append(paths[0] + "g");
+        EXPECT_EQ(store[0], paths[0]);
+        EXPECT_EQ(store[2], paths[0] + "g");
+    });
+}
+
+// An archive's folders have at most 1 MiB.
+TEST(DeepTrees, AnArchiveTakesADeepPathUpToItsLimit) {
+    onSmallStack([] {
+        constexpr std::size_t deepest = std::size_t{1} << 19;
+        const std::vector<std::string> paths = {deepPath(deepest), "d/f"};
+        std::vector<std::uint8_t> bytes;
+        tessel::ArchiveWriter writer(bytes);
+        writer.addAll(paths);
+        EXPECT_THROW(writer.add(deepPath(deepest + 1)), std::length_error);
+        EXPECT_THROW(writer.add(deepPath(2'000'000)), std::length_error);
+        writer.finish();
+        const auto archive = tessel::PathArchive::own(bytes);
+        ASSERT_EQ(archive.size(), paths.size());
+        EXPECT_EQ(archive[0], paths[0]);
+        EXPECT_EQ(archive.numberOf(paths[0]), 0U);
+        EXPECT_EQ(archive.numberOf(deepPath(deepest - 1)), std::nullopt);
+        EXPECT_EQ(
+            archive.folder(deepPath(deepest - 1).substr(0, 2 * (deepest - 1))),
+            (std::vector<tessel::NumberRange>{{0, 1}}));
+        EXPECT_EQ(archive.find("/d/f"), (std::vector<std::uint64_t>{0}));
+        archive.verify();
     });
 }
 

@@ -9,6 +9,7 @@
 #include "coder/PathRetrieval.hpp"
 #include "tests/support/AllocationMeter.hpp"
 #include "tests/support/Coders.hpp"
+#include "tests/support/EachAllocation.hpp"
 #include "tests/support/Trees.hpp"
 
 namespace {
@@ -179,6 +180,36 @@ TEST(MemoryFailures, ABatchOnWorkersIsRefusedOrAddedInPart) {
         EXPECT_EQ(support::brokenInvariant(*coder), "");
         return added;
     });
+}
+
+// The same if the workers have no memory either, in folders that are not added
+// unless all before them are.
+TEST(MemoryFailures, ABatchWhoseWorkersLackMemoryIsRefusedOrAddedInPart) {
+    std::vector<Texts> manyFolders;
+    for (std::size_t i = 0; i < 200; ++i)
+        manyFolders.push_back({u"b", std::u16string(1 + i, u'c')});
+    const std::vector<Texts> manyFiles(200, Texts{u"a", u"b", u"c", u"d"});
+    CoderPtr coder;
+    std::vector<Texts> folders;
+    std::vector<Texts> files;
+    support::atEachAllocation(
+        [&] {
+            coder = filledCoder();
+            folders = manyFolders;
+            files = manyFiles;
+        },
+        [&] { coder->generateCodeAsyncAndAddPaths(folders, files, 3); },
+        [&](bool succeeded) {
+            EXPECT_EQ(support::brokenInvariant(*coder), "");
+            const std::uint64_t added = coder->pathCount - 7;
+            EXPECT_EQ(added % 4, 0U);
+            EXPECT_TRUE(added == 800 || !succeeded);
+            EXPECT_EQ(coder->partitionEnds.size(), 3 + added / 4);
+            support::addBatches(*coder, manyFolders, manyFiles, 3);
+            EXPECT_EQ(coder->pathCount, 7 + added + 800);
+            EXPECT_EQ(support::brokenInvariant(*coder), "");
+        },
+        {.threads = support::FailingThreads::All, .allUpTo = 100, .step = 7});
 }
 
 TEST(MemoryFailures, ABatchThatFailsBeforeItIsEncodedKeepsItsTexts) {

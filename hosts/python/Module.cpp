@@ -12,6 +12,7 @@
 #include <span>
 #include <stop_token>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -25,6 +26,7 @@
 #include "hosts/python/StoredList.hpp"
 #include "hosts/python/Taking.hpp"
 #include "hosts/python/ViewObjects.hpp"
+#include "paths/WholeFile.hpp"
 
 namespace tessel::python {
 
@@ -257,6 +259,17 @@ void bindPacker(py::module_& module) {
         .def("finish", [](Packer& packer) { return shared(packer.finish()); });
 }
 
+// ---- Other files ----
+
+void replaceFile(const std::string& file, std::string_view content) {
+    const InterpreterReleased released;
+    namingArchive(file, [&] {
+        paths::replaceFile(
+            file, {reinterpret_cast<const std::uint8_t*>(content.data()),
+                   content.size()});
+    });
+}
+
 }  // namespace
 
 PYBIND11_MODULE(_core, module) {
@@ -265,6 +278,7 @@ PYBIND11_MODULE(_core, module) {
     bindView(module);
     bindPathSequence(module);
     bindPacker(module);
+    module.def("replace_file", &replaceFile);
 }
 
 }  // namespace tessel::python

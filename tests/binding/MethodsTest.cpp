@@ -466,6 +466,33 @@ TEST_F(MethodsTest, GetPathsWithSeparatorSkipsFolderWithoutComponents) {
               (Listing{{{}, {u"a"}, {u"b"}}, {{u"cc"}, {u"b"}, {u"c"}}}));
 }
 
+TEST_F(MethodsTest, GetPathsTakesNumbersBeyond32Bits) {
+    // Ends that were set by hand make the second batch begin at 2^32 - 1.
+    constexpr double border = 4294967296.0;
+    HuffmanPathTree coder;
+    const std::vector<double> equal(3, 1.0);
+    coder.deflateHuffman(equal.data(), u"abc");
+    HuffmanPathTree::FolderTexts folders = {{u"a"}, {u"b"}};
+    HuffmanPathTree::FolderTexts files = {{u"a"}, {u"a", u"b", u"c"}};
+    coder.generateCodeAsyncAndAddPaths(folders, files);
+    coder.partitionEnds = {(std::uint64_t{1} << 32) - 2,
+                           (std::uint64_t{1} << 32) + 1};
+    std::vector<std::uint8_t> bytes;
+    coder.serialize(bytes, true);
+    const Value instance =
+        make(Value::text(u"tree"), Value::text(coder.getTreeString()),
+             Value::byteColumn(bytes), Value::column(equal));
+    const Value loaded =
+        host_.load(filesetClassName, host_.save(host_.copy(instance)));
+    for (const Value& each : {instance, loaded}) {
+        EXPECT_EQ(fetched(each, {1, border - 1, border, border + 1}),
+                  (Listing{{{u"a"}, {u"b"}}, {{u"a"}, {u"a", u"b", u"c"}}}));
+        EXPECT_EQ(joined(each, {border}, u"/"), (Texts{u"bb"}));
+        EXPECT_EQ(fetched(each, {border + 2}), Listing());
+        EXPECT_THROW(fetched(each, {2}), HostException);
+    }
+}
+
 TEST_F(MethodsTest, GetPathsWithoutEndsYieldsFoldersOfPartitions) {
     // A stored form may have tracks alone.
     HuffmanPathTree coder;

@@ -97,6 +97,29 @@ TEST(PathNumbering, AHugeCountTakesNoMemory) {
     }
 }
 
+// Ends on both sides of 2^32, which a count that was set by hand leads to.
+TEST(PathNumbering, NumbersBeyond32BitsAreFound) {
+    constexpr std::uint64_t border = std::uint64_t{1} << 32;
+    PathNumbering numbering;
+    note(numbering, 3);
+    numbering.pathCount = border - 100;
+    for (std::size_t i = 0; i < 60; ++i) note(numbering, i % 7);
+    const Ends& ends = numbering.partitionEnds;
+    ASSERT_LT(ends[1], border);
+    ASSERT_GT(ends.back(), border);
+    PathNumbering checked = numbering;
+    checked.checkEnds();
+    for (const PathNumbering& each : {numbering, checked})
+        for (const std::uint64_t number :
+             {std::uint64_t{0}, std::uint64_t{3}, std::uint64_t{4},
+              border - 200, border - 1, border, border + 1, border + 3,
+              ends.back(), ends.back() + 1, 2 * border, 2 * border + 3})
+            for (std::size_t k = 0; k <= ends.size(); ++k)
+                ASSERT_EQ(each.partitionAtOrAfter(k, number),
+                          searched(ends, k, number))
+                    << "from " << k << " for " << number;
+}
+
 // The same after a form whose last end is huge and whose ends fall.
 TEST(PathNumbering, HugeEndsThatFallTakeNoMemory) {
     PathNumbering numbering;

@@ -244,6 +244,85 @@ TEST(PathRetrieval, FewerTracksThanEndsAreOutOfRange) {
     EXPECT_EQ(answerFor(*coder, {2}), (Answer{{{u"a"}}, {{u"b"}}}));
 }
 
+// ---- Numbers on both sides of 2^32 ----
+
+constexpr double border = 4294967296.0;
+
+// The paths a/a and b/a, of which the second one's partition claims to end at
+// 2^32 - 3; then c/{a,b,c,d,aa} with the numbers 2^32 - 2 to 2^32 + 2, and
+// a/{c,d} with the next two.
+CoderPtr partitionsAroundTheBorder() {
+    CoderPtr coder = fourLetterCoder();
+    addBatch(*coder, {u"a"}, {u"a"});
+    addBatch(*coder, {u"b"}, {u"a"});
+    coder->pathCount = static_cast<std::uint64_t>(border) - 3;
+    coder->partitionEnds.back() = coder->pathCount;
+    addBatch(*coder, {u"c"}, {u"a", u"b", u"c", u"d", u"aa"});
+    addBatch(*coder, {u"a"}, {u"c", u"d"});
+    return coder;
+}
+
+void expectAnswersAroundTheBorder(const HuffmanPathTree& coder) {
+    const Texts inC = {u"a", u"b", u"c", u"d", u"aa"};
+    std::vector<double> numbers;
+    for (std::size_t i = 0; i < inC.size(); ++i) {
+        numbers.push_back(border - 2 + static_cast<double>(i));
+        EXPECT_EQ(answerFor(coder, {numbers.back()}),
+                  (Answer{{{u"c"}}, {{inC[i]}}}));
+    }
+    EXPECT_EQ(answerFor(coder, numbers), (Answer{{{u"c"}}, {inC}}));
+    EXPECT_EQ(answerFor(coder, {1, 2, border, border + 4}),
+              (Answer{{{u"a"}, {u"b"}, {u"c"}, {u"a"}},
+                      {{u"a"}, {u"a"}, {u"c"}, {u"d"}}}));
+    EXPECT_EQ(answerFor(coder, {border + 5, 2 * border + 1}), Answer());
+    expectRefused(coder, {3});
+    expectRefused(coder, {border - 3});
+}
+
+TEST(PathRetrieval, NumbersBeyond32BitsLeadToTheirPaths) {
+    const CoderPtr coder = partitionsAroundTheBorder();
+    expectAnswersAroundTheBorder(*coder);
+    coder->numbering().checkEnds();
+    expectAnswersAroundTheBorder(*coder);
+    for (const bool compress : {false, true}) {
+        const CoderPtr restored = support::restoredFrom(
+            support::formOf(*coder, compress), compress, *coder);
+        EXPECT_EQ(restored->pathCount, coder->pathCount);
+        EXPECT_EQ(restored->partitionEnds, coder->partitionEnds);
+        expectAnswersAroundTheBorder(*restored);
+    }
+    HuffmanPathTree copy;
+    copy.copyTree(*coder);
+    expectAnswersAroundTheBorder(copy);
+}
+
+TEST(PathRetrieval, RepeatedPathsHaveNumbersBeyond32Bits) {
+    const CoderPtr coder = fourLetterCoder();
+    addWhole(*coder, {u"a", u"b"});
+    coder->pathCount = static_cast<std::uint64_t>(border) - 1;
+    addWhole(*coder, {u"a", u"b"});
+    addWhole(*coder, {u"a", u"b"});
+    const CoderPtr restored =
+        support::restoredFrom(support::formOf(*coder, true), true, *coder);
+    EXPECT_EQ(restored->duplicates, coder->duplicates);
+    EXPECT_EQ(restored->maxDuplicatePathNumber, coder->pathCount);
+    for (HuffmanPathTree* each : {coder.get(), restored.get()}) {
+        const auto number = static_cast<std::uint64_t>(border);
+        EXPECT_TRUE(each->hasDuplicate(number));
+        EXPECT_TRUE(each->hasDuplicate(number + 1));
+        EXPECT_FALSE(each->hasDuplicate(0));
+        EXPECT_FALSE(each->hasDuplicate(1));
+        each->resetPathsToBTree();
+        each->nextPathNumber = number - 1;
+        for (int repeat = 0; repeat < 2; ++repeat) {
+            Components path;
+            each->getNextPathFromBTree(path);
+            EXPECT_EQ(decodedBy(*each, path), (Texts{u"a", u"b"}));
+        }
+        EXPECT_EQ(each->nextPathNumber, number + 1);
+    }
+}
+
 // ---- Tracks without ends ----
 
 CoderPtr trackOnly() {

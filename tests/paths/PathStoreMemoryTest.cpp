@@ -40,7 +40,25 @@ Strings morePaths() {
     return paths;
 }
 
-void expectAppendedOrAsItWas(const Strings& more) {
+// Every allocation of any thread counts; as there are thousands, each of the
+// first hundred fails and then one of so many.
+constexpr support::AllocationCount onAllThreads = {
+    .threads = support::FailingThreads::All,
+    .allUpTo = 100,
+    .step = 97,
+    .most = 100'000};
+
+// Enough for three threads that encode, in folders of a few files each.
+Strings pathsForThreads() {
+    Strings paths;
+    for (std::size_t i = 0; i < 3200; ++i)
+        paths.push_back("/a/" + std::string(1 + i / 9 % 40, 'b') + "/" +
+                        std::string(1 + i % 9, 'c'));
+    return paths;
+}
+
+void expectAppendedOrAsItWas(const Strings& more,
+                             support::AllocationCount count = {}) {
     PathStore store;
     Strings all = basePaths();
     all.insert(all.end(), more.begin(), more.end());
@@ -51,7 +69,8 @@ void expectAppendedOrAsItWas(const Strings& more) {
                          if (succeeded) return;
                          store.append(more);
                          expectPaths(store, all);
-                     });
+                     },
+                     count);
 }
 
 TEST(PathStoreMemory, PathsAreAppendedOrTheStoreIsAsItWas) {
@@ -62,6 +81,34 @@ TEST(PathStoreMemory, AStoreThatIsEncodedAnewIsSoOrAsItWas) {
     Strings more = morePaths();
     more.emplace_back("/a/another character");
     expectAppendedOrAsItWas(more);
+}
+
+TEST(PathStoreMemory, WhatThreadsEncodeIsAppendedOrTheStoreIsAsItWas) {
+    expectAppendedOrAsItWas(pathsForThreads(), onAllThreads);
+}
+
+TEST(PathStoreMemory, WhatThreadsEncodeAnewIsSoOrTheStoreIsAsItWas) {
+    Strings more = pathsForThreads();
+    more.emplace_back("/a/another character");
+    expectAppendedOrAsItWas(more, onAllThreads);
+}
+
+// The second chunk is encoded while the first one is inserted.
+TEST(PathStoreMemory, ChunksAreAppendedOrTheStoreIsAsItWas) {
+    const Strings more(250'002, "/a/b");
+    PathStore store;
+    atEachAllocation(
+        [&] { store = PathStore::from(basePaths()); },
+        [&] { store.append(more); },
+        [&](bool succeeded) {
+            const std::size_t size = basePaths().size();
+            if (!succeeded) expectPaths(store, basePaths());
+            if (!succeeded) store.append(more);
+            ASSERT_EQ(store.size(), size + more.size());
+            EXPECT_EQ(store[size], more.front());
+            EXPECT_EQ(store[store.size() - 1], more.back());
+        },
+        {.threads = support::FailingThreads::All, .allUpTo = 10, .step = 5});
 }
 
 TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {

@@ -26,8 +26,11 @@
 
 namespace {
 
+using stores::expectHolds;
 using stores::inTreeOrder;
 using stores::iterated;
+using stores::readAll;
+using stores::sorted;
 using tessel::DamagedFormException;
 using tessel::PathStore;
 using tessel::paths::IndexedRange;
@@ -64,33 +67,6 @@ const Strings& awkwardPaths() {
                                   "a/b/c/d/e/f/g",
                                   "/a/b/c"};
     return paths;
-}
-
-Strings readAll(const PathStore& store) {
-    Strings paths;
-    store.read(0, store.size(), [&](std::size_t number, std::string_view path) {
-        EXPECT_EQ(number, paths.size());
-        paths.emplace_back(path);
-    });
-    return paths;
-}
-
-Strings sorted(Strings paths) {
-    std::ranges::sort(paths);
-    return paths;
-}
-
-// Asks the store in every way that it has.
-void expectHolds(const PathStore& store, const Strings& paths) {
-    ASSERT_EQ(store.size(), paths.size());
-    EXPECT_EQ(store.empty(), paths.empty());
-    EXPECT_EQ(readAll(store), paths);
-    EXPECT_EQ(iterated(store), paths);
-    EXPECT_EQ(sorted(inTreeOrder(store)), sorted(paths));
-    for (std::size_t i = 0; i < paths.size(); ++i)
-        EXPECT_EQ(store[i], paths[i]);
-    EXPECT_THROW(store[paths.size()], std::out_of_range);
-    EXPECT_EQ(readAll(PathStore::load(store.save())), paths);
 }
 
 // ---- Adding and reading ----

@@ -165,6 +165,51 @@ void growOver(std::size_t border) {
 TEST(ChildBlock, GrowsOverTheBorderOfOneByte) { growOver(255); }
 TEST(ChildBlock, GrowsOverTheBorderOfTwoBytes) { growOver(65535); }
 
+// Children whose block is full, with every number of bytes around a border: as
+// they were made, with one more, given back, and with a folder among them.
+void expectEachSize(std::size_t shortest, std::size_t longest) {
+    for (std::size_t length = shortest; length <= longest; ++length) {
+        NodePool pool;
+        std::vector<Component> names;
+        for (std::uint8_t i = 0; i < 20; ++i) names.push_back({i});
+        names.insert(names.begin() + 9, Component(length, 99));
+        ComponentArena arena;
+        for (const Component& name : names) arena.append(name);
+        auto list = arena.finish();
+        const BNodePtr node =
+            BNodePtr::adopt(pool.make({}, {list.bytes(), list.size(), false}));
+        FolderNode& folder = *node->folder();
+        const auto expectNames = [&] {
+            ASSERT_EQ(folder.children().count(), names.size());
+            ChildReader reader(folder.children());
+            for (std::size_t i = 0; i < names.size(); ++i) {
+                ASSERT_TRUE(
+                    tessel::sameComponent(folder.child(i).value(), names[i]))
+                    << length;
+                ASSERT_TRUE(
+                    tessel::sameComponent(reader.next().value(), names[i]));
+            }
+        };
+        expectNames();
+        arena.append(names.emplace_back(Component{77}));
+        list = arena.finish();
+        folder.append({list.bytes(), list.size(), false});
+        expectNames();
+        folder.trim();
+        expectNames();
+        folder.reservePromotion(3);
+        folder.promote(3, pool.make(names[3], {list.bytes(), 1, false}));
+        expectNames();
+    }
+}
+
+TEST(ChildBlock, HasEachSizeAroundTheBorderOfOneByte) {
+    expectEachSize(1, 300);
+}
+TEST(ChildBlock, HasEachSizeAroundTheBorderOfTwoBytes) {
+    expectEachSize(65'200, 65'540);
+}
+
 // ---- A tree and its copy, beside plain lists of children ----
 
 // Children as a plain tree has them: in order, never removed.

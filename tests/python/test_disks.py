@@ -13,7 +13,7 @@ import time
 import lists
 import pytest
 from failing_calls import ERRORS
-from qztessel import DamagedArchiveError, PathList
+from qztessel import DamagedArchiveError, PathList, ShardedPathList
 
 # What lets calls fail is loaded before the C library.
 CALLS = os.environ.get("LD_PRELOAD")
@@ -146,6 +146,31 @@ def test_a_killed_process_leaves_the_old_file_or_the_new_one(tmp_path, how):
     PathList.pack(parts[0], file)
     assert os.listdir(tmp_path) == ["a.tessel"]
     assert 0 < written < KILLED_WRITERS
+
+
+def test_a_killed_writer_of_a_manifest_leaves_nothing_for_long(tmp_path):
+    shard = tmp_path / "0.tessel"
+    manifest = tmp_path / "all.json"
+    PathList.pack(["a"], shard)
+    ShardedPathList.join([shard], manifest)
+    usual = sorted(os.listdir(tmp_path))
+    draw = random.Random(6)
+    left = 0
+    for _ in range(KILLED_WRITERS):
+        child = os.fork()
+        if child == 0:
+            while True:
+                ShardedPathList.join([shard], manifest)
+        time.sleep(draw.random() * 0.05)
+        os.kill(child, signal.SIGKILL)
+        os.waitpid(child, 0)
+        assert list(ShardedPathList.open(manifest)) == ["a"]
+        names = os.listdir(tmp_path)
+        assert len(names) <= len(usual) + 1
+        left += len(names) > len(usual)
+    assert left
+    ShardedPathList.join([shard], manifest)
+    assert sorted(os.listdir(tmp_path)) == usual
 
 
 # ---- Changed files ----

@@ -6,6 +6,8 @@ import itertools
 import pickle
 import random
 import signal
+import struct
+import zlib
 
 import numpy as np
 import pytest
@@ -296,6 +298,26 @@ def test_numbers_that_are_none():
 
 def test_without_an_output_nothing_is_looked_up():
     assert call(filled(), "getPaths", 0, np.array([np.nan])) == []
+
+
+def test_numbers_beyond_32_bits():
+    # A stored form whose second batch begins at 2^32 - 1. Its ends take 8 bytes.
+    made = HuffmanPaths("frequencies", "/abc", [1, 1, 1, 1])
+    made.add_paths([["/"], ["/", "b"]], [["a"], ["a", "b", "c"]])
+    payload = zlib.decompress(made.serialize()[1].tobytes()[8:])
+    ends = struct.pack("<QQ", 2**32 - 2, 2**32 + 1)
+    assert payload.count(b"\1\0\0\2\1\4") == 1
+    payload = payload.replace(b"\1\0\0\2\1\4", b"\1\3\0\2" + ends)
+    form = struct.pack("<Q", len(payload)) + zlib.compress(payload)
+    inputs = made.string_tree, np.frombuffer(form, np.uint8), made.frequencies
+    paths = HuffmanPaths("tree", *inputs)
+    numbers = [1, 2**32 - 1, 2**32, 2**32 + 1, 2**32 + 2]
+    wanted = ["/a", "/b/a", "/b/b", "/b/c", None]
+    for each in paths, copy.copy(paths), pickle.loads(pickle.dumps(paths)):
+        assert each.get_paths(numbers, "/") == wanted
+        assert each.get_paths(np.array(numbers, np.uint64), "/") == wanted
+        for number, path in zip(numbers, wanted, strict=True):
+            assert each.get_paths([number], "/") == [path]
 
 
 # ---- Iteration ----

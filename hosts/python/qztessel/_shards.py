@@ -23,7 +23,6 @@ import hashlib
 import json
 import os
 import re
-import secrets
 from bisect import bisect_right
 from collections.abc import Iterable, Iterator
 from dataclasses import dataclass
@@ -161,19 +160,13 @@ def write_manifest(file: str, shards: Iterable[tuple[str, Facts]]) -> None:
 
 
 def replace_json(file: str, value: object) -> None:
-    """Replace a file by a value's JSON, as a whole or not at all."""
-    temporary = f"{file}-{secrets.token_hex(8)}.tmp"
-    try:
-        with open(temporary, "x", encoding="ascii") as out:
-            json.dump(value, out, indent=1)
-            out.write("\n")
-            out.flush()
-            os.fsync(out.fileno())
-        os.replace(temporary, file)
-    except BaseException:
-        if os.path.exists(temporary):
-            os.unlink(temporary)
-        raise
+    """Replace a file by a value's JSON, as a whole or not at all.
+
+    The new file is a hidden one beside it at first. If the process is killed
+    meanwhile, the next replacement of the same file removes that.
+    """
+    text = json.dumps(value, indent=1) + "\n"
+    _core.replace_file(os.fsencode(file), text.encode("ascii"))
 
 
 def _parsed(file: str, text: bytes) -> list[Shard]:
