@@ -11,7 +11,7 @@ namespace {
 
 // Strings from here on are compared from byte `depth`; all bytes before it
 // are equal.
-struct Range {
+struct Bucket {
     std::span<StringItem> items;
     std::size_t depth;
 };
@@ -31,13 +31,13 @@ std::uint64_t keyAt(std::string_view text, std::size_t depth) {
     return key;
 }
 
-void sortFew(const Range& range) {
-    std::ranges::sort(
-        range.items, [&](const StringItem& a, const StringItem& b) {
-            const int order =
-                a.text.substr(range.depth).compare(b.text.substr(range.depth));
-            return order != 0 ? order < 0 : a.number < b.number;
-        });
+void sortFew(const Bucket& bucket) {
+    std::ranges::sort(bucket.items, [&](const StringItem& a,
+                                        const StringItem& b) {
+        const int order =
+            a.text.substr(bucket.depth).compare(b.text.substr(bucket.depth));
+        return order != 0 ? order < 0 : a.number < b.number;
+    });
 }
 
 std::uint64_t medianKey(std::span<const StringItem> items) {
@@ -48,38 +48,39 @@ std::uint64_t medianKey(std::span<const StringItem> items) {
 }
 
 // Splits by the pivot's key and appends what is left to be sorted.
-void partition(const Range& range, std::vector<Range>& left) {
-    const std::uint64_t pivot = medianKey(range.items);
+void partition(const Bucket& bucket, std::vector<Bucket>& left) {
+    const std::uint64_t pivot = medianKey(bucket.items);
     const auto lowerEnd = std::partition(
-        range.items.begin(), range.items.end(),
+        bucket.items.begin(), bucket.items.end(),
         [&](const StringItem& item) { return item.key < pivot; });
     const auto equalEnd = std::partition(
-        lowerEnd, range.items.end(),
+        lowerEnd, bucket.items.end(),
         [&](const StringItem& item) { return item.key == pivot; });
-    left.push_back({{range.items.begin(), lowerEnd}, range.depth});
-    left.push_back({{equalEnd, range.items.end()}, range.depth});
+    left.push_back({{bucket.items.begin(), lowerEnd}, bucket.depth});
+    left.push_back({{equalEnd, bucket.items.end()}, bucket.depth});
     const std::span<StringItem> equal(lowerEnd, equalEnd);
     if ((pivot & 0xFFU) == 0) {
         // The strings end here: they are equal.
         std::ranges::sort(equal, {}, &StringItem::number);
         return;
     }
-    for (StringItem& item : equal) item.key = keyAt(item.text, range.depth + 8);
-    left.push_back({equal, range.depth + 8});
+    for (StringItem& item : equal)
+        item.key = keyAt(item.text, bucket.depth + 8);
+    left.push_back({equal, bucket.depth + 8});
 }
 
 }  // namespace
 
 void sortStrings(std::span<StringItem> items) {
     for (StringItem& item : items) item.key = keyAt(item.text, 0);
-    std::vector<Range> left = {{items, 0}};
+    std::vector<Bucket> left = {{items, 0}};
     while (!left.empty()) {
-        const Range range = left.back();
+        const Bucket bucket = left.back();
         left.pop_back();
-        if (range.items.size() <= fewItems)
-            sortFew(range);
+        if (bucket.items.size() <= fewItems)
+            sortFew(bucket);
         else
-            partition(range, left);
+            partition(bucket, left);
     }
 }
 
