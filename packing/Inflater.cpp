@@ -16,8 +16,7 @@ constexpr std::uint64_t maxInflationFactor = 1032;
 
 constexpr std::size_t windowBytes = std::size_t{256} << 10U;
 
-// Room before a window, for the rest of the one before it.
-constexpr std::size_t headroom = std::size_t{4} << 10U;
+constexpr std::size_t usualHeadroom = std::size_t{4} << 10U;
 
 // As many of so many bytes as zlib takes at once.
 uInt zlibCount(std::size_t bytes) noexcept {
@@ -34,7 +33,9 @@ std::launch aheadOfReader() noexcept {
 }  // namespace
 
 Inflater::Inflater(std::span<const std::uint8_t> stream, std::uint64_t size)
-    : unread_(static_cast<std::size_t>(size)),
+    : headroom_(std::min<std::uint64_t>(
+          usualHeadroom, size - std::min<std::uint64_t>(size, windowBytes))),
+      unread_(static_cast<std::size_t>(size)),
       stream_(stream),
       toInflate_(unread_) {
     if (size / maxInflationFactor > stream.size()) throw DamagedFormException();
@@ -51,7 +52,7 @@ std::span<const std::uint8_t> Inflater::nextBlock(
     if (!ahead_.valid()) inflateAhead(std::launch::deferred);
     ahead_.get();
     const std::size_t count = rest.size() + aheadBytes_;
-    const bool isLong = rest.size() > headroom || size > count;
+    const bool isLong = rest.size() > headroom_ || size > count;
     const auto block = isLong
                            ? longBlock(rest, std::max<std::size_t>(size, count))
                            : shortBlock(rest);
@@ -63,7 +64,7 @@ std::span<const std::uint8_t> Inflater::nextBlock(
 // The window that was inflated ahead, with the rest put in front of it.
 std::span<const std::uint8_t> Inflater::shortBlock(
     std::span<const std::uint8_t> rest) {
-    const std::size_t begin = headroom - rest.size();
+    const std::size_t begin = headroom_ - rest.size();
     std::ranges::copy(rest, std::span(next_).subspan(begin).begin());
     window_.swap(next_);
     return std::span(window_).subspan(begin, rest.size() + aheadBytes_);
@@ -73,7 +74,7 @@ std::span<const std::uint8_t> Inflater::shortBlock(
 std::span<const std::uint8_t> Inflater::longBlock(
     std::span<const std::uint8_t> rest, std::size_t size) {
     std::vector<std::uint8_t> block(size);
-    const auto ahead = std::span(next_).subspan(headroom, aheadBytes_);
+    const auto ahead = std::span(next_).subspan(headroom_, aheadBytes_);
     const auto afterRest = std::ranges::copy(rest, block.begin()).out;
     const auto end = std::ranges::copy(ahead, afterRest).out;
     fill(std::span(end, block.end()));
@@ -103,9 +104,10 @@ void Inflater::inflateAhead(std::launch how) {
 // also if it is empty.
 std::span<std::uint8_t> Inflater::room() {
     aheadBytes_ = std::min(windowBytes, toInflate_);
-    if (next_.size() < headroom + aheadBytes_)
-        next_.resize(headroom + aheadBytes_);
-    return std::span(next_).subspan(headroom, aheadBytes_);
+    const std::size_t needed =
+        std::max<std::size_t>(headroom_ + aheadBytes_, 1);
+    if (next_.size() < needed) next_.resize(needed);
+    return std::span(next_).subspan(headroom_, aheadBytes_);
 }
 
 // Inflates as many bytes as fit in `to`.

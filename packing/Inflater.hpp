@@ -54,6 +54,10 @@ private:
     void fill(std::span<std::uint8_t> to);
     std::size_t inflateSome(std::span<std::uint8_t> to);
 
+    // Room before a window, for the rest of the one before it. None if there is
+    // one window only, which takes no more memory than its bytes then.
+    const std::size_t headroom_;
+
     std::size_t unread_;                // bytes that are in no block yet
     std::size_t aheadBytes_ = 0;        // in next_, once ahead_ is ready
     std::vector<std::uint8_t> window_;  // the current block

@@ -444,7 +444,7 @@ TEST(MemoryFailures, AFormIsInflatedAPieceAtATime) {
     const CoderPtr coder = support::fourLetterCoder();
     for (const char16_t letter : std::u16string(u"abcd"))
         support::addBatch(*coder, Texts(1, std::u16string(1, letter)),
-                          Texts(200, std::u16string(2'000, u'd')));
+                          Texts(800, std::u16string(2'000, u'd')));
     Bytes form = support::formOf(*coder, true);
     const std::size_t payload = support::formOf(*coder, false).size();
     HuffmanPathTree restored;
