@@ -64,6 +64,7 @@ TEST(Inflater, WhatNobodyReadsIsCheckedToo) {
         Inflater inflater(stream, 300'000);
         ByteCursor(inflater).take(bytes);
         inflater.finish();
+        EXPECT_EQ(inflater.remaining(), 0U);
     };
     for (const std::size_t bytes : {0U, 1U, 100'000U, 300'000U})
         EXPECT_NO_THROW(finishAfter(bytes)) << bytes;
