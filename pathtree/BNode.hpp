@@ -57,9 +57,9 @@ public:
 
     // The same node, not an equal value.
     friend bool operator==(BNode a, BNode b) noexcept {
+        // A file and a folder differ in their places, too.
         FolderNode* const folder = a.folder();
-        if (folder != nullptr || b.folder() != nullptr)
-            return folder == b.folder();
+        if (folder != nullptr) return folder == b.folder();
         return a.place_ == b.place_ && a.position_ == b.position_;
     }
 

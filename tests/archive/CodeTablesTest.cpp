@@ -115,5 +115,14 @@ TEST(CodeTablesTest, VarintsComeBack) {
     EXPECT_EQ(bytes, (Bytes{0xAC, 0x02}));
 }
 
+TEST(CodeTablesTest, AVarintHasAtMost32BitsInFiveBytes) {
+    for (const Bytes& bytes :
+         {Bytes{}, Bytes{0x80}, Bytes{0xFF, 0xFF, 0xFF, 0xFF, 0x10},
+          Bytes{0x80, 0x80, 0x80, 0x80, 0x80, 0x00}}) {
+        sixpacks::ByteCursor cursor(bytes);
+        EXPECT_THROW(unpackVarint(cursor), DamagedFormException);
+    }
+}
+
 }  // namespace
 }  // namespace tessel::archive

@@ -64,6 +64,7 @@ TEST(Inflater, WhatNobodyReadsIsCheckedToo) {
         Inflater inflater(stream, 300'000);
         ByteCursor(inflater).take(bytes);
         inflater.finish();
+        EXPECT_EQ(inflater.remaining(), 0U);
     };
     for (const std::size_t bytes : {0U, 1U, 100'000U, 300'000U})
         EXPECT_NO_THROW(finishAfter(bytes)) << bytes;
@@ -106,6 +107,9 @@ TEST(Inflater, TheBestCompressionThatExistsIsAccepted) {
 
 TEST(Inflater, ASizeThatNoStreamReachesIsRefused) {
     const Bytes stream = streamOf(Bytes(100, 0));
+    EXPECT_NO_THROW(Inflater(stream, stream.size() * 1032));
+    EXPECT_THROW(Inflater(stream, (stream.size() + 1) * 1032),
+                 DamagedFormException);
     EXPECT_THROW(Inflater(stream, stream.size() * 1200), DamagedFormException);
     EXPECT_THROW(Inflater(stream, ~std::uint64_t{0}), DamagedFormException);
     EXPECT_THROW(inflated({}, 1), DamagedFormException);

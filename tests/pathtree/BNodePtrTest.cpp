@@ -41,6 +41,8 @@ TEST(BNodePtr, HandlesAreSharedMovedAndEmptied) {
     EXPECT_FALSE(first);
     EXPECT_EQ(support::textOf((*moved).value()), "a");
     EXPECT_TRUE(BNodePtr() == BNodePtr());
+    EXPECT_FALSE(BNodePtr() == moved);
+    EXPECT_FALSE(moved == BNodePtr());
 }
 
 TEST(BNodePtr, AHeldFileKeepsItsFolderAlive) {

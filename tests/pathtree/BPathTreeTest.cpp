@@ -442,4 +442,23 @@ TEST(PathTreeInsertion, ANodeIsALeafExactlyWithoutChildren) {
     EXPECT_FALSE(tree.isLeaf(file));
 }
 
+TEST(PathTreeInsertion, AListOfChildrenKnowsWhetherThereIsAFolder) {
+    BPathTree tree;
+    addBatch(tree, {"a"}, {"f", "g"});
+    const tessel::FolderNode& folder = *tree.root->children()[0].folder();
+    EXPECT_TRUE(tree.root->folder()->children().hasFolders());
+    EXPECT_FALSE(folder.children().hasFolders());
+    addBatch(tree, {"a", "f"}, {"x"});
+    EXPECT_TRUE(folder.children().hasFolders());
+}
+
+TEST(PathTreeMemory, ChildrenWithinTheirFoldersNodeTakeNoList) {
+    BPathTree shallow;
+    addBatch(shallow, {"a"}, {"f"});
+    BPathTree deep;
+    addBatch(deep, {"a", "b", "c", "d"}, {"f"});
+    EXPECT_EQ(deep.memoryUsage().childLists, shallow.memoryUsage().childLists);
+    EXPECT_GT(deep.memoryUsage().names, shallow.memoryUsage().names);
+}
+
 }  // namespace

@@ -62,6 +62,7 @@ TEST(ComponentArena, AArenaIsAsNewAfterItsBuffersWereTaken) {
     const auto second = support::packedBy(arena, {{4}});
     EXPECT_EQ(unpacked(first), (Components{{1, 2}, {3}}));
     EXPECT_EQ(unpacked(second), (Components{{4}}));
+    EXPECT_EQ(second.size(), 1U);
 }
 
 TEST(ComponentArena, TheSlackAfterAComponentMayBeWritten) {
