@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -123,6 +124,27 @@ TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {
                      },
                      [](bool) {});
     expectPaths(store, morePaths());
+}
+
+// A form of some windows is inflated on a thread of its own.
+TEST(PathStoreMemory, LoadingWhileAThreadInflatesIsRepeatable) {
+    std::mt19937 random(4);
+    Strings paths;
+    for (std::size_t i = 0; i < 8000; ++i) {
+        std::string& path = paths.emplace_back("/d/");
+        for (std::size_t length = 0; length < 200; ++length)
+            path += static_cast<char>('a' + random() % 26);
+    }
+    const auto bytes = PathStore::from(paths).save();
+    ASSERT_GT(bytes.size(), std::size_t{1} << 19U);
+    atEachAllocation([] {},
+                     [&] {
+                         const PathStore loaded = PathStore::load(bytes);
+                         EXPECT_EQ(loaded.size(), paths.size());
+                         EXPECT_EQ(loaded[7000], paths[7000]);
+                     },
+                     [](bool) {}, onAllThreads);
+    EXPECT_EQ(iterated(PathStore::load(bytes)), paths);
 }
 
 }  // namespace
