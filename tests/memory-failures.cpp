@@ -192,24 +192,29 @@ TEST(MemoryFailures, ABatchWhoseWorkersLackMemoryIsRefusedOrAddedInPart) {
     CoderPtr coder;
     std::vector<Texts> folders;
     std::vector<Texts> files;
-    support::atEachAllocation(
-        [&] {
-            coder = filledCoder();
-            folders = manyFolders;
-            files = manyFiles;
-        },
-        [&] { coder->generateCodeAsyncAndAddPaths(folders, files, 3); },
-        [&](bool succeeded) {
-            EXPECT_EQ(support::brokenInvariant(*coder), "");
-            const std::uint64_t added = coder->pathCount - 7;
-            EXPECT_EQ(added % 4, 0U);
-            EXPECT_TRUE(added == 800 || !succeeded);
-            EXPECT_EQ(coder->partitionEnds.size(), 3 + added / 4);
-            support::addBatches(*coder, manyFolders, manyFiles, 3);
-            EXPECT_EQ(coder->pathCount, 7 + added + 800);
-            EXPECT_EQ(support::brokenInvariant(*coder), "");
-        },
-        {.threads = support::FailingThreads::All, .allUpTo = 100, .step = 7});
+    for (const auto kind : {support::FailingAllocations::AllLater,
+                            support::FailingAllocations::One})
+        support::atEachAllocation(
+            [&] {
+                coder = filledCoder();
+                folders = manyFolders;
+                files = manyFiles;
+            },
+            [&] { coder->generateCodeAsyncAndAddPaths(folders, files, 3); },
+            [&](bool succeeded) {
+                EXPECT_EQ(support::brokenInvariant(*coder), "");
+                const std::uint64_t added = coder->pathCount - 7;
+                EXPECT_EQ(added % 4, 0U);
+                EXPECT_TRUE(added == 800 || !succeeded);
+                EXPECT_EQ(coder->partitionEnds.size(), 3 + added / 4);
+                support::addBatches(*coder, manyFolders, manyFiles, 3);
+                EXPECT_EQ(coder->pathCount, 7 + added + 800);
+                EXPECT_EQ(support::brokenInvariant(*coder), "");
+            },
+            {.threads = support::FailingThreads::All,
+             .allocations = kind,
+             .allUpTo = 100,
+             .step = 7});
 }
 
 TEST(MemoryFailures, ABatchThatFailsBeforeItIsEncodedKeepsItsTexts) {

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -42,11 +43,17 @@ Strings morePaths() {
 
 // Every allocation of any thread counts; as there are thousands, each of the
 // first hundred fails and then one of so many.
-constexpr support::AllocationCount onAllThreads = {
-    .threads = support::FailingThreads::All,
-    .allUpTo = 100,
-    .step = 97,
-    .most = 100'000};
+constexpr support::AllocationCount onAllThreads(
+    support::FailingAllocations allocations) {
+    return {.threads = support::FailingThreads::All,
+            .allocations = allocations,
+            .allUpTo = 100,
+            .step = 97,
+            .most = 100'000};
+}
+
+constexpr support::FailingAllocations eachKind[] = {
+    support::FailingAllocations::AllLater, support::FailingAllocations::One};
 
 // Enough for three threads that encode, in folders of a few files each.
 Strings pathsForThreads() {
@@ -84,31 +91,36 @@ TEST(PathStoreMemory, AStoreThatIsEncodedAnewIsSoOrAsItWas) {
 }
 
 TEST(PathStoreMemory, WhatThreadsEncodeIsAppendedOrTheStoreIsAsItWas) {
-    expectAppendedOrAsItWas(pathsForThreads(), onAllThreads);
+    for (const auto kind : eachKind)
+        expectAppendedOrAsItWas(pathsForThreads(), onAllThreads(kind));
 }
 
 TEST(PathStoreMemory, WhatThreadsEncodeAnewIsSoOrTheStoreIsAsItWas) {
     Strings more = pathsForThreads();
     more.emplace_back("/a/another character");
-    expectAppendedOrAsItWas(more, onAllThreads);
+    for (const auto kind : eachKind)
+        expectAppendedOrAsItWas(more, onAllThreads(kind));
 }
 
 // The second chunk is encoded while the first one is inserted.
 TEST(PathStoreMemory, ChunksAreAppendedOrTheStoreIsAsItWas) {
     const Strings more(250'002, "/a/b");
     PathStore store;
-    atEachAllocation(
-        [&] { store = PathStore::from(basePaths()); },
-        [&] { store.append(more); },
-        [&](bool succeeded) {
-            const std::size_t size = basePaths().size();
-            if (!succeeded) expectPaths(store, basePaths());
-            if (!succeeded) store.append(more);
-            ASSERT_EQ(store.size(), size + more.size());
-            EXPECT_EQ(store[size], more.front());
-            EXPECT_EQ(store[store.size() - 1], more.back());
-        },
-        {.threads = support::FailingThreads::All, .allUpTo = 10, .step = 5});
+    for (const auto kind : eachKind)
+        atEachAllocation([&] { store = PathStore::from(basePaths()); },
+                         [&] { store.append(more); },
+                         [&](bool succeeded) {
+                             const std::size_t size = basePaths().size();
+                             if (!succeeded) expectPaths(store, basePaths());
+                             if (!succeeded) store.append(more);
+                             ASSERT_EQ(store.size(), size + more.size());
+                             EXPECT_EQ(store[size], more.front());
+                             EXPECT_EQ(store[store.size() - 1], more.back());
+                         },
+                         {.threads = support::FailingThreads::All,
+                          .allocations = kind,
+                          .allUpTo = 10,
+                          .step = 5});
 }
 
 TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {
@@ -123,6 +135,28 @@ TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {
                      },
                      [](bool) {});
     expectPaths(store, morePaths());
+}
+
+// A form of some windows is inflated on a thread of its own.
+TEST(PathStoreMemory, LoadingWhileAThreadInflatesIsRepeatable) {
+    std::mt19937 random(4);
+    Strings paths;
+    for (std::size_t i = 0; i < 8000; ++i) {
+        std::string& path = paths.emplace_back("/d/");
+        for (std::size_t length = 0; length < 200; ++length)
+            path += static_cast<char>('a' + random() % 26);
+    }
+    const auto bytes = PathStore::from(paths).save();
+    ASSERT_GT(bytes.size(), std::size_t{1} << 19U);
+    for (const auto kind : eachKind)
+        atEachAllocation([] {},
+                         [&] {
+                             const PathStore loaded = PathStore::load(bytes);
+                             EXPECT_EQ(loaded.size(), paths.size());
+                             EXPECT_EQ(loaded[7000], paths[7000]);
+                         },
+                         [](bool) {}, onAllThreads(kind));
+    EXPECT_EQ(iterated(PathStore::load(bytes)), paths);
 }
 
 }  // namespace

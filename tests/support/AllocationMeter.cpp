@@ -21,15 +21,21 @@ std::atomic<bool> allFailing{false};
 std::atomic<long> allAllocationsLeft{0};
 std::atomic<bool> anyFailed{false};
 
+// Whether one allocation is to fail, and those after it not.
+std::atomic<bool> oneAlone{false};
+
 // Counts an allocation; false if it is to fail.
 bool allow(std::size_t bytes) {
     if (watching) {
         largestBytes = std::max(largestBytes, bytes);
         totalBytes += bytes;
     }
-    if (allFailing && --allAllocationsLeft < 0) {
-        anyFailed = true;
-        return false;
+    if (allFailing) {
+        const long left = --allAllocationsLeft;
+        if (left == -1 || (left < 0 && !oneAlone)) {
+            anyFailed = true;
+            return false;
+        }
     }
     if (!failing) return true;
     if (allocationsLeft > 0) {
@@ -37,6 +43,7 @@ bool allow(std::size_t bytes) {
         return true;
     }
     failed = true;
+    failing = !oneAlone;
     return false;
 }
 
@@ -98,8 +105,9 @@ std::size_t AllocationMeter::largest() const { return largestBytes; }
 
 std::size_t AllocationMeter::total() const { return totalBytes; }
 
-AllocationFailure::AllocationFailure(std::size_t count,
-                                     FailingThreads threads) {
+AllocationFailure::AllocationFailure(std::size_t count, FailingThreads threads,
+                                     FailingAllocations allocations) {
+    oneAlone = allocations == FailingAllocations::One;
     allocationsLeft = count;
     allAllocationsLeft = static_cast<long>(count);
     failed = false;

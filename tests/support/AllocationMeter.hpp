@@ -23,11 +23,16 @@ public:
 // Whose allocations an AllocationFailure counts and refuses.
 enum class FailingThreads { ThisOne, All };
 
+// Which allocations fail after those that are granted: the next one alone, so
+// that one thread may lack memory and the others have it, or all of them.
+enum class FailingAllocations { AllLater, One };
+
 // While it exists, allocations fail after the first `count`. One at a time.
 class AllocationFailure {
 public:
     explicit AllocationFailure(
-        std::size_t count, FailingThreads threads = FailingThreads::ThisOne);
+        std::size_t count, FailingThreads threads = FailingThreads::ThisOne,
+        FailingAllocations allocations = FailingAllocations::AllLater);
     ~AllocationFailure();
     AllocationFailure(const AllocationFailure&) = delete;
     AllocationFailure& operator=(const AllocationFailure&) = delete;

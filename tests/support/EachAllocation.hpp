@@ -12,6 +12,7 @@ namespace support {
 // How atEachAllocation counts.
 struct AllocationCount {
     FailingThreads threads = FailingThreads::ThisOne;
+    FailingAllocations allocations = FailingAllocations::AllLater;
     // From this number on, only each step-th allocation fails.
     std::size_t allUpTo = ~std::size_t{0};
     std::size_t step = 1;
@@ -31,7 +32,8 @@ void atEachAllocation(Prepare prepare, Operate operate, Check check,
         prepare();
         bool succeeded = true;
         {
-            const AllocationFailure failure(n, count.threads);
+            const AllocationFailure failure(n, count.threads,
+                                            count.allocations);
             try {
                 operate();
             } catch (const std::bad_alloc&) {
