@@ -52,12 +52,14 @@ Sizes tried(Sizes borders) {
     return borders;
 }
 
-// From two before each border to two beyond it, ascending, each once.
+// From two before each border to two beyond it, with sanitizers from one to
+// one; ascending, each once.
 Sizes around(const Sizes& borders, std::size_t least = 1) {
+    constexpr std::size_t reach = shareOf(2);
     std::set<std::size_t> sizes;
     for (const std::size_t border : tried(borders))
-        for (std::size_t size = border - std::min<std::size_t>(border, 2);
-             size <= border + 2; ++size)
+        for (std::size_t size = border - std::min(border, reach);
+             size <= border + reach; ++size)
             if (size >= least) sizes.insert(size);
     return {sizes.begin(), sizes.end()};
 }

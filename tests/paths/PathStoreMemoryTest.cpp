@@ -10,6 +10,7 @@
 #include "paths/PathStore.hpp"
 #include "tests/paths/Stores.hpp"
 #include "tests/support/EachAllocation.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace {
 
@@ -42,13 +43,13 @@ Strings morePaths() {
 }
 
 // Every allocation of any thread counts; as there are thousands, each of the
-// first hundred fails and then one of so many.
+// first hundred fails and then one of so many; with sanitizers far fewer.
 constexpr support::AllocationCount onAllThreads(
     support::FailingAllocations allocations) {
     return {.threads = support::FailingThreads::All,
             .allocations = allocations,
-            .allUpTo = 100,
-            .step = 97,
+            .allUpTo = support::shareOf(100),
+            .step = 97 * (100 / support::shareOf(100)),
             .most = 100'000};
 }
 
@@ -119,8 +120,8 @@ TEST(PathStoreMemory, ChunksAreAppendedOrTheStoreIsAsItWas) {
                          },
                          {.threads = support::FailingThreads::All,
                           .allocations = kind,
-                          .allUpTo = 10,
-                          .step = 5});
+                          .allUpTo = support::shareOf(10),
+                          .step = 5 * (10 / support::shareOf(10))});
 }
 
 TEST(PathStoreMemory, SavingAndLoadingAreRepeatable) {
