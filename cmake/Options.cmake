@@ -46,15 +46,6 @@ if(QZTESSEL_SANITIZE)
   endif()
   target_compile_options(
     qztessel_options INTERFACE -fno-omit-frame-pointer ${sanitizers})
-  # What a test itself does is watched by the address sanitizer alone: it compiles
-  # in two thirds of the time. Inline functions of ours are those of our libraries
-  # (qztesselPreferCopiesOf), with all that watches them.
-  if(QZTESSEL_SANITIZE MATCHES "undefined")
-    target_compile_options(
-      qztessel_options
-      INTERFACE $<$<BOOL:$<TARGET_PROPERTY:QZTESSEL_IS_TEST>>:-fno-sanitize=undefined,float-cast-overflow>
-    )
-  endif()
   target_link_options(qztessel_options INTERFACE ${sanitizers})
 endif()
 
