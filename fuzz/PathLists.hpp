@@ -55,4 +55,16 @@ void requireHeld(const List& list, const Paths& paths) {
     require(at == 0, "each number is answered");
 }
 
+// The tree's order of a store must have each of these paths as often as the
+// list.
+template <class Store>
+void requireInTree(const Store& store, Paths paths) {
+    Paths met;
+    store.forEachInTreeOrder(
+        [&](std::string_view path) { met.emplace_back(path); });
+    std::ranges::sort(met);
+    std::ranges::sort(paths);
+    require(met == paths, "the tree has every path");
+}
+
 }  // namespace tessel::fuzz

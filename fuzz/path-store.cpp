@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "fuzz/Input.hpp"
+#include "fuzz/PathLists.hpp"
 #include "packing/sixpacks.hpp"
 #include "paths/PathStore.hpp"
 
@@ -19,7 +20,6 @@ namespace tessel::fuzz {
 namespace {
 
 using Bytes = std::vector<std::uint8_t>;
-using Strings = std::vector<std::string>;
 
 // Paths read at most, however many a form claims to hold.
 constexpr std::size_t maxRead = 300;
@@ -73,14 +73,14 @@ bool storeAccepted(Operation operation) {
 // All routes must give the same, as far as they give anything.
 void checkRoutes(const PathStore& store) {
     const std::size_t last = std::min(store.size(), maxRead);
-    Strings one;
+    Paths one;
     bool whole = true;
     for (std::size_t i = 0; i < last && whole; ++i) {
         one.emplace_back();
         whole = storeAccepted([&] { store.read(i, one.back()); });
     }
     if (!whole) one.pop_back();
-    Strings many;
+    Paths many;
     const auto keep = [&](std::size_t number, std::string_view path) {
         require(number == many.size(), "numbers come in order");
         many.emplace_back(path);
@@ -105,8 +105,12 @@ void checkHostile(const Bytes& bytes) {
 }
 
 void checkPaths(Input& input) {
-    Strings paths;
+    Paths paths;
     PathStore store;
+    const auto appendRest = [&] {
+        const auto added = static_cast<std::ptrdiff_t>(store.size());
+        store.append(Paths(paths.begin() + added, paths.end()));
+    };
     while (!input.empty()) {
         // A high bit adds the paths so far; the others are added at the end.
         const std::uint8_t length = input.byte();
@@ -115,25 +119,15 @@ void checkPaths(Input& input) {
         const std::size_t wanted = 1 + length % 0x7F;
         while (path.size() < wanted && !input.empty())
             path.push_back(static_cast<char>(input.byte()));
-        if (length >= 0x80)
-            store.append(Strings(
-                paths.begin() + static_cast<std::ptrdiff_t>(store.size()),
-                paths.end()));
+        if (length >= 0x80) appendRest();
     }
-    store.append(
-        Strings(paths.begin() + static_cast<std::ptrdiff_t>(store.size()),
-                paths.end()));
+    appendRest();
     const PathStore loaded = PathStore::load(store.save());
-    Strings met;
+    Paths met;
     for (const std::string_view path : loaded) met.emplace_back(path);
     require(met == paths, "every path comes back");
     checkRoutes(loaded);
-    met.clear();
-    loaded.forEachInTreeOrder(
-        [&](std::string_view path) { met.emplace_back(path); });
-    std::ranges::sort(met);
-    std::ranges::sort(paths);
-    require(met == paths, "the tree has every path");
+    requireInTree(loaded, paths);
 }
 
 void useStore(Input input) {

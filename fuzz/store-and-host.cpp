@@ -28,13 +28,7 @@ void checkStore(const Paths& paths, std::size_t firstCall) {
     requireHeld(store, paths);
     const PathStore loaded = PathStore::load(store.save());
     requireHeld(loaded, paths);
-    Paths met;
-    loaded.forEachInTreeOrder(
-        [&](std::string_view path) { met.emplace_back(path); });
-    std::ranges::sort(met);
-    Paths sorted = paths;
-    std::ranges::sort(sorted);
-    require(met == sorted, "the tree has every path");
+    requireInTree(loaded, paths);
 }
 
 void checkArchive(const Paths& paths, const ArchiveOptions& options) {

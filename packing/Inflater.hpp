@@ -18,10 +18,8 @@ namespace tessel::sixpacks {
 // known only after finish(), so keep apart until then what was read.
 //
 // Ownership: borrows the stream.
-// Threads: one at a time may use it. While a window is read, a thread of its
-// own
-//   inflates the next one, if there is a second core: reading costs no time
-//   then as long as it is faster than zlib.
+// Threads: one at a time may use it. If there is a second core, a thread of its
+//   own inflates the next window while the current one is read.
 // Cost: two windows of 256 KiB, or of the longest single read; about 40 KB
 //   inside zlib.
 class Inflater final : public ByteSource {
@@ -63,7 +61,7 @@ private:
     std::vector<std::uint8_t> window_;  // the current block
     std::vector<std::uint8_t> next_;
 
-    // While ahead_ is not ready, the other thread's.
+    // Used by the thread that inflates ahead until ahead_ is ready.
     z_stream zlib_{};
     std::span<const std::uint8_t> stream_;  // what zlib has not been given
     std::size_t toInflate_;
