@@ -1,4 +1,4 @@
-// In the place of Marisa.cpp and Compressors.cpp where their libraries are
+// In the place of MarisaSubject.cpp and Compressors.cpp where their libraries are
 // missing.
 
 #include "bench/Subject.hpp"

@@ -54,59 +54,37 @@ foreach(word IN ITEMS -analyzer-config max-nodes=20000)
   list(APPEND tidy --extra-arg=-Xclang --extra-arg=${word})
 endforeach()
 
+# Checks all sources of some folders. They are joined into one: most of the time
+# goes into the headers of libraries, which are the same for all of them. So names
+# inside of a source must differ from those in the others, except in programs.
 function(qztesselAddTidyTest name)
-  add_test(
-    NAME tidy.${name}
-    COMMAND ${ARGN}
-    WORKING_DIRECTORY ${PROJECT_SOURCE_DIR})
-  set_tests_properties(tidy.${name} PROPERTIES LABELS "check;tidy" COST 50)
-endfunction()
-
-# Sources, joined in groups: most of the time goes into the headers of libraries,
-# which are the same for all of them.
-function(qztesselTidyFiles name)
-  set(number 0)
-  while(ARGN)
-    list(SUBLIST ARGN 0 30 files)
-    list(REMOVE_ITEM ARGN ${files})
-    qztesselAddTidyTest(
-      ${name}-${number} cmake/checks/tidy.py
-      ${PROJECT_BINARY_DIR}/tidy/${name}-${number}.cpp ${files} -- ${tidy}
-      --config-file=${PROJECT_SOURCE_DIR}/.clang-tidy -- -std=c++20
-      -I${PROJECT_SOURCE_DIR} -DQZTESSEL_PLUGIN="" -DQZTESSEL_MESSAGES=""
-      ${systemIncludes})
-    math(EXPR number "${number} + 1")
-  endwhile()
-endfunction()
-
-# Programs, and what stands in for another file: they have names in common.
-file(
-  GLOB aloneInTidy CONFIGURE_DEPENDS
-  RELATIVE ${PROJECT_SOURCE_DIR}
-  examples/*.cpp hosts/embedded/demo/*.cpp hosts/minimal/*.cpp)
-list(APPEND aloneInTidy bench/NoRivals.cpp bench/hostile-costs.cpp
-     bench/limits.cpp bench/path-bench.cpp bench/workloads.cpp)
-
-function(qztesselTidyRoom room)
+  list(TRANSFORM ARGN APPEND "/*.cpp" OUTPUT_VARIABLE patterns)
   file(
     GLOB sources CONFIGURE_DEPENDS
     RELATIVE ${PROJECT_SOURCE_DIR}
-    ${PROJECT_SOURCE_DIR}/${room}/*.cpp)
-  list(REMOVE_ITEM sources ${aloneInTidy})
-  qztesselTidyFiles(${room} ${sources})
+    ${patterns})
+  # It defines what another source of its folder does, if that is not built.
+  list(REMOVE_ITEM sources bench/NoRivals.cpp)
+  add_test(
+    NAME tidy.${name}
+    COMMAND
+      cmake/checks/tidy.py ${PROJECT_BINARY_DIR}/tidy/${name}.cpp ${sources} --
+      ${tidy} --config-file=${PROJECT_SOURCE_DIR}/.clang-tidy -- -std=c++20
+      -I${PROJECT_SOURCE_DIR} -DQZTESSEL_PLUGIN="" -DQZTESSEL_MESSAGES=""
+      ${systemIncludes}
+    WORKING_DIRECTORY ${PROJECT_SOURCE_DIR})
+  set_tests_properties(tidy.${name} PROPERTIES LABELS "check;tidy" COST 500)
 endfunction()
 
-set(rooms packing pathtree coder paths archive binding hosts/embedded
-          hosts/console hosts/patterns bench fuzz)
 set(systemIncludes)
 if(TARGET qztessel_python)
-  list(APPEND rooms hosts/python hosts/python/host)
   list(TRANSFORM QZTESSEL_PYTHON_INCLUDE_DIRS PREPEND -isystem
        OUTPUT_VARIABLE systemIncludes)
+  qztesselAddTidyTest(python hosts/python)
+  qztesselAddTidyTest(python-host hosts/python/host)
 endif()
-foreach(room IN LISTS rooms)
-  qztesselTidyRoom(${room})
-endforeach()
-foreach(source IN LISTS aloneInTidy)
-  qztesselTidyFiles(${source} ${source})
-endforeach()
+qztesselAddTidyTest(core packing pathtree coder paths)
+qztesselAddTidyTest(archive archive)
+qztesselAddTidyTest(hosts binding hosts/embedded hosts/patterns hosts/console)
+qztesselAddTidyTest(programs bench examples hosts/embedded/demo hosts/minimal)
+qztesselAddTidyTest(fuzz fuzz)

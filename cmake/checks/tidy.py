@@ -16,19 +16,33 @@ import sys
 BEGIN = "LLVMFuzzerTestOneInput"
 
 
+def is_include(line: str) -> bool:
+    return line.startswith("#include")
+
+
+def set_apart(lines: list[str], name: str) -> None:
+    """Puts what follows the headers into a namespace, on the same lines."""
+    first = 1 + max(at for at, line in enumerate(lines) if is_include(line))
+    lines[first] = f"namespace {name} {{ {lines[first]}"
+    lines[-1] += f" }}  // namespace {name}"
+
+
 def join(files: list[str]) -> tuple[list[str], list[str]]:
     """All lines of the files, and the place of each. A header that a file before
-    has included is left out; its line stays, empty. The beginnings of fuzz targets
-    are numbered, so that targets can be joined."""
+    has included is left out; its line stays, empty. Programs are set apart, since
+    all have a main(), and the beginnings of fuzz targets are numbered."""
     joined: list[str] = []
     places: list[str] = []
     included: set[str] = set()
     for number, file in enumerate(files):
         text = pathlib.Path(file).read_text().replace(BEGIN, f"{BEGIN}{number}")
         lines = text.splitlines()
+        headers = set(filter(is_include, lines))
+        if "\nint main(" in text:
+            set_apart(lines, f"program{number}")
         joined += ["" if line in included else line for line in lines]
         places += [f"{file}:{at}" for at in range(1, len(lines) + 1)]
-        included |= {line for line in lines if line.startswith("#include")}
+        included |= headers
     return joined, places
 
 
