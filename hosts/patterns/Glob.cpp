@@ -3,6 +3,7 @@
 #include <fmt/format.h>
 
 #include <cstddef>
+#include <vector>
 
 namespace tessel::patterns {
 
@@ -36,12 +37,53 @@ std::string wrapped(const std::string& expression, LetterCase letterCase,
     return folds ? "(?i:" + expression + ")" : expression;
 }
 
+// Where the sets of a glob end. All is found in one pass: a glob of many '['
+// and no ']' costs no more than another one of its length.
+class SetEnds {
+public:
+    static constexpr std::size_t none = std::string_view::npos;
+
+    explicit SetEnds(std::string_view glob)
+        : glob_(glob),
+          classEnds_(glob.size() + 2, none),
+          ends_(glob.size() + 2, none) {
+        for (std::size_t at = glob.size(); at-- > 0;) {
+            classEnds_[at] =
+                glob.substr(at, 2) == ":]" ? at + 2 : classEnds_[at + 1];
+            ends_[at] = glob[at] == ']' ? at : ends_[behindMember(at)];
+        }
+    }
+
+    // Where the ']' is that ends a set whose next member is at `at`, or none.
+    std::size_t endFrom(std::size_t at) const { return ends_[at]; }
+
+    // Behind the class of POSIX at `at`, such as "[:digit:]"; none if there is
+    // no class.
+    std::size_t behindClass(std::size_t at) const {
+        return glob_.substr(at, 2) == "[:" ? classEnds_[at + 2] : none;
+    }
+
+private:
+    std::size_t behindMember(std::size_t at) const {
+        const std::size_t behind = behindClass(at);
+        if (behind != none) return behind;
+        return at + (glob_[at] == '\\' ? 2U : 1U);
+    }
+
+    std::string_view glob_;
+    std::vector<std::size_t> classEnds_;  // behind the next ":]" from there
+    std::vector<std::size_t> ends_;
+};
+
 // Translates one glob from its start to its end.
 class GlobTranslation {
 public:
     GlobTranslation(std::string_view glob, LetterCase letterCase,
                     PatternAlphabet alphabet)
-        : glob_(glob), letterCase_(letterCase), alphabet_(alphabet) {}
+        : glob_(glob),
+          ends_(glob),
+          letterCase_(letterCase),
+          alphabet_(alphabet) {}
 
     std::string run() {
         while (at_ < glob_.size()) step();
@@ -64,27 +106,18 @@ private:
 
     void literal(char c) { appendByte(c, letterCase_, alphabet_, expression_); }
 
-    // Where the ']' of the set that starts at at_ is, or npos.
-    std::size_t setEnd() const noexcept {
+    // Where the ']' of the set is that starts at at_, or none.
+    std::size_t setEnd() const {
         std::size_t at = at_;
         if (at < glob_.size() && (glob_[at] == '!' || glob_[at] == '^')) ++at;
         if (at < glob_.size() && glob_[at] == ']') ++at;
-        while (at < glob_.size() && glob_[at] != ']') {
-            const std::size_t classEnd = glob_.substr(at, 2) == "[:"
-                                             ? glob_.find(":]", at + 2)
-                                             : std::string_view::npos;
-            if (classEnd != std::string_view::npos)
-                at = classEnd + 2;
-            else
-                at += glob_[at] == '\\' ? 2U : 1U;
-        }
-        return at < glob_.size() ? at : std::string_view::npos;
+        return ends_.endFrom(at);
     }
 
     // Translates the set after a '['. Returns false if there is none.
     bool set() {
         const std::size_t end = setEnd();
-        if (end == std::string_view::npos) return false;
+        if (end == SetEnds::none) return false;
         const bool foldsHere = letterCase_ == LetterCase::Ignored &&
                                alphabet_ == PatternAlphabet::Bytes;
         expression_ += foldsHere ? "(?i:[" : "[";
@@ -100,13 +133,11 @@ private:
 
     // One character, the dash of a range, or a class of POSIX.
     void member(std::size_t end) {
-        if (glob_.substr(at_, 2) == "[:") {
-            const std::size_t classEnd = glob_.find(":]", at_ + 2);
-            if (classEnd != std::string_view::npos && classEnd < end) {
-                expression_ += glob_.substr(at_, classEnd + 2 - at_);
-                at_ = classEnd + 2;
-                return;
-            }
+        const std::size_t behind = ends_.behindClass(at_);
+        if (behind != SetEnds::none) {
+            expression_ += glob_.substr(at_, behind - at_);
+            at_ = behind;
+            return;
         }
         char c = glob_[at_++];
         const bool isRange = c == '-' && !expression_.ends_with('[') &&
@@ -120,6 +151,7 @@ private:
     }
 
     std::string_view glob_;
+    SetEnds ends_;
     LetterCase letterCase_;
     PatternAlphabet alphabet_;
     std::size_t at_ = 0;

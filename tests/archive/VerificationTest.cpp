@@ -1,8 +1,10 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <span>
 #include <stop_token>
+#include <string>
 #include <vector>
 
 #include "archive/ArchiveExceptions.hpp"
@@ -53,6 +55,29 @@ TEST_F(VerificationTest, TellsEachDamagedPieceOnce) {
         EXPECT_EQ(found[0].size, 4096U);
         EXPECT_LE(found[1].offset, second);
         EXPECT_EQ(found[1].size, 8192U);  // neighbours are one
+    }
+}
+
+TEST_F(VerificationTest, TellsASegmentThatCountsItsTextWrongly) {
+    const std::uint64_t begin =
+        SegmentEntry::unpack(std::span(bytes_).subspan(
+                                 FileHeader::unpack(bytes_).directoryOffset),
+                             0)
+            .offset;
+    SegmentHead head = SegmentHead::unpack(std::span(bytes_).subspan(begin));
+    std::uint64_t text = 0;
+    for (const std::string& path : paths_) text += path.size();
+    ASSERT_EQ(head.textBytes, text);
+    head.textBytes = text + 1;
+    archives::Bytes changed;
+    head.pack(changed);
+    std::ranges::copy(changed, &bytes_[begin]);
+    for (const unsigned threads : {1U, 4U}) {
+        const auto found = damages(threads);
+        ASSERT_EQ(found.size(), 1U);
+        EXPECT_EQ(found[0].offset, begin);
+        EXPECT_EQ(found[0].what,
+                  "A segment's head tells a wrong number of bytes.");
     }
 }
 

@@ -65,6 +65,30 @@ TEST(Glob, WhatIsNoSetIsText) {
     EXPECT_TRUE(matches("a\\", "a\\"));
 }
 
+// Looking for the end of each set would take hours.
+TEST(Glob, AMillionSetsThatDoNotEndAreText) {
+    for (const std::string part : {"[", "[:", "[[:a", "[!"}) {
+        std::string text;
+        while (text.size() < 1'000'000) text += part;
+        EXPECT_EQ(
+            globToExpression(text, LetterCase::Exact, PatternAlphabet::Bytes),
+            textToExpression(text, LetterCase::Exact, PatternAlphabet::Bytes))
+            << part;
+        // One set of the whole text, apart from the last ']'.
+        const std::string set = globToExpression(
+            "[" + text + "]]", LetterCase::Exact, PatternAlphabet::Bytes);
+        EXPECT_TRUE(set.starts_with('[') && set.ends_with("]\\x5D")) << part;
+    }
+}
+
+TEST(Glob, ClassesEndBeforeSets) {
+    EXPECT_TRUE(matches("[[:alpha:][:digit:]]", "5"));
+    EXPECT_TRUE(matches("[[:alpha:]", "[a")) << "the set is the second";
+    EXPECT_TRUE(matches("[[:a]b:]", "[:b:]")) << "the set is the second";
+    EXPECT_TRUE(matches("[[:]", ":"));
+    EXPECT_TRUE(matches("[\\[:alpha:]]", "[]")) << "a bracket that is quoted";
+}
+
 TEST(Glob, EverythingElseIsItself) {
     const std::string special = "a.b(c)|d+{2}^$#\n\t\\\\\xC3\xBC";
     EXPECT_TRUE(matches(special, "a.b(c)|d+{2}^$#\n\t\\\xC3\xBC"));
