@@ -9,8 +9,8 @@
 
 namespace tessel::archive {
 
-// Every so many folders in plain text, with the name blocks in which they are
-// first named: the top of a search by path.
+// Every n-th folder in plain text, with the name blocks in which they are first
+// named: the top of a search by path.
 //
 // Ownership: borrows the segment, which must have this section.
 // Threads: const members from any number of threads.

@@ -19,8 +19,9 @@ struct GroupTables {
 //   | offset, bit 31: wide (u32) | folders before (u32, names only)
 //   | 16 new folders (bytes, names only) | 16 lengths (bytes) |
 //
-// If a length is above 255, all 16 are in a table entry of their own, whose
-// index takes the first four bytes of theirs.
+// If a length is above 255, bit 31 of the offset is set, and the 16 lengths are
+// in an entry of `wide`, 16 u32. The first 4 of the 16 bytes are the index of
+// that entry then (u32).
 // Throws std::length_error if the blocks take 2 GiB or more.
 GroupTables packGroups(const std::vector<Blocks>& nameChunks,
                        const std::vector<Blocks>& folderChunks);

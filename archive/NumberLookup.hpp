@@ -19,12 +19,12 @@ namespace tessel::archive {
 std::optional<std::uint64_t> numberOf(const ArchiveReader& archive,
                                       std::string_view path);
 
-// Whether the path is in the list: faster than numberOf where that scans an
-// order.
+// Whether the path is in the list. Faster than numberOf in a rearranged segment
+// without an index, where numberOf scans the order.
 bool contains(const ArchiveReader& archive, std::string_view path);
 
-// The numbers of all paths that start with the path and a '/', which may be
-// the path's last byte; of all paths if it is empty.
+// The numbers of all paths that start with the folder and a '/', which the
+// folder may already end with; of all paths if the folder is empty.
 std::vector<NumberRange> numbersBelow(const ArchiveReader& archive,
                                       std::string_view folder);
 

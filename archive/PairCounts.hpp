@@ -70,8 +70,9 @@ public:
     // Both halves are the separator, which is part of no pair.
     static constexpr TokenPair noPair = 0xFFFFFFFF;
 
-    // Forgets all and makes room for so many pairs. Of more it takes care, at
-    // some cost: different pairs can share a count of a sketch.
+    // Removes all entries and makes room for this many pairs. If more come, the
+    // table grows: they may, because a number of pairs that was estimated from
+    // a sketch is too small where pairs share a count.
     void reset(std::size_t expectedPairs) {
         std::size_t size = 1024;
         while (size < 3 * expectedPairs) size *= 2;

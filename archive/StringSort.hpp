@@ -7,7 +7,7 @@
 
 namespace tessel::archive {
 
-// A string to be sorted and what it is called.
+// A string to be sorted and its number.
 struct StringItem {
     std::string_view text;
     std::uint64_t key = 0;  // used by sortStrings

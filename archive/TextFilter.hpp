@@ -10,9 +10,10 @@
 
 namespace tessel::archive {
 
-// TextFilter tells which paths hold every one of some texts. It looks at a
-// folder once for all of its names, and then only at what a text could need of
-// the folder's end and at the names.
+// TextFilter tells which paths hold every one of some texts. A folder is
+// searched once for all of its names. Each path is then searched only for the
+// texts that its folder does not hold, from the first byte at the folder's end
+// at which such a text could begin.
 //
 // Ownership: borrows the texts.
 // Threads: one thread at a time; copies are independent.

@@ -1,5 +1,5 @@
-// In the place of MarisaSubject.cpp and Compressors.cpp where their libraries are
-// missing.
+// In the place of MarisaSubject.cpp and Compressors.cpp where their libraries
+// are missing.
 
 #include "bench/Subject.hpp"
 

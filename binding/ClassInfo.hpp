@@ -33,7 +33,7 @@ public:
     void customLoad(HostArray* instance, const HostSavedValue* saved) override;
 };
 
-// Registers HuffmanPaths with the host unless the host has it, and answers it.
+// Registers HuffmanPaths with the host unless the host has it, and returns it.
 // Throws MissingPackageException, and whatever the host raises.
 HostClass* registerHuffmanPaths();
 

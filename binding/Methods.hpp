@@ -66,7 +66,7 @@ void construct(HostFrame& frame);
 // apart by the caller (see HuffmanPathTree).
 void addPaths(HostFrame& frame);
 
-// Answers paths by number: as components, or joined with a separator.
+// Returns paths by number: as components, or joined with a separator.
 void getPaths(HostFrame& frame);
 
 void getNextPath(HostFrame& frame);
@@ -76,7 +76,7 @@ void hasNextPath(HostFrame& frame);
 
 void reset(HostFrame& frame);
 
-// Answers the tree string and, only if two outputs are requested, the stored
+// Returns the tree string and, only if two outputs are requested, the stored
 // form.
 void serialize(HostFrame& frame);
 

@@ -18,8 +18,9 @@ using FolderTexts = std::vector<std::vector<std::u16string>>;
 
 // The texts of a batch and what they are encoded to, one entry per folder.
 //
-// Threads: a folder's texts belong to the worker that takes the folder. Its
-//   results have slots of their own, too; the locks are for whoever watches.
+// Threads: a folder's texts and the places of its results belong to the worker
+//   that takes the folder. The locks guard the lists as a whole: workers add
+//   buffers, and others may read the lists meanwhile.
 struct Batch {
     FolderTexts folders;
     FolderTexts files;

@@ -71,12 +71,13 @@ public:
     std::uint64_t pathCount = 0;
 
 private:
-    // One entry of the table for so many numbers, as a power of two; more in a
-    // loaded form that has few partitions for its numbers.
+    // The table of starts has one entry per 2^shift_ numbers. A loaded form
+    // with few partitions for its numbers gets a larger shift than the usual
+    // one: the table has no more entries than there are partitions.
     static constexpr unsigned usualShift = 6;
 
-    // So many entries a partition of so many files may add to the table,
-    // however far the count has jumped.
+    // The most entries that a partition of this many files adds to the table,
+    // even if pathCount was set by hand to a far larger number.
     std::size_t mostStarts(std::size_t fileCount) const noexcept {
         return (fileCount >> shift_) + 1;
     }

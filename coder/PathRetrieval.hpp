@@ -51,8 +51,7 @@ public:
     // Throws std::out_of_range for a number that leads outside the tree; the
     // paths before it have been visited then.
     // Cost: for each partition met a search in partitionEnds and the way from
-    // its
-    //   folder up, or its track down.
+    //   its folder up, or its track down.
     template <class Numbers, class Visitor>
     void visit(const Numbers& numbers, Visitor&& visitor) const;
 

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-// The entry that a fuzzing engine, or the stand-in for one, calls.
+// The function that libFuzzer calls with each input.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data,
                                       std::size_t size);
 

@@ -18,7 +18,7 @@ constexpr std::size_t windowBytes = std::size_t{256} << 10U;
 
 constexpr std::size_t usualHeadroom = std::size_t{4} << 10U;
 
-// As many of so many bytes as zlib takes at once.
+// No more bytes than zlib takes in one call.
 uInt zlibCount(std::size_t bytes) noexcept {
     return static_cast<uInt>(
         std::min<std::size_t>(bytes, std::numeric_limits<uInt>::max()));

@@ -182,8 +182,8 @@ void PathStore::recode(Survey& survey, Source source) {
     size_ = added;
 }
 
-// Takes away what a failed addition left. If there is no memory for it, that
-// is up to whoever needs it next.
+// Takes away what a failed addition left. If there is no memory for it, the
+// next call that needs a sound coder tries again.
 void PathStore::restoreSoundness() noexcept {
     if (contents_->isSound()) return;
     try {

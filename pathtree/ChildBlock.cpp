@@ -228,8 +228,8 @@ void ChildBlock::promote(std::uint64_t position, FolderNode* folder) noexcept {
 
 // ---- Release ----
 //
-// A dead block counts nothing any more, so its numbers are free: the first
-// says where the walk goes on, the third where its current folder is.
+// A dead block needs no counts, so the numbers of its header serve the walk:
+// the first says where it goes on, the third where its current folder is.
 
 void ChildBlock::beginRelease() noexcept {
     if (memory_ != nullptr) setNumber(0, hasFolders() ? 0 : usedBytes());

@@ -38,8 +38,8 @@ struct ChildBatch {
 //   ----------------+-------------------------------------------------------
 //   a file          | see PackedComponent.hpp
 //   a folder        | 255; the address of its FolderNode, 8 bytes
-//   a folder that   | 253; the address, 8 bytes; what else the file's entry
-//   was a file      | had: the name is in the FolderNode now
+//   a folder that   | 253; the address, 8 bytes; the rest of the file's
+//   was a file      | entry, unused: the name is in the FolderNode
 //
 //   flags     | says
 //   ----------+-------------------------------------------------------------

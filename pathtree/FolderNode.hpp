@@ -10,25 +10,25 @@
 
 namespace tessel {
 
-// A node that has children, or had them in mind: the root and every folder.
+// The root, or a component that has children.
 // Its name, its share count and the way to its children are in one piece of a
 // NodeSlab. Files have no node: they are entries of their folder's ChildBlock.
 //
 //   | shares, 4 | parent, 4 | length 6 | flags 2 bits | name | children |
 //   |           |           | one byte                |      |          |
 //
-//   length bits | length of the name | the name is in the bytes after
-//   ------------+--------------------+-----------------------------------------
-//   0 to 62     | the same           | the byte
-//   63          | 63 to maxInSlab    | the length, 8 bytes
-//   63          | above maxInSlab    | the length, 8 bytes; only the address of
-//               |                    | a heap block, 8 bytes
+//   length bits | after the byte
+//   ------------+-------------------------------------------------------------
+//   0 to 62     | the name, which has that many bytes
+//   63          | the name's length, 8 bytes; then the name or, if it is longer
+//               | than maxInSlab, the address of a heap block with it, 8 bytes
 //
-//   flag         | the children are
+//   flag         | after the name
 //   -------------+------------------------------------------------------------
-//   inlineBlock  | a ChildBlock right here: so they are made, if it is small
-//   none         | where the 8 bytes here point to: a ChildBlock on the heap;
-//                | null: no children, as in a root without paths
+//   inlineBlock  | a ChildBlock. A new node has its children here if they take
+//                | at most maxInlineBlock bytes
+//   none         | the address of a ChildBlock on the heap, 8 bytes; null in a
+//                | root without paths
 //
 // The parent is said as a distance: 0 for the root, and where it would be more
 // than 8 GiB.
@@ -40,8 +40,9 @@ namespace tessel {
 // Threads: the count is atomic, all else must not be read while it changes.
 class FolderNode {
 public:
-    // Longer names have a block of their own, so that slabs stay well filled:
-    // at most this part of 16 KiB is lost at the end of each.
+    // Longer names have a heap block of their own, so that slabs stay well
+    // filled: a node takes at most about 1.2 KiB, and no more than that is lost
+    // at the end of a slab of 16 KiB.
     static constexpr std::size_t maxInSlab = 1024;
     // A block that grows leaves its place in the slab unused. So only those
     // stay there that are small.
@@ -91,7 +92,7 @@ public:
             reinterpret_cast<const char*>(this) + steps * step());
     }
 
-    // Asks the processor for the children.
+    // Prefetches the children.
     void prefetchChildren() const noexcept {
         __builtin_prefetch(children().memory());
     }

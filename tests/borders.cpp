@@ -3,7 +3,7 @@
 //
 //   border      | what changes beyond it
 //   ------------+----------------------------------------------------------
-//   8           | a packed child takes more room than a folder's address
+//   8           | a file's entry takes more room than a folder's, 9 bytes
 //   16, 128, 256| an archive's block, folder head or group is full
 //   31          | an archive's token is full
 //   32          | a folder's chain no longer fits its buffer
@@ -52,8 +52,8 @@ Sizes tried(Sizes borders) {
     return borders;
 }
 
-// From two before each border to two beyond it, with sanitizers from one to
-// one; ascending, each once.
+// The two sizes on either side of each border, with sanitizers one, and the
+// border itself; ascending, each once.
 Sizes around(const Sizes& borders, std::size_t least = 1) {
     constexpr std::size_t reach = shareOf(2);
     std::set<std::size_t> sizes;

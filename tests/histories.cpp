@@ -140,8 +140,9 @@ rc::Gen<Step> anyStep() {
 struct Pair {
     CoderPtr coder = std::make_unique<HuffmanPathTree>();
     model::Coder expected;
-    // Insertions into the nodes that the coder shares, and their number when
-    // its pass began: a pass is not to be gone on with after an insertion.
+    // How often something was inserted into the nodes that this coder shares
+    // with its copies, and that count when its pass began: a pass must not
+    // continue after an insertion.
     std::shared_ptr<int> insertions = std::make_shared<int>(0);
     int passBegan = 0;
 };
@@ -483,7 +484,7 @@ RC_GTEST_PROP(Histories, WhatWasReadIsWrittenAgain, ()) {
     }
 }
 
-// ---- The third voice: a plain list ----
+// ---- Beside a plain list ----
 
 // paths[n - 1] is path n, as long as no file becomes a folder: folders and
 // files have names of their own here.

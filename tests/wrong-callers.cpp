@@ -300,9 +300,9 @@ TEST(WrongCallers, AVisitorMayTakeTheNextPathOrStartAnew) {
     EXPECT_FALSE(tree.hasNextPath());
 }
 
-// So many children that they are searched by an index, and so many folders that
-// the old root's memory is given back and taken by the new one: the index must
-// not answer for a folder that is where one of the former tree was.
+// There are enough children for an index, and enough folders that the new root
+// takes the old root's memory. The index must not answer for a new folder at an
+// old folder's address.
 TEST(WrongCallers, ARootThatWasReplacedIsSearchedAnew) {
     for (int round = 0; round < 20; ++round) {
         BPathTree tree;

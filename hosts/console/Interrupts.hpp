@@ -13,8 +13,9 @@ namespace tessel::console {
 // instead (tidyUpFirst): it is told through token() and, where it waits for
 // input, through wakeDescriptor(); the second signal ends it at once, too.
 //
-// SIGPIPE is ignored, so that writing fails with an error instead; endBySignal
-// makes up for it. A SIGHUP that was ignored before, as nohup does, stays so.
+// SIGPIPE is ignored, so that writing fails with an error instead.
+// endByClosedPipe() then ends the process as SIGPIPE would have. A SIGHUP that
+// was ignored before, as nohup does, stays so.
 //
 // Threads: construct it on the main thread before any other thread starts,
 //   since the signals are blocked in all threads but its own.

@@ -20,8 +20,8 @@ struct ListOptions {
     EmptyLines emptyLines = EmptyLines::Refused;
 };
 
-// ListInput reads paths from a list: lines, NUL-separated records, a saved
-// store or an archive, whichever the file begins as.
+// ListInput reads paths from a list: lines, NUL-separated records, or a saved
+// store or an archive, which are recognized by their first bytes.
 //
 // Ownership: borrows session and bar.
 // Errors: ConsoleException names file and line; CancelledException;
@@ -34,8 +34,8 @@ public:
         : options_(options), session_(&session), bar_(&bar) {}
 
     // Gives the sink every path of a list file, or of standard input for "-".
-    // std::invalid_argument and std::length_error of the sink are told with
-    // the line.
+    // std::invalid_argument and std::length_error from the sink become errors
+    // that name the line.
     void readList(const std::string& file, const Sink& sink);
 
     // Gives the sink what is in a folder at any depth.

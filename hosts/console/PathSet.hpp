@@ -15,8 +15,7 @@ public:
     // file  the archive's name, for errors
     PathSet(const PathArchive& archive, std::string file, ProgressBar& bar);
 
-    // The path at which the walk is, or nothing at the end; valid until
-    // advance.
+    // The current path, or nothing at the end; valid until advance.
     const std::optional<std::string>& path() const noexcept { return path_; }
 
     // Goes on to the next different path.

@@ -322,6 +322,18 @@ TEST(ArchiveWriterTest, AWriterThatWasMovedFromTakesNothing) {
     EXPECT_EQ(readBack(bytes), Paths{"a"});
 }
 
+TEST(ArchiveWriterTest, AWriterTakesThePlaceOfAnUnfinishedOne) {
+    Bytes first;
+    Bytes second;
+    ArchiveWriter writer(first);
+    writer.add("lost");
+    writer = ArchiveWriter(second);
+    writer.add("kept");
+    writer.finish();
+    EXPECT_TRUE(first.empty());
+    EXPECT_EQ(readBack(second), Paths{"kept"});
+}
+
 TEST(ArchiveWriterTest, CancellingLeavesTheOldBytes) {
     Bytes bytes = {1, 2, 3};
     std::stop_source source;

@@ -351,6 +351,14 @@ TEST(PathArchive, AnIteratorKeepsTheBytes) {
     EXPECT_TRUE(moved == std::default_sentinel);
 }
 
+TEST(PathArchive, AnIteratorTakesThePlaceOfAnother) {
+    auto it = PathArchive::own(archiveOf({"x"})).begin();
+    it = PathArchive::own(archiveOf({"a/b", "c"})).begin();
+    EXPECT_EQ(*it, "a/b");
+    ++it;
+    EXPECT_EQ(*it, "c");
+}
+
 TEST(PathArchive, AnIteratorAtTheEndStaysThere) {
     const auto archive = PathArchive::own(archiveOf({"a/b", "c"}));
     auto it = archive.begin();

@@ -47,6 +47,7 @@ TEST_F(VerificationTest, TellsEachDamagedPieceOnce) {
     const std::uint64_t second = inNames(9000 + 5 * 4096);
     for (const std::uint64_t at : {first, second, second + 4096})
         bytes_[at] ^= 1;
+    EXPECT_EQ(damages(1), damages(4));
     for (const unsigned threads : {1U, 4U}) {
         const auto found = damages(threads);
         ASSERT_EQ(found.size(), 2U);

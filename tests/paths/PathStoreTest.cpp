@@ -249,6 +249,8 @@ TEST(PathStore, IteratorsMoveAndEndForGood) {
     EXPECT_EQ(*second, "b");
     ++second;
     EXPECT_TRUE(second == store.end());
+    second = store.begin();
+    EXPECT_EQ(*second, "a");
     static_assert(std::ranges::input_range<PathStore>);
     EXPECT_EQ(std::ranges::distance(store.begin(), store.end()), 2);
 }

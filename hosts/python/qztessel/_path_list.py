@@ -40,8 +40,8 @@ class PathList(Sequence[AnyStr]):
 
     A list in a file is mapped: all processes that open it share one copy, and
     none of them copies it by reading. A list never changes. Slices and the
-    results of `shuffled`, `split`, `sample` and `select` are lists, too; they
-    read the same archive and take no memory of their own.
+    results of `shuffled`, `split`, `sample` and `select` are lists, too, which
+    read the same archive. Only `select` takes memory: 8 bytes per index.
 
     >>> paths = PathList.pack(["a/x", "a/y", "b/x", "b/y"])
     >>> paths[1], paths[-1], "b/x" in paths, len(paths)
