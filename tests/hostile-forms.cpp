@@ -9,6 +9,7 @@
 
 #include "tests/support/AllocationMeter.hpp"
 #include "tests/support/Coders.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace {
 
@@ -312,7 +313,8 @@ Bytes changesOf(std::uint8_t byte) {
 // repeats itself only some.
 std::size_t after(std::size_t i, std::size_t size) {
     constexpr std::size_t edge = 160;
-    return i < edge || i + edge >= size ? i + 1 : i + 7;
+    constexpr std::size_t step = 7 * (8 / support::shareOf(8));
+    return i < edge || i + edge >= size ? i + 1 : i + step;
 }
 
 TEST_P(HostileForm, WithEveryByteChanged) {

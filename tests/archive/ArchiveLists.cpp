@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "archive/ArchiveWriter.hpp"
+#include "tests/support/Sizes.hpp"
 
 namespace support {
 
@@ -139,24 +140,24 @@ std::vector<NamedList> nastyLists() {
         {"slashes",
          {"/", "//", "///", "a//b", "a//", "/a", "//a", "./x", "../x", "a/",
           "a", "a/b", "a/./b"}},
-        {"equal paths", Paths(5000, "usr/share/same")},
+        {"equal paths", Paths(shareOf(5000), "usr/share/same")},
         {"equal names", {"a/x", "b/x", "a/x", "b/x", "c/x", "x", "x"}},
         {"prefixes of each other", {"a", "aa", "aaa", "a/a", "aa/a", "aaaa"}},
         {"every byte", everyByte()},
         {"border lengths", borderLengths()},
         {"deep folders", deepFolders()},
         {"numbers as names", numbersAsNames()},
-        {"files", fileList(5000, 1)},
+        {"files", fileList(shareOf(5000), 1)},
     };
     std::mt19937 random(7);
-    Paths shuffled = fileList(5000, 2);
+    Paths shuffled = fileList(shareOf(5000), 2);
     std::shuffle(shuffled.begin(), shuffled.end(), random);
     lists.push_back({"shuffled", shuffled});
-    Paths reversed = fileList(3000, 3);
+    Paths reversed = fileList(shareOf(3000), 3);
     std::reverse(reversed.begin(), reversed.end());
     lists.push_back({"reversed", reversed});
-    Paths runs = fileList(3000, 4);
-    std::rotate(runs.begin(), runs.begin() + 1234, runs.end());
+    Paths runs = fileList(shareOf(3000), 4);
+    std::rotate(runs.begin(), runs.begin() + shareOf(1234), runs.end());
     lists.push_back({"two sorted runs", runs});
     return lists;
 }

@@ -36,7 +36,7 @@ TEST(ArchiveOperations, AnswerTheSameInSmallSegments) {
     for (const auto& [name, paths] : support::nastyLists()) {
         SCOPED_TRACE(name);
         ArchiveOptions options;
-        options.pathsPerSegment = 700;
+        options.pathsPerSegment = shareOf(700);
         options.index = ArchiveIndex::WhereNeeded;
         expectAllAnswers(support::archiveOf(paths, options), paths);
     }

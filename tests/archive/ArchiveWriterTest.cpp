@@ -203,7 +203,7 @@ TEST(ArchiveWriterTest, OnlyUnsortedListsGetAnIndex) {
 // ---- Segments ----
 
 TEST(ArchiveWriterTest, SegmentsAreCutByPathsAndByText) {
-    const Paths tree = treeList(1000);
+    const Paths tree = treeList(shareOf(1000));
     ArchiveOptions options;
     options.pathsPerSegment = 64;
     expectRoundTrip(tree, options);

@@ -65,18 +65,18 @@ TEST(Glob, WhatIsNoSetIsText) {
     EXPECT_TRUE(matches("a\\", "a\\"));
 }
 
-// Looking for the end of each set would take hours.
-TEST(Glob, AMillionSetsThatDoNotEndAreText) {
+// To look for the end of each set in all that follows would take minutes.
+TEST(Glob, ManySetsThatDoNotEndAreText) {
     for (const std::string part : {"[", "[:", "[[:a", "[!"}) {
         std::string text;
-        while (text.size() < 1'000'000) text += part;
+        while (text.size() < 200'000) text += part;
         EXPECT_EQ(
             globToExpression(text, LetterCase::Exact, PatternAlphabet::Bytes),
             textToExpression(text, LetterCase::Exact, PatternAlphabet::Bytes))
             << part;
         // One set of the whole text, apart from the last ']'.
         const std::string set = globToExpression(
-            "[" + text + "]]", LetterCase::Exact, PatternAlphabet::Bytes);
+            "[" + text + "x]]", LetterCase::Exact, PatternAlphabet::Bytes);
         EXPECT_TRUE(set.starts_with('[') && set.ends_with("]\\x5D")) << part;
     }
 }
