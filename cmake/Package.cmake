@@ -54,8 +54,8 @@ set(CPACK_DEBIAN_RUNTIME_PACKAGE_CONTROL_EXTRA
     ${PROJECT_SOURCE_DIR}/cmake/debian/triggers)
 set(CPACK_COMPONENT_RUNTIME_DESCRIPTION
     "plug-in for very large lists of paths
-Adds a class that keeps millions of file paths in about half the memory that
-their text takes to a host environment that loads it.
+Adds a class that keeps millions of file paths in two fifths to half of the
+memory that their text takes to a host environment that loads it.
 .
 This package has the shared library and the texts of its messages.")
 
@@ -66,7 +66,7 @@ set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_DEPENDS
 set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "very large lists of paths, kept small: libraries and headers
 Keeps millions of file paths in memory, growing by batches, or as a finished
-archive that is mapped and answers in less than a microsecond.
+archive that is mapped and answers in a few microseconds.
 .
 This package has the static libraries, their headers, the CMake package and
 the files for pkg-config.")

@@ -32,13 +32,13 @@ public:
     using std::runtime_error::runtime_error;
 };
 
-// PathStore keeps a very large list of paths in about half the memory that
-// their text takes.
+// PathStore keeps a very large list of paths in two fifths to half of the
+// memory that their text takes.
 //
 //     auto store = tessel::PathStore::from(lines);
 //     std::string path = store[1'000'000];
 //     for (std::string_view each : store) std::cout << each << '\n';
-//     store.saveFile("paths.tessel");
+//     store.saveFile("paths.store");
 //
 // A path is any bytes but none: NUL, newline and bytes that are no text come
 // back as they were added. Numbers count from 0 in the order of addition.
