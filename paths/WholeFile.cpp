@@ -71,13 +71,20 @@ std::optional<mode_t> modeOf(const std::string& file) {
     return std::nullopt;
 }
 
-// The file that symbolic links lead to, or the name itself if there is none.
+// The file itself, or what its symbolic links lead to, which need not exist.
 std::string linkTarget(const std::string& file) {
-    std::error_code error;
-    const auto target = std::filesystem::canonical(file, error);
-    if (error && error != std::errc::no_such_file_or_directory)
-        fail("write", file, error.value());
-    return error ? file : target.string();
+    constexpr int maxLinks = 40;  // as Linux has it
+    std::filesystem::path path(file);
+    for (int links = 0;; ++links) {
+        std::error_code error;
+        const auto target = std::filesystem::read_symlink(path, error);
+        if (error == std::errc::invalid_argument ||
+            error == std::errc::no_such_file_or_directory)
+            return path.string();
+        if (error) fail("write", file, error.value());
+        if (links == maxLinks) fail("write", file, ELOOP);
+        path = path.parent_path() / target;
+    }
 }
 
 std::string folderOf(const std::string& file) {

@@ -99,6 +99,16 @@ TEST_F(WholeFile, FollowsASymbolicLink) {
     EXPECT_EQ(readWholeFile(path("a")), "n");
 }
 
+TEST_F(WholeFile, MakesWhatALinkPointsTo) {
+    fs::create_directory(path("folder"));
+    fs::create_symlink("folder/second", path("first"));
+    fs::create_symlink("../a", path("folder/second"));
+    replaceFile(path("first"), Bytes{'n'});
+    EXPECT_TRUE(fs::is_symlink(path("first")));
+    EXPECT_TRUE(fs::is_symlink(path("folder/second")));
+    EXPECT_EQ(readWholeFile(path("a")), "n");
+}
+
 TEST_F(WholeFile, ALinkToItselfIsNotReplaced) {
     fs::create_symlink("link", path("link"));
     try {
