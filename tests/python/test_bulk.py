@@ -61,11 +61,12 @@ def test_kinds_of_arrays():
     assert packed.take([], as_array="O").dtype == object
     with pytest.raises(ValueError, match="'X' is none of"):
         packed.take([0], as_array="X")
-    for wrong in ([2], [-3]):
+    for wrong in ([2], [-3], [2**63], [2**64], [0, -(2**70)]):
         with pytest.raises(IndexError, match="out of range for 2 paths"):
             packed.take(wrong)
     with pytest.raises(TypeError):
         packed.take([0.5])
+    assert packed.take(np.array([1, -2], dtype=object)) == ["bcd", "a/ä"]
 
 
 def test_numbers(view):

@@ -79,6 +79,16 @@ def test_one_name_is_no_list_of_names(client, tmp_path):
         packing.pack_shards("listing", tmp_path, client)
 
 
+def test_wrong_options_are_told_before_anything_is_packed(client, tmp_path):
+    listing = tmp_path / "listing"
+    listing.write_text("a\n")
+    with pytest.raises(ValueError, match="^level 'most' is none of"):
+        packing.pack_shards([listing], tmp_path / "shards", client, level="most")
+    with pytest.raises(TypeError, match="^progress 7 cannot be called"):
+        packing.pack_shards([listing], tmp_path / "shards", client, progress=7)
+    assert not (tmp_path / "shards").exists()
+
+
 def test_a_listing_that_is_a_shard_to_be(client, tmp_path):
     for name, paths in ("00000.tessel", ["a"]), ("00001.tessel", ["b"]):
         PathList.pack(paths, tmp_path / name)

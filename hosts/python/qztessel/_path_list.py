@@ -168,7 +168,7 @@ class PathList(Sequence[AnyStr]):
         ValueError: path 1 is empty
         """
         packer = _core.Packer(
-            _target(file), _level(level), index, _callable(progress)
+            _target(file), known_level(level), index, known_callable(progress)
         )
         _add(packer, source)
         return cls._over(_core.PathSequence(packer.finish()), as_bytes)
@@ -191,7 +191,7 @@ class PathList(Sequence[AnyStr]):
         True
         """
         packer = _core.Packer(
-            _target(file), _level(level), index, _callable(progress)
+            _target(file), known_level(level), index, known_callable(progress)
         )
         packer.add_sequence(self._paths)
         return self._like(_core.PathSequence(packer.finish()))
@@ -216,7 +216,7 @@ class PathList(Sequence[AnyStr]):
         """
         if not self._paths.is_whole:
             raise ValueError("cannot append to a view; save() it and append to that")
-        packer = _core.Packer.append_to(self._paths.stored, _callable(progress))
+        packer = _core.Packer.append_to(self._paths.stored, known_callable(progress))
         _add(packer, paths)
         return self._like(_core.PathSequence(packer.finish()))
 
@@ -549,13 +549,15 @@ def full_name(file: Path) -> bytes:
     return os.path.abspath(name)
 
 
-def _callable(progress: Progress | None) -> Progress | None:
+def known_callable(progress: Progress | None) -> Progress | None:
+    """The progress, or a `TypeError`."""
     if progress is not None and not callable(progress):
         raise TypeError(f"progress {progress!r} cannot be called")
     return progress
 
 
-def _level(level: str) -> _core.Level:
+def known_level(level: str) -> _core.Level:
+    """The level of that name, or a `ValueError`."""
     if level not in ("fast", "normal", "best"):
         raise ValueError(f"level {level!r} is none of 'fast', 'normal', 'best'")
     chosen: _core.Level = getattr(_core.Level, level)
@@ -588,6 +590,13 @@ def _integers(numbers: npt.ArrayLike, size: int) -> npt.NDArray[np.int64]:
     array = np.asarray(numbers)
     if array.ndim != 1:
         raise ValueError(f"expected one dimension of indices, not {array.ndim}")
+    objects = array.dtype.kind == "O" and array.size
+    if objects and all(isinstance(each, int) for each in array):
+        # NumPy keeps integers as objects if one has no place in 64 bits.
+        farthest = max(array, key=abs)
+        if not -size <= farthest < size:
+            raise IndexError(f"list index {farthest} is out of range for {size} paths")
+        array = array.astype(np.int64)
     if array.dtype.kind not in "iu" and array.size:
         raise TypeError(f"expected integers as indices, not {array.dtype}")
     if array.dtype.kind == "u" and array.size and array.max() >= size:

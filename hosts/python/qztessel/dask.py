@@ -16,7 +16,7 @@ from typing import Any, Literal
 import distributed
 
 from . import _core
-from ._path_list import Path, PathList, Progress
+from ._path_list import Path, PathList, Progress, known_callable, known_level
 from ._sharded_path_list import ShardedPathList
 from ._shards import Facts, replace_json, write_manifest
 
@@ -64,6 +64,8 @@ def pack_shards(
     """
     if isinstance(listings, (str, bytes, os.PathLike)):
         raise TypeError("expected many listings; put the one into a list")
+    known_level(level)
+    known_callable(progress)
     sources = [os.path.abspath(os.fsdecode(listing)) for listing in listings]
     target = os.path.abspath(os.fsdecode(folder))
     names = [f"{position:05}.tessel" for position in range(len(sources))]
