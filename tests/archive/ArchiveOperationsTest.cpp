@@ -114,6 +114,11 @@ TEST(ArchiveOperations, MappedArchivesAnswerAsThoseInMemory) {
     const PathArchive owned = PathArchive::own(support::archiveOf(paths));
     EXPECT_EQ(support::pathsOf(owned), paths);
     EXPECT_EQ(owned.info().fileBytes, mapped.info().fileBytes);
+    EXPECT_TRUE(std::ranges::equal(owned.bytes(), mapped.bytes()));
+    for (const PathArchive& archive : {mapped, owned}) {
+        archive.releasePages();
+        EXPECT_EQ(support::pathsOf(archive), paths);
+    }
 }
 
 TEST(ArchiveOperations, InfoAddsUp) {

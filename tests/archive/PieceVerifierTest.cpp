@@ -6,6 +6,7 @@
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/PieceVerifier.hpp"
 #include "tests/archive/Archives.hpp"
+#include "tests/archive/ChangedSegment.hpp"
 
 namespace tessel::archive {
 namespace {
@@ -54,6 +55,27 @@ TEST_F(PieceVerifierTest, OnlyWhatTouchesADamagedPieceIsRefused) {
         } catch (const DamagedArchiveException& damage) {
             EXPECT_EQ(damage.offset(), entry_.offset + bodyStart_ + 3 * 4096);
         }
+    }
+}
+
+// Pieces of 512 bytes need a second table, of the checksums of the first one.
+TEST(PieceVerifierOfSmallPieces, ChecksEveryTableOfChecksums) {
+    const archives::ChangedSegment changed(
+        archives::sortedPaths(20'000),
+        [](SegmentHead& head, archives::Bytes&) { head.pieceShift = 9; });
+    archives::Bytes bytes = changed.bytes();
+    const SegmentHead head = SegmentHead::unpack(bytes);
+    ASSERT_GT(head.sumTreeBytes(), 8 * (head.bodyBytes() / 512 + 1));
+    const auto verifier = [&] { return PieceVerifier(bytes, head, 0); };
+    {
+        const PieceVerifier pieces = verifier();
+        for (std::uint64_t p = 0; p < pieces.pieces(); ++p)
+            ASSERT_TRUE(pieces.isSound(p)) << p;
+    }
+    for (std::uint64_t i = 0; i < head.sumTreeBytes(); i += 100) {
+        bytes[segmentHeadBytes + i] ^= 1;
+        EXPECT_THROW(verifier(), DamagedArchiveException) << i;
+        bytes[segmentHeadBytes + i] ^= 1;
     }
 }
 

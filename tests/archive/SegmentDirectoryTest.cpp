@@ -1,5 +1,11 @@
 #include <gtest/gtest.h>
 
+#include <array>
+#include <cstdint>
+#include <span>
+#include <string>
+#include <vector>
+
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/SegmentDirectory.hpp"
 
@@ -59,6 +65,54 @@ TEST(SegmentDirectoryTest, EveryCutAndEveryChangeIsDamage) {
         EXPECT_THROW(SegmentDirectory::unpack(changed), DamagedArchiveException)
             << at;
     }
+}
+
+// What is said of two segments after `change` was made to the header and to the
+// entries, with the right checksums.
+template <class Change>
+std::string saidAfter(Change change) {
+    const Bytes file = fileOf(twoSegments());
+    FileHeader header = FileHeader::unpack(file);
+    const auto directory = std::span(file).subspan(header.directoryOffset);
+    std::array entries = {
+        SegmentEntry::unpack(directory, 0),
+        SegmentEntry::unpack(directory.subspan(segmentEntryBytes), 1)};
+    change(header, entries);
+    Bytes changed;
+    header.pack(changed);
+    changed.resize(fileHeaderBytes + 3000);
+    for (std::size_t i = 0; i < entries.size(); ++i)
+        entries[i].pack(changed, i);
+    try {
+        SegmentDirectory::unpack(changed);
+    } catch (const DamagedArchiveException& damage) {
+        return damage.cause();
+    }
+    return "";
+}
+
+TEST(SegmentDirectoryTest, ContradictionsAreDamage) {
+    using Entries = std::array<SegmentEntry, 2>;
+    EXPECT_EQ(saidAfter([](FileHeader&, Entries&) {}), "");
+    for (void (*change)(Entries&) :
+         {+[](Entries& entries) { ++entries[0].offset; },
+          +[](Entries& entries) { --entries[1].offset; },
+          +[](Entries& entries) { ++entries[1].offset; },
+          +[](Entries& entries) { --entries[0].bytes; },
+          +[](Entries& entries) { ++entries[1].bytes; },
+          +[](Entries& entries) { entries[1].bytes = ~std::uint64_t{0}; },
+          +[](Entries& entries) { ++entries[0].firstNumber; },
+          +[](Entries& entries) { --entries[1].firstNumber; },
+          +[](Entries& entries) { entries[1].paths = 0; },
+          +[](Entries& entries) { entries[1].paths = maxPathsPerSegment + 1; }})
+        EXPECT_EQ(
+            saidAfter([&](FileHeader&, Entries& entries) { change(entries); }),
+            "The segment directory contradicts itself.");
+    EXPECT_EQ(
+        saidAfter([](FileHeader&, Entries& entries) { --entries[1].bytes; }),
+        "The segment directory does not match the header.");
+    EXPECT_EQ(saidAfter([](FileHeader& header, Entries&) { ++header.paths; }),
+              "The segment directory does not match the header.");
 }
 
 TEST(SegmentDirectoryTest, ANewerVersionIsNamed) {

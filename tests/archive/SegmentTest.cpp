@@ -9,6 +9,7 @@
 #include "archive/ArchiveExceptions.hpp"
 #include "archive/Segment.hpp"
 #include "tests/archive/Archives.hpp"
+#include "tests/archive/ChangedSegment.hpp"
 
 namespace tessel::archive {
 namespace {
@@ -113,6 +114,34 @@ TEST(Segment, RefusesPlacesOutsideASection) {
                  DamagedArchiveException);
     EXPECT_THROW(segment.require(Section::Names, 1, ~std::uint64_t{0}),
                  DamagedArchiveException);
+}
+
+// What a segment says that was changed and has the right checksums.
+template <class Use>
+std::string saidOf(const archives::ChangedSegment& changed, Use use) {
+    const Segment segment(changed.bytes(), changed.entry());
+    try {
+        use(segment);
+    } catch (const DamagedArchiveException& damage) {
+        return damage.cause();
+    }
+    return "";
+}
+
+TEST(Segment, RefusesTablesAndGroupsThatBreakTheRules) {
+    const archives::Paths paths = archives::sortedPaths(500);
+    const auto useTables = [](const Segment& segment) { segment.tables(); };
+    const auto useGroup = [](const Segment& segment) { segment.nameBlock(1); };
+    const archives::ChangedSegment table(
+        paths, archives::flip(Section::TokenCodes, 0, 0xFF));
+    EXPECT_EQ(saidOf(table, useTables), "A table of codes breaks the rules.");
+    EXPECT_EQ(saidOf(table, useGroup), "");
+    // The highest byte of the folders before the group.
+    const archives::ChangedSegment group(
+        paths, archives::flip(Section::NameGroups, 7, 0x80));
+    EXPECT_EQ(saidOf(group, useTables), "");
+    EXPECT_EQ(saidOf(group, useGroup),
+              "A group has seen more folders than there are.");
 }
 
 TEST(Segment, RefusesADamagedHeadChecksumOrTable) {

@@ -8,7 +8,7 @@ namespace tessel::archive {
 namespace {
 
 TEST(WorkersTest, EveryStepRunsOnce) {
-    for (const unsigned threads : {1U, 2U, 5U}) {
+    for (const unsigned threads : {0U, 1U, 2U, 5U}) {
         Workers workers(threads, {});
         for (const std::size_t steps : {0U, 1U, 3U, 1000U}) {
             std::vector<std::atomic<int>> runs(steps);
