@@ -4,8 +4,8 @@
 #include <string>
 #include <string_view>
 
-#include "archive/FunctionRef.hpp"
 #include "archive/ScanOptions.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel {
 

@@ -8,8 +8,8 @@
 #include <optional>
 #include <vector>
 
-#include "archive/FunctionRef.hpp"
 #include "archive/ScanOptions.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::archive {
 

@@ -2,10 +2,10 @@
 
 #include "archive/ArchiveOptions.hpp"
 #include "archive/FrontCoder.hpp"
-#include "archive/FunctionRef.hpp"
 #include "archive/ListParser.hpp"
 #include "archive/TokenModel.hpp"
 #include "archive/Workers.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::archive {
 

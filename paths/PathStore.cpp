@@ -224,7 +224,7 @@ void PathStore::read(std::span<const std::size_t> numbers,
 PathStore::Iterator PathStore::begin() const { return Iterator(*this); }
 
 void PathStore::forEachInTreeOrder(
-    FunctionView<void(std::string_view)> visit) const {
+    FunctionRef<void(std::string_view)> visit) const {
     withSoundCoder(
         [&](HuffmanPathTree& coder) { paths::readInTreeOrder(coder, visit); });
 }
@@ -279,7 +279,7 @@ const HuffmanPathTree& PathStore::coder() const {
 }
 
 // Calls use with a coder of exactly this store's paths.
-void PathStore::withSoundCoder(FunctionView<void(HuffmanPathTree&)> use) const {
+void PathStore::withSoundCoder(FunctionRef<void(HuffmanPathTree&)> use) const {
     if (contents_ != nullptr && contents_->isSound())
         return use(contents_->coder());
     if (contents_ == nullptr) {

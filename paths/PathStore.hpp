@@ -13,7 +13,7 @@
 #include <vector>
 
 #include "packing/ByteCursor.hpp"
-#include "paths/FunctionView.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel {
 
@@ -58,7 +58,7 @@ class PathStore {
 public:
     class Iterator;
     // Takes a path's number and its bytes, which live until it returns.
-    using Visitor = FunctionView<void(std::size_t, std::string_view)>;
+    using Visitor = FunctionRef<void(std::size_t, std::string_view)>;
 
     PathStore() noexcept;
     PathStore(PathStore&& other) noexcept;
@@ -123,7 +123,7 @@ public:
     // so no other thread may read the store meanwhile.
     // Cost: per path less than any other way, and independent of the order of
     // addition.
-    void forEachInTreeOrder(FunctionView<void(std::string_view)> visit) const;
+    void forEachInTreeOrder(FunctionRef<void(std::string_view)> visit) const;
 
     // ---- Saving ----
 
@@ -169,16 +169,16 @@ public:
 private:
     class Contents;
     class Survey;
-    using Sink = FunctionView<void(std::string_view)>;
+    using Sink = FunctionRef<void(std::string_view)>;
     // Gives the sink every path, in order. May be called twice.
-    using Source = FunctionView<void(Sink)>;
+    using Source = FunctionRef<void(Sink)>;
 
     void appendFrom(Source source);
     void appendOnce(Source source);
     void addInPlace(Source source);
     void recode(Survey& survey, Source source);
     void restoreSoundness() noexcept;
-    void withSoundCoder(FunctionView<void(HuffmanPathTree&)> use) const;
+    void withSoundCoder(FunctionRef<void(HuffmanPathTree&)> use) const;
 
     std::unique_ptr<Contents> contents_;  // null: an empty store
     std::size_t size_ = 0;

@@ -5,7 +5,7 @@
 #include <string>
 #include <string_view>
 
-#include "paths/FunctionView.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel {
 
@@ -15,8 +15,8 @@ class HuffmanPathTree;
 
 namespace tessel::paths {
 
-using NumberedPathVisitor = FunctionView<void(std::size_t, std::string_view)>;
-using PathVisitor = FunctionView<void(std::string_view)>;
+using NumberedPathVisitor = FunctionRef<void(std::size_t, std::string_view)>;
+using PathVisitor = FunctionRef<void(std::string_view)>;
 
 // Reads the paths of a store's coder as bytes. Numbers count from 0 and must
 // be below the coder's number of paths. All of them throw

@@ -4,10 +4,10 @@
 #include <string>
 #include <string_view>
 
-#include "archive/FunctionRef.hpp"
 #include "archive/NumberRange.hpp"
 #include "archive/PathArchive.hpp"
 #include "hosts/console/PathOutput.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::console {
 

@@ -8,7 +8,7 @@
 #include <utility>
 
 #include "archive/ArchiveExceptions.hpp"
-#include "archive/FunctionRef.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::python {
 

@@ -2,7 +2,7 @@
 
 #include <stop_token>
 
-#include "archive/FunctionRef.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::python {
 

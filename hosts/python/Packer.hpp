@@ -12,8 +12,8 @@
 #include <vector>
 
 #include "archive/ArchiveWriter.hpp"
-#include "archive/FunctionRef.hpp"
 #include "hosts/python/PathSequence.hpp"
+#include "packing/FunctionRef.hpp"
 #include "paths/PathList.hpp"
 
 namespace tessel::python {

@@ -9,9 +9,9 @@
 #include <utility>
 #include <vector>
 
-#include "archive/FunctionRef.hpp"
 #include "hosts/python/StoredList.hpp"
 #include "hosts/python/View.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel::python {
 

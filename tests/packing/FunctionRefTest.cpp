@@ -1,11 +1,12 @@
 #include <gtest/gtest.h>
 
+#include <memory>
 #include <stdexcept>
 #include <string>
 #include <string_view>
 #include <type_traits>
 
-#include "archive/FunctionRef.hpp"
+#include "packing/FunctionRef.hpp"
 
 namespace tessel {
 namespace {
@@ -31,6 +32,25 @@ TEST(FunctionRef, KeepsTheCallablesState) {
 TEST(FunctionRef, CallsAConstCallable) {
     const auto half = [](int value) { return value / 2; };
     EXPECT_EQ(apply(half, 8), 4);
+}
+
+TEST(FunctionRef, PassesArgumentsOn) {
+    const auto take = [](std::unique_ptr<int> number) { return *number; };
+    const FunctionRef<int(std::unique_ptr<int>)> taking = take;
+    EXPECT_EQ(taking(std::make_unique<int>(5)), 5);
+    int target = 0;
+    const auto set = [](int& to) { to = 7; };
+    const FunctionRef<void(int&)> setting = set;
+    setting(target);
+    EXPECT_EQ(target, 7);
+}
+
+TEST(FunctionRef, DropsAResultThatIsNotWanted) {
+    int calls = 0;
+    const auto count = [&calls] { return ++calls; };
+    const FunctionRef<void()> counting = count;
+    counting();
+    EXPECT_EQ(calls, 1);
 }
 
 TEST(FunctionRef, LetsExceptionsThrough) {

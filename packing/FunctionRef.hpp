@@ -41,8 +41,8 @@ public:
 private:
     template <class Callable>
     static Result callAs(void* target, Arguments... arguments) {
-        return (*static_cast<Callable*>(target))(
-            std::forward<Arguments>(arguments)...);
+        return static_cast<Result>((*static_cast<Callable*>(target))(
+            std::forward<Arguments>(arguments)...));
     }
 
     void* target_;
