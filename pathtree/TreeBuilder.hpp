@@ -24,9 +24,10 @@ namespace tessel {
 // What a hostile form can demand: a node takes two bytes of the payload at
 // least (its code and its length), and most for its size if its name is
 // empty. A comb of such nodes, each folder with a file and one more folder,
-// makes 11 bytes of heap per byte of payload, tree and builder together. A
-// compressed form is at most 1,032 times smaller than its payload, so the
-// two multiply: bound the input to bound the memory.
+// makes 11 bytes of heap per byte of payload, tree and builder together, and
+// at most 18 with the room that the builder's vectors hold in reserve. A
+// compressed form is at most 1,032 times smaller than its payload, so the two
+// multiply: bound the input to bound the memory.
 class TreeBuilder {
 public:
     // Codes may be hostile; they are judged as add() comes to them.
