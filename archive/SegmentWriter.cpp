@@ -30,7 +30,7 @@ ByteVector packTables(std::span<const SymbolCode> codes) {
     return out;
 }
 
-// Numbers of so many bits each.
+// Numbers of this many bits each.
 ByteVector packNumbers(const std::vector<std::uint32_t>& numbers,
                        unsigned bits) {
     BitWriter out;

@@ -61,7 +61,7 @@ struct TokenList {
             std::uint32_t{bytes[2]} << 16U);
     }
 
-    // The entry as a token with a code of so many bits.
+    // The entry as a token with a code of this many bits.
     Token token(std::uint32_t index, unsigned codeBits,
                 const ContextTable& contexts) const noexcept {
         const TokenEntry found = entry(index);
@@ -102,7 +102,7 @@ public:
     }
 
 private:
-    // 1 if the code at the top has more than so many bits, otherwise 0.
+    // 1 if the code at the top has more than this many bits, otherwise 0.
     unsigned isLonger(std::uint32_t top, unsigned bits) const noexcept {
         return static_cast<unsigned>(top > lastCode_[bits]);
     }

@@ -17,7 +17,7 @@ namespace {
 // How much each level spends. Measured on a million neighbouring paths and on
 // a million drawn from an archive's seven; sizes are bytes per path.
 struct Effort {
-    // Learned from this much, and from one byte in so many of the list.
+    // Learned from this much, and from one byte in this many of the list.
     // Long lists repay more tokens: of seven million paths, a fixed sample of
     // two million bytes leaves 3 % in size. At the normal level, a million
     // more gain 0.5 to 1 % and take a tenth more time.

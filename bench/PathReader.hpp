@@ -26,7 +26,7 @@ public:
     explicit PathJoiner(const tessel::HuffmanPathTree& coder)
         : coder_(&coder) {}
 
-    // Keeps so many leading folders and forgets the others.
+    // Keeps this many leading folders and forgets the others.
     void keepFolders(std::size_t depth);
     void addFolder(tessel::ComponentView name);
     const std::u16string& pathOf(tessel::ComponentView fileName);

@@ -31,8 +31,8 @@ std::uint64_t readNumber(std::string_view& in, std::size_t bytes) {
 }
 
 // A container that keeps paths as they are. It has
-//   Text, which takes what text(i) returns; static name; reserve for so many
-//   paths of so many bytes; add; size; write to bytes and read from them.
+//   Text, which takes what text(i) returns; static name; reserve for this many
+//   paths of this many bytes; add; size; write to bytes and read from them.
 template <class Container>
 class Plain : public Subject {
 public:

@@ -12,7 +12,7 @@ namespace bench {
 
 // "1,234,567"
 std::string grouped(std::size_t number);
-// With so many digits after the point: "12.30"
+// With this many digits after the point: "12.30"
 std::string fixed(double number, int digits);
 // With three digits that count, more if it is large: "0.0123", "1.23", "1234".
 // "-" for what is not a number.

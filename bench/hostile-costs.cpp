@@ -91,7 +91,7 @@ public:
         for (const auto& track : tracks) numbers(track);
         return *this;
     }
-    // So many repeats of the first path, under every other number.
+    // This many repeats of the first path, under every other number.
     Payload& duplicates(std::size_t count) {
         put({0, 3, 3, 3});
         for (std::size_t i = 0; i < count; ++i) {

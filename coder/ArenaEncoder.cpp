@@ -18,7 +18,7 @@ static_assert(noStep > CodeTable::longestInline);
 // codes of the greatest length. Most file systems have no longer names.
 constexpr std::size_t maxShortText = 255;
 
-// A packed code has its length in so many low bits.
+// A packed code has its length in this many low bits.
 constexpr unsigned lengthBits = 8;
 unsigned lengthOf(std::uint64_t code) noexcept { return code & 0xFFU; }
 std::uint64_t bitsOf(std::uint64_t code) noexcept { return code >> lengthBits; }

@@ -55,7 +55,7 @@ private:
 // The folders above a new one that the cache knows or should know.
 class NearestAbove {
 public:
-    // So many are looked for, the nearest first: all of them would take time
+    // This many are looked for, the nearest first: all of them would take time
     // by the square of the depth. With four, a sorted build takes 10 % fewer
     // instructions than with none, a shuffled one 3 to 9 %.
     static constexpr std::size_t most = 4;

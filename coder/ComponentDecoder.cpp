@@ -36,7 +36,7 @@ public:
     }
 
     // The bits from position `bit` on, least significant first. At least
-    // validBits of them are the component's, as far as it has so many.
+    // validBits of them are the component's, as far as it has that many.
     static constexpr unsigned validBits = 57;
     std::uint64_t from(std::size_t bit) const noexcept {
         if (bytes_.size() < sizeof whole_) return whole_ >> bit;

@@ -48,7 +48,7 @@ public:
         // Bits that the first n characters take, n from 1 to count().
         unsigned bitLengthOf(unsigned n) const noexcept { return field(n); }
 
-        // How many of its characters end within so many bits.
+        // How many of its characters end within this many bits.
         unsigned charactersWithin(std::uint64_t bitCount) const noexcept {
             unsigned n = count();
             while (n > 0 && bitLengthOf(n) > bitCount) --n;
@@ -63,7 +63,7 @@ public:
             std::memcpy(out, &word_, sizeof word_);
         }
 
-        // Appends a character whose code ends after so many bits of the
+        // Appends a character whose code ends after this many bits of the
         // window. There must be fewer than maxCharacters.
         void append(char16_t character, unsigned bitCount) noexcept;
 

@@ -39,7 +39,7 @@ public:
     const Folder* find(const ComponentList& components,
                        std::uint32_t hash) const noexcept;
 
-    // Makes sure that adding a folder of so many components, and so many
+    // Makes sure that adding a folder of this many components, and this many
     // folders above it, does not throw.
     void reserveFor(std::size_t depth, std::size_t above);
 

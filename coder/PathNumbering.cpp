@@ -15,7 +15,7 @@ void PathNumbering::reserveForPartition(std::size_t trackLength,
     reserveGently(starts_, mostStarts(fileCount));
 }
 
-// Brings the table up to partition k, by at most so many entries. There is
+// Brings the table up to partition k, by at most this many entries. There is
 // room. A table that lags behind makes searches longer, not wrong.
 void PathNumbering::noteStarts(std::size_t k, std::size_t most) noexcept {
     if (k > std::numeric_limits<std::uint32_t>::max()) return;

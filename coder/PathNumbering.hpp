@@ -26,8 +26,8 @@ public:
         return !duplicates.empty() && duplicates.contains(pathNumber);
     }
 
-    // Makes sure that the next notePartition with so many files and a track of
-    // at most trackLength + 1 positions does not throw, so that tree and
+    // Makes sure that the next notePartition with this many files and a track
+    // of at most trackLength + 1 positions does not throw, so that tree and
     // numbering never disagree.
     void reserveForPartition(std::size_t trackLength, std::size_t fileCount);
 

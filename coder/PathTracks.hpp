@@ -93,7 +93,7 @@ private:
     std::size_t startOf(std::size_t i) const noexcept;
     // Turns the track before into the one that begins here; returns its end.
     std::size_t readTrack(std::size_t at, PathTrack& track) const;
-    // Where the integer is that follows so many others.
+    // Where the integer is that follows this many others.
     std::size_t skip(std::size_t at, std::uint64_t integers) const noexcept {
         while (integers > 0)
             if ((bytes_[at++] & moreFollows) == 0) --integers;

@@ -118,7 +118,7 @@ void Inflater::fill(std::span<std::uint8_t> to) {
     }
 }
 
-// Inflates up to so many bytes and returns how many. Each call makes headway
+// Inflates up to this many bytes and returns how many. Each call makes headway
 // or throws: zlib says so when it cannot go on, and keeps saying it.
 std::size_t Inflater::inflateSome(std::span<std::uint8_t> to) {
     if (zlib_.avail_in == 0) {

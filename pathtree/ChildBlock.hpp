@@ -169,7 +169,7 @@ private:
         std::uint64_t capacity = 0;
         std::uint8_t flags;
 
-        // Of so many children, in so many bytes, and `slack` bytes beyond.
+        // Of this many children, in this many bytes, and `slack` bytes beyond.
         Plan(std::uint64_t children, std::uint64_t bytes, std::uint64_t slack,
              std::uint8_t kind) noexcept;
         std::size_t numberBytes() const noexcept { return bytesOf(flags); }
@@ -188,7 +188,7 @@ private:
     static constexpr std::size_t headerBytes(std::size_t numberBytes) noexcept {
         return 1 + 3 * numberBytes;
     }
-    // Bytes of the samples of so many children.
+    // Bytes of the samples of this many children.
     static constexpr std::uint64_t sampleBytes(
         std::uint64_t children, std::size_t numberBytes) noexcept {
         return children == 0 ? 0

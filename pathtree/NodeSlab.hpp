@@ -28,7 +28,7 @@ public:
     static constexpr std::size_t minBytes = 1024 - 64;
     static constexpr std::size_t nodeAlignment = alignof(FolderNode);
 
-    // A slab of so many bytes, held once. Throws std::bad_alloc.
+    // A slab of this many bytes, held once. Throws std::bad_alloc.
     static NodeSlab* create(std::size_t bytes);
 
     static NodeSlab* of(const FolderNode* node) noexcept {
@@ -39,7 +39,7 @@ public:
     NodeSlab(const NodeSlab&) = delete;
     NodeSlab& operator=(const NodeSlab&) = delete;
 
-    // The address of a new node of so many bytes; nullptr if no room is left.
+    // The address of a new node of this many bytes; nullptr if no room is left.
     // The node holds the slab.
     void* allocate(std::size_t bytes) noexcept {
         constexpr std::size_t unit = nodeAlignment;

@@ -12,9 +12,9 @@
 //
 //   first byte | what follows
 //   -----------+------------------------------------------------------------
-//   0 to 252   | so many bytes: the component
+//   0 to 252   | that many bytes: the component
 //   253        | only among children: a folder that was a file, see ChildBlock
-//   254        | the length, 8 bytes, and so many bytes: the component
+//   254        | the length, 8 bytes, and that many bytes: the component
 //   255        | only among children: a folder, see ChildBlock
 namespace tessel::packed {
 

@@ -11,8 +11,9 @@ namespace tessel {
 struct PathView {
     std::span<const Component> folders;
     ComponentView name;
-    // So many leading folders are the same nodes as in the path before, which
-    // this tree visited in the same pass: their text need not be decoded anew.
+    // The number of leading folders that are the same nodes as in the path
+    // before, which this tree visited in the same pass: their text need not be
+    // decoded anew.
     std::size_t unchangedFolders;
 };
 

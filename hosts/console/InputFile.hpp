@@ -31,7 +31,7 @@ public:
     // Bytes of a regular file; 0 if nobody knows.
     std::uint64_t size() const noexcept { return size_; }
 
-    // Reads at most so many bytes, at least one unless the input is at its
+    // Reads at most this many bytes, at least one unless the input is at its
     // end.
     std::size_t read(char* into, std::size_t mostBytes);
 

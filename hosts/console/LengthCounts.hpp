@@ -31,7 +31,7 @@ public:
     std::size_t longest() const noexcept;
     std::size_t median() const noexcept { return quantile(50); }
 
-    // The smallest length that so many per cent of the paths do not exceed.
+    // The smallest length that this many per cent of the paths do not exceed.
     std::size_t quantile(unsigned percent) const noexcept;
 
     // At most `maxBins` bins of equal width from 0 on. The last one holds

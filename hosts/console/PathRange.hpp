@@ -21,8 +21,8 @@ struct PathRange {
 // become the nearest that fits, which no list has.
 std::optional<PathRange> parsePathRange(std::string_view text) noexcept;
 
-// The numbers of a list of so many paths that a range means; nothing if one of
-// its ends is not in the list or the last is before the first.
+// The numbers of a list of this many paths that a range means; nothing if one
+// of its ends is not in the list or the last is before the first.
 std::optional<tessel::NumberRange> resolve(const PathRange& range,
                                            std::uint64_t size) noexcept;
 

@@ -52,7 +52,7 @@ public:
     // Whether the path is in the list.
     bool contains(std::string_view path) const;
 
-    // Ends a call that read so many paths: after a large one, the pages of a
+    // Ends a call that read this many paths: after a large one, the pages of a
     // large file are taken out of this process's memory, so that worker
     // processes that wait take none for them.
     void endReading(std::uint64_t paths) const noexcept;

@@ -324,7 +324,7 @@ class PathList(Sequence[AnyStr]):
         return [self[a:b] for a, b in zip(starts, starts[1:])]
 
     def sample(self, count: int, seed: int) -> PathList[AnyStr]:
-        """Return so many of these paths, drawn without repeats.
+        """Return this many of these paths, drawn without repeats.
 
         The same as `shuffled(seed)[:count]`.
 
