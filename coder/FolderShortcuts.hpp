@@ -49,7 +49,7 @@ public:
         return {root->atSteps(entry >> 1), (entry & 1) != 0};
     }
 
-    // Asks the processor for what find will look at.
+    // Prefetches what find will look at.
     void prefetch(std::size_t k) const noexcept {
         if (k < entries_.size()) __builtin_prefetch(entries_.data() + k);
     }

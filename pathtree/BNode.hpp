@@ -52,7 +52,7 @@ public:
         return place_ == &parent && position_ == position;
     }
 
-    // Asks the processor for the folder's node, or for the file's folder.
+    // Prefetches the folder's node, or the file's folder.
     void prefetch() const noexcept { __builtin_prefetch(place_); }
 
     // The same node, not an equal value.

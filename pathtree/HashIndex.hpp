@@ -93,7 +93,7 @@ public:
                    : entry.positionPlusOne - std::size_t{1};
     }
 
-    // Asks the processor for the entry that find will look at first.
+    // Prefetches the entry that find will look at first.
     void prefetch(std::uint32_t hash) const noexcept {
         if (!entries_.empty())
             __builtin_prefetch(&entries_[hash & (entries_.size() - 1)]);
