@@ -71,8 +71,9 @@ std::optional<mode_t> modeOf(const std::string& file) {
     return std::nullopt;
 }
 
-// The file itself, or what its symbolic links lead to, which need not exist.
-std::string linkTarget(const std::string& file) {
+// What a link leads to that has no file there yet; the name itself if it is no
+// link. Its folder's own links are followed once, here.
+std::string newTarget(const std::string& file) {
     constexpr int maxLinks = 40;  // as Linux has it
     std::filesystem::path path(file);
     for (int links = 0;; ++links) {
@@ -80,11 +81,28 @@ std::string linkTarget(const std::string& file) {
         const auto target = std::filesystem::read_symlink(path, error);
         if (error == std::errc::invalid_argument ||
             error == std::errc::no_such_file_or_directory)
-            return path.string();
+            break;
         if (error) fail("write", file, error.value());
         if (links == maxLinks) fail("write", file, ELOOP);
         path = path.parent_path() / target;
     }
+    std::error_code error;
+    const auto folder = std::filesystem::canonical(
+        path.has_parent_path() ? path.parent_path() : ".", error);
+    if (error) fail("write", file, error.value());
+    return (folder / path.filename()).string();
+}
+
+// The file that symbolic links lead to. A file that is there but has no name
+// any more, such as one of /proc, stays as it is: nothing can be put in its
+// place.
+std::string linkTarget(const std::string& file, bool isThere) {
+    std::error_code error;
+    const auto target = std::filesystem::canonical(file, error);
+    if (!error) return target.string();
+    if (error != std::errc::no_such_file_or_directory)
+        fail("write", file, error.value());
+    return isThere ? file : newTarget(file);
 }
 
 std::string folderOf(const std::string& file) {
@@ -259,7 +277,7 @@ void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes) {
     requireNoNul("write", file);
     const auto oldMode = modeOf(file);
     if (oldMode && isSpecial(*oldMode)) return writeInto(file, bytes);
-    Replacement replacement(linkTarget(file));
+    Replacement replacement(linkTarget(file, oldMode.has_value()));
     if (oldMode) replacement.takePermissions(*oldMode);
     replacement.write(bytes);
     replacement.commit();

@@ -109,6 +109,31 @@ TEST_F(WholeFile, MakesWhatALinkPointsTo) {
     EXPECT_EQ(readWholeFile(path("a")), "n");
 }
 
+TEST_F(WholeFile, ALinkIntoNoFolderNamesTheLink) {
+    fs::create_symlink("gone/a", path("link"));
+    try {
+        replaceFile(path("link"), Bytes{'n'});
+        FAIL() << "nothing was thrown";
+    } catch (const std::system_error& error) {
+        EXPECT_EQ(error.code(), std::errc::no_such_file_or_directory);
+        EXPECT_NE(std::string(error.what()).find(path("link")),
+                  std::string::npos);
+    }
+    EXPECT_EQ(entries(), 1U);
+}
+
+// Its link in /proc names a file that is not there, "NAME (deleted)".
+TEST_F(WholeFile, AFileWithoutANameIsNotReplaced) {
+    const int file = ::open(path("a").c_str(), O_RDWR | O_CREAT, 0600);
+    ASSERT_GE(file, 0);
+    fs::remove(path("a"));
+    EXPECT_THROW(
+        replaceFile("/proc/self/fd/" + std::to_string(file), Bytes{'n'}),
+        std::system_error);
+    ::close(file);
+    EXPECT_EQ(entries(), 0U);
+}
+
 TEST_F(WholeFile, ALinkToItselfIsNotReplaced) {
     fs::create_symlink("link", path("link"));
     try {
