@@ -61,12 +61,17 @@ def test_kinds_of_arrays():
     assert packed.take([], as_array="O").dtype == object
     with pytest.raises(ValueError, match="'X' is none of"):
         packed.take([0], as_array="X")
-    for wrong in ([2], [-3], [2**63], [2**64], [0, -(2**70)]):
+    for wrong in ([2], [-3], [2**63], [0, 2**63], [-1, 2**64 - 1], [0, -(2**70)]):
         with pytest.raises(IndexError, match="out of range for 2 paths"):
             packed.take(wrong)
     with pytest.raises(TypeError):
         packed.take([0.5])
     assert packed.take(np.array([1, -2], dtype=object)) == ["bcd", "a/ä"]
+    assert packed.take(np.array([np.int8(1)], dtype=object)) == ["bcd"]
+    for no_indices in ([True, False], [0, 0.5], [0, None], ["0"]):
+        for dtype in (None, object):
+            with pytest.raises(TypeError, match="expected integers as indices"):
+                packed.take(np.array(no_indices, dtype=dtype))
 
 
 def test_numbers(view):

@@ -586,17 +586,24 @@ def _add_named(packer: _core.Packer, name: bytes) -> None:
         )
 
 
+def _is_integer(value: object) -> bool:
+    return isinstance(value, (int, np.integer)) and not isinstance(value, bool)
+
+
 def _integers(numbers: npt.ArrayLike, size: int) -> npt.NDArray[np.int64]:
     array = np.asarray(numbers)
     if array.ndim != 1:
         raise ValueError(f"expected one dimension of indices, not {array.ndim}")
-    objects = array.dtype.kind == "O" and array.size
-    if objects and all(isinstance(each, int) for each in array):
-        # NumPy keeps integers as objects if one has no place in 64 bits.
-        farthest = max(array, key=abs)
+    # Integers some of which have no place in 64 bits become objects or floats.
+    if array.size and array.dtype.kind in "Of" and not isinstance(numbers, np.ndarray):
+        objects = np.asarray(numbers, dtype=object)
+    else:
+        objects = array
+    if array.size and objects.dtype.kind == "O" and all(map(_is_integer, objects)):
+        farthest = max(objects, key=abs)
         if not -size <= farthest < size:
             raise IndexError(f"list index {farthest} is out of range for {size} paths")
-        array = array.astype(np.int64)
+        array = objects.astype(np.int64)
     if array.dtype.kind not in "iu" and array.size:
         raise TypeError(f"expected integers as indices, not {array.dtype}")
     if array.dtype.kind == "u" and array.size and array.max() >= size:
