@@ -11,6 +11,7 @@
 #include <random>
 #include <system_error>
 
+#include "packing/LinkTarget.hpp"
 #include "packing/OpenFolder.hpp"
 
 namespace tessel::archive {
@@ -45,27 +46,13 @@ void requireRegular(mode_t mode, const std::string& file) {
     fail(file);
 }
 
-bool isLink(const fs::path& path) {
-    std::error_code error;
-    const fs::file_status status = fs::symlink_status(path, error);
-    if (status.type() == fs::file_type::none)  // the system does not tell
-        throw std::system_error(error, path.string());
-    return fs::is_symlink(status);
-}
-
 // The file that is to be replaced: the target, or what it links to, which need
 // not exist.
 std::string replacedFile(const std::string& file) {
-    constexpr int maxLinks = 40;  // as Linux has it
-    fs::path path(file);
-    for (int links = 0; isLink(path); ++links) {
-        if (links == maxLinks) {
-            errno = ELOOP;
-            fail(file);
-        }
-        path = path.parent_path() / fs::read_symlink(path);
-    }
-    return path.string();
+    std::error_code error;
+    const fs::path target = linkTarget(file, error);
+    if (error) throw std::system_error(error, file);
+    return target.string();
 }
 
 std::string hiddenPrefix(std::string_view name) {

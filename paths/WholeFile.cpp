@@ -15,6 +15,7 @@
 #include <system_error>
 #include <utility>
 
+#include "packing/LinkTarget.hpp"
 #include "packing/OpenFolder.hpp"
 
 namespace tessel::paths {
@@ -73,36 +74,26 @@ std::optional<mode_t> modeOf(const std::string& file) {
 
 // What a link leads to that has no file there yet; the name itself if it is no
 // link. Its folder's own links are followed once, here.
-std::string newTarget(const std::string& file) {
-    constexpr int maxLinks = 40;  // as Linux has it
-    std::filesystem::path path(file);
-    for (int links = 0;; ++links) {
-        std::error_code error;
-        const auto target = std::filesystem::read_symlink(path, error);
-        if (error == std::errc::invalid_argument ||
-            error == std::errc::no_such_file_or_directory)
-            break;
-        if (error) fail("write", file, error.value());
-        if (links == maxLinks) fail("write", file, ELOOP);
-        path = path.parent_path() / target;
-    }
+std::string newFile(const std::string& file) {
     std::error_code error;
-    const auto folder = std::filesystem::canonical(
-        path.has_parent_path() ? path.parent_path() : ".", error);
+    const std::filesystem::path target = linkTarget(file, error);
     if (error) fail("write", file, error.value());
-    return (folder / path.filename()).string();
+    const auto folder = std::filesystem::canonical(
+        target.has_parent_path() ? target.parent_path() : ".", error);
+    if (error) fail("write", file, error.value());
+    return (folder / target.filename()).string();
 }
 
-// The file that symbolic links lead to. A file that is there but has no name
-// any more, such as one of /proc, stays as it is: nothing can be put in its
-// place.
-std::string linkTarget(const std::string& file, bool isThere) {
+// The file that is to be replaced: what symbolic links lead to. An open file
+// that was removed can be reached through /proc/self/fd, but has no name to
+// follow: for it, the name as given, beside which no file can be made.
+std::string replacedFile(const std::string& file, bool isThere) {
     std::error_code error;
     const auto target = std::filesystem::canonical(file, error);
     if (!error) return target.string();
     if (error != std::errc::no_such_file_or_directory)
         fail("write", file, error.value());
-    return isThere ? file : newTarget(file);
+    return isThere ? file : newFile(file);
 }
 
 std::string folderOf(const std::string& file) {
@@ -277,7 +268,7 @@ void replaceFile(const std::string& file, std::span<const std::uint8_t> bytes) {
     requireNoNul("write", file);
     const auto oldMode = modeOf(file);
     if (oldMode && isSpecial(*oldMode)) return writeInto(file, bytes);
-    Replacement replacement(linkTarget(file, oldMode.has_value()));
+    Replacement replacement(replacedFile(file, oldMode.has_value()));
     if (oldMode) replacement.takePermissions(*oldMode);
     replacement.write(bytes);
     replacement.commit();
