@@ -4,12 +4,14 @@
 #include <cstddef>
 #include <cstdint>
 #include <random>
+#include <span>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "archive/ArchiveReader.hpp"
 #include "archive/ArchiveWriter.hpp"
+#include "archive/Format.hpp"
 #include "archive/NumberRange.hpp"
 
 // Lists of paths and archives of them, for tests.
@@ -113,6 +115,13 @@ inline Paths nastyPaths() {
     paths.push_back(std::string(70'000, 'n') + 'm');
     paths.push_back(std::string(60'000, 'f') + "/x");
     return paths;
+}
+
+// Where an archive's first segment is.
+inline tessel::archive::SegmentEntry firstEntry(const Bytes& archive) {
+    const auto header = tessel::archive::FileHeader::unpack(archive);
+    return tessel::archive::SegmentEntry::unpack(
+        std::span(archive).subspan(header.directoryOffset), 0);
 }
 
 // An archive in memory, open for reading its parts.

@@ -30,10 +30,7 @@ public:
     // The first segment of an archive.
     template <class Change>
     ChangedSegment(const Bytes& archive, Change change) {
-        namespace format = tessel::archive;
-        const auto header = format::FileHeader::unpack(archive);
-        entry_ = format::SegmentEntry::unpack(
-            std::span(archive).subspan(header.directoryOffset), 0);
+        entry_ = firstEntry(archive);
         const auto segment =
             std::span(archive).subspan(entry_.offset, entry_.bytes);
         SegmentHead head = SegmentHead::unpack(segment);

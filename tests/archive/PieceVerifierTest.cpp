@@ -15,10 +15,7 @@ class PieceVerifierTest : public testing::Test {
 protected:
     archives::Bytes archive_ =
         archives::archiveOf(archives::sortedPaths(20'000));
-    SegmentEntry entry_ =
-        SegmentEntry::unpack(std::span(archive_).subspan(
-                                 FileHeader::unpack(archive_).directoryOffset),
-                             0);
+    SegmentEntry entry_ = archives::firstEntry(archive_);
     std::span<std::uint8_t> bytes_ =
         std::span(archive_).subspan(entry_.offset, entry_.bytes);
     SegmentHead head_ = SegmentHead::unpack(bytes_);

@@ -17,17 +17,11 @@ namespace {
 using archives::archiveOf;
 using archives::OpenArchive;
 
-SegmentEntry onlyEntry(const archives::Bytes& bytes) {
-    const FileHeader header = FileHeader::unpack(bytes);
-    return SegmentEntry::unpack(
-        std::span(bytes).subspan(header.directoryOffset), 0);
-}
-
 // Opens the only segment of an archive after `change` was made to its bytes.
 template <class Change>
 void openChanged(Change change) {
     archives::Bytes bytes = archiveOf(archives::sortedPaths(500));
-    const SegmentEntry entry = onlyEntry(bytes);
+    const SegmentEntry entry = archives::firstEntry(bytes);
     change(bytes, entry);
     const std::span<const std::uint8_t> whole(bytes);
     const Segment segment(whole.subspan(entry.offset, entry.bytes), entry);

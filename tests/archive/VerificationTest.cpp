@@ -60,11 +60,7 @@ TEST_F(VerificationTest, TellsEachDamagedPieceOnce) {
 }
 
 TEST_F(VerificationTest, TellsASegmentThatCountsItsTextWrongly) {
-    const std::uint64_t begin =
-        SegmentEntry::unpack(std::span(bytes_).subspan(
-                                 FileHeader::unpack(bytes_).directoryOffset),
-                             0)
-            .offset;
+    const std::uint64_t begin = archives::firstEntry(bytes_).offset;
     SegmentHead head = SegmentHead::unpack(std::span(bytes_).subspan(begin));
     std::uint64_t text = 0;
     for (const std::string& path : paths_) text += path.size();

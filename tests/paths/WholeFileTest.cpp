@@ -22,6 +22,8 @@ using tessel::paths::readWholeFile;
 using tessel::paths::replaceFile;
 using Bytes = std::vector<std::uint8_t>;
 
+void replaceByN(const std::string& file) { replaceFile(file, Bytes{'n'}); }
+
 class WholeFile : public ::testing::Test {
 protected:
     WholeFile() {
@@ -33,6 +35,19 @@ protected:
 
     std::string path(const std::string& name) const {
         return (folder_ / name).string();
+    }
+    // Expects an operation to throw this error, with the file's name.
+    template <class Operation>
+    static void expectError(std::errc code, const std::string& file,
+                            Operation operation) {
+        try {
+            operation(file);
+            ADD_FAILURE() << "nothing was thrown";
+        } catch (const std::system_error& error) {
+            EXPECT_EQ(error.code(), code);
+            EXPECT_NE(std::string(error.what()).find(file), std::string::npos)
+                << error.what();
+        }
     }
     std::size_t entries() const {
         return static_cast<std::size_t>(
@@ -111,14 +126,7 @@ TEST_F(WholeFile, MakesWhatALinkPointsTo) {
 
 TEST_F(WholeFile, ALinkIntoNoFolderNamesTheLink) {
     fs::create_symlink("gone/a", path("link"));
-    try {
-        replaceFile(path("link"), Bytes{'n'});
-        FAIL() << "nothing was thrown";
-    } catch (const std::system_error& error) {
-        EXPECT_EQ(error.code(), std::errc::no_such_file_or_directory);
-        EXPECT_NE(std::string(error.what()).find(path("link")),
-                  std::string::npos);
-    }
+    expectError(std::errc::no_such_file_or_directory, path("link"), replaceByN);
     EXPECT_EQ(entries(), 1U);
 }
 
@@ -136,12 +144,8 @@ TEST_F(WholeFile, AFileWithoutANameIsNotReplaced) {
 
 TEST_F(WholeFile, ALinkToItselfIsNotReplaced) {
     fs::create_symlink("link", path("link"));
-    try {
-        replaceFile(path("link"), Bytes{'n'});
-        FAIL() << "nothing was thrown";
-    } catch (const std::system_error& error) {
-        EXPECT_EQ(error.code(), std::errc::too_many_symbolic_link_levels);
-    }
+    expectError(std::errc::too_many_symbolic_link_levels, path("link"),
+                replaceByN);
     EXPECT_TRUE(fs::is_symlink(path("link")));
     EXPECT_EQ(entries(), 1U);
 }
@@ -196,14 +200,8 @@ TEST_F(WholeFile, ANameWithANulIsNotCutThere) {
 }
 
 TEST_F(WholeFile, ErrorsNameTheFile) {
-    try {
-        readWholeFile(path("missing"));
-        FAIL() << "nothing was thrown";
-    } catch (const std::system_error& error) {
-        EXPECT_EQ(error.code(), std::errc::no_such_file_or_directory);
-        EXPECT_NE(std::string(error.what()).find(path("missing")),
-                  std::string::npos);
-    }
+    expectError(std::errc::no_such_file_or_directory, path("missing"),
+                readWholeFile);
     EXPECT_THROW(replaceFile(path("no/file"), Bytes{1}), std::system_error);
     EXPECT_THROW(readWholeFile(path(".")), std::system_error);
 }
