@@ -594,16 +594,15 @@ def _integers(numbers: npt.ArrayLike, size: int) -> npt.NDArray[np.int64]:
     array = np.asarray(numbers)
     if array.ndim != 1:
         raise ValueError(f"expected one dimension of indices, not {array.ndim}")
-    # Integers some of which have no place in 64 bits become objects or floats.
-    if array.size and array.dtype.kind in "Of" and not isinstance(numbers, np.ndarray):
-        objects = np.asarray(numbers, dtype=object)
-    else:
-        objects = array
-    if array.size and objects.dtype.kind == "O" and all(map(_is_integer, objects)):
-        farthest = max(objects, key=abs)
+    # Integers that have no type of 64 bits in common become objects or floats.
+    exact = array
+    if array.dtype.kind == "f" and not isinstance(numbers, np.ndarray):
+        exact = np.asarray(numbers, dtype=object)
+    if array.size and exact.dtype.kind == "O" and all(map(_is_integer, exact)):
+        farthest = max(exact, key=abs)
         if not -size <= farthest < size:
             raise IndexError(f"list index {farthest} is out of range for {size} paths")
-        array = objects.astype(np.int64)
+        array = exact.astype(np.int64)
     if array.dtype.kind not in "iu" and array.size:
         raise TypeError(f"expected integers as indices, not {array.dtype}")
     if array.dtype.kind == "u" and array.size and array.max() >= size:
