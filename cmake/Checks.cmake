@@ -54,9 +54,10 @@ foreach(word IN ITEMS -analyzer-config max-nodes=20000)
   list(APPEND tidy --extra-arg=-Xclang --extra-arg=${word})
 endforeach()
 
-# Checks all sources of some folders. They are joined into one: most of the time
-# goes into the headers of libraries, which are the same for all of them. So names
-# inside of a source must differ from those in the others, except in programs.
+# Runs clang-tidy over all sources of some folders, joined into one file: most of
+# its time goes into the headers of libraries, which it reads only once then. So
+# names of internal linkage must differ between these sources. Those with a main()
+# may have the same names, because each is put into a namespace of its own.
 function(qztesselAddTidyTest name)
   list(TRANSFORM ARGN APPEND "/*.cpp" OUTPUT_VARIABLE patterns)
   file(

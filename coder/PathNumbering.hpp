@@ -71,9 +71,10 @@ public:
     std::uint64_t pathCount = 0;
 
 private:
-    // The table of starts has one entry per 2^shift_ numbers. A loaded form
-    // with few partitions for its numbers gets a larger shift than the usual
-    // one: the table has no more entries than there are partitions.
+    // starts_ has one entry per 2^shift_ numbers. This shift is the usual one.
+    // A stored form can claim many numbers for few partitions: after it was
+    // loaded, the shift is larger, so that there is at most one entry more
+    // than there are partitions.
     static constexpr unsigned usualShift = 6;
 
     // The most entries that a partition of this many files adds to the table,

@@ -80,8 +80,9 @@ public:
 // more than is left throws DamagedFormException and leaves the cursor where it
 // was.
 //
-// Over a source: what take returned is valid only until the next read. Of a
-// cursor and its copies, read only one. Read none after the source has thrown.
+// A cursor over a source has three more rules: what take returned is valid only
+// until the next read; once a cursor was copied, read only the copy or only the
+// original; read neither after the source has thrown.
 //
 // Inline: reading a stored form is a long row of these calls.
 class ByteCursor {

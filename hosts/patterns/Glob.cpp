@@ -37,8 +37,8 @@ std::string wrapped(const std::string& expression, LetterCase letterCase,
     return folds ? "(?i:" + expression + ")" : expression;
 }
 
-// Where the sets of a glob end. All is found in one pass: a glob of many '['
-// and no ']' costs no more than another one of its length.
+// Where the sets of a glob end. One pass finds all the ends: a glob of many '['
+// and no ']' costs no more than any other glob of its length.
 class SetEnds {
 public:
     static constexpr std::size_t none = std::string_view::npos;
