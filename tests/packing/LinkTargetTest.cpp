@@ -1,11 +1,11 @@
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <system_error>
 
 #include "packing/LinkTarget.hpp"
+#include "tests/support/TemporaryFolder.hpp"
 
 namespace {
 
@@ -13,19 +13,12 @@ namespace fs = std::filesystem;
 
 class LinkTarget : public testing::Test {
 protected:
-    LinkTarget() {
-        std::string pattern =
-            (fs::temp_directory_path() / "links-XXXXXX").string();
-        folder_ = ::mkdtemp(pattern.data());
-    }
-    ~LinkTarget() override { fs::remove_all(folder_); }
-
     // Links whose names are numbers, each to the one before.
     void makeChain(int links) const {
         for (int i = 1; i <= links; ++i)
             fs::create_symlink(std::to_string(i - 1), at(std::to_string(i)));
     }
-    fs::path at(const std::string& name) const { return folder_ / name; }
+    fs::path at(const std::string& name) const { return folder_.file(name); }
     static std::error_code errorOf(const fs::path& path) {
         std::error_code error;
         tessel::linkTarget(path, error);
@@ -39,7 +32,7 @@ protected:
     }
 
 private:
-    fs::path folder_;
+    support::TemporaryFolder folder_;
 };
 
 TEST_F(LinkTarget, WhatIsNoLinkIsItself) {

@@ -23,6 +23,7 @@
 #include "paths/IndexedRange.hpp"
 #include "paths/PathStore.hpp"
 #include "tests/paths/Stores.hpp"
+#include "tests/support/TemporaryFolder.hpp"
 
 namespace {
 
@@ -353,32 +354,8 @@ TEST(PathStore, SavedBytesAreReproducible) {
     EXPECT_EQ(store.save(), bytes);
 }
 
-// A folder that goes with its contents.
-class Folder {
-public:
-    Folder() {
-        std::string pattern =
-            (std::filesystem::temp_directory_path() / "store-XXXXXX").string();
-        name_ = ::mkdtemp(pattern.data());
-    }
-    Folder(const Folder&) = delete;
-    Folder& operator=(const Folder&) = delete;
-    ~Folder() { std::filesystem::remove_all(name_); }
-
-    std::string file(const std::string& name) const {
-        return (name_ / name).string();
-    }
-    std::size_t entries() const {
-        return static_cast<std::size_t>(
-            std::distance(std::filesystem::directory_iterator(name_), {}));
-    }
-
-private:
-    std::filesystem::path name_;
-};
-
 TEST(PathStore, FilesKeepAStore) {
-    const Folder folder;
+    const support::TemporaryFolder folder;
     const std::string name = folder.file("store");
     PathStore::from(awkwardPaths()).saveFile(name);
     expectHolds(PathStore::loadFile(name), awkwardPaths());
@@ -410,7 +387,7 @@ TEST(PathStore, FileErrorsNameTheFile) {
 }
 
 TEST(PathStore, ADamagedFileIsRefused) {
-    const Folder folder;
+    const support::TemporaryFolder folder;
     std::ofstream(folder.file("bad")) << "no store";
     EXPECT_THROW(PathStore::loadFile(folder.file("bad")), DamagedFormException);
 }

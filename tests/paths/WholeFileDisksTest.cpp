@@ -22,6 +22,7 @@
 
 #include "paths/PathStore.hpp"
 #include "tests/support/FailingCalls.hpp"
+#include "tests/support/TemporaryFolder.hpp"
 
 namespace {
 
@@ -51,22 +52,14 @@ int killedWriters() {
 
 class WholeFileDisks : public ::testing::Test {
 protected:
-    WholeFileDisks() {
-        std::string pattern =
-            (fs::temp_directory_path() / "disks-XXXXXX").string();
-        folder_ = ::mkdtemp(pattern.data());
-    }
-    ~WholeFileDisks() override {
-        failCall("", "", 0, 0);
-        fs::remove_all(folder_);
-    }
+    ~WholeFileDisks() override { failCall("", "", 0, 0); }
 
     std::string path(const std::string& name) const {
-        return (folder_ / name).string();
+        return folder_.file(name);
     }
     std::vector<std::string> names() const {
         std::vector<std::string> names;
-        for (const auto& entry : fs::directory_iterator(folder_))
+        for (const auto& entry : fs::directory_iterator(folder_.path()))
             names.push_back(entry.path().filename().string());
         return names;
     }
@@ -84,7 +77,7 @@ protected:
                                  std::to_string(error));
                     ASSERT_LT(number, 100);
                     prepare();
-                    failCall(folder_.c_str(), kind, number, error);
+                    failCall(folder_.path().c_str(), kind, number, error);
                     const bool isDone = succeeds(work);
                     const bool isOver = hasFailed() == 0;
                     failCall("", "", 0, 0);
@@ -99,14 +92,14 @@ private:
             work();
             return true;
         } catch (const std::system_error& error) {
-            EXPECT_NE(std::string(error.what()).find(folder_.string()),
+            EXPECT_NE(std::string(error.what()).find(folder_.path().string()),
                       std::string::npos)
                 << error.what();
             return false;
         }
     }
 
-    fs::path folder_;
+    support::TemporaryFolder folder_;
 };
 
 PathStore storeOf(const std::vector<std::string>& paths) {

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "paths/WholeFile.hpp"
+#include "tests/support/TemporaryFolder.hpp"
 
 namespace {
 
@@ -26,15 +27,8 @@ void replaceByN(const std::string& file) { replaceFile(file, Bytes{'n'}); }
 
 class WholeFile : public ::testing::Test {
 protected:
-    WholeFile() {
-        std::string pattern =
-            (fs::temp_directory_path() / "wf-XXXXXX").string();
-        folder_ = ::mkdtemp(pattern.data());
-    }
-    ~WholeFile() override { fs::remove_all(folder_); }
-
     std::string path(const std::string& name) const {
-        return (folder_ / name).string();
+        return folder_.file(name);
     }
     // Expects an operation to throw this error, with the file's name.
     template <class Operation>
@@ -49,13 +43,10 @@ protected:
                 << error.what();
         }
     }
-    std::size_t entries() const {
-        return static_cast<std::size_t>(
-            std::distance(fs::directory_iterator(folder_), {}));
-    }
+    std::size_t entries() const { return folder_.entries(); }
 
 private:
-    fs::path folder_;
+    support::TemporaryFolder folder_;
 };
 
 TEST_F(WholeFile, ReadsWhatWasWritten) {
